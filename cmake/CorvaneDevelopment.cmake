@@ -1,0 +1,21 @@
+# Compiler options for Corvane's own targets only. They are applied as PRIVATE options, so a project that
+# links corvane::corvane inherits none of them.
+
+function(corvane_development_options target)
+    target_compile_options(${target} PRIVATE -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor)
+    if(CMAKE_CXX_COMPILER_ID MATCHES "Clang")
+        target_compile_options(${target} PRIVATE -Wthread-safety)
+    endif()
+    if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)
+        # False alarms of g++ 12 about the standard library's strings and variants, in optimised builds.
+        target_compile_options(${target} PRIVATE -Wno-restrict -Wno-maybe-uninitialized)
+    endif()
+    if(CORVANE_WERROR)
+        target_compile_options(${target} PRIVATE -Werror)
+    endif()
+    if(CORVANE_SANITIZE)
+        target_compile_options(${target} PRIVATE -fsanitize=${CORVANE_SANITIZE} -fno-omit-frame-pointer
+            -fno-sanitize-recover=all)
+        target_link_options(${target} PRIVATE -fsanitize=${CORVANE_SANITIZE})
+    endif()
+endfunction()

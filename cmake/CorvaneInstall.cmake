@@ -1,0 +1,53 @@
+# Installs the library with its public headers, the CMake package and the pkg-config file.
+include(CMakePackageConfigHelpers)
+
+# Headers that only the library's own sources include: what they pull in is not a consumer's affair.
+file(GLOB_RECURSE headers RELATIVE ${PROJECT_SOURCE_DIR} CONFIGURE_DEPENDS ${PROJECT_SOURCE_DIR}/corvane/*.h)
+set(internal_headers
+    corvane/Models/JSONTree.h
+    corvane/Platform/CurlTransfer.h
+    corvane/Platform/HostCall.h
+    corvane/Platform/HTTPTransfer.h
+    corvane/Platform/OpenSSLUse.h
+    corvane/Platform/PrivateFile.h
+    corvane/Platform/TaskList.h
+    corvane/Platform/Thread.h
+    corvane/Platform/TransferThread.h
+    corvane/Session/SessionCore.h)
+list(REMOVE_ITEM headers ${internal_headers})
+foreach(header IN LISTS headers)
+    get_filename_component(folder ${header} DIRECTORY)
+    install(FILES ${PROJECT_SOURCE_DIR}/${header} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/${folder})
+endforeach()
+install(FILES ${CMAKE_CURRENT_BINARY_DIR}/include/corvane/Export.h
+    DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/corvane)
+
+install(TARGETS corvane EXPORT corvaneTargets
+    RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR})
+
+set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/corvane)
+install(EXPORT corvaneTargets NAMESPACE corvane:: DESTINATION ${package_dir})
+configure_package_config_file(${PROJECT_SOURCE_DIR}/cmake/corvaneConfig.cmake.in
+    ${CMAKE_CURRENT_BINARY_DIR}/corvaneConfig.cmake INSTALL_DESTINATION ${package_dir})
+write_basic_package_version_file(${CMAKE_CURRENT_BINARY_DIR}/corvaneConfigVersion.cmake
+    COMPATIBILITY SameMinorVersion)
+install(FILES
+    ${CMAKE_CURRENT_BINARY_DIR}/corvaneConfig.cmake
+    ${CMAKE_CURRENT_BINARY_DIR}/corvaneConfigVersion.cmake
+    ${PROJECT_SOURCE_DIR}/cmake/CorvaneApplicationBundle.cmake
+    DESTINATION ${package_dir})
+
+# A static library leaves it to its user to link what it is made of; a shared one brings that itself.
+if(BUILD_SHARED_LIBS)
+    set(pc_cflags "")
+    set(pc_libs_extra "")
+    set(pc_requires "")
+else()
+    set(pc_cflags "-DCORVANE_STATIC_DEFINE")
+    set(pc_libs_extra "-lboost_json -lboost_container -pthread")
+    set(pc_requires "sqlite3 zlib libcurl libcrypto spdlog")
+endif()
+configure_file(${PROJECT_SOURCE_DIR}/cmake/corvane.pc.in ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc @ONLY)
+install(FILES ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

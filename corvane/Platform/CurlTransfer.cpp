@@ -1,0 +1,287 @@
+#include <corvane/Platform/CurlTransfer.h>
+
+#include <corvane/Platform/TransferError.h>
+
+#include <curl/curl.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <new>
+#include <system_error>
+
+namespace corvane {
+
+namespace {
+
+using Code = TransferError::Code;
+
+// More than any server has to say, and little enough to keep for every transfer.
+constexpr std::size_t longestHead = std::size_t{256} * 1024;
+
+struct URLParts {
+    std::string scheme;
+    std::string host;
+    std::string port;
+};
+
+std::string part(CURLU* url, CURLUPart which) {
+    char* text = nullptr;
+    if (curl_url_get(url, which, &text, CURLU_DEFAULT_PORT) != CURLUE_OK) return {};
+    const std::unique_ptr<char, decltype(&curl_free)> owned(text, curl_free);
+    return text;
+}
+
+URLParts parse(const std::string& text) {
+    const std::unique_ptr<CURLU, decltype(&curl_url_cleanup)> url(curl_url(), curl_url_cleanup);
+    if (!url) throw std::bad_alloc();
+    if (text.find('\0') != std::string::npos || curl_url_set(url.get(), CURLUPART_URL, text.c_str(), 0) != CURLUE_OK) {
+        throw TransferError(Code::invalidRequest, "the URL cannot be used: " + text);
+    }
+    URLParts parts{part(url.get(), CURLUPART_SCHEME), part(url.get(), CURLUPART_HOST), part(url.get(), CURLUPART_PORT)};
+    if (parts.scheme != "http" && parts.scheme != "https") {
+        throw TransferError(Code::invalidRequest, "the URL is neither http nor https: " + text);
+    }
+    std::transform(parts.host.begin(), parts.host.end(), parts.host.begin(),
+                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+    return parts;
+}
+
+bool isLoopback(const std::string& host) {
+    return host == "localhost" || host.ends_with(".localhost") || host.starts_with("127.") || host == "[::1]";
+}
+
+bool isToken(std::string_view text) {
+    return !text.empty() && std::all_of(text.begin(), text.end(), [](char c) {
+        return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
+               std::string_view("!#$%&'*+-.^_`|~").find(c) != std::string_view::npos;
+    });
+}
+
+bool equalIgnoringCase(std::string_view a, std::string_view b) {
+    return curl_strnequal(a.data(), b.data(), std::min(a.size(), b.size())) && a.size() == b.size();
+}
+
+std::string_view trimmed(std::string_view text) {
+    constexpr std::string_view blanks = " \t\r\n";
+    const auto first = text.find_first_not_of(blanks);
+    if (first == std::string_view::npos) return {};
+    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
+}  // namespace
+
+void CurlTransfer::EasyDeleter::operator()(void* easy) const noexcept {
+    curl_easy_cleanup(easy);
+}
+void CurlTransfer::HeaderListDeleter::operator()(void* list) const noexcept {
+    curl_slist_free_all(static_cast<curl_slist*>(list));
+}
+CurlTransfer::File::~File() {
+    if (descriptor >= 0) close(descriptor);
+}
+
+std::string CurlTransfer::hostKey(const HTTPTransfer& transfer) {
+    const URLParts url = parse(transfer.request.url);
+    return transfer.pool + ' ' + url.host + ' ' + url.port;
+}
+
+CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
+    : limits_(transfer.limits),
+      didSend_(transfer.didSend),
+      deadline_(Clock::now() + limits_.timeWithoutProgress),
+      easy_(curl_easy_init()) {
+    if (!easy_) throw std::bad_alloc();
+    if (transfer.bodyFile) openBody(*transfer.bodyFile);
+    setHeaders(transfer.request);
+    setOptions(transfer);
+}
+
+CurlTransfer::~CurlTransfer() = default;
+
+void CurlTransfer::openBody(const std::filesystem::path& file) {
+    // Not to wait for the other end where somebody put a pipe in the file's place.
+    body_.descriptor = open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+    struct stat status {};
+    const bool opened = body_.descriptor >= 0 && fstat(body_.descriptor, &status) == 0;
+    if (!opened || !S_ISREG(status.st_mode)) {
+        const auto why = opened ? std::string("it is not a file") : std::system_category().message(errno);
+        throw TransferError(Code::bodyUnavailable, "cannot read " + file.string() + ": " + why);
+    }
+    bodySize_ = status.st_size;
+}
+
+void CurlTransfer::setHeaders(const TransferRequest& request) {
+    const auto append = [this](const std::string& line) {
+        auto* list = curl_slist_append(static_cast<curl_slist*>(headerList_.get()), line.c_str());
+        if (!list) throw std::bad_alloc();
+        (void)headerList_.release();
+        headerList_.reset(list);
+    };
+    for (const auto& [name, value] : request.headers) {
+        if (!isToken(name) || value.find_first_of(std::string_view("\r\n\0", 3)) != std::string::npos) {
+            throw TransferError(Code::invalidRequest, "the header cannot be sent: " + name);
+        }
+        append(trimmed(value).empty() ? name + ';' : name + ": " + value);
+    }
+    append("Expect:");
+}
+
+void CurlTransfer::setOptions(const HTTPTransfer& transfer) {
+    CURL* easy = easy_.get();
+    const URLParts url = parse(transfer.request.url);
+    curl_easy_setopt(easy, CURLOPT_URL, transfer.request.url.c_str());
+    curl_easy_setopt(easy, CURLOPT_PROTOCOLS_STR, "http,https");
+    curl_easy_setopt(easy, CURLOPT_FOLLOWLOCATION, 0L);
+    curl_easy_setopt(easy, CURLOPT_SSL_VERIFYPEER, 1L);
+    curl_easy_setopt(easy, CURLOPT_SSL_VERIFYHOST, 2L);
+    curl_easy_setopt(easy, CURLOPT_NOSIGNAL, 1L);
+    // A name that is still being looked up must not hold up the thread when its transfer is dropped.
+    curl_easy_setopt(easy, CURLOPT_QUICK_EXIT, 1L);
+    curl_easy_setopt(easy, CURLOPT_CONNECTTIMEOUT_MS, static_cast<long>(limits_.timeWithoutProgress.count()));
+    curl_easy_setopt(easy, CURLOPT_ERRORBUFFER, errorText_);
+    curl_easy_setopt(easy, CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
+    if (isLoopback(url.host)) curl_easy_setopt(easy, CURLOPT_PROXY, "");
+
+    curl_easy_setopt(easy, CURLOPT_HTTPHEADER, static_cast<curl_slist*>(headerList_.get()));
+    curl_easy_setopt(easy, CURLOPT_HEADERFUNCTION, &headerArrived);
+    curl_easy_setopt(easy, CURLOPT_HEADERDATA, this);
+    curl_easy_setopt(easy, CURLOPT_WRITEFUNCTION, &bodyArrived);
+    curl_easy_setopt(easy, CURLOPT_WRITEDATA, this);
+    if (!transfer.bodyFile) return;
+
+    if (!isToken(transfer.request.method)) throw TransferError(Code::invalidRequest, "the method cannot be sent");
+    curl_easy_setopt(easy, CURLOPT_UPLOAD, 1L);
+    curl_easy_setopt(easy, CURLOPT_CUSTOMREQUEST, transfer.request.method.c_str());
+    curl_easy_setopt(easy, CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(bodySize_));
+    curl_easy_setopt(easy, CURLOPT_READFUNCTION, &readBody);
+    curl_easy_setopt(easy, CURLOPT_READDATA, this);
+    curl_easy_setopt(easy, CURLOPT_SEEKFUNCTION, &seekBody);
+    curl_easy_setopt(easy, CURLOPT_SEEKDATA, this);
+}
+
+void CurlTransfer::update(Clock::time_point now) {
+    CURL* easy = easy_.get();
+    curl_off_t sent = 0, received = 0;
+    long headers = 0, requests = 0;
+    curl_easy_getinfo(easy, CURLINFO_SIZE_UPLOAD_T, &sent);
+    curl_easy_getinfo(easy, CURLINFO_SIZE_DOWNLOAD_T, &received);
+    curl_easy_getinfo(easy, CURLINFO_HEADER_SIZE, &headers);
+    curl_easy_getinfo(easy, CURLINFO_REQUEST_SIZE, &requests);
+    std::int64_t activity = sent + received + headers + requests;
+    // The steps of connecting exchange bytes too, though nobody counts them.
+    for (const auto step : {CURLINFO_NAMELOOKUP_TIME_T, CURLINFO_CONNECT_TIME_T, CURLINFO_APPCONNECT_TIME_T}) {
+        curl_off_t reached = 0;
+        curl_easy_getinfo(easy, step, &reached);
+        activity += reached > 0;
+    }
+    if (activity != activity_) {
+        activity_ = activity;
+        deadline_ = now + limits_.timeWithoutProgress;
+    }
+    if (requests > 0 && sent >= bodySize_ && answerDeadline_ == Clock::time_point::max()) {
+        answerDeadline_ = now + limits_.answer;
+    }
+    if (sent > reported_) {
+        reported_ = sent;
+        if (didSend_) didSend_(sent, bodySize_);
+    }
+}
+
+std::optional<AnyError> CurlTransfer::error(int curlCode) const {
+    if (curlCode == CURLE_OK || capReached_) return std::nullopt;
+    if (!bodyProblem_.empty()) return AnyError(TransferError(Code::bodyUnavailable, bodyProblem_));
+    if (curlCode == CURLE_OPERATION_TIMEDOUT) return timeoutError();
+    std::string text = curl_easy_strerror(static_cast<CURLcode>(curlCode));
+    if (errorText_[0]) text += std::string(": ") + errorText_;
+    return AnyError(TransferError(Code::network, std::move(text)));
+}
+
+std::optional<AnyError> CurlTransfer::timeoutError() const {
+    if (answerDeadline_ < deadline_) {
+        if (headComplete_) return std::nullopt;
+        return AnyError(
+            TransferError(Code::timedOut, "no answer came within " + std::to_string(limits_.answer.count()) + " ms"));
+    }
+    return AnyError(TransferError(Code::timedOut, "nothing was sent or received for " +
+                                                      std::to_string(limits_.timeWithoutProgress.count()) + " ms"));
+}
+
+std::optional<TransferResponse> CurlTransfer::response() const {
+    if (!headComplete_) return std::nullopt;
+    return answer_;
+}
+
+void CurlTransfer::takeHeader(std::string_view line) {
+    if (line.starts_with("HTTP/")) {  // also after an interim answer
+        answer_ = {};
+        headComplete_ = false;
+    } else if (headComplete_) {
+        return;  // a trailer
+    } else if (trimmed(line).empty()) {
+        long status = 0;
+        curl_easy_getinfo(easy_.get(), CURLINFO_RESPONSE_CODE, &status);
+        answer_.statusCode = status;
+        headComplete_ = status >= 200;
+    } else if (const auto colon = line.find(':'); colon != std::string_view::npos) {
+        const auto name = line.substr(0, colon);
+        const auto value = trimmed(line.substr(colon + 1));
+        const auto known = std::find_if(answer_.headers.begin(), answer_.headers.end(),
+                                        [&](const auto& header) { return equalIgnoringCase(header.first, name); });
+        if (known == answer_.headers.end()) {
+            answer_.headers.emplace(name, value);
+        } else {
+            known->second.append(", ").append(value);
+        }
+    }
+}
+
+std::size_t CurlTransfer::readBody(char* buffer, std::size_t size, std::size_t count, void* self) noexcept {
+    auto& transfer = *static_cast<CurlTransfer*>(self);
+    const auto wanted =
+        std::min<std::int64_t>(static_cast<std::int64_t>(size * count), transfer.bodySize_ - transfer.bodyRead_);
+    if (wanted <= 0) return 0;  // what was added to the file meanwhile is not part of the body
+    ssize_t got = 0;
+    do {
+        got = pread(transfer.body_.descriptor, buffer, static_cast<std::size_t>(wanted), transfer.bodyRead_);
+    } while (got < 0 && errno == EINTR);
+    if (got <= 0) {
+        transfer.bodyProblem_ = got < 0 ? "cannot read the body file: " + std::system_category().message(errno)
+                                        : "the body file has shrunk";
+        return CURL_READFUNC_ABORT;
+    }
+    transfer.bodyRead_ += got;
+    return static_cast<std::size_t>(got);
+}
+
+int CurlTransfer::seekBody(void* self, std::int64_t offset, int origin) noexcept {
+    if (origin != SEEK_SET || offset < 0) return CURL_SEEKFUNC_CANTSEEK;
+    static_cast<CurlTransfer*>(self)->bodyRead_ = offset;
+    return CURL_SEEKFUNC_OK;
+}
+
+std::size_t CurlTransfer::headerArrived(char* data, std::size_t size, std::size_t count, void* self) noexcept {
+    auto& transfer = *static_cast<CurlTransfer*>(self);
+    const std::size_t length = size * count;
+    transfer.headerBytes_ += length;
+    if (transfer.headerBytes_ > longestHead) return 0;
+    try {
+        transfer.takeHeader({data, length});
+    } catch (...) {
+        return 0;  // out of memory: the transfer fails
+    }
+    return length;
+}
+
+std::size_t CurlTransfer::bodyArrived(char*, std::size_t size, std::size_t count, void* self) noexcept {
+    auto& transfer = *static_cast<CurlTransfer*>(self);
+    transfer.answerBytes_ += size * count;
+    if (transfer.answerBytes_ <= transfer.limits_.responseBody) return size * count;
+    transfer.capReached_ = true;
+    return 0;
+}
+
+}  // namespace corvane

@@ -1,0 +1,31 @@
+#pragma once
+
+#include <corvane/Platform/TypeName.h>
+
+#include <string_view>
+#include <typeindex>
+#include <typeinfo>
+
+namespace corvane {
+
+/// A type as a value: what an event property asks for, what a stack holds. Compared by identity, printed by name.
+class DataType {
+  public:
+    template <class T>
+    [[nodiscard]] static DataType of() {
+        return DataType(typeid(T), typeName<T>());
+    }
+
+    /// The type's unqualified name, in storage that lives as long as the program.
+    [[nodiscard]] std::string_view name() const { return name_; }
+
+    friend bool operator==(const DataType& a, const DataType& b) { return a.type_ == b.type_; }
+
+  private:
+    DataType(const std::type_info& type, std::string_view name) : type_(type), name_(name) {}
+
+    std::type_index type_;
+    std::string_view name_;
+};
+
+}  // namespace corvane

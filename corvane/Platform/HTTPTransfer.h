@@ -1,0 +1,31 @@
+#pragma once
+
+#include <corvane/Platform/Error.h>
+#include <corvane/Platform/TransferRequest.h>
+#include <corvane/Platform/TransferResponse.h>
+#include <corvane/Platform/TransferSessionConfiguration.h>
+
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <optional>
+#include <string>
+
+namespace corvane {
+
+/// One HTTP exchange as it is handed to the transfer thread. A value; what it calls, it calls on that thread, so the
+/// functions only enqueue.
+struct HTTPTransfer {
+    TransferRequest request;
+    /// Sent as the body, when there is one.
+    std::optional<std::filesystem::path> bodyFile;
+    TransferLimits limits;
+    /// Transfers of one pool share the limit per host.
+    std::string pool;
+    /// The bytes of the body that have gone out so far and its size, whenever the first has grown. May be empty.
+    std::function<void(std::int64_t total, std::int64_t expected)> didSend;
+    /// The end; called once, unless the transfer is cancelled or the process exits before.
+    std::function<void(std::optional<AnyError> error, std::optional<TransferResponse> response)> didComplete;
+};
+
+}  // namespace corvane

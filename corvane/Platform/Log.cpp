@@ -1,0 +1,120 @@
+#include <corvane/Platform/Log.h>
+
+#include <spdlog/sinks/stdout_sinks.h>
+#include <spdlog/spdlog.h>
+
+#include <mutex>
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+std::shared_ptr<spdlog::logger> makeLogger() {
+    const std::string name(Log::subsystem);
+    if (auto registered = spdlog::get(name)) return registered;
+    auto logger = std::make_shared<spdlog::logger>(name, std::make_shared<spdlog::sinks::stderr_sink_mt>());
+    logger->set_pattern("%Y-%m-%d %H:%M:%S.%e %l [%n:" + std::string(Log::category) + "] %v");
+    logger->set_level(spdlog::level::trace);
+    return logger;
+}
+
+spdlog::level::level_enum spdlogLevel(LogLevel level) {
+    switch (level) {
+        case LogLevel::debug:
+            return spdlog::level::debug;
+        case LogLevel::default_:
+            return spdlog::level::info;
+        case LogLevel::error:
+            return spdlog::level::err;
+    }
+    return spdlog::level::err;
+}
+
+// Writes `format` with its placeholders replaced. A placeholder without an argument stays as it is
+// written.
+std::string render(std::string_view format, std::initializer_list<LogArgument> arguments, bool hidesPrivate) {
+    struct Placeholder {
+        std::string_view text;
+        bool isPublic;
+    };
+    static constexpr Placeholder placeholders[] = {{"%{public}@", true}, {"%@", false}, {"%ld", true}, {"%d", true}};
+    std::string out;
+    out.reserve(format.size() + 64);
+    const LogArgument* next = arguments.begin();
+    while (!format.empty()) {
+        const std::size_t percent = format.find('%');
+        out.append(format.substr(0, percent));
+        if (percent == std::string_view::npos) break;
+        format.remove_prefix(percent);
+        const Placeholder* found = nullptr;
+        for (const auto& placeholder : placeholders) {
+            if (format.starts_with(placeholder.text)) found = &placeholder;
+        }
+        if (!found || next == arguments.end()) {
+            out += '%';
+            format.remove_prefix(1);
+            continue;
+        }
+        if (found->isPublic || !hidesPrivate) {
+            next->appendTo(out);
+        } else {
+            out += "<private>";
+        }
+        ++next;
+        format.remove_prefix(found->text.size());
+    }
+    return out;
+}
+
+}  // namespace
+
+void LogArgument::appendTo(std::string& out) const {
+    if (isNumber_) {
+        out += std::to_string(number_);
+    } else {
+        out += text_;
+    }
+}
+
+struct Log::Output {
+    std::mutex mutex;
+    std::shared_ptr<const Sink> sink;
+    std::shared_ptr<spdlog::logger> logger;
+};
+
+Log::Log() : output_(new Output) {}
+
+Log& Log::shared() {
+    static auto& log = *new Log;
+    return log;
+}
+
+void Log::setSink(Sink sink) {
+    auto shared = sink ? std::make_shared<const Sink>(std::move(sink)) : nullptr;
+    std::lock_guard lock(output_->mutex);
+    output_->sink.swap(shared);
+}
+
+void Log::write(LogLevel level, std::string_view format, std::initializer_list<LogArgument> arguments) noexcept {
+    try {
+        const std::string message = render(format, arguments, hidesPrivate_.load(std::memory_order_relaxed));
+        std::shared_ptr<const Sink> sink;
+        std::shared_ptr<spdlog::logger> logger;
+        {
+            std::lock_guard lock(output_->mutex);
+            sink = output_->sink;
+            if (!sink && !output_->logger) output_->logger = makeLogger();
+            logger = output_->logger;
+        }
+        if (sink) {
+            (*sink)(level, message);
+        } else {
+            logger->log(spdlogLevel(level), spdlog::string_view_t(message.data(), message.size()));
+        }
+    } catch (...) {
+        // A log that fails has nobody left to tell; the work that wanted to be logged goes on.
+    }
+}
+
+}  // namespace corvane

@@ -1,0 +1,53 @@
+#include <corvane/Platform/OpenSSLUse.h>
+
+#include <corvane/Platform/ForkMark.h>
+#include <corvane/Platform/SigningError.h>
+
+#include <openssl/crypto.h>
+
+#include <cstdlib>
+#include <mutex>
+
+namespace corvane {
+
+namespace {
+
+struct ExitState {
+    std::shared_mutex mutex;
+    bool exiting = false;
+    const ForkMark made;
+
+    static ExitState& shared() {
+        static auto& state = *new ExitState;
+        return state;
+    }
+
+    ExitState() {
+        // Exit handlers run in reverse order, so OpenSSL's must be there before ours.
+        OPENSSL_init_crypto(OPENSSL_INIT_LOAD_CRYPTO_STRINGS, nullptr);  // asked for nothing, it registers nothing
+        instance = this;
+        exiting = std::atexit([] {
+                      // A thread of the parent may have held it when the child was made; there are none in the child.
+                      if (instance->made.isInChild()) return;
+                      const std::lock_guard lock(instance->mutex);
+                      instance->exiting = true;
+                  }) != 0;
+    }
+
+    // Not looked up through shared(): the process may exit while that is still being made.
+    static inline ExitState* instance = nullptr;
+};
+
+}  // namespace
+
+OpenSSLUse::OpenSSLUse() : lock_(ExitState::shared().mutex) {
+    if (ExitState::shared().exiting) {
+        throw SigningError(SigningError::unavailable, "the process is exiting");
+    }
+}
+
+OpenSSLUse::~OpenSSLUse() {
+    OPENSSL_thread_stop();
+}
+
+}  // namespace corvane

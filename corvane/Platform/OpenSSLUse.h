@@ -1,0 +1,24 @@
+#pragma once
+
+#include <shared_mutex>
+
+namespace corvane {
+
+/// Held by whoever calls OpenSSL. OpenSSL takes itself down in an exit handler, while threads of the library may still
+/// be at work: the exit waits for the uses that are held, and later ones throw `SigningError` unavailable. Uses may be
+/// held on several threads at once; hold one for the length of a computation, never while waiting or calling out.
+///
+/// At its end OpenSSL frees what it keeps for the thread, its error queue among it: a thread that ends after OpenSSL's
+/// exit handler could not free it any more.
+class OpenSSLUse {
+  public:
+    OpenSSLUse();
+    ~OpenSSLUse();
+    OpenSSLUse(const OpenSSLUse&) = delete;
+    OpenSSLUse& operator=(const OpenSSLUse&) = delete;
+
+  private:
+    std::shared_lock<std::shared_mutex> lock_;
+};
+
+}  // namespace corvane

@@ -1,0 +1,126 @@
+#include <corvane/Platform/PrivateFile.h>
+
+#include <corvane/Platform/Error.h>
+#include <corvane/Platform/UUID.h>
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <ctime>
+#include <memory>
+
+namespace corvane {
+
+namespace {
+
+constexpr std::string_view partialExtension = ".partial";
+
+class Descriptor {
+  public:
+    explicit Descriptor(int descriptor) : descriptor_(descriptor) {}
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+    ~Descriptor() {
+        if (descriptor_ >= 0) ::close(descriptor_);
+    }
+    [[nodiscard]] int get() const { return descriptor_; }
+    /// Closes at once: some file systems report a failed write only here.
+    [[nodiscard]] bool close() {
+        const int descriptor = descriptor_;
+        descriptor_ = -1;
+        return ::close(descriptor) == 0;
+    }
+
+  private:
+    int descriptor_;
+};
+
+bool writeAll(int descriptor, std::string_view contents) {
+    while (!contents.empty()) {
+        const ssize_t count = ::write(descriptor, contents.data(), contents.size());
+        if (count < 0 && errno == EINTR) continue;
+        if (count < 0) return false;
+        contents.remove_prefix(static_cast<std::size_t>(count));
+    }
+    return true;
+}
+
+/// A file beside `target` that holds `contents`; removed at the end unless it was renamed.
+class PartialFile {
+  public:
+    PartialFile(const std::filesystem::path& target, std::string_view contents)
+        : path_(target.parent_path() / ("." + target.filename().string() + "." + newUUID()).append(partialExtension)) {
+        Descriptor descriptor(::open(path_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+        if (descriptor.get() < 0) throw SystemError("create file " + target.string(), errno);
+        if (!writeAll(descriptor.get(), contents) || !descriptor.close()) {
+            const int error = errno;
+            ::unlink(path_.c_str());
+            throw SystemError("write file " + target.string(), error);
+        }
+    }
+    PartialFile(const PartialFile&) = delete;
+    PartialFile& operator=(const PartialFile&) = delete;
+    ~PartialFile() {
+        if (!path_.empty()) ::unlink(path_.c_str());
+    }
+
+    [[nodiscard]] const char* path() const { return path_.c_str(); }
+    void keep() { path_.clear(); }
+
+  private:
+    std::filesystem::path path_;
+};
+
+}  // namespace
+
+void replacePrivateFile(const std::filesystem::path& file, std::string_view contents) {
+    PartialFile partial(file, contents);
+    if (::rename(partial.path(), file.c_str()) != 0) throw SystemError("write file " + file.string(), errno);
+    partial.keep();
+}
+
+bool createPrivateFile(const std::filesystem::path& file, std::string_view contents) {
+    const PartialFile partial(file, contents);
+    if (::link(partial.path(), file.c_str()) == 0) return true;
+    if (errno == EEXIST) return false;
+    throw SystemError("create file " + file.string(), errno);
+}
+
+void removeAbandonedPartialFiles(const std::filesystem::path& directory) noexcept {
+    const std::unique_ptr<DIR, int (*)(DIR*)> opened(::opendir(directory.c_str()), ::closedir);
+    if (!opened) return;
+    const int at = ::dirfd(opened.get());
+    const std::time_t oldest = std::time(nullptr) - std::time_t{60} * 60;
+    while (const dirent* entry = ::readdir(opened.get())) {
+        const std::string_view name = entry->d_name;
+        struct stat status {};
+        const bool isAbandoned = name.starts_with('.') && name.ends_with(partialExtension) &&
+                                 ::fstatat(at, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) == 0 &&
+                                 S_ISREG(status.st_mode) && status.st_mtime < oldest;
+        if (isAbandoned) ::unlinkat(at, entry->d_name, 0);
+    }
+}
+
+std::string readWholeFile(const std::filesystem::path& file) {
+    const Descriptor descriptor(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
+    struct stat status {};
+    if (descriptor.get() < 0 || ::fstat(descriptor.get(), &status) != 0) {
+        throw SystemError("read file " + file.string(), errno);
+    }
+    std::string contents(static_cast<std::size_t>(status.st_size), '\0');
+    std::size_t size = 0;
+    while (size < contents.size()) {
+        const ssize_t count = ::read(descriptor.get(), contents.data() + size, contents.size() - size);
+        if (count < 0 && errno == EINTR) continue;
+        if (count < 0) throw SystemError("read file " + file.string(), errno);
+        if (count == 0) break;
+        size += static_cast<std::size_t>(count);
+    }
+    contents.resize(size);
+    return contents;
+}
+
+}  // namespace corvane

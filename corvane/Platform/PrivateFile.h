@@ -1,0 +1,28 @@
+#pragma once
+
+#include <corvane/Export.h>
+
+#include <filesystem>
+#include <string>
+#include <string_view>
+
+namespace corvane {
+
+// Files of mode 0600 that are there whole or not at all, whenever the process is killed: the contents are written to a
+// file beside the target, which then takes the target's name. Safe from any thread and with several processes. They
+// throw `SystemError`, and leave no file of their own behind.
+
+/// Writes the file, in place of one of that name.
+CORVANE_EXPORT void replacePrivateFile(const std::filesystem::path& file, std::string_view contents);
+
+/// Writes the file unless there is one of that name. Returns whether it was written.
+CORVANE_EXPORT bool createPrivateFile(const std::filesystem::path& file, std::string_view contents);
+
+/// Removes from a directory what a process that was killed left half written. Files younger than an hour stay: another
+/// process may be at work on them. What cannot be looked at or removed stays.
+CORVANE_EXPORT void removeAbandonedPartialFiles(const std::filesystem::path& directory) noexcept;
+
+/// The contents of a file. Throws `SystemError` when it cannot be read.
+[[nodiscard]] CORVANE_EXPORT std::string readWholeFile(const std::filesystem::path& file);
+
+}  // namespace corvane

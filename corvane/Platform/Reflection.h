@@ -1,0 +1,171 @@
+#pragma once
+
+#include <corvane/Platform/TieFields.h>
+
+#include <array>
+#include <cstddef>
+#include <string_view>
+#include <type_traits>
+#include <utility>
+
+// Field reflection over plain aggregates, at compile time and without registration: how many fields a type has, what
+// they are called, and references to them in declaration order. Everything here is consteval or a plain template, so
+// nothing of it is left in the host's program but the names.
+
+namespace corvane::reflection {
+
+namespace detail {
+
+// Converts to whatever a field is. Const, so that a field's own converting constructor wins where both would do.
+struct AnyField {
+    template <class T>
+    operator T() const noexcept;  // NOLINT(google-explicit-constructor): declared only
+};
+
+template <class T, std::size_t... I>
+consteval bool takesFields(std::index_sequence<I...>) {
+    return requires {
+        T{(static_cast<void>(I), AnyField{})...};
+    };
+}
+
+// Fields have addresses of their own, so a type has no more of them than bytes.
+template <class T>
+inline constexpr std::size_t mostFields = sizeof(T) < maximumFields ? sizeof(T) : maximumFields;
+
+template <class T, std::size_t N>
+consteval std::size_t countFrom() {
+    if constexpr (N == 0) {
+        return 0;
+    } else if constexpr (takesFields<T>(std::make_index_sequence<N>())) {
+        return N;
+    } else {
+        return countFrom<T, N - 1>();
+    }
+}
+
+template <class T>
+struct AnyBaseOf {
+    template <class Base>
+    requires(std::is_base_of_v<Base, T> && !std::is_same_v<Base, T>) operator Base()
+        const noexcept;  // NOLINT(google-explicit-constructor): declared only
+};
+
+template <class T>
+concept HasBase = requires {
+    T{AnyBaseOf<T>{}};
+};
+
+// An array without its own braces takes as many values as it has elements, and so upsets the count. One that is given
+// its braces takes one value only: then what follows is too much.
+template <class T, std::size_t... Before, std::size_t... After>
+consteval bool isArrayAt(std::index_sequence<Before...>, std::index_sequence<After...>) {
+    return requires {
+        T{(static_cast<void>(Before), AnyField{})..., {}};
+    }
+    &&!requires {
+        T{(static_cast<void>(Before), AnyField{})..., {}, (static_cast<void>(After), AnyField{})...};
+    };
+}
+
+template <class T, std::size_t N, std::size_t... I>
+consteval bool hasArray(std::index_sequence<I...>) {
+    return (isArrayAt<T>(std::make_index_sequence<I>(), std::make_index_sequence<N - 1 - I>()) || ...);
+}
+
+template <class T>
+consteval bool canReflect() {
+    if constexpr (!std::is_class_v<T> || !std::is_aggregate_v<T> || !std::is_destructible_v<T>) {
+        return false;
+    } else if constexpr (std::is_empty_v<T>) {
+        return true;
+    } else if constexpr (HasBase<T> || takesFields<T>(std::make_index_sequence<maximumFields + 1>())) {
+        return false;
+    } else {
+        constexpr std::size_t count = countFrom<T, mostFields<T>>();
+        return count > 0 && !hasArray<T, count>(std::make_index_sequence<count>());
+    }
+}
+
+// An object that is never defined: its subobjects have addresses, and an address has a name.
+template <class T>
+struct Wrapper {
+    T value;
+};
+
+#if defined(__clang__)
+#pragma clang diagnostic push
+#pragma clang diagnostic ignored "-Wundefined-var-template"
+#pragma clang diagnostic ignored "-Wundefined-internal"
+#endif
+
+template <class T>
+extern const Wrapper<T> object;
+
+template <class P>
+struct Address {
+    P pointer;
+};
+
+template <class P>
+Address(P) -> Address<P>;
+
+template <Address A>
+consteval const char* pretty() {  // a plain pointer: gcc spells an alias out at the end of the text
+    return __PRETTY_FUNCTION__;
+}
+
+// gcc ends in "...::Screen::name}]", clang in "...value.name}]".
+consteval std::string_view lastName(std::string_view text) {
+    const std::size_t end = text.find_last_not_of("]})>; ") + 1;
+    const std::size_t begin = text.find_last_of(".:&", end - 1) + 1;
+    return text.substr(begin, end - begin);
+}
+
+template <class T, std::size_t N, std::size_t I>
+consteval std::string_view fieldName() {
+    return lastName(pretty<Address{&std::get<I>(tieFields<N>(object<T>.value))}>());
+}
+
+template <class T, std::size_t N, std::size_t... I>
+consteval auto collectNames(std::index_sequence<I...>) {
+    return std::array<std::string_view, N>{fieldName<T, N, I>()...};
+}
+
+#if defined(__clang__)
+#pragma clang diagnostic pop
+#endif
+
+}  // namespace detail
+
+/// Whether `T` can be taken apart: an aggregate class without bases and arrays, of at most `maximumFields` fields.
+template <class T>
+concept Reflectable = detail::canReflect<std::remove_cv_t<T>>();
+
+/// The number of fields of a reflectable type.
+template <class T>
+inline constexpr std::size_t fieldCount = std::is_empty_v<T> ? 0 : detail::countFrom<T, detail::mostFields<T>>();
+
+/// The names of the fields, in declaration order.
+template <class T>
+inline constexpr std::array<std::string_view, fieldCount<T>> fieldNames =
+    detail::collectNames<T, fieldCount<T>>(std::make_index_sequence<fieldCount<T>>());
+
+namespace detail {
+template <class T, class Visitor, std::size_t... I>
+constexpr void visitFields(T& value, Visitor& visitor, std::index_sequence<I...>) {
+    using Record = std::remove_cv_t<T>;
+    auto fields = tieFields<sizeof...(I)>(value);
+    static_cast<void>(fields);
+    (visitor(fieldNames<Record>[I], std::get<I>(fields)), ...);
+}
+}  // namespace detail
+
+/// Calls `visitor(name, field)` for each field in declaration order.
+template <class T, class Visitor>
+requires Reflectable<T>
+constexpr void forEachField(T& value, Visitor&& visitor) {
+    detail::visitFields(value, visitor, std::make_index_sequence<fieldCount<std::remove_cv_t<T>>>());
+}
+
+}  // namespace corvane::reflection

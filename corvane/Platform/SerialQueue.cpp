@@ -1,0 +1,259 @@
+#include <corvane/Platform/SerialQueue.h>
+
+#include <corvane/Platform/ForkMark.h>
+#include <corvane/Platform/Log.h>
+#include <corvane/Platform/Require.h>
+#include <corvane/Platform/TaskList.h>
+#include <corvane/Platform/Thread.h>
+
+#include <atomic>
+#include <condition_variable>
+#include <deque>
+#include <exception>
+#include <mutex>
+#include <system_error>
+
+namespace corvane {
+
+namespace {
+
+// The queues that the code running on this thread is on, innermost first. A task that sync() runs
+// is on its queue and on every queue of the thread that waits for it, also when it runs on another
+// thread.
+struct Frame {
+    const void* queue;
+    const Frame* outer;
+};
+thread_local const Frame* currentFrame = nullptr;
+
+class FrameScope {
+  public:
+    FrameScope(const void* queue, const Frame* outer) : previous_(currentFrame), frame_{queue, outer} {
+        currentFrame = &frame_;
+    }
+    FrameScope(const FrameScope&) = delete;
+    FrameScope& operator=(const FrameScope&) = delete;
+    ~FrameScope() { currentFrame = previous_; }
+
+  private:
+    const Frame* previous_;
+    Frame frame_;
+};
+
+bool isOn(const void* queue) noexcept {
+    for (const Frame* frame = currentFrame; frame; frame = frame->outer) {
+        if (frame->queue == queue) return true;
+    }
+    return false;
+}
+
+void runGuarded(Task& task, const std::string& label) noexcept {
+    try {
+        task();
+    } catch (...) {
+        Log::shared().error("Task failed, queue=%{public}@, error=%{public}@", label, AnyError::current().what());
+    }
+    task.reset();
+}
+
+// Keeps a task for good: in a child made by fork nothing runs it, and destroying what it holds could wait for ever.
+void abandon(Task task) {
+    static auto& mutex = *new std::mutex;
+    static auto& tasks = *new std::deque<Task>;
+    std::lock_guard lock(mutex);
+    tasks.push_back(std::move(task));
+}
+
+}  // namespace
+
+struct SerialQueue::State {
+    State(std::string name, QualityOfService quality) : label(std::move(name)), qualityOfService(quality) {}
+
+    const std::string label;
+    const QualityOfService qualityOfService;
+    const ForkMark born;
+
+    std::mutex mutex;
+    std::condition_variable wake;      // the worker waits here
+    std::condition_variable syncDone;  // callers of sync() wait here
+    TaskList waiting;
+    bool running = false;  // somebody, the worker or an inline sync(), is running tasks
+    bool asleep = false;   // the worker waits for `wake`
+    bool workerStarted = false;
+    bool closed = false;  // the last reference is gone; the worker ends when nothing is left
+    // Written under the mutex; the worker reads it without between two tasks.
+    std::atomic<int> suspensions = 0;
+
+    bool suspended() const noexcept { return suspensions.load(std::memory_order_relaxed) > 0; }
+
+    static void startWorker(const std::shared_ptr<State>& state);
+    void work();
+    void runTaken(TaskList& taken);
+};
+
+// Requires: `running` was false and has just been checked under the lock together with
+// `workerStarted`.
+void SerialQueue::State::startWorker(const std::shared_ptr<State>& state) {
+    try {
+        startDetachedThread(state->label, state->qualityOfService == QualityOfService::background,
+                            [state] { state->work(); });
+    } catch (const std::system_error& error) {
+        Log::shared().error("Failed to start thread, queue=%{public}@, error=%{public}@", state->label, error.what());
+        std::lock_guard lock(state->mutex);
+        state->workerStarted = false;  // what waits stays; the next call tries again
+    }
+}
+
+void SerialQueue::State::work() {
+    TaskList taken;
+    std::unique_lock lock(mutex);
+    for (;;) {
+        while (running || waiting.empty() || suspended()) {
+            if (closed && waiting.empty()) return;
+            asleep = true;
+            wake.wait(lock);
+            asleep = false;
+        }
+        running = true;
+        taken.takeAll(waiting);
+        lock.unlock();
+        runTaken(taken);
+        lock.lock();
+        running = false;
+    }
+}
+
+void SerialQueue::State::runTaken(TaskList& taken) {
+    FrameScope scope(this, nullptr);
+    while (!taken.empty()) {
+        if (suspended()) {
+            std::unique_lock lock(mutex);
+            while (suspended()) wake.wait(lock);
+        }
+        Task task = taken.pop();
+        runGuarded(task, label);
+    }
+}
+
+SerialQueue::SerialQueue(std::string label, QualityOfService qualityOfService)
+    : state_(std::make_shared<State>(std::move(label), qualityOfService)) {}
+
+SerialQueue::~SerialQueue() {
+    if (state_->born.isInChild()) return;
+    std::unique_lock lock(state_->mutex);
+    state_->closed = true;
+    state_->suspensions = 0;
+    const bool start = !state_->workerStarted && !state_->waiting.empty();
+    if (start) state_->workerStarted = true;
+    lock.unlock();
+    if (start) State::startWorker(state_);
+    state_->wake.notify_one();
+}
+
+const std::string& SerialQueue::label() const noexcept {
+    return state_->label;
+}
+
+void SerialQueue::async(Task task) {
+    State& state = *state_;
+    if (state.born.isInChild()) return abandon(std::move(task));
+    bool wake = false;
+    bool start = false;
+    {
+        std::lock_guard lock(state.mutex);
+        state.waiting.push(std::move(task));
+        if (!state.workerStarted) {
+            state.workerStarted = start = true;
+        } else {
+            // Whoever runs tasks looks again before it stops, so only a sleeping worker needs a
+            // call.
+            wake = state.asleep && !state.running && !state.suspended();
+        }
+    }
+    if (start) State::startWorker(state_);
+    if (wake) state.wake.notify_one();
+}
+
+void SerialQueue::runSync(FunctionRef function) {
+    CORVANE_REQUIRE(!isCurrent(), "sync on the queue it is already on would wait for itself, queue=" + label());
+    State& state = *state_;
+    CORVANE_REQUIRE(
+        !state.born.isInChild(),
+        "a child made by fork cannot wait for a queue of its parent; it may exec or _exit, queue=" + label());
+    std::unique_lock lock(state.mutex);
+    if (!state.running && state.waiting.empty() && !state.suspended()) {
+        state.running = true;
+        lock.unlock();
+        struct Finish {
+            ~Finish() {
+                bool wake = false;
+                {
+                    std::lock_guard guard(state->mutex);
+                    state->running = false;
+                    wake = state->asleep && (!state->waiting.empty() || state->closed);
+                }
+                if (wake) state->wake.notify_one();
+            }
+            std::shared_ptr<State> state;  // the function may release the queue
+        } finish{state_};
+        FrameScope scope(&state, currentFrame);
+        function.call(function.object);
+        return;
+    }
+
+    struct Call {
+        FunctionRef function;
+        const Frame* outer;
+        std::exception_ptr error;
+        bool done = false;
+    } call{function, currentFrame, nullptr};
+    state.waiting.push([&call, &state] {
+        try {
+            FrameScope scope(&state, call.outer);
+            call.function.call(call.function.object);
+        } catch (...) {
+            call.error = std::current_exception();
+        }
+        std::lock_guard guard(state.mutex);
+        call.done = true;
+        state.syncDone.notify_all();
+    });
+    const bool start = !state.workerStarted;
+    state.workerStarted = true;
+    const bool wake = state.asleep && !state.running && !state.suspended();
+    lock.unlock();
+    if (start) State::startWorker(state_);
+    if (wake) state.wake.notify_one();
+    lock.lock();
+    while (!call.done) state.syncDone.wait(lock);
+    lock.unlock();
+    if (call.error) std::rethrow_exception(call.error);
+}
+
+void SerialQueue::suspend() {
+    std::lock_guard lock(state_->mutex);
+    ++state_->suspensions;
+}
+
+void SerialQueue::resume() {
+    {
+        std::lock_guard lock(state_->mutex);
+        CORVANE_REQUIRE(state_->suspended(), "resume of a queue that is not suspended, queue=" + label());
+        --state_->suspensions;
+    }
+    state_->wake.notify_one();
+}
+
+bool SerialQueue::isCurrent() const noexcept {
+    return isOn(state_.get());
+}
+
+void SerialQueue::assertCurrent(const char* operation) const {
+    CORVANE_REQUIRE(isCurrent(), std::string(operation) + " must run on queue " + label());
+}
+
+void SerialQueue::assertNotCurrent(const char* operation) const {
+    CORVANE_REQUIRE(!isCurrent(), std::string(operation) + " must not be called on queue " + label());
+}
+
+}  // namespace corvane

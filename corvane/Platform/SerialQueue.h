@@ -1,0 +1,97 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Platform/Task.h>
+#include <corvane/Platform/ThreadAnnotations.h>
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <type_traits>
+#include <utility>
+
+namespace corvane {
+
+/// A first-in, first-out queue of tasks, of which at most one runs at any time.
+///
+/// The queue owns one thread, started with its first asynchronous task; the thread carries the last
+/// part of the label as its name, blocks all signals, and a background queue's thread is niced. All
+/// operations may be called from any thread. Whoever holds a reference may release it anywhere, in
+/// a task of this queue too: what was enqueued before the last release still runs (a suspended
+/// queue is resumed for it), and no destructor ever waits.
+///
+/// A child made by `fork` has no thread for the queue: there `async` keeps the task for good without running it, and
+/// `sync` stops the child with a message.
+///
+///     SerialQueue queue("com.example.work");
+///     queue.async([] { ... });                    // returns at once
+///     int n = queue.sync([] { return 42; });      // on this thread when the queue is idle
+class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
+  public:
+    enum class QualityOfService {
+        default_,    ///< the process's own priority
+        background,  ///< work nobody waits for: a lower thread priority
+    };
+
+    explicit SerialQueue(std::string label, QualityOfService qualityOfService = QualityOfService::default_);
+    SerialQueue(const SerialQueue&) = delete;
+    SerialQueue& operator=(const SerialQueue&) = delete;
+    ~SerialQueue();
+
+    [[nodiscard]] const std::string& label() const noexcept;
+
+    /// Enqueues a task and returns. What the task throws is logged at error level, and the next
+    /// task runs. The task's captures are destroyed on the queue, right after it ran.
+    void async(Task task);
+
+    /// Runs `function` on the queue, after everything enqueued before, and returns its result or
+    /// rethrows what it threw. When the queue is idle and not suspended it runs on the caller's
+    /// thread; otherwise the caller waits. Either way the function is on this queue and still on
+    /// every queue the caller was on.
+    ///
+    /// Requires: the caller is not on this queue (it would wait for itself; the process is stopped
+    /// with a message).
+    template <class F>
+    auto sync(F&& function) -> std::invoke_result_t<F&> {
+        using Result = std::invoke_result_t<F&>;
+        if constexpr (std::is_void_v<Result>) {
+            auto call = [&] { function(); };
+            runSync({&call, [](void* f) { (*static_cast<decltype(call)*>(f))(); }});
+        } else {
+            std::optional<Result> result;
+            auto call = [&] { result.emplace(function()); };
+            runSync({&call, [](void* f) { (*static_cast<decltype(call)*>(f))(); }});
+            return *std::move(result);
+        }
+    }
+
+    /// Stops the queue after the task that is running. Nests: as many resumes are needed as there
+    /// were suspensions.
+    void suspend();
+    /// Requires: the queue is suspended (otherwise the process is stopped with a message).
+    void resume();
+
+    /// Whether the calling code runs on this queue.
+    [[nodiscard]] bool isCurrent() const noexcept;
+
+    /// Stops the process with a message that names `operation` and the queue unless the calling
+    /// code runs on it.
+    void assertCurrent(const char* operation) const CORVANE_ASSERT_CAPABILITY(this);
+
+    /// Stops the process with a message that names `operation` and the queue if the calling code
+    /// runs on it.
+    void assertNotCurrent(const char* operation) const;
+
+  private:
+    struct State;
+    struct FunctionRef {
+        void* object;
+        void (*call)(void*);
+    };
+
+    void runSync(FunctionRef function);
+
+    const std::shared_ptr<State> state_;
+};
+
+}  // namespace corvane

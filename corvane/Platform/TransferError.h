@@ -1,0 +1,26 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Platform/Error.h>
+
+#include <string>
+
+namespace corvane {
+
+/// Why a transfer ended without the answer it was made for.
+class CORVANE_EXPORT TransferError : public Error {
+  public:
+    enum class Code {
+        invalidRequest,   ///< the URL or a header cannot be sent; another attempt ends the same way
+        bodyUnavailable,  ///< the body file is missing, not readable, or changed its size while it was sent
+        timedOut,         ///< no byte went either way for as long as the limits allow
+        network,          ///< no name, no connection, no trust, or the connection broke
+    };
+
+    TransferError(Code code, std::string message);
+    ~TransferError() override;
+
+    [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
+};
+
+}  // namespace corvane

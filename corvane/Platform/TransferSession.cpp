@@ -1,0 +1,49 @@
+#include <corvane/Platform/TransferSession.h>
+
+#include <corvane/Platform/InProcessTransferSession.h>
+#include <corvane/Platform/TransferError.h>
+
+#include <mutex>
+#include <utility>
+
+namespace corvane {
+
+namespace {
+struct Registry {
+    std::mutex mutex;
+    std::shared_ptr<const TransferSession::Factory> factory;
+};
+
+Registry& registry() {
+    static auto& instance = *new Registry;  // never destroyed: sessions may be opened while the process exits
+    return instance;
+}
+}  // namespace
+
+TransferError::TransferError(Code code, std::string message)
+    : Error("Corvane.TransferError", static_cast<int>(code), std::move(message)) {}
+TransferError::~TransferError() = default;
+
+TransferTask::~TransferTask() = default;
+TransferSessionDelegate::~TransferSessionDelegate() = default;
+TransferSession::~TransferSession() = default;
+
+void TransferSession::setFactory(Factory factory) {
+    auto shared = factory ? std::make_shared<const Factory>(std::move(factory)) : nullptr;
+    std::lock_guard lock(registry().mutex);
+    registry().factory = std::move(shared);
+}
+
+std::shared_ptr<TransferSession> TransferSession::make(TransferSessionConfiguration configuration,
+                                                       std::weak_ptr<TransferSessionDelegate> delegate,
+                                                       std::shared_ptr<SerialQueue> queue) {
+    std::shared_ptr<const Factory> factory;
+    {
+        std::lock_guard lock(registry().mutex);
+        factory = registry().factory;
+    }
+    if (factory) return (*factory)(std::move(configuration), std::move(delegate), std::move(queue));
+    return std::make_shared<InProcessTransferSession>(configuration, std::move(delegate), std::move(queue));
+}
+
+}  // namespace corvane

@@ -1,0 +1,67 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Platform/SerialQueue.h>
+#include <corvane/Platform/TransferRequest.h>
+#include <corvane/Platform/TransferSessionConfiguration.h>
+#include <corvane/Platform/TransferSessionDelegate.h>
+#include <corvane/Platform/TransferTask.h>
+
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace corvane {
+
+/// Uploads files in the background: the seam behind which an agent outside the process can carry the transfers on when
+/// the process has gone.
+///
+/// Owned by whoever made it, which is also the owner of its tasks. It holds its delegate weakly and its queue strongly.
+/// All operations may be called from any thread, on the session's queue too. None of them calls back before it returns
+/// or waits for a queue. Destroying a session cancels the transfers that run inside the process; nothing is reported of
+/// them.
+///
+///     auto session = TransferSession::make({.identifier = "com.example.uploads"}, delegate, queue);
+///     auto task = session->uploadTask({"https://example.com/in", "PUT", {{"Content-Type", "text/plain"}}}, file);
+///     task->setDescription("report 7");
+///     task->resume();                              // delegate->taskDidComplete(...) on the queue
+class CORVANE_EXPORT TransferSession {
+  public:
+    /// Opens a session. An empty queue means one of the session's own.
+    using Factory = std::function<std::shared_ptr<TransferSession>(
+        TransferSessionConfiguration, std::weak_ptr<TransferSessionDelegate>, std::shared_ptr<SerialQueue>)>;
+    using Listing = std::function<void(std::vector<std::shared_ptr<TransferTask>>)>;
+
+    /// Replaces the way in which `make` opens sessions for the whole process; an empty factory brings back the
+    /// library's own, which transfers inside the process. Call it before the first session is opened: sessions that are
+    /// open stay as they are.
+    static void setFactory(Factory factory);
+
+    /// Opens a session through the process's factory. Throws what the factory throws.
+    [[nodiscard]] static std::shared_ptr<TransferSession> make(TransferSessionConfiguration configuration,
+                                                               std::weak_ptr<TransferSessionDelegate> delegate,
+                                                               std::shared_ptr<SerialQueue> queue);
+
+    virtual ~TransferSession();
+
+    /// Text of the owner's.
+    [[nodiscard]] virtual std::optional<std::string> description() const = 0;
+    virtual void setDescription(std::string description) = 0;
+
+    /// Makes a suspended task that sends the file as the request's body. The file is opened when the transfer starts;
+    /// one that is missing then fails the task.
+    virtual std::shared_ptr<TransferTask> uploadTask(TransferRequest request, std::filesystem::path file) = 0;
+
+    /// Lists the owner's tasks that are not completed, in the order in which they were made: `listing` is called once,
+    /// on the session's queue, after the completion callbacks that were pending at the call.
+    virtual void tasks(Listing listing) = 0;
+
+    /// Tells the session that the host was woken for its events: what is pending is delivered, and then the delegate
+    /// gets `allEventsDelivered` once for this call.
+    virtual void deliverPendingEvents() = 0;
+};
+
+}  // namespace corvane

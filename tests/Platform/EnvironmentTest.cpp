@@ -1,0 +1,94 @@
+#include <corvane/Platform/AtomicCounter.h>
+#include <corvane/Platform/Bundle.h>
+#include <corvane/Platform/Date.h>
+#include <corvane/Platform/DocumentsDirectory.h>
+#include <corvane/Platform/Error.h>
+#include <corvane/Platform/Lazy.h>
+#include <corvane/Platform/MainQueue.h>
+
+#include "tests/support/TemporaryDocuments.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstdlib>
+#include <future>
+#include <limits>
+
+namespace corvane::test {
+namespace {
+
+TEST(DocumentsDirectory, IsTheApplicationsOwnAndPrivate) {
+    TemporaryDocuments temporary;
+    const char* before = std::getenv("XDG_DATA_HOME");
+    const std::string saved = before ? before : "";
+    setenv("XDG_DATA_HOME", temporary.path().c_str(), 1);
+    DocumentsDirectory::set({});
+    EXPECT_EQ(DocumentsDirectory::path(), temporary / "test_Platform/Documents");
+    EXPECT_EQ(DocumentsDirectory::create(), temporary / "test_Platform/Documents");
+    EXPECT_EQ(permissions(temporary / "test_Platform"), 0700u);
+    EXPECT_EQ(permissions(temporary / "test_Platform/Documents"), 0700u);
+    before ? setenv("XDG_DATA_HOME", saved.c_str(), 1) : unsetenv("XDG_DATA_HOME");
+
+    writeFile(temporary / "file", "");
+    DocumentsDirectory::set(temporary / "file/Documents");
+    EXPECT_THROW(DocumentsDirectory::create(), SystemError);
+}
+
+TEST(DocumentsDirectory, NamesFilesAfterEndpointsOnlyInsideItself) {
+    EXPECT_EQ(DocumentsDirectory::fileNamePart(" Main Store\r\n"), "main store");
+    EXPECT_EQ(DocumentsDirectory::fileNamePart("..."), "...");
+    const std::string refused[] = {"", " \n", ".", "..", "a/b", "../a", std::string("a\0b", 3), std::string(191, 'a')};
+    for (const auto& name : refused)
+        EXPECT_THROW((void)DocumentsDirectory::fileNamePart(name), InvalidArgument) << name;
+}
+
+TEST(Bundle, ReadsEntriesAndSkipsWhatIsNone) {
+    TemporaryDocuments temporary;
+    writeFile(temporary / "app.bundle", "BundleName=A=B\nnonsense\n=\nBundleVersion=7\n");
+    const Bundle bundle = Bundle::fromFile(temporary / "app.bundle");
+    EXPECT_EQ(bundle.entry(Bundle::nameKey), "A=B");
+    EXPECT_EQ(bundle.entry(Bundle::versionKey), "7");
+    EXPECT_FALSE(bundle.entry(Bundle::identifierKey));
+    EXPECT_FALSE(Bundle::fromFile(temporary / "none").entry(Bundle::nameKey));
+}
+
+TEST(Date, ConvertsOnlyWhatADateCanHold) {
+    using namespace std::chrono_literals;
+    EXPECT_EQ(dateFromMilliseconds(-1500), Date(-1500ms));
+    EXPECT_FALSE(dateFromMilliseconds(std::numeric_limits<std::int64_t>::max()));
+    EXPECT_EQ(dateFromSeconds(1.5), Date(1500ms));
+    EXPECT_EQ(secondsSince1970(Date(-250ms)), -0.25);
+    for (const double seconds : {1e300, -1e300, std::nan(""), HUGE_VAL}) EXPECT_FALSE(dateFromSeconds(seconds));
+    EXPECT_EQ(description(Date(-1ms)), "1969-12-31 23:59:59 +0000");
+}
+
+TEST(Lazy, LoadsOnceAndAgainOnlyAfterAFailure) {
+    int loads = 0;
+    const Lazy<int> lazy([&] {
+        if (++loads == 1) throw std::runtime_error("not yet");
+        return loads;
+    });
+    EXPECT_THROW((void)lazy.value(), std::runtime_error);
+    EXPECT_EQ(lazy.value(), 2);
+    EXPECT_EQ(lazy.value(), 2);
+    AtomicCounter counter;
+    EXPECT_EQ(counter.add(-3), -3);
+    EXPECT_EQ(counter.exchange(7), -3);
+    EXPECT_EQ(counter.value(), 7);
+}
+
+TEST(MainQueue, RunsOnTheHostsExecutorOrOnItsOwnQueueWhenThatFails) {
+    std::promise<int> ran;
+    MainQueue::setExecutor([](const std::function<void()>&) { throw std::runtime_error("no loop"); });
+    MainQueue::async([&] { ran.set_value(7); });
+    EXPECT_EQ(ran.get_future().get(), 7);
+    std::function<void()> posted;
+    MainQueue::setExecutor([&](std::function<void()> task) { posted = std::move(task); });
+    MainQueue::async([] { throw 1; });
+    EXPECT_NO_THROW(posted());
+    MainQueue::setExecutor(nullptr);
+}
+
+}  // namespace
+}  // namespace corvane::test

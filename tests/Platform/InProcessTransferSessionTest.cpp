@@ -1,0 +1,359 @@
+#include <corvane/Platform/InProcessTransferSession.h>
+
+#include <corvane/Platform/TransferError.h>
+
+#include "tests/support/ScriptedServer.h"
+#include "tests/support/TemporaryDocuments.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <cstdlib>
+#include <future>
+#include <map>
+#include <mutex>
+#include <string>
+#include <vector>
+
+namespace corvane {
+namespace {
+
+using namespace std::chrono_literals;
+using test::ScriptedServer;
+using Reply = ScriptedServer::Reply;
+using Ending = Reply::Ending;
+using State = TransferTask::State;
+
+// Keeps what it was told, and the state that the task was in at that moment.
+class Recorder final : public TransferSessionDelegate {
+  public:
+    struct Completion {
+        std::optional<AnyError> error;
+        std::optional<TransferResponse> response;
+        State state;
+    };
+
+    void taskDidSendBodyData(const TransferTask& task, std::int64_t sent, std::int64_t total,
+                             std::int64_t expected) override {
+        std::lock_guard lock(mutex_);
+        sums_[task.identifier()] += sent;
+        EXPECT_EQ(sums_[task.identifier()], total);
+        EXPECT_LE(total, expected);
+    }
+    void taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
+                         const std::optional<TransferResponse>& response) override {
+        std::lock_guard lock(mutex_);
+        EXPECT_TRUE(completions_.emplace(task.identifier(), Completion{error, response, task.state()}).second);
+        changed_.notify_all();
+    }
+    void allEventsDelivered() override {
+        std::lock_guard lock(mutex_);
+        completedAtSignal_.push_back(completions_.size());
+        changed_.notify_all();
+    }
+
+    Completion wait(const TransferTask& task) {
+        std::unique_lock lock(mutex_);
+        const bool came = changed_.wait_for(lock, 10s, [&] { return completions_.contains(task.identifier()); });
+        EXPECT_TRUE(came) << "task " << task.identifier();
+        return came ? completions_.at(task.identifier()) : Completion{};
+    }
+    std::size_t completed() const {
+        std::lock_guard lock(mutex_);
+        return completions_.size();
+    }
+    std::int64_t sent(const TransferTask& task) const {
+        std::lock_guard lock(mutex_);
+        return sums_.at(task.identifier());
+    }
+    std::vector<std::size_t> completedAtSignal() const {
+        std::lock_guard lock(mutex_);
+        return completedAtSignal_;
+    }
+
+  private:
+    mutable std::mutex mutex_;
+    std::condition_variable changed_;
+    std::map<std::int64_t, Completion> completions_;
+    std::map<std::int64_t, std::int64_t> sums_;
+    std::vector<std::size_t> completedAtSignal_;
+};
+
+class InProcessTransferSessionTest : public testing::Test {
+  protected:
+    InProcessTransferSessionTest() { body("the body"); }
+
+    std::shared_ptr<TransferSession> open(TransferLimits limits = {}) { return open(limits, recorder); }
+    std::shared_ptr<TransferSession> open(TransferLimits limits, const std::shared_ptr<Recorder>& delegate) {
+        return std::make_shared<InProcessTransferSession>(
+            TransferSessionConfiguration{.identifier = "test", .ownerKey = "test", .limits = limits}, delegate, queue);
+    }
+    std::shared_ptr<TransferTask> start(TransferSession& session, const std::string& url) {
+        auto task = session.uploadTask({.url = url, .method = "PUT", .headers = {}}, body());
+        task->resume();
+        return task;
+    }
+    std::filesystem::path body() { return documents / "body"; }
+    std::filesystem::path body(std::string_view contents) {
+        test::writeFile(body(), contents);
+        return body();
+    }
+    static std::string describe(const Recorder::Completion& completion) {
+        if (const auto* error = completion.error ? completion.error->as<TransferError>() : nullptr) {
+            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut", "network"};
+            return names[error->code()];
+        }
+        if (completion.error) return completion.error->what();
+        return completion.response ? std::to_string(completion.response->statusCode) : "nothing";
+    }
+
+    test::TemporaryDocuments documents;
+    ScriptedServer server;
+    std::shared_ptr<SerialQueue> queue = std::make_shared<SerialQueue>("test");
+    std::shared_ptr<Recorder> recorder = std::make_shared<Recorder>();
+};
+
+TEST_F(InProcessTransferSessionTest, SendsTheFileAndReportsTheAnswer) {
+    const std::string large(3'000'000, 'b');
+    server.script(Reply::status(201, {{"X-Twice", "a"}, {"x-twice", "b"}, {"Empty", ""}}, "dropped"));
+    auto session = open();
+    auto task = session->uploadTask({.url = server.url("/in?x=1"),
+                                     .method = "PUT",
+                                     .headers = {{"Content-Type", "text/x"}, {"User-Agent", "me/1"}, {"X-None", ""}}},
+                                    body(large));
+    EXPECT_EQ(task->state(), State::suspended);
+    task->resume();
+    task->resume();
+    const auto completion = recorder->wait(*task);
+    EXPECT_EQ(describe(completion), "201");
+    EXPECT_EQ(completion.state, State::running) << "until the callback has returned";
+    const std::map<std::string, std::string> headers{{"X-Twice", "a, b"}, {"Empty", ""}, {"Content-Length", "7"}};
+    EXPECT_EQ(completion.response->headers, headers);
+    EXPECT_EQ(recorder->sent(*task), 3'000'000);
+    queue->sync([] {});
+    EXPECT_EQ(task->state(), State::completed);
+
+    const auto requests = server.requests();
+    ASSERT_EQ(requests.size(), 1u);
+    EXPECT_EQ(requests[0].method + requests[0].path, "PUT/in?x=1");
+    EXPECT_EQ(requests[0].body, large);
+    EXPECT_EQ(requests[0].header("User-Agent"), "me/1");
+    EXPECT_EQ(requests[0].header("Content-Length"), "3000000");
+    EXPECT_EQ(requests[0].header("Expect") + requests[0].header("Transfer-Encoding"), "");
+}
+
+TEST_F(InProcessTransferSessionTest, EndsWithWhatTheServerMakesOfIt) {
+    const struct {
+        const char* name;
+        Reply reply;
+        const char* expected;
+    } cases[] = {
+        {"redirect", Reply::status(302, {{"Location", "/elsewhere"}}), "302"},
+        {"interim answer", Reply::raw("HTTP/1.1 103 Early\r\nA: b\r\n\r\nHTTP/1.1 204 Done\r\n\r\n"), "204"},
+        {"reset inside the answer", Reply::partial(Ending::reset), "network"},
+        {"close inside the answer", Reply::partial(Ending::close), "network"},
+        {"no answer", Reply::raw(""), "network"},
+        {"garbage", Reply::raw("SSH-2.0-server\r\nHTTP/1.1 200 OK\r\n\r\n"), "network"},
+        {"endless headers",
+         Reply::raw("HTTP/1.1 200 OK\r\n" +
+                    [] {
+                        std::string headers;
+                        for (int i = 0; i < 6000; ++i)
+                            headers += "X-" + std::to_string(i) + ": " + std::string(50, 'x') + "\r\n";
+                        return headers;
+                    }()),
+         "network"},
+        {"endless body", Reply::partial(Ending::endless), "200"},
+        {"stall inside the answer", Reply::partial(Ending::silence), "timedOut"},
+        {"no answer ever", Reply::never(), "timedOut"},
+    };
+    auto session = open({.timeWithoutProgress = 300ms});
+    for (const auto& one : cases) {
+        server.script(one.reply);
+        EXPECT_EQ(describe(recorder->wait(*start(*session, server.url()))), one.expected) << one.name;
+    }
+    EXPECT_EQ(server.requests().size(), std::size(cases)) << "nothing is sent twice";
+}
+
+TEST_F(InProcessTransferSessionTest, TimesOutWhenTheServerStopsReading) {
+    Reply reply = Reply::never();
+    reply.bodyLimit = 10;
+    server.script(reply);
+    auto session = open({.timeWithoutProgress = 300ms});
+    auto task =
+        session->uploadTask({.url = server.url(), .method = "PUT", .headers = {}}, body(std::string(40'000'000, 'b')));
+    task->resume();
+    EXPECT_EQ(describe(recorder->wait(*task)), "timedOut");
+    EXPECT_LT(recorder->sent(*task), 40'000'000);
+}
+
+TEST_F(InProcessTransferSessionTest, FailsTheTaskAndNotTheCallWhenItCannotBeSent) {
+    auto session = open();
+    std::string closedPort;
+    {
+        ScriptedServer gone;
+        closedPort = gone.url();
+    }
+    const auto pipe = documents / "pipe";
+    ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
+    using Headers = std::vector<std::pair<std::string, std::string>>;
+    const struct {
+        std::string url;
+        Headers headers;
+        std::filesystem::path file;
+        const char* expected;
+    } cases[] = {
+        {closedPort, {}, body(), "network"},
+        {server.url(), {}, documents / "missing", "bodyUnavailable"},
+        {server.url(), {}, documents.path(), "bodyUnavailable"},
+        {server.url(), {}, pipe, "bodyUnavailable"},
+        {"file://" + body().string(), {}, body(), "invalidRequest"},
+        {"ftp://127.0.0.1/x", {}, body(), "invalidRequest"},
+        {"", {}, body(), "invalidRequest"},
+        {server.url("/ HTTP/1.1\r\nX: y"), {}, body(), "invalidRequest"},
+        {server.url(), {{"X", "a\r\nEvil: b"}}, body(), "invalidRequest"},
+        {server.url(), {{"X", std::string("a\0b", 3)}}, body(), "invalidRequest"},
+        {server.url(), {{"Evil: b\r\nX", "a"}}, body(), "invalidRequest"},
+    };
+    for (const auto& one : cases) {
+        auto task = session->uploadTask({.url = one.url, .method = "PUT", .headers = one.headers}, one.file);
+        task->resume();
+        EXPECT_EQ(describe(recorder->wait(*task)), one.expected) << one.url << ' ' << one.file;
+    }
+    EXPECT_TRUE(server.requests().empty());
+}
+
+TEST_F(InProcessTransferSessionTest, ABodyFileThatChangesItsSizeMeanwhileNeitherHangsNorLies) {
+    constexpr std::size_t size = 40'000'000;  // more than the sockets hold, so that the transfer waits for the server
+    auto session = open();
+    const auto send = [&](std::size_t newSize) {
+        Reply reply = Reply::status(200);
+        reply.pauseAfter = 1000;
+        server.script(reply);
+        auto task =
+            session->uploadTask({.url = server.url(), .method = "PUT", .headers = {}}, body(std::string(size, 'b')));
+        task->resume();
+        EXPECT_TRUE(server.waitForPause());
+        std::filesystem::resize_file(documents / "body", newSize);
+        server.release();
+        return describe(recorder->wait(*task));
+    };
+    EXPECT_EQ(send(size / 100), "bodyUnavailable");
+    EXPECT_EQ(send(size + 1000), "200");
+    EXPECT_EQ(server.requests().back().body.size(), size);
+}
+
+TEST_F(InProcessTransferSessionTest, LimitsTransfersPerHostWithoutHoldingUpAnother) {
+    constexpr int count = 12;
+    ScriptedServer other;
+    server.script(Reply::status(200).hold(), count);
+    auto session = open();
+    auto second = open({}, std::make_shared<Recorder>());  // the limit is the process's
+    std::vector<std::shared_ptr<TransferTask>> tasks;
+    for (int i = 0; i < count; ++i) tasks.push_back(start(i % 2 ? *session : *second, server.url()));
+    EXPECT_TRUE(server.waitForRequests(4));
+    EXPECT_EQ(describe(recorder->wait(*start(*session, other.url()))), "200");
+    EXPECT_EQ(server.requests().size(), 4u);
+    server.release(count);
+    EXPECT_TRUE(server.waitForRequests(count));
+    EXPECT_EQ(server.mostAtOnce(), 4);
+}
+
+TEST_F(InProcessTransferSessionTest, ListsTasksBehindPendingCompletions) {
+    server.script(Reply::status(200));
+    server.script(Reply::never());
+    std::promise<void> release;
+    queue->async([gate = release.get_future().share()] { gate.wait(); });
+    auto session = open({.transfersPerHost = 1});
+    auto finished = start(*session, server.url());
+    auto running = start(*session, server.url());
+    auto idle = session->uploadTask({.url = server.url(), .method = "PUT", .headers = {}}, body());
+    running->setDescription("running");
+    // The second transfer has the first one's place, so the first one's completion waits in the queue.
+    ASSERT_TRUE(server.waitForRequests(2));
+    EXPECT_EQ(finished->state(), State::running);
+
+    std::vector<std::pair<std::int64_t, State>> listed;
+    session->tasks([&](const auto& tasks) {
+        EXPECT_TRUE(queue->isCurrent());
+        for (const auto& task : tasks) listed.emplace_back(task->identifier(), task->state());
+        EXPECT_EQ(tasks.front()->description(), "running");
+    });
+    EXPECT_TRUE(listed.empty()) << "no callback inside the call";
+    release.set_value();
+    queue->sync([] {});
+    const std::vector<std::pair<std::int64_t, State>> expected{{2, State::running}, {3, State::suspended}};
+    EXPECT_EQ(listed, expected);
+    EXPECT_EQ(recorder->completed(), 1u);
+}
+
+TEST_F(InProcessTransferSessionTest, SignalsAWakeUpOnceAndBehindWhatIsPending) {
+    auto session = open();
+    session->deliverPendingEvents();
+    queue->sync([] {});
+    EXPECT_EQ(recorder->completedAtSignal(), (std::vector<std::size_t>{0}));
+    recorder->wait(*start(*session, server.url()));
+    session->deliverPendingEvents();
+    queue->sync([] {});
+    EXPECT_EQ(recorder->completedAtSignal(), (std::vector<std::size_t>{0, 1}));
+}
+
+TEST_F(InProcessTransferSessionTest, CancelsItsTransfersWhenItGoes) {
+    server.script(Reply::never(), 4);
+    auto session = open();
+    std::vector<std::shared_ptr<TransferTask>> tasks;
+    for (int i = 0; i < 6; ++i) tasks.push_back(start(*session, server.url()));
+    ASSERT_TRUE(server.waitForRequests(4));
+    auto later = session->uploadTask({.url = server.url(), .method = "PUT", .headers = {}}, body());
+    session.reset();
+    later->resume();
+    // The places at the server are free again, and those that waited for them never came.
+    auto others = std::make_shared<Recorder>();
+    auto next = open({}, others);
+    EXPECT_EQ(describe(others->wait(*start(*next, server.url()))), "200");
+    EXPECT_EQ(server.requests().size(), 5u);
+    queue->sync([] {});
+    EXPECT_EQ(recorder->completed(), 0u);
+}
+
+TEST_F(InProcessTransferSessionTest, MayGoInItsOwnCallbackWithItsDelegateAndItsQueue) {
+    struct Releaser final : TransferSessionDelegate {
+        void taskDidSendBodyData(const TransferTask&, std::int64_t, std::int64_t, std::int64_t) override {}
+        void taskDidComplete(const TransferTask&, const std::optional<AnyError>&,
+                             const std::optional<TransferResponse>&) override {
+            session.reset();
+            done.set_value();
+        }
+        void allEventsDelivered() override {}
+        std::shared_ptr<TransferSession> session;
+        std::promise<void> done;
+    };
+    auto releaser = std::make_shared<Releaser>();
+    auto done = releaser->done.get_future();
+    releaser->session = TransferSession::make({.identifier = "test"}, releaser, nullptr);
+    start(*releaser->session, server.url());
+    EXPECT_EQ(done.wait_for(10s), std::future_status::ready);
+}
+
+using InProcessTransferSessionDeathTest = InProcessTransferSessionTest;
+
+TEST_F(InProcessTransferSessionDeathTest, TheProcessExitsWithTransfersPending) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            server.script(Reply::never(), 2);
+            static auto session = open();
+            start(*session, server.url());
+            start(*session, server.url());
+            if (!server.waitForRequests(2)) _exit(1);
+            std::filesystem::remove_all(documents.path());
+            std::exit(0);  // the session, older than the transfer thread, goes after it
+        },
+        testing::ExitedWithCode(0), "");
+}
+
+}  // namespace
+}  // namespace corvane

@@ -1,0 +1,143 @@
+#include <corvane/Platform/SerialQueue.h>
+
+#include "tests/support/CapturedLog.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <future>
+#include <stdexcept>
+#include <thread>
+#include <vector>
+
+namespace corvane {
+namespace {
+
+TEST(SerialQueue, RunsTasksInOrderFromManyThreadsWithoutOverlap) {
+    SerialQueue queue("test");
+    constexpr int threads = 4, each = 5000;
+    std::vector<int> last(threads, -1);
+    int inside = 0;
+    bool ordered = true;
+    std::vector<std::thread> callers;
+    for (int t = 0; t < threads; ++t) {
+        callers.emplace_back([&, t] {
+            for (int i = 0; i < each; ++i) {
+                queue.async([&, t, i] {
+                    ordered = ordered && ++inside == 1 && last[t] == i - 1;
+                    last[t] = i;
+                    --inside;
+                });
+                if (i % 500 == 0) queue.sync([&] { ordered = ordered && last[t] == i; });
+            }
+        });
+    }
+    for (auto& caller : callers) caller.join();
+    queue.sync([] {});
+    EXPECT_TRUE(ordered);
+    EXPECT_EQ(last, std::vector<int>(threads, each - 1));
+}
+
+TEST(SerialQueue, SyncReturnsResultsAndRethrowsOnBothPaths) {
+    SerialQueue queue("test");
+    const auto caller = std::this_thread::get_id();
+    EXPECT_EQ(queue.sync([] { return std::this_thread::get_id(); }), caller) << "an idle queue needs no thread switch";
+    EXPECT_THROW(queue.sync([] { throw std::runtime_error("x"); }), std::runtime_error);
+
+    std::promise<void> release;
+    queue.async([&] { release.get_future().wait(); });
+    std::thread releaser([&] { release.set_value(); });
+    EXPECT_EQ(queue.sync([] { return 7; }), 7);
+    releaser.join();
+
+    queue.async([] {});
+    EXPECT_THROW(queue.sync([]() -> int { throw std::runtime_error("x"); }), std::runtime_error);
+}
+
+TEST(SerialQueue, SyncIsOnItsQueueAndStillOnTheOuterOne) {
+    SerialQueue outer("outer");
+    SerialQueue inner("inner");
+    const auto check = [&] {
+        inner.sync([&] { EXPECT_TRUE(inner.isCurrent() && outer.isCurrent()); });
+        EXPECT_TRUE(outer.isCurrent());
+        EXPECT_FALSE(inner.isCurrent());
+    };
+    outer.sync(check);
+    std::promise<void> release;
+    inner.async([&] { release.get_future().wait(); });
+    outer.async([&] { check(); });
+    release.set_value();
+    outer.sync([] {});
+    EXPECT_FALSE(outer.isCurrent());
+}
+
+TEST(SerialQueue, SuspensionsNestAndHoldBackOnlyLaterTasks) {
+    SerialQueue queue("test");
+    std::atomic<int> ran = 0;
+    queue.suspend();
+    queue.suspend();
+    queue.async([&] { ++ran; });
+    queue.resume();
+    std::promise<void> waiting;
+    std::thread waiter([&] {
+        waiting.set_value();
+        queue.sync([&] { ++ran; });
+    });
+    waiting.get_future().wait();
+    EXPECT_EQ(ran, 0);
+    queue.resume();
+    waiter.join();
+    EXPECT_EQ(ran, 2);
+
+    // A task may suspend its own queue: the next one waits, though it was already taken up with the first.
+    std::promise<void> suspended;
+    queue.async([&] {
+        queue.suspend();
+        suspended.set_value();
+    });
+    queue.async([&] { ran = 10; });
+    suspended.get_future().wait();
+    EXPECT_EQ(ran, 2);
+    queue.resume();
+    queue.sync([] {});
+    EXPECT_EQ(ran, 10);
+}
+
+TEST(SerialQueue, RunsWhatWaitsWhenTheLastReferenceGoesAlsoInItsOwnTask) {
+    auto queue = std::make_shared<SerialQueue>("test");
+    std::promise<int> done;
+    int ran = 0;
+    queue->suspend();
+    for (int i = 0; i < 1000; ++i) queue->async([&] { ++ran; });
+    queue->async([&, last = queue]() mutable { last.reset(); });
+    queue->async([&] { done.set_value(ran); });
+    queue->resume();
+    queue.reset();
+    EXPECT_EQ(done.get_future().get(), 1000);
+
+    auto suspended = std::make_shared<SerialQueue>("test");
+    std::promise<void> ranSuspended;
+    suspended->suspend();
+    suspended->async([&] { ranSuspended.set_value(); });
+    suspended.reset();
+    ranSuspended.get_future().wait();
+}
+
+TEST(SerialQueue, LogsWhatATaskThrowsAndGoesOn) {
+    test::CapturedLog log;
+    SerialQueue queue("com.example.q");
+    queue.async([] { throw std::runtime_error("no luck"); });
+    queue.sync([] {});
+    EXPECT_TRUE(log.has(LogLevel::error, "Task failed, queue=com.example.q, error=no luck"));
+}
+
+TEST(SerialQueueDeathTest, StopsOnProgrammingErrors) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    SerialQueue queue("com.example.q");
+    EXPECT_DEATH(queue.resume(), "resume of a queue that is not suspended, queue=com.example.q");
+    EXPECT_DEATH(queue.sync([&] { queue.sync([] {}); }), "would wait for itself, queue=com.example.q");
+    EXPECT_DEATH(queue.assertCurrent("push"), "push must run on queue com.example.q");
+}
+
+}  // namespace
+}  // namespace corvane

@@ -1,0 +1,117 @@
+#pragma once
+
+#include <condition_variable>
+#include <cstddef>
+#include <deque>
+#include <map>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <thread>
+#include <utility>
+#include <vector>
+
+namespace corvane::test {
+
+/// A small HTTP server on a free port of the loopback address that answers as a test tells it to.
+///
+/// It records every request and takes the replies in the order in which they were scripted, one per request; without a
+/// script it answers 200. Every connection has a thread of its own and serves one request after the other. The
+/// destructor closes all connections and joins all threads, also under a transfer. Callable from any thread.
+///
+///     ScriptedServer server;
+///     server.script(Reply::status(503));
+///     upload(server.url("/in"));
+///     ASSERT_TRUE(server.waitForRequests(1));
+///     EXPECT_EQ(server.requests()[0].header("Content-Encoding"), "gzip");
+class ScriptedServer {
+  public:
+    using Headers = std::vector<std::pair<std::string, std::string>>;
+
+    struct Request {
+        std::string method;
+        std::string path;
+        Headers headers;
+        std::string body;  ///< what was read of it
+
+        /// The value of the first header of this name, capitals aside; empty without one.
+        [[nodiscard]] std::string header(std::string_view name) const;
+    };
+
+    /// What happens to one request.
+    struct Reply {
+        enum class Ending {
+            keepAlive,  ///< a whole answer; the connection stays open
+            close,      ///< closed after `bytes`
+            reset,      ///< broken off after `bytes`, so that the client's system sees a reset
+            trickle,    ///< a few bytes, a header or a piece of the body, now and then until the client closes
+            endless,    ///< the body goes on until the client closes
+            silence,    ///< nothing more is sent or read until the client closes or the server stops
+        };
+        std::string bytes;  ///< sent as they are
+        Ending ending = Ending::keepAlive;
+        bool held = false;            ///< wait for `release` before the first byte
+        std::size_t bodyLimit = ~0u;  ///< stop reading the request's body after this many bytes
+        std::optional<std::size_t> pauseAfter =
+            std::nullopt;  ///< read this much of the body, then wait for `release` to go on
+
+        /// A whole answer.
+        static Reply status(int code, const Headers& headers = {}, std::string_view body = {});
+        /// The beginning of a 200 answer that announces more than it sends.
+        static Reply partial(Ending ending);
+        /// These bytes, and a closed connection.
+        static Reply raw(std::string bytes) { return {.bytes = std::move(bytes), .ending = Ending::close}; }
+        /// No answer at all.
+        static Reply never() { return {.bytes = {}, .ending = Ending::silence}; }
+        [[nodiscard]] Reply hold() const;
+    };
+
+    ScriptedServer();
+    ScriptedServer(const ScriptedServer&) = delete;
+    ScriptedServer& operator=(const ScriptedServer&) = delete;
+    ~ScriptedServer();
+
+    [[nodiscard]] std::string url(std::string_view path = "/") const;
+
+    /// Appends replies for the next requests.
+    void script(Reply reply, int times = 1);
+    /// Lets this many held or paused requests go on, now or when they are due.
+    void release(int replies = 1);
+
+    [[nodiscard]] std::vector<Request> requests() const;
+    /// The most requests that were waiting for their answer at one time.
+    [[nodiscard]] int mostAtOnce() const;
+    /// Waits until this many requests have been read; false when they did not come within ten seconds.
+    [[nodiscard]] bool waitForRequests(std::size_t count) const;
+
+    /// Waits until a request has been paused since the last call; false when none was within ten seconds.
+    [[nodiscard]] bool waitForPause();
+
+  private:
+    void acceptConnections();
+    void serve(int connection);
+    bool answer(int connection, const Reply& reply);
+    bool readRequest(int connection, std::string& buffer);
+    void readBody(int connection, std::string& buffer, std::size_t length, const Reply& reply);
+    Reply nextReply();
+    void waitForRelease();
+    void record(Request request);
+
+    int listener_ = -1;
+    int port_ = 0;
+    std::thread acceptor_;
+
+    mutable std::mutex mutex_;
+    mutable std::condition_variable changed_;
+    std::deque<Reply> script_;
+    std::vector<Request> requests_;
+    int released_ = 0;
+    int paused_ = 0;
+    int atOnce_ = 0;
+    int mostAtOnce_ = 0;
+    bool stopping_ = false;
+    std::map<int, std::thread> connections_;
+};
+
+}  // namespace corvane::test
