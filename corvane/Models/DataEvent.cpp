@@ -1,0 +1,54 @@
+#include <corvane/Models/DataEvent.h>
+
+namespace corvane {
+
+namespace {
+const char* describe(DataEventError::Code code) {
+    switch (code) {
+        case DataEventError::invalidTopLevelJson:
+            return "the data event's encoding is not a JSON object";
+        case DataEventError::internalError:
+            return "an object-facing data event has no structured encoding";
+        case DataEventError::dataNotSerializable:
+            return "a value of the data event cannot become JSON";
+        case DataEventError::dataArrayValueNotSerializable:
+            return "an element of an array cannot become JSON";
+        case DataEventError::dataDictKeyNotSerializable:
+            return "a key of a dictionary is not a string";
+        case DataEventError::dataDictValueNotSerializable:
+            return "a value of a dictionary cannot become JSON";
+    }
+    return "the data event cannot become JSON";
+}
+}  // namespace
+
+DataEventError::DataEventError(Code code) : Error("Corvane.DataEventError", code, describe(code)) {}
+DataEventError::~DataEventError() = default;
+
+JSON detail::requireObject(JSON json) {
+    if (!json.isObject()) throw DataEventError(DataEventError::invalidTopLevelJson);
+    return json;
+}
+
+JSON detail::requireHostObject(JSON json) {
+    json = requireObject(std::move(json));
+    if (jsontext::nesting(json.text()) > jsontext::maximumDepth) throw EncodingError(EncodingError::tooDeep, {});
+    if (!json.exists()) throw EncodingError(EncodingError::malformed, {});  // text that was taken as encoded
+    return json;
+}
+
+AnyDataEvent::Base::~Base() = default;
+
+JSON AnyDataEvent::toDict() const {
+    const auto box = box_;  // the host's code, which is not called under the lock, may replace this object
+    {
+        std::lock_guard lock(box->mutex);
+        if (box->dict) return *box->dict;
+    }
+    JSON dict = box->makeDict();
+    std::lock_guard lock(box->mutex);
+    if (!box->dict) box->dict = std::move(dict);
+    return *box->dict;
+}
+
+}  // namespace corvane

@@ -1,0 +1,84 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Models/DataEventError.h>
+#include <corvane/Models/Encoding.h>
+#include <corvane/Platform/DataType.h>
+
+#include <concepts>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <utility>
+
+namespace corvane {
+
+/// A typed piece of context data: a plain aggregate, a record with a descriptor, or a type that encodes itself. Every
+/// field becomes a key of a JSON object, named exactly like the field.
+template <class T>
+concept DataEventType = std::is_class_v<T> && std::move_constructible<T> &&
+    (detail::EncodesItself<T> || Record<T> || requires(const T& data) {
+        { data.toDict() } -> std::same_as<JSON>;
+    });
+
+namespace detail {
+/// The value unless it is not an object: then throws `invalidTopLevelJson`.
+CORVANE_EXPORT JSON requireObject(JSON json);
+/// The same for a value that the host made, which may also nest too deep.
+CORVANE_EXPORT JSON requireHostObject(JSON json);
+}  // namespace detail
+
+/// A data event as a JSON object: what its own `JSON toDict() const` returns where it has one, its encoded fields
+/// otherwise. Throws `EncodingError`, `DataEventError::invalidTopLevelJson`, or what the data event itself throws.
+template <DataEventType T>
+[[nodiscard]] JSON toDict(const T& data) {
+    if constexpr (requires {
+                      { data.toDict() } -> std::same_as<JSON>;
+                  }) {
+        return detail::requireHostObject(data.toDict());
+    } else {
+        return detail::requireObject(encoded(data));
+    }
+}
+
+/// A data event of any type, held by reference. It is encoded when it is first asked for, and every event that finds it
+/// on a stack reuses the text. Immutable; may be read from any thread.
+class CORVANE_EXPORT AnyDataEvent {
+  public:
+    template <class T>
+    requires(!std::same_as<T, AnyDataEvent> && DataEventType<T>) explicit AnyDataEvent(T data)
+        : box_(std::make_shared<Box<T>>(std::move(data))) {}
+
+    /// The data event as a JSON object. Throws as the free function `toDict` does, each time anew.
+    [[nodiscard]] JSON toDict() const;
+
+    [[nodiscard]] DataType type() const { return box_->type(); }
+
+    /// The data event as a `T`, or nullptr when it is of another type. Good as long as a copy of this object.
+    template <class T>
+    [[nodiscard]] const T* as() const {
+        return type() == DataType::of<T>() ? &static_cast<const Box<T>&>(*box_).data : nullptr;
+    }
+
+  private:
+    struct CORVANE_EXPORT Base {
+        virtual ~Base();
+        [[nodiscard]] virtual DataType type() const = 0;
+        [[nodiscard]] virtual JSON makeDict() const = 0;
+
+        mutable std::mutex mutex;
+        mutable std::optional<JSON> dict;  // guarded by mutex
+    };
+
+    template <class T>
+    struct Box final : Base {
+        explicit Box(T value) : data(std::move(value)) {}
+        [[nodiscard]] DataType type() const override { return DataType::of<T>(); }
+        [[nodiscard]] JSON makeDict() const override { return corvane::toDict(data); }
+        const T data;
+    };
+
+    std::shared_ptr<const Base> box_;
+};
+
+}  // namespace corvane

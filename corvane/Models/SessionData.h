@@ -1,0 +1,39 @@
+#pragma once
+
+#include <corvane/Models/DataEvent.h>
+
+#include <string>
+
+namespace corvane {
+
+/// A data event under the key by which a session carries it: `SessionData{"viewer", viewer}`.
+template <class D>
+struct SessionData {
+    std::string key;
+    D data;
+
+    /// One entry: the key with the data event's object.
+    [[nodiscard]] JSON toDict() const {
+        const JSON dict = dataDict();
+        Encoder encoder;
+        encoder.beginObject();
+        encoder.key(key);
+        encoder.json(dict);
+        encoder.endObject();
+        return JSON::fromEncodedText(std::move(encoder).take());
+    }
+
+  private:
+    [[nodiscard]] JSON dataDict() const {
+        try {
+            return corvane::toDict(data);
+        } catch (const EncodingError& error) {
+            throw error.within(key);
+        }
+    }
+};
+
+template <class D>
+SessionData(std::string, D) -> SessionData<D>;
+
+}  // namespace corvane

@@ -1,0 +1,194 @@
+#include <corvane/Models/DataEvent.h>
+#include <corvane/Models/Decoding.h>
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <limits>
+#include <map>
+#include <optional>
+#include <string>
+#include <tuple>
+#include <unordered_map>
+#include <vector>
+
+namespace corvane {
+namespace {
+
+using namespace std::chrono_literals;
+
+enum class Quality : std::uint8_t { low, high };
+enum class Plan { free, gold };
+std::string_view toText(Plan plan) {
+    return plan == Plan::gold ? "gold" : "free";
+}
+bool fromText(std::string_view text, Plan& plan) {
+    plan = text == "gold" ? Plan::gold : Plan::free;
+    return text == "gold" || text == "free";
+}
+
+struct Track {
+    std::string title;
+    std::optional<double> length;
+};
+
+struct Everything {
+    std::string text = "t";
+    std::int8_t small = -1;
+    std::uint64_t large = std::numeric_limits<std::uint64_t>::max();
+    std::int64_t lowest = std::numeric_limits<std::int64_t>::min();
+    float ratio = 0.1f;
+    double number = 3;
+    bool flag = true;
+    Date date = Date(1500ms);
+    std::optional<int> none;
+    std::optional<int> some = 7;
+    std::vector<Track> tracks = {{"a", 1.25}, {"b", {}}};
+    std::map<std::string, std::vector<int>> lists = {{"x", {1, 2}}, {"y", {}}};
+    Quality quality = Quality::high;
+    Plan plan = Plan::gold;
+    std::vector<bool> bits = {true, false};
+};
+
+class Hidden {
+  public:
+    Hidden() = default;
+    explicit Hidden(std::string id) : id_(std::move(id)) {}
+    static constexpr auto corvaneFields() { return std::tuple{Field{"id", &Hidden::id_}}; }
+    [[nodiscard]] const std::string& id() const { return id_; }
+
+  private:
+    std::string id_;
+};
+
+struct Bare {
+    void encode(Encoder& encoder) const { encoder.integer(7); }
+};
+
+TEST(Encoding, WritesEveryKindOfFieldAndReadsItBack) {
+    const JSON json = toDict(Everything{});
+    EXPECT_EQ(json.text(), R"({"text":"t","small":-1,"large":18446744073709551615,"lowest":-9223372036854775808,)"
+                           R"("ratio":0.1,"number":3.0,"flag":true,"date":1500,"some":7,)"
+                           R"("tracks":[{"title":"a","length":1.25},{"title":"b"}],"lists":{"x":[1,2],"y":[]},)"
+                           R"("quality":1,"plan":"gold","bits":[true,false]})");
+    EXPECT_EQ(toDict(decode<Everything>(json)).text(), json.text());
+    EXPECT_EQ(toDict(decode<Hidden>(toDict(Hidden("h")))).text(), R"({"id":"h"})");
+}
+
+TEST(Encoding, TruncatesDatesTowardZero) {
+    EXPECT_EQ(encoded(Date(-500us)).text(), "0");
+    EXPECT_EQ(encoded(Date(-1999us)).text(), "-1");
+    EXPECT_EQ(encoded(Date(1999us)).text(), "1");
+}
+
+template <class T>
+std::string failure(const T& value) {
+    try {
+        (void)toDict(value);
+    } catch (const Error& error) {
+        return error.what();
+    }
+    return "";
+}
+
+struct Node {
+    std::vector<Node> children;
+};
+
+Node chain(int depth) {
+    Node node;
+    for (int i = 1; i < depth; ++i) {
+        Node outer;
+        outer.children.push_back(std::move(node));
+        node = std::move(outer);
+    }
+    return node;
+}
+
+TEST(Encoding, RefusesWhatJSONCannotHoldAndNamesTheProperty) {
+    struct Named {
+        std::map<std::string, Track> tracks;
+    };
+    EXPECT_EQ(failure(Named{{{"k", {"\xc3\x28", {}}}}}), "tracks.k.title: the text is not UTF-8");
+    EXPECT_EQ(failure(Named{{{"k", {"", 0.0 / 0.0}}}}), "tracks.k.length: the number is infinite or not a number");
+    EXPECT_EQ(failure(Named{{{"\xff", {}}}}), "tracks.(key): the text is not UTF-8");
+    EXPECT_EQ(failure(chain(64)), "") << "an object and an array a level: 128 levels with the last, empty array";
+    EXPECT_NE(failure(chain(65)).find("nest too deep"), std::string::npos);
+    EXPECT_EQ(failure(Bare{}), "the data event's encoding is not a JSON object");
+}
+
+TEST(Encoding, NeverWritesBrokenTextForAnEncoderMisused) {
+    const auto broken = [](auto&& use) {
+        Encoder encoder;
+        EXPECT_THROW(
+            {
+                use(encoder);
+                (void)std::move(encoder).take();
+            },
+            EncodingError);
+    };
+    broken([](Encoder&) {});
+    broken([](Encoder& e) { e.beginObject(); });
+    broken([](Encoder& e) { e.beginObject(), e.integer(1); });
+    broken([](Encoder& e) { e.beginObject(), e.key("a"), e.endObject(); });
+    broken([](Encoder& e) { e.beginObject(), e.key("a"), e.key("b"); });
+    broken([](Encoder& e) { e.beginArray(), e.endObject(); });
+    broken([](Encoder& e) { e.beginArray(), e.key("a"); });
+    broken([](Encoder& e) { e.integer(1), e.integer(2); });
+}
+
+TEST(Decoding, NamesWhatIsMissingWrongOrOutOfRange) {
+    const auto path = [](std::string_view text) {
+        try {
+            (void)decode<Everything>(JSON(text));
+        } catch (const DecodingError& error) {
+            return std::string(error.what());
+        }
+        return std::string();
+    };
+    EXPECT_EQ(path(R"({"text":1})"), "text: the value is of another kind");
+    EXPECT_EQ(path(R"({"text":""})"), "small: there is no such value");
+    EXPECT_EQ(path(R"({"text":"","small":128})"), "small: the value does not fit the field");
+    EXPECT_EQ(path("[]"), "the value is of another kind");
+}
+
+TEST(DataEvent, IsEncodedOnceAndGivenBackByType) {
+    static int encodings = 0;
+    struct Counting {
+        void encode(Encoder& encoder) const {
+            ++encodings;
+            encoder.beginObject();
+            encoder.endObject();
+        }
+    };
+    const AnyDataEvent event{Counting{}};
+    EXPECT_EQ(event.toDict().text(), "{}");
+    EXPECT_EQ(&event.toDict().text(), &event.toDict().text());
+    EXPECT_EQ(encodings, 1);
+    EXPECT_TRUE(event.as<Counting>());
+    EXPECT_FALSE(event.as<Track>());
+    EXPECT_THROW((void)AnyDataEvent{Bare{}}.toDict(), DataEventError);
+}
+
+namespace media {
+template <class T, class U>
+struct Pair {};
+struct Outer {
+    struct Inner {};
+    struct Named {
+        static constexpr std::string_view typeName = "Outer.Named";
+    };
+};
+}  // namespace media
+
+TEST(TypeName, IsTheLastComponentOfEveryName) {
+    struct Local {};
+    EXPECT_EQ(typeName<Track>(), "Track");
+    EXPECT_EQ(typeName<Local>(), "Local");
+    EXPECT_EQ(typeName<media::Outer::Inner>(), "Inner");
+    EXPECT_EQ(typeName<media::Outer::Named>(), "Outer.Named");
+    EXPECT_EQ((typeName<media::Pair<Track, media::Pair<Local, media::Outer>>>()), "Pair<Track, Pair<Local, Outer>>");
+}
+
+}  // namespace
+}  // namespace corvane

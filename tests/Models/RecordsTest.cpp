@@ -1,0 +1,72 @@
+#include <corvane/Models/Client.h>
+#include <corvane/Models/Decoding.h>
+#include <corvane/Models/EventData.h>
+#include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/Session.h>
+#include <corvane/Models/SessionData.h>
+#include <corvane/Models/TimedData.h>
+
+#include "tests/support/CapturedLog.h"
+
+#include <gtest/gtest.h>
+
+namespace corvane {
+namespace {
+
+using namespace std::chrono_literals;
+
+TEST(Records, EncodeToTheirExactJSON) {
+    EXPECT_EQ(toDict(EventData{"E", Date(1500ms), "/root", "S"}).text(),
+              R"({"eventID":"E","eventTimestamp":1500,"eventPath":"/root","sessionID":"S"})");
+    const Date start(10h);
+    EXPECT_EQ(toDict(TimedData(start, start + 1234500us)).text(),
+              R"({"startTimestamp":36000000,"endTimestamp":36001234,"duration":1234})");
+    EXPECT_EQ(TimedData(start + 1234500us, start).duration, -1234);
+    EXPECT_EQ(TimedData(Date::min(), Date::max()).duration, 18446744073708) << "wider than a duration holds";
+    EXPECT_EQ(decode<TimedData>(toDict(TimedData(start, start + 2s))).duration, 2000);
+}
+
+TEST(Records, SessionDataIsOneEntryUnderItsKey) {
+    struct Viewer {
+        int id;
+    };
+    struct Bare {
+        void encode(Encoder& encoder) const { encoder.null(); }
+    };
+    EXPECT_EQ(toDict(SessionData{"user", Viewer{7}}).text(), R"({"user":{"id":7}})");
+    EXPECT_EQ(encoded(SessionData{"user", Viewer{7}}).text(), R"({"key":"user","data":{"id":7}})");
+    EXPECT_THROW((void)toDict(SessionData{"user", Bare{}}), DataEventError);
+}
+
+TEST(Records, KindsCompareByCaseAndName) {
+    EXPECT_EQ(Session::Kind::custom("a"), Session::Kind::custom("a"));
+    EXPECT_NE(Session::Kind::custom("a"), Session::Kind::custom("b"));
+    EXPECT_NE(Session::Kind::custom(""), Session::Kind::userEvents());
+}
+
+TEST(Client, ComesFromABundleOrNotAtAll) {
+    test::CapturedLog log;
+    const auto client = [](const char* build) {
+        return Client::fromBundle(Bundle({{"BundleIdentifier", "com.example.app"},
+                                          {"BundleName", "App"},
+                                          {"BundleShortVersionString", "2.3"},
+                                          {"BundleVersion", build}}));
+    };
+    EXPECT_EQ(client("1234.5.6")->build(), 1234);
+    EXPECT_EQ(client("abc")->build(), 0);
+    EXPECT_EQ(client("77")->fullVersion(), "2.3.77");
+    EXPECT_FALSE(Client::fromBundle(Bundle()));
+    EXPECT_EQ(log.count("Failed to make a client"), 1);
+    EXPECT_THROW(Client("com.example\r\nX: y", "App", "1", 1), InvalidArgument);
+}
+
+TEST(ProcessEvent, PayloadHoldsDataAndMetadataButNotTheGroup) {
+    const JSON json(R"({"screen":{"name":"home"}})");
+    EXPECT_EQ(ProcessEvent("View", json, "group").payload().text(),
+              R"({"data":{"screen":{"name":"home"}},"metadata":{"name":"View","version":"0.1.0"}})");
+    EXPECT_THROW((void)ProcessEvent("View", JSON("[]"), std::nullopt).payload(), JSONError);
+    EXPECT_THROW((void)ProcessEvent("View", JSON("broken"), std::nullopt).payload(), JSONError);
+}
+
+}  // namespace
+}  // namespace corvane
