@@ -1,0 +1,41 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/Session.h>
+#include <corvane/Tracker/Group.h>
+
+#include <functional>
+#include <memory>
+#include <string>
+
+namespace corvane {
+
+class SerialQueue;
+
+/// Receives what a session manager records. Held by shared pointer and told apart by identity.
+///
+/// All callbacks but the first run on the access queue, one at a time, in the order of the host's calls. A callback
+/// must not wait for that queue; what it throws is logged and the next processor is called.
+class CORVANE_EXPORT EventProcessorType {
+  public:
+    virtual ~EventProcessorType();
+
+    /// The queue on which all later callbacks run. Called once per addition, on the thread that adds the processor.
+    virtual void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) = 0;
+    virtual void process(const ProcessEvent& processEvent) = 0;
+
+    virtual void didEnterGroup(const Group& group);
+    virtual void didLeaveGroup(const Group& group);
+    /// A session started, or was running when the processor was added.
+    virtual void didStartSession(const Session& session);
+    /// The session's data changed. `submitQueues` asks the processor to send what it has queued now.
+    virtual void didUpdateSession(const Session& session, bool submitQueues);
+    virtual void didEndSession(const Session& session, Date endDate);
+
+    /// Returns true when this processor owns the background transfer session `identifier` and takes the completion
+    /// over, which it then calls when the session's events are delivered.
+    virtual bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion);
+};
+
+}  // namespace corvane

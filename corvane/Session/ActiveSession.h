@@ -1,0 +1,45 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/Session.h>
+
+#include <deque>
+#include <string>
+
+namespace corvane {
+
+/// What trackers see of the session that runs.
+class CORVANE_EXPORT ActiveSessionType {
+  public:
+    virtual ~ActiveSessionType();
+
+    [[nodiscard]] virtual const std::string& identifier() const = 0;
+    [[nodiscard]] virtual const Session::Kind& kind() const = 0;
+    [[nodiscard]] virtual Date startDate() const = 0;
+};
+
+/// The session that runs, with every event handed over while it was active. Made by the session manager only, and used
+/// on its queue.
+class CORVANE_EXPORT ActiveSession final : public ActiveSessionType {
+  public:
+    ActiveSession(std::string identifier, Session::Kind kind, Date startDate);
+    ~ActiveSession() override;
+
+    [[nodiscard]] const std::string& identifier() const override { return identifier_; }
+    [[nodiscard]] const Session::Kind& kind() const override { return kind_; }
+    [[nodiscard]] Date startDate() const override { return startDate_; }
+    /// In hand-over order.
+    [[nodiscard]] const std::deque<ProcessEvent>& events() const { return events_; }
+
+    /// Keeps an event in its compact form: a session may run for weeks.
+    void append(const ProcessEvent& event);
+
+  private:
+    const std::string identifier_;
+    const Session::Kind kind_;
+    const Date startDate_;
+    std::deque<ProcessEvent> events_;
+};
+
+}  // namespace corvane

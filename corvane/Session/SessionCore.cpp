@@ -1,0 +1,174 @@
+#include <corvane/Session/SessionCore.h>
+
+#include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/UUID.h>
+
+#include <algorithm>
+#include <set>
+#include <utility>
+
+namespace corvane {
+
+SessionCore::SessionCore()
+    : accessQueue_(
+          std::make_shared<SerialQueue>("com.veskar.corvane.event-tracker", SerialQueue::QualityOfService::background)),
+      processorManager_(std::make_shared<ProcessorManager>(accessQueue_)) {}
+
+SessionCore::~SessionCore() = default;
+
+std::shared_ptr<SessionCore> SessionCore::make() {
+    std::shared_ptr<SessionCore> core(new SessionCore);
+    core->tracker_ = Tracker::makeRoot("root", core->accessQueue_, core);
+    core->processorManager_->setSessionProvider(core);
+    return core;
+}
+
+void SessionCore::close() {
+    std::lock_guard lock(suspensionMutex_);
+    closed_ = true;
+    for (auto count = suspendCount_.exchange(0); count > 0; --count) accessQueue_->resume();
+}
+
+void SessionCore::suspend() {
+    std::lock_guard lock(suspensionMutex_);
+    if (closed_) return;
+    suspendCount_.add(1);
+    accessQueue_->suspend();
+}
+
+void SessionCore::resume() {
+    std::lock_guard lock(suspensionMutex_);
+    if (closed_) return;
+    suspendCount_.add(-1);
+    accessQueue_->resume();
+}
+
+void SessionCore::start(Session::Kind kind, Date startDate) {
+    accessQueue_->assertCurrent("SessionManager start");
+    if (isActive()) return;
+    announce(SessionChange::willStart);
+    state_ = std::make_unique<ActiveSession>(newUUID(), std::move(kind), startDate);
+    processorManager_->didStartSession(*currentSession());
+    announce(SessionChange::didStart);
+}
+
+void SessionCore::end(Date endDate) {
+    accessQueue_->assertCurrent("SessionManager end");
+    if (!isActive()) return;
+    announce(SessionChange::willEnd);
+    const Session session = *currentSession();
+    state_ = session;
+    processorManager_->didEndSession(session, endDate);
+    announce(SessionChange::didEnd);
+    pruneOnceOnlyData();
+}
+
+void SessionCore::push(AnyDataEventEntry entry, bool submitEventQueues) {
+    accessQueue_->assertCurrent("SessionManager push");
+    dataStacks_.push(std::move(entry));
+    if (const auto session = currentSession()) processorManager_->didUpdateSession(*session, submitEventQueues);
+}
+
+const ActiveSessionType* SessionCore::activeSession() const {
+    accessQueue_->assertCurrent("SessionManager activeSession");
+    const auto* active = std::get_if<std::unique_ptr<ActiveSession>>(&state_);
+    return active ? active->get() : nullptr;
+}
+
+void SessionCore::process(const ProcessEvent& event) {
+    accessQueue_->assertCurrent("SessionManager process");
+    if (auto* active = std::get_if<std::unique_ptr<ActiveSession>>(&state_)) (*active)->append(event);
+    processorManager_->process(event);
+}
+
+void SessionCore::addSessionObserver(std::shared_ptr<SessionObserver> observer) {
+    accessQueue_->async([self = shared_from_this(), observer = std::move(observer)]() mutable {
+        self->addSessionObserverNow(std::move(observer));
+    });
+}
+
+void SessionCore::addSessionObserverNow(std::shared_ptr<SessionObserver> observer) {
+    accessQueue_->assertCurrent("SessionManager addSessionObserver");
+    // Looking through all of them at every registration would make many trackers cost their square.
+    if (observers_.size() >= pruneAt_) {
+        std::erase_if(observers_, [](const auto& registered) { return !registered->object(); });
+        pruneAt_ = std::max<std::size_t>(16, observers_.size() * 2);
+    }
+    observers_.push_back(std::move(observer));
+}
+
+void SessionCore::removeSessionObservers(std::weak_ptr<const void> object) {
+    accessQueue_->async([self = shared_from_this(), object = std::move(object)] {
+        self->accessQueue_->assertCurrent("SessionManager removeSessionObservers");
+        const auto given = object.lock();
+        std::erase_if(self->observers_, [&](const auto& registered) {
+            const auto owner = registered->object();
+            return !owner || owner == given;
+        });
+    });
+}
+
+void SessionCore::didEnterGroup(const Group& group) {
+    processorManager_->didEnterGroup(group);
+}
+void SessionCore::didLeaveGroup(const Group& group) {
+    processorManager_->didLeaveGroup(group);
+}
+
+std::optional<Session> SessionCore::currentSession() const {
+    accessQueue_->assertCurrent("SessionManager currentSession");
+    const auto* active = std::get_if<std::unique_ptr<ActiveSession>>(&state_);
+    if (!active) return std::nullopt;
+    return sessionOf(**active);
+}
+
+Session SessionCore::sessionOf(const ActiveSession& active) const {
+    return {active.identifier(), active.kind(), active.startDate(), sessionData(active.identifier())};
+}
+
+/// The identifier, then what lies on top of each stack; the first value of a key stays. Nothing is consumed.
+JSON SessionCore::sessionData(const std::string& identifier) const {
+    accessQueue_->assertCurrent("SessionManager sessionData");
+    Encoder encoder;
+    encoder.beginObject();
+    encoder.key("sessionID");
+    encoder.string(identifier);
+    std::set<std::string> keys{"sessionID"};
+    std::vector<AnyDataEvent> tops;  // encoding is the host's code, which may push in the meantime
+    for (const auto& [key, stack] : dataStacks_.all()) {
+        if (const AnyDataEventEntry* top = stack.top()) tops.push_back(top->data);
+    }
+    for (const AnyDataEvent& top : tops) {
+        std::optional<JSON::Object> dict;
+        callHost("session data", [&] { dict = top.toDict().object(); });
+        if (!dict) continue;
+        for (const auto& [name, value] : *dict) {
+            const auto [kept, isNew] = keys.insert(name);
+            if (!isNew) continue;
+            encoder.key(*kept);
+            encoder.json(value);
+        }
+    }
+    encoder.endObject();
+    return JSON::fromEncodedText(std::move(encoder).take());
+}
+
+void SessionCore::announce(SessionChange change) {
+    accessQueue_->assertCurrent("SessionManager announce");
+    // A block may end the observation of another one by releasing its object; new registrations come later, so only
+    // the ones there are now are told. Blocks cannot change the list under the loop but through addSessionObserverNow.
+    const auto observers = observers_;
+    for (const auto& observer : observers) observer->notify(change);
+}
+
+void SessionCore::pruneOnceOnlyData() {
+    accessQueue_->assertCurrent("SessionManager prune");
+    auto& stacks = dataStacks_.all();
+    for (auto stack = stacks.begin(); stack != stacks.end();) {
+        const AnyDataEventEntry* top = stack->second.top();
+        if (top && top->traits.contains(DataEventTrait::onlyOnce)) stack->second.pop();
+        stack = stack->second.isEmpty() ? stacks.erase(stack) : std::next(stack);
+    }
+}
+
+}  // namespace corvane

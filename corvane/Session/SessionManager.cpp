@@ -1,0 +1,70 @@
+#include <corvane/Session/SessionManager.h>
+
+#include <corvane/Platform/HostCall.h>
+#include <corvane/Session/SessionCore.h>
+
+namespace corvane {
+
+SessionManager::SessionManager() : core_(SessionCore::make()) {}
+
+SessionManager::~SessionManager() {
+    // The last reference goes on the queue, behind everything that was enqueued before.
+    const auto queue = core_->accessQueue();
+    if (!core_->isInForkedChild()) core_->close();
+    queue->async([core = std::move(core_)]() mutable { core.reset(); });
+}
+
+const std::shared_ptr<Tracker>& SessionManager::tracker() const {
+    return core_->tracker();
+}
+const std::shared_ptr<ProcessorManager>& SessionManager::processorManager() const {
+    return core_->processorManager();
+}
+
+void SessionManager::start(Session::Kind kind) {
+    core_->accessQueue()->async([core = core_, kind = std::move(kind), startDate = now()]() mutable {
+        core->start(std::move(kind), startDate);
+    });
+}
+
+void SessionManager::end(std::function<void()> completion) {
+    core_->accessQueue()->async([core = core_, completion = std::move(completion), endDate = now()] {
+        core->end(endDate);
+        if (completion) callHost("end completion", completion);
+    });
+}
+
+void SessionManager::endSync() {
+    if (core_->isInForkedChild()) return;
+    core_->accessQueue()->assertNotCurrent("SessionManager::endSync");
+    if (core_->isSuspended()) return;
+    const Date endDate = now();
+    core_->accessQueue()->sync([&] { core_->end(endDate); });
+}
+
+void SessionManager::push(AnyDataEventEntry entry, bool submitEventQueues) {
+    core_->accessQueue()->async([core = core_, entry = std::move(entry), submitEventQueues]() mutable {
+        core->push(std::move(entry), submitEventQueues);
+    });
+}
+
+void SessionManager::transaction(std::function<void(AccessSessionManager&)> block) {
+    core_->accessQueue()->async([core = core_, block = std::move(block)] {
+        AccessSessionManager access(core);
+        if (block) callHost("session transaction", [&] { block(access); });
+    });
+}
+
+AccessSessionManager::AccessSessionManager(std::shared_ptr<SessionCore> sessionManager)
+    : sessionManager_(std::move(sessionManager)) {}
+AccessSessionManager::~AccessSessionManager() = default;
+
+bool AccessSessionManager::isActive() const {
+    return sessionManager_->isActive();
+}
+
+void AccessSessionManager::push(AnyDataEventEntry entry, bool submitEventQueues) {
+    sessionManager_->push(std::move(entry), submitEventQueues);
+}
+
+}  // namespace corvane

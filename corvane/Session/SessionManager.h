@@ -1,0 +1,74 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Models/Session.h>
+#include <corvane/Models/SessionData.h>
+#include <corvane/Processing/ProcessorManager.h>
+#include <corvane/Session/AccessSessionManager.h>
+#include <corvane/Tracker/Tracker.h>
+
+#include <functional>
+#include <memory>
+#include <source_location>
+#include <utility>
+
+namespace corvane {
+
+/// The object that a host makes first: it owns the queue on which all tracking runs, the root tracker and the processor
+/// manager, and it starts and ends sessions.
+///
+/// Operations may be called from any thread; all but `endSync` enqueue their work and return at once. Starting while a
+/// session is active, and ending while none is, does nothing.
+///
+/// The destructor lets everything that was called before it reach the processors, ends no session, waits for nothing,
+/// and may run anywhere, in a block on the manager's own queue too. A suspended queue is resumed for it. What trackers
+/// are asked afterwards fails with `TrackerError::noSession`.
+///
+/// A process that forks goes on as before. Its child may exec, or end with `_exit` or `exit`: the destructors and exit
+/// handlers of what it has a copy of do nothing there, and nothing is recorded or sent twice. It must not use the
+/// copies otherwise; a child that records events makes its own objects, and its parent makes none before it.
+///
+///     SessionManager sessions;
+///     sessions.processorManager()->add(std::make_shared<LoggingEventProcessor>());
+///     sessions.start(Session::Kind::userEvents());
+class CORVANE_EXPORT SessionManager {
+  public:
+    SessionManager();
+    SessionManager(const SessionManager&) = delete;
+    SessionManager& operator=(const SessionManager&) = delete;
+    ~SessionManager();
+
+    /// The root tracker, named "root".
+    [[nodiscard]] const std::shared_ptr<Tracker>& tracker() const;
+    [[nodiscard]] const std::shared_ptr<ProcessorManager>& processorManager() const;
+
+    /// Starts a session, whose start date is the time of the call.
+    void start(Session::Kind kind);
+    /// Ends the session; the end date is the time of the call. The completion, if any, is called on the queue, also
+    /// when there was nothing to end.
+    void end(std::function<void()> completion = {});
+    /// Ends the session before it returns; does nothing at all while the queue is suspended.
+    /// Requires: the caller is not on the queue (the process is stopped with a message).
+    void endSync();
+
+    /// Puts data into this and later sessions, under its key. Processors are told of it while a session is active;
+    /// `submitEventQueues` asks them to send what they have collected so far under the data before this push.
+    template <class D>
+    void push(SessionData<D> data, DataEventTraits traits = {}, bool submitEventQueues = false,
+              std::source_location where = std::source_location::current()) {
+        static_assert(DataEventType<D>, "corvane: session data wraps a data event: a plain aggregate or a record");
+        push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
+             submitEventQueues);
+    }
+
+    /// Runs a block on the queue. What it throws is logged.
+    void transaction(std::function<void(AccessSessionManager&)> block);
+
+    /// The same for session data that is known by name.
+    void push(AnyDataEventEntry entry, bool submitEventQueues);
+
+  private:
+    std::shared_ptr<SessionCore> core_;
+};
+
+}  // namespace corvane

@@ -1,0 +1,28 @@
+#include <corvane/Session/SessionObserver.h>
+
+#include <corvane/Platform/HostCall.h>
+
+#include <utility>
+
+namespace corvane {
+
+SessionObserver::SessionObserver(AccessTracker sessionChangeTracker, Block block)
+    : sessionChangeTracker_(std::move(sessionChangeTracker)), block_(std::move(block)) {}
+SessionObserver::~SessionObserver() = default;
+
+void SessionObserver::disposeOn(std::weak_ptr<const void> object) {
+    std::lock_guard lock(mutex_);
+    object_.swap(object);
+}
+
+std::shared_ptr<const void> SessionObserver::object() const {
+    std::lock_guard lock(mutex_);
+    return object_.lock();
+}
+
+void SessionObserver::notify(SessionChange change) {
+    const auto held = object();
+    if (held && block_) callHost("session observer", [&] { block_(sessionChangeTracker_, change); });
+}
+
+}  // namespace corvane

@@ -1,0 +1,100 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Tracker/DataEventStack.h>
+#include <corvane/Tracker/EventSubmit.h>
+#include <corvane/Tracker/TrackerTimer.h>
+
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace corvane {
+
+/// Which entries a snapshot copies.
+enum class SnapshotPolicy {
+    now,  ///< of each key the entry in scope: the newest one of the nearest tracker
+    all,  ///< every entry of every stack; an evaluation then takes the oldest one of the nearest tracker
+};
+
+/// What one tracker of the chain held.
+struct SnapshotLevel {
+    std::string name;  ///< the tracker's
+    /// By key, oldest first. Under `now` one entry per key, and only of keys that no nearer level has.
+    std::map<std::string, std::vector<AnyDataEventEntry>, std::less<>> entries;
+    TrackerTimers timers;
+};
+
+/// A property with the entry that answers it.
+struct SnapshotEntry {
+    std::string name;
+    AnyDataEventEntry dataEntry;
+};
+
+/// An event type evaluated against a snapshot: what it would carry, and what it lacks. A value.
+struct SnapshotEvent {
+    /// A property without data.
+    class MissingData {
+      public:
+        [[nodiscard]] static MissingData required(DataType type) { return {false, type}; }
+        [[nodiscard]] static MissingData optional(DataType type) { return {true, type}; }
+
+        [[nodiscard]] bool isOptional() const { return isOptional_; }
+        [[nodiscard]] DataType type() const { return type_; }
+        friend bool operator==(const MissingData&, const MissingData&) = default;
+
+      private:
+        MissingData(bool isOptional, DataType type) : isOptional_(isOptional), type_(type) {}
+        bool isOptional_;
+        DataType type_;
+    };
+
+    bool isValid = true;                   ///< nothing that is required is missing
+    std::vector<SnapshotEntry> entries;    ///< in declaration order
+    std::vector<MissingData> missingData;  ///< in declaration order
+
+    /// Keeps the names in `entries` alive.
+    EventMirrorProperties properties;
+};
+
+/// The data in scope of a tracker at one moment. Immutable; it keeps no tracker alive, and may be read from any thread.
+///
+///     auto snapshot = tracker->snapshot(SnapshotPolicy::now);
+///     if (!snapshot->evaluate<ScreenView>().isValid) ...    // a submission would fail
+class CORVANE_EXPORT SnapshotType {
+  public:
+    virtual ~SnapshotType();
+
+    /// Checks an event type against the copied data. Consumes nothing; runs on the caller's thread. A required
+    /// `TimedData` is answered by the timer that ran on the nearest tracker, up to now; there is no `EventData` unless
+    /// some was pushed, since no event has been made.
+    template <class E>
+    [[nodiscard]] SnapshotEvent evaluate() const {
+        return evaluate(EventSubmit::actual<E>());
+    }
+    [[nodiscard]] virtual SnapshotEvent evaluate(const EventSubmit& event) const = 0;
+};
+
+/// See SnapshotType.
+class CORVANE_EXPORT Snapshot final : public SnapshotType {
+  public:
+    using SnapshotType::evaluate;
+
+    /// @param levels the nearest tracker first
+    Snapshot(SnapshotPolicy policy, std::vector<SnapshotLevel> levels, std::shared_ptr<EventMirrorStore> mirrorStore);
+    ~Snapshot() override;
+
+    [[nodiscard]] SnapshotPolicy policy() const { return policy_; }
+    [[nodiscard]] const std::vector<SnapshotLevel>& levels() const { return levels_; }
+    [[nodiscard]] SnapshotEvent evaluate(const EventSubmit& event) const override;
+
+  private:
+    [[nodiscard]] const AnyDataEventEntry* lookup(std::string_view key) const;
+
+    const SnapshotPolicy policy_;
+    const std::vector<SnapshotLevel> levels_;
+    const std::shared_ptr<EventMirrorStore> eventMirrorStore_;
+};
+
+}  // namespace corvane

@@ -1,0 +1,82 @@
+#pragma once
+
+#include <corvane/Models/Fields.h>
+#include <corvane/Platform/TypeName.h>
+#include <corvane/Tracker/EventMirrorStore.h>
+
+#include <concepts>
+#include <memory>
+#include <string_view>
+#include <type_traits>
+#include <utility>
+#include <vector>
+
+namespace corvane {
+
+/// An event type: a record that can be made without arguments. Its fields that are property declarations are its
+/// properties; fields of any other kind are ignored. Its name is its `typeName`.
+template <class E>
+concept EventType = std::is_class_v<E> && std::default_initializable<E> && Record<E>;
+
+/// What an event is called and what it carries: what a submission needs to know of it, whatever it was declared by.
+struct EventDeclaration {
+    std::string_view name;
+    EventMirrorProperties (*properties)(const EventDeclaration& self, EventMirrorStore& store);
+};
+
+namespace detail {
+
+struct PropertyCollector {
+    template <class T>
+    void operator()(std::string_view name, const T& field) const {
+        if constexpr (std::derived_from<T, EventPropertyType>) {
+            properties.push_back({std::string(name), std::make_shared<const T>(field)});
+        }
+    }
+    std::vector<EventMirrorProperty>& properties;
+};
+
+template <class E>
+std::vector<EventMirrorProperty> mirrorOf() {
+    std::vector<EventMirrorProperty> properties;
+    const E declarations{};
+    forEachField(declarations, PropertyCollector{properties});
+    return properties;
+}
+
+template <class E>
+EventMirrorProperties propertiesOf(const EventDeclaration& self, EventMirrorStore& store) {
+    return store.properties(self.name, &mirrorOf<E>);
+}
+
+template <class E>
+inline constexpr EventDeclaration declarationOf{typeName<E>(), &propertiesOf<E>};
+
+}  // namespace detail
+
+/// Names the event that is submitted or timed. A value of two words; copies share the declaration.
+class EventSubmit {
+  public:
+    /// The event type `E`.
+    template <class E>
+    [[nodiscard]] static EventSubmit actual() {
+        static_assert(EventType<E>,
+                      "corvane: an event type is a plain aggregate (or a record with corvaneFields()) that can be made "
+                      "without arguments and whose fields are EventProperty declarations");
+        // The declaration is a constant of the program: nothing owns it.
+        return EventSubmit(std::shared_ptr<const EventDeclaration>(std::shared_ptr<void>(), &detail::declarationOf<E>));
+    }
+
+    /// An event declared at run time.
+    explicit EventSubmit(std::shared_ptr<const EventDeclaration> declaration) : declaration_(std::move(declaration)) {}
+
+    [[nodiscard]] std::string_view name() const { return declaration_->name; }
+    [[nodiscard]] EventMirrorProperties properties(EventMirrorStore& store) const {
+        return declaration_->properties(*declaration_, store);
+    }
+
+  private:
+    std::shared_ptr<const EventDeclaration> declaration_;
+};
+
+}  // namespace corvane

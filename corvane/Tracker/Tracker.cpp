@@ -1,0 +1,308 @@
+#include <corvane/Tracker/Tracker.h>
+
+#include <corvane/Models/EventData.h>
+#include <corvane/Models/TimedData.h>
+#include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/UUID.h>
+#include <corvane/Session/ActiveSession.h>
+#include <corvane/Session/SessionObserver.h>
+#include <corvane/Tracker/AccessTracker.h>
+#include <corvane/Tracker/TrackerDelegate.h>
+
+#include <algorithm>
+#include <set>
+
+namespace corvane {
+
+TrackerDelegate::~TrackerDelegate() = default;
+
+Tracker::Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue,
+                 std::shared_ptr<EventMirrorStore> mirrorStore, std::shared_ptr<Tracker> parent,
+                 std::weak_ptr<TrackerDelegate> delegate)
+    : name_(std::move(name)),
+      accessQueue_(std::move(accessQueue)),
+      eventMirrorStore_(std::move(mirrorStore)),
+      parentTracker_(std::move(parent)),
+      delegate_(std::move(delegate)) {}
+
+Tracker::~Tracker() = default;
+
+std::shared_ptr<Tracker> Tracker::makeRoot(std::string name, std::shared_ptr<SerialQueue> accessQueue,
+                                           std::weak_ptr<TrackerDelegate> delegate) {
+    return std::shared_ptr<Tracker>(new Tracker(std::move(name), std::move(accessQueue),
+                                                std::make_shared<EventMirrorStore>(), nullptr, std::move(delegate)));
+}
+
+std::shared_ptr<Tracker> Tracker::chain(std::string name) {
+    std::shared_ptr<Tracker> child(
+        new Tracker(std::move(name), accessQueue_, eventMirrorStore_, shared_from_this(), delegate_));
+    child->onSessionChange([](AccessTracker& access, SessionChange change) {
+        if (const auto tracker = access.tracker()) tracker->react(change);
+    });
+    return child;
+}
+
+std::vector<std::string> Tracker::path() const {
+    std::vector<std::string> names;
+    for (const Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
+        names.push_back(tracker->name_);
+    }
+    std::reverse(names.begin(), names.end());
+    return names;
+}
+
+void Tracker::submit(EventSubmit event, Date submitTime, SubmitOptions options) {
+    accessQueue_->async([self = shared_from_this(), event = std::move(event), submitTime,
+                         options = std::move(options)] { self->performSubmit(event, submitTime, options); });
+}
+
+std::shared_ptr<DelayedToken> Tracker::delayedSubmit(EventSubmit event, SubmitOptions options) {
+    return std::make_shared<DelayedToken>(
+        [weak = weak_from_this(), event = std::move(event), submitTime = now(), options = std::move(options)] {
+            if (const auto tracker = weak.lock()) tracker->submit(event, submitTime, options);
+        });
+}
+
+void Tracker::transaction(std::function<void(AccessTracker&)> block) {
+    accessQueue_->async([self = shared_from_this(), block = std::move(block)] {
+        AccessTracker access(self);
+        if (block) callHost("tracker transaction", [&] { block(access); });
+    });
+}
+
+void Tracker::whenSession(std::function<void(AccessTracker&)> block) {
+    accessQueue_->async([self = shared_from_this(), block = std::move(block)]() mutable {
+        self->performWhenSession(std::move(block));
+    });
+}
+
+std::shared_ptr<const SnapshotType> Tracker::snapshot(SnapshotPolicy policy) {
+    accessQueue_->assertNotCurrent("Tracker::snapshot");
+    return accessQueue_->sync(
+        [&] { return std::make_shared<const Snapshot>(policy, levels(policy), eventMirrorStore_); });
+}
+
+void Tracker::time(EventSubmit event, Date startTime, bool submitAndRestartWithSession) {
+    accessQueue_->async([self = shared_from_this(), event = std::move(event), startTime, submitAndRestartWithSession] {
+        self->performTime(event, startTime, submitAndRestartWithSession);
+    });
+}
+
+void Tracker::push(AnyDataEventEntry entry) {
+    accessQueue_->async(
+        [self = shared_from_this(), entry = std::move(entry)]() mutable { self->performPush(std::move(entry)); });
+}
+
+void Tracker::pop(std::string_view key, DataType type) {
+    accessQueue_->async([self = shared_from_this(), key = std::string(key), type] { self->performPop(key, type); });
+}
+
+void Tracker::enterGroup(std::string groupName) {
+    accessQueue_->async([self = shared_from_this(), group = Group{std::move(groupName), now()}]() mutable {
+        self->performEnterGroup(std::move(group));
+    });
+}
+
+void Tracker::leaveGroup() {
+    accessQueue_->async([self = shared_from_this()] { self->performLeaveGroup(); });
+}
+
+std::shared_ptr<SessionObserver> Tracker::onSessionChange(SessionChangeBlock block) {
+    auto observer = std::make_shared<SessionObserver>(AccessTracker(weak_from_this()), std::move(block));
+    observer->disposeOn(weak_from_this());
+    if (const auto delegate = delegate_.lock()) delegate->addSessionObserver(observer);
+    return observer;
+}
+
+void Tracker::removeSessionObservers(const std::shared_ptr<const void>& object) {
+    if (const auto delegate = delegate_.lock()) delegate->removeSessionObservers(object);
+}
+
+void Tracker::suspend() {
+    if (const auto delegate = delegate_.lock()) delegate->suspend();
+}
+
+void Tracker::resume() {
+    if (const auto delegate = delegate_.lock()) delegate->resume();
+}
+
+void Tracker::performSubmit(const EventSubmit& event, Date submitTime, const SubmitOptions& options) {
+    accessQueue_->assertCurrent("Tracker submission");
+    const auto delegate = delegate_.lock();
+    if (delegate && delegate->activeSession() && options.onlyIfTimed && !timers_.contains(event.name())) return;
+    const EventSubmitResult result = process(event, submitTime, delegate.get());
+    if (options.completion) callHost("submit completion", [&] { options.completion(result); });
+}
+
+EventSubmitResult Tracker::process(const EventSubmit& event, Date submitTime, TrackerDelegate* delegate) {
+    const ActiveSessionType* session = delegate ? delegate->activeSession() : nullptr;
+    if (!session) return EventSubmitResult::failed(AnyError(TrackerError::withoutSession()));
+    try {
+        // A document could not say what the event is called, and the event would be lost behind its success.
+        if (!jsontext::isUTF8(event.name())) throw EncodingError(EncodingError::notUTF8, "metadata.name");
+        const EventMirrorProperties properties = event.properties(*eventMirrorStore_);
+        const Sequence sequence = resolve(*properties, event, submitTime, session->identifier());
+        ProcessEvent processEvent(std::string(event.name()), encode(sequence), groupName());
+        delegate->process(processEvent);
+        return EventSubmitResult::success(std::move(processEvent));
+    } catch (...) {
+        return EventSubmitResult::failed(AnyError::current());
+    }
+}
+
+Sequence Tracker::resolve(const std::vector<EventMirrorProperty>& properties, const EventSubmit& event, Date submitTime,
+                          const std::string& sessionID) {
+    Sequence sequence;
+    std::vector<TrackerError::MissingData> missing;
+    sequence.entries.reserve(properties.size());
+    for (const auto& [name, property] : properties) {
+        std::optional<AnyDataEvent> data;
+        if (!property->isOptional()) data = builtIn(*property, event, submitTime, sessionID);
+        if (!data) data = lookup(property->dataKey());
+        if (data) {
+            sequence.entries.push_back({name, *std::move(data)});
+        } else if (!property->isOptional()) {
+            missing.push_back({name, property->dataType()});
+        }
+    }
+    if (!missing.empty()) throw TrackerError::missing(std::move(missing));
+    return sequence;
+}
+
+/// What the library itself knows of an event: its identity, and its span while a timer runs, which ends the timer.
+std::optional<AnyDataEvent> Tracker::builtIn(const EventPropertyType& property, const EventSubmit& event,
+                                             Date submitTime, const std::string& sessionID) {
+    accessQueue_->assertCurrent("Tracker submission");
+    if (property.isDataType(DataType::of<EventData>())) {
+        return AnyDataEvent(EventData{newUUID(), submitTime, eventPath(), sessionID});
+    }
+    if (property.trait() == EventPropertyTrait::data && property.isDataType(DataType::of<TimedData>())) {
+        if (const auto timer = timers_.find(event.name()); timer != timers_.end()) {
+            const TimedData span(timer->second.startTime, submitTime);
+            timers_.erase(timer);
+            if (const auto restart = restartTimers_.find(event.name()); restart != restartTimers_.end()) {
+                restartTimers_.erase(restart);
+            }
+            return AnyDataEvent(span);
+        }
+    }
+    return std::nullopt;
+}
+
+std::optional<AnyDataEvent> Tracker::lookup(std::string_view key) {
+    for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
+        tracker->accessQueue_->assertCurrent("Tracker lookup");
+        if (auto data = tracker->dataStacks_.take(key)) return data;
+    }
+    return std::nullopt;
+}
+
+std::optional<std::string> Tracker::groupName() {
+    for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
+        tracker->accessQueue_->assertCurrent("Tracker group");
+        if (!tracker->groupStack_.empty()) return tracker->groupStack_.back().name;
+    }
+    return std::nullopt;
+}
+
+const std::string& Tracker::eventPath() {
+    accessQueue_->assertCurrent("Tracker path");
+    if (eventPath_.empty()) {
+        for (const auto& component : path()) eventPath_ += "/" + component;
+    }
+    return eventPath_;
+}
+
+void Tracker::performTime(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession) {
+    accessQueue_->assertCurrent("Tracker timer");
+    if (timers_.contains(event.name())) return;
+    timers_.emplace(std::string(event.name()), Timer{startTime});
+    if (submitAndRestartWithSession) restartTimers_.insert_or_assign(std::string(event.name()), event);
+}
+
+void Tracker::performPush(AnyDataEventEntry entry) {
+    accessQueue_->assertCurrent("Tracker push");
+    dataStacks_.push(std::move(entry));
+}
+
+void Tracker::performPop(std::string_view key, DataType type) {
+    accessQueue_->assertCurrent("Tracker pop");
+    dataStacks_.pop(key, type);
+}
+
+void Tracker::performEnterGroup(Group group) {
+    accessQueue_->assertCurrent("Tracker group");
+    groupStack_.push_back(group);
+    if (const auto delegate = delegate_.lock()) delegate->didEnterGroup(group);
+}
+
+void Tracker::performLeaveGroup() {
+    for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
+        tracker->accessQueue_->assertCurrent("Tracker group");
+        if (tracker->groupStack_.empty()) continue;
+        const Group left = std::move(tracker->groupStack_.back());
+        tracker->groupStack_.pop_back();
+        if (const auto delegate = delegate_.lock()) delegate->didLeaveGroup(left);
+        return;
+    }
+}
+
+void Tracker::performWhenSession(std::function<void(AccessTracker&)> block) {
+    accessQueue_->assertCurrent("Tracker whenSession");
+    const auto delegate = delegate_.lock();
+    if (!delegate || !block) return;
+    if (delegate->activeSession()) {
+        AccessTracker access(weak_from_this());
+        callHost("whenSession", [&] { block(access); });
+        return;
+    }
+    // The observation ends with its object, which the observer's own block holds until it has run.
+    auto holder = std::make_shared<std::shared_ptr<const void>>(std::make_shared<char>());
+    const std::weak_ptr<const void> token = *holder;
+    const auto observer = std::make_shared<SessionObserver>(
+        AccessTracker(weak_from_this()),
+        [holder, block = std::move(block)](AccessTracker& access, SessionChange change) {
+            if (change != SessionChange::didStart || !*holder) return;
+            holder->reset();
+            block(access);
+        });
+    observer->disposeOn(token);
+    delegate->addSessionObserverNow(observer);
+}
+
+/// One level per tracker, from this one to the root. A key that a nearer level supplied is not repeated under `now`.
+std::vector<SnapshotLevel> Tracker::levels(SnapshotPolicy policy) {
+    std::vector<SnapshotLevel> levels;
+    std::set<std::string_view> taken;
+    for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
+        tracker->accessQueue_->assertCurrent("Tracker snapshot");
+        SnapshotLevel level{tracker->name_, {}, tracker->timers_};
+        for (const auto& [key, stack] : tracker->dataStacks_.all()) {
+            if (stack.isEmpty()) continue;
+            if (policy == SnapshotPolicy::all) {
+                level.entries.emplace(key, stack.entries());
+            } else if (taken.insert(key).second) {
+                level.entries.emplace(key, std::vector{*stack.top()});
+            }
+        }
+        levels.push_back(std::move(level));
+    }
+    return levels;
+}
+
+/// Restart timers follow the session: submitted while it can still take the event, started anew with the next one.
+void Tracker::react(SessionChange change) {
+    accessQueue_->assertCurrent("Tracker session change");
+    if (change != SessionChange::didStart && change != SessionChange::willEnd) return;
+    const auto timers = restartTimers_;  // reactions change the map
+    for (const auto& [name, event] : timers) {
+        if (change == SessionChange::didStart) {
+            performTime(event, now(), true);
+        } else {
+            performSubmit(event, now(), {.onlyIfTimed = true});
+            restartTimers_.insert_or_assign(name, event);
+        }
+    }
+}
+
+}  // namespace corvane

@@ -1,0 +1,74 @@
+#include "tests/support/TrackingFixture.h"
+
+#include <atomic>
+#include <future>
+#include <thread>
+
+namespace corvane::test {
+namespace {
+
+class Lifetime : public TrackingTest {
+  protected:
+    struct Mark {};
+};
+
+TEST_F(Lifetime, EverythingCalledBeforeDestructionStillReachesTheProcessorsWhereverItHappens) {
+    for (const std::string way : {"here", "another thread", "a completion", "suspended"}) {
+        const auto recorder = std::make_shared<RecordingProcessor>();
+        auto manager = std::make_unique<SessionManager>();
+        const auto tracker = manager->tracker();
+        manager->processorManager()->add(recorder);
+        manager->start(Session::Kind::userEvents());
+        std::promise<void> release, started;
+        manager->transaction([&](AccessSessionManager&) {
+            started.set_value();
+            release.get_future().wait();
+        });
+        started.get_future().wait();
+        std::atomic<int> succeeded = 0, failed = 0;
+        const auto count = [&](const EventSubmitResult& result) { ++(result.succeeded() ? succeeded : failed); };
+        for (int i = 0; i < 10000; ++i) {
+            tracker->submit<Mark>([&, i](const EventSubmitResult& result) {
+                count(result);
+                if (i == 100 && way == "a completion") manager.reset();
+            });
+        }
+        if (way == "here") manager.reset();
+        if (way == "another thread") std::thread([&] { manager.reset(); }).join();
+        if (way == "suspended") {
+            tracker->suspend();
+            manager.reset();
+        }
+        if (way != "a completion") tracker->submit<Mark>(count);
+        release.set_value();
+        recorder->drain();
+        recorder->drain();  // behind the end of the manager too
+        EXPECT_EQ(succeeded, 10000) << way;
+        EXPECT_EQ(failed, way == "a completion" ? 0 : 1) << way;
+        EXPECT_EQ(recorder->events.size(), 10000u) << way;
+        EXPECT_EQ(recorder->calls.back(), "process Mark") << "no session is ended behind the host's back";
+    }
+}
+
+TEST_F(Lifetime, MayEndInItsOwnBlockOnAnotherThreadOrSuspended) {
+    root->submit<Mark>([this](const EventSubmitResult&) { sessions.reset(); });
+    processor->drain();
+    EXPECT_EQ(submit<Mark>(root), "! there is no active session");
+
+    auto other = std::make_unique<SessionManager>();
+    const auto tracker = other->tracker();
+    other->processorManager()->add(processor);
+    other->start(Session::Kind::userEvents());
+    tracker->suspend();
+    tracker->suspend();
+    std::promise<bool> outcome;
+    tracker->submit<Mark>([&](const EventSubmitResult& result) { outcome.set_value(result.succeeded()); });
+    std::thread([&] { other.reset(); }).join();
+    EXPECT_TRUE(outcome.get_future().get());
+    tracker->resume();
+    tracker->suspend();
+    processor->drain();
+}
+
+}  // namespace
+}  // namespace corvane::test
