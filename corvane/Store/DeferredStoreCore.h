@@ -1,0 +1,55 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Platform/SerialQueue.h>
+#include <corvane/Store/StoreConnection.h>
+#include <corvane/Store/StoreTable.h>
+
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+
+namespace corvane {
+
+/// What every `DeferredStore` does, whatever its entity: makes the connection on the shared queue, checks the table's
+/// schema version, falls back to memory.
+///
+/// States: pending, then ready (on disk or in memory) or failed, for good.
+class CORVANE_EXPORT DeferredStoreCore {
+  public:
+    /// The one queue on which all database work of the process runs; never destroyed.
+    [[nodiscard]] static SerialQueue& queue();
+
+    /// Returns at once; the connection is made on the queue. When the core has gone by then, nothing is done.
+    /// @param table must outlive the process's use of the core.
+    /// @param location the name of the database file; nothing for memory.
+    [[nodiscard]] static std::shared_ptr<DeferredStoreCore> make(const StoreTable& table, std::int64_t schemaVersion,
+                                                                 std::optional<std::string> location);
+
+    DeferredStoreCore(const DeferredStoreCore&) = delete;
+    DeferredStoreCore& operator=(const DeferredStoreCore&) = delete;
+    /// The connection is closed on the queue: closing may write to disk, and whoever lets go must not wait for it.
+    ~DeferredStoreCore();
+
+    /// The connection to use now. When its file has been removed or replaced, it is made anew first, with the table.
+    /// Requires: on the queue. Throws `DeferredStoreError` noStore.
+    [[nodiscard]] const std::shared_ptr<StoreConnection>& connection();
+    /// Throws `StoreError` cantOpen when the last `connection()` found its file lost. Requires: on the queue.
+    void throwIfFileWasLost() const;
+
+  private:
+    DeferredStoreCore(const StoreTable& table, std::int64_t schemaVersion)
+        : table_(table), schemaVersion_(schemaVersion) {}
+
+    void makeAnew() CORVANE_REQUIRES(queue());
+
+    const StoreTable& table_;
+    const std::int64_t schemaVersion_;
+
+    std::shared_ptr<StoreConnection> connection_ CORVANE_GUARDED_BY(queue());
+    // Where the file was, when the last look found it gone.
+    std::optional<StoreLocation> lost_ CORVANE_GUARDED_BY(queue());
+};
+
+}  // namespace corvane

@@ -1,0 +1,20 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Platform/Error.h>
+
+namespace corvane {
+
+/// What a deferred store itself throws: `DeferredStore<Entity>::Errors`. Domain "Corvane.DeferredStore.Errors".
+class CORVANE_EXPORT DeferredStoreError : public Error {
+  public:
+    enum Code {
+        noStore = 0,  ///< neither the database file nor one in memory could be had; the log says why
+    };
+    explicit DeferredStoreError(Code code);
+    ~DeferredStoreError() override;
+
+    [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
+};
+
+}  // namespace corvane

@@ -1,0 +1,88 @@
+#pragma once
+
+#include <corvane/Store/Storable.h>
+#include <corvane/Store/StoreConnection.h>
+#include <corvane/Store/StoreTable.h>
+
+#include <memory>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace corvane {
+
+/// The records of one entity type, in one table of one database.
+///
+/// A store starts open. Any operation may be used on a closed one: it opens the database, runs, and closes it again; so
+/// owners keep a store open over a burst of work. Nothing is logged here: every operation throws `Errors`
+/// (`InvalidArgument` for a value that no statement can hold), and returns no partial result. Use it from one queue at
+/// a time; the library's stores are reached through a `DeferredStore`, which sees to that.
+///
+///     Store<Note> store(StoreLocation::default_("main"));
+///     store.createTable();
+///     store.insert(note);
+///     std::vector<Note> found = store.fetchWhere("identifier", "n1");
+template <Storable Entity>
+class Store {
+  public:
+    using Errors = StoreError;
+
+    /// Opens the database. Throws what `open` throws.
+    explicit Store(StoreLocation location) : Store(std::make_shared<StoreConnection>(std::move(location))) {}
+    /// A store over a connection that there is already.
+    explicit Store(std::shared_ptr<StoreConnection> connection) : connection_(std::move(connection)) {}
+
+    /// Opens the database unless it is open.
+    void open() { connection_->open(); }
+    /// Closes the database; a memory store keeps what it holds until it is destroyed.
+    void close() { connection_->close(); }
+    [[nodiscard]] bool isOpen() const { return connection_->isOpen(); }
+
+    /// Creates the table unless it is there.
+    void createTable() { connection_->run(table().createSQL()); }
+    /// Drops the table if it is there.
+    void dropTable() { connection_->run(table().dropSQL()); }
+
+    /// Writes a record, in place of one with the same key.
+    void insert(const Entity& entity) {
+        std::vector<StorableValue> values;
+        values.reserve(table().columns().size());
+        for (const auto& column : table().columns()) values.push_back(entity.storableValue(column.name));
+        connection_->run(table().insertSQL(values));
+    }
+
+    /// All records, in no particular order. A record that cannot be read fails the whole call with its error.
+    [[nodiscard]] std::vector<Entity> fetchAll() { return fetch(table().selectSQL()); }
+    /// The records whose `column` equals `value`.
+    [[nodiscard]] std::vector<Entity> fetchWhere(std::string_view column, const StorableValue& value) {
+        return fetch(table().selectSQL(column, value));
+    }
+    /// Deletes the records whose `column` equals `value`, if there are any.
+    void deleteWhere(std::string_view column, const StorableValue& value) {
+        connection_->run(table().deleteSQL(column, value));
+    }
+
+    /// Calls `operations`: what they do here is done all or not at all, and no other process writes in between. What
+    /// they throw undoes them and comes through.
+    template <class Operations>
+    void transaction(Operations&& operations) {
+        connection_->transaction(std::forward<Operations>(operations));
+    }
+
+    /// The entity's table and its statements.
+    [[nodiscard]] static const StoreTable& table() {
+        static const auto& table = *new StoreTable(Entity::tableName, Entity::columns());
+        return table;
+    }
+
+  private:
+    std::vector<Entity> fetch(const std::string& sql) {
+        std::vector<Entity> entities;
+        connection_->query(sql, [&](StoreStepper& stepper) { entities.push_back(Entity::read(stepper)); });
+        return entities;
+    }
+
+    std::shared_ptr<StoreConnection> connection_;
+};
+
+}  // namespace corvane

@@ -1,0 +1,63 @@
+#include <corvane/Store/StoreStepper.h>
+
+#include <sqlite3.h>
+
+namespace corvane {
+
+namespace {
+
+sqlite3_stmt* handle(void* statement) {
+    return static_cast<sqlite3_stmt*>(statement);
+}
+
+[[noreturn]] void throwBadColumn(int column, const char* missing) {
+    throw StoreStepperError(StoreStepperError::badColumn, "column " + std::to_string(column) + " holds no " + missing);
+}
+
+std::string message(StoreStepperError::Code code, const std::string& detail) {
+    return (code == StoreStepperError::badColumn ? "bad column: " : "bad data in column: ") + detail;
+}
+
+}  // namespace
+
+StoreStepperError::StoreStepperError(Code code, const std::string& detail)
+    : Error("Corvane.StoreStepper.Errors", code, message(code, detail)) {}
+StoreStepperError::~StoreStepperError() = default;
+
+int StoreStepper::take() {
+    const int column = index_++;
+    if (!statement_) throwBadColumn(column, "value, for there is no row");
+    return column;
+}
+
+std::optional<std::string> StoreStepper::optionalText() {
+    const int column = take();
+    const auto* text = reinterpret_cast<const char*>(sqlite3_column_text(handle(statement_), column));
+    if (!text) return std::nullopt;
+    return std::string(text, static_cast<std::size_t>(sqlite3_column_bytes(handle(statement_), column)));
+}
+
+std::string StoreStepper::text() {
+    auto text = optionalText();
+    if (!text) throwBadColumn(index_ - 1, "text");
+    return *std::move(text);
+}
+
+std::int64_t StoreStepper::integer() {
+    const int column = take();
+    return sqlite3_column_int64(handle(statement_), column);
+}
+
+double StoreStepper::double_() {
+    const int column = take();
+    return sqlite3_column_double(handle(statement_), column);
+}
+
+std::string StoreStepper::bytes() {
+    const int column = take();
+    const auto* bytes = static_cast<const char*>(sqlite3_column_blob(handle(statement_), column));
+    if (!bytes) throwBadColumn(column, "bytes");
+    return {bytes, static_cast<std::size_t>(sqlite3_column_bytes(handle(statement_), column))};
+}
+
+}  // namespace corvane

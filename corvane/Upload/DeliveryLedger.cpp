@@ -1,0 +1,61 @@
+#include <corvane/Upload/DeliveryLedger.h>
+
+namespace corvane {
+
+namespace {
+
+void addTo(DeliveryReport::Count& count, std::int64_t events) {
+    count.events += events;
+    ++count.documents;
+}
+
+}  // namespace
+
+void DeliveryLedger::add(std::string_view identifier, std::int64_t events) {
+    const std::lock_guard lock(mutex_);
+    onTheirWay_.emplace(identifier, events);
+}
+
+void DeliveryLedger::remove(std::string_view identifier) {
+    const std::lock_guard lock(mutex_);
+    if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) onTheirWay_.erase(found);
+    if (onTheirWay_.empty()) settled_.notify_all();
+}
+
+void DeliveryLedger::settle(std::string_view identifier, Outcome outcome) {
+    const std::lock_guard lock(mutex_);
+    const auto found = onTheirWay_.find(identifier);
+    if (found == onTheirWay_.end()) return;
+    switch (outcome) {
+        case Outcome::delivered:
+            addTo(totals_.delivered, found->second);
+            break;
+        case Outcome::pending:
+            addTo(totals_.pending, found->second);
+            break;
+        case Outcome::givenUp:
+            addTo(totals_.givenUp, found->second);
+            break;
+    }
+    onTheirWay_.erase(found);
+    if (onTheirWay_.empty()) settled_.notify_all();
+}
+
+DeliveryReport DeliveryLedger::reportLocked() const {
+    auto report = totals_;
+    for (const auto& [identifier, events] : onTheirWay_) addTo(report.pending, events);
+    return report;
+}
+
+DeliveryReport DeliveryLedger::report() const {
+    const std::lock_guard lock(mutex_);
+    return reportLocked();
+}
+
+DeliveryReport DeliveryLedger::wait(std::chrono::steady_clock::time_point deadline) const {
+    std::unique_lock lock(mutex_);
+    settled_.wait_until(lock, deadline, [&] { return onTheirWay_.empty(); });
+    return reportLocked();
+}
+
+}  // namespace corvane

@@ -1,0 +1,57 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Upload/DeliveryReport.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <cstdint>
+#include <map>
+#include <mutex>
+#include <string>
+#include <string_view>
+
+namespace corvane {
+
+/// The books of which document is still on its way, for whoever wants to wait for the last of them.
+///
+/// The batching processor enters a document before it hands it over, the upload manager says what became of it. Holds
+/// one entry per document on its way; settled ones are folded into totals. Safe from any thread; nothing but `wait`
+/// waits.
+class CORVANE_EXPORT DeliveryLedger {
+  public:
+    /// Each enumerator says what happens next with the document.
+    enum class Outcome {
+        delivered,  ///< nothing: the collector has it
+        pending,    ///< it goes out again when a manager for its endpoint is next opened
+        givenUp,    ///< nothing: it was refused or dropped
+    };
+
+    /// Enters a document that is about to be handed over. Entering one again changes nothing.
+    void add(std::string_view identifier, std::int64_t events);
+    /// Strikes out a document whose hand-over was refused. Harmless for one that is not there.
+    void remove(std::string_view identifier);
+    /// Enters a document of an earlier run, whose number of events is not known.
+    void resubmitted(std::string_view identifier) { add(identifier, 0); }
+    /// Settles a document, for good. Harmless for one that is not there.
+    void settle(std::string_view identifier, Outcome outcome);
+
+    /// How things stand; what is on its way counts as pending.
+    [[nodiscard]] DeliveryReport report() const;
+
+    /// Waits until every document that was entered is settled, and at most until `deadline`; returns how things stand
+    /// then. Documents entered meanwhile are waited for too.
+    ///
+    /// Requires: not on a queue that the settling needs: the access queue or a queue of the upload.
+    DeliveryReport wait(std::chrono::steady_clock::time_point deadline) const;
+
+  private:
+    [[nodiscard]] DeliveryReport reportLocked() const;
+
+    mutable std::mutex mutex_;
+    mutable std::condition_variable settled_;
+    std::map<std::string, std::int64_t, std::less<>> onTheirWay_;  // events by document identifier
+    DeliveryReport totals_;                                        // of settled documents
+};
+
+}  // namespace corvane

@@ -1,0 +1,27 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Platform/Error.h>
+
+#include <cstdint>
+
+namespace corvane {
+
+/// The compression of a payload failed. Domain "Corvane.GZIPError".
+class CORVANE_EXPORT GZIPError : public Error {
+  public:
+    enum Code {
+        failed = 0,  ///< zlib refused; see status()
+    };
+    /// @param status the status code that zlib returned.
+    GZIPError(Code code, std::int32_t status);
+    ~GZIPError() override;
+
+    [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
+    [[nodiscard]] std::int32_t status() const noexcept { return status_; }
+
+  private:
+    std::int32_t status_;
+};
+
+}  // namespace corvane

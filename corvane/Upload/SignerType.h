@@ -1,0 +1,20 @@
+#pragma once
+
+#include <corvane/Export.h>
+
+#include <string>
+#include <string_view>
+
+namespace corvane {
+
+/// Turns the body of an upload into the text of its signature header.
+class CORVANE_EXPORT SignerType {
+  public:
+    virtual ~SignerType();
+
+    /// The signature of `body` as text that a header can hold. Throws what the signing failed with; the upload then
+    /// goes out with the error in the header's place. May be called from several threads at once.
+    [[nodiscard]] virtual std::string sign(std::string_view body) = 0;
+};
+
+}  // namespace corvane

@@ -1,0 +1,33 @@
+#pragma once
+
+#include <corvane/Export.h>
+
+#include <filesystem>
+#include <optional>
+#include <string_view>
+
+namespace corvane {
+
+class ResourceType;
+struct UploadResponse;
+
+/// Holds one payload file per pending upload. The upload manager writes and removes the files, the transfer reads them,
+/// so all operations may be called from any thread.
+class CORVANE_EXPORT UploadDropboxType {
+  public:
+    virtual ~UploadDropboxType();
+
+    /// Keeps `data` as the payload of the upload `identifier`, in place of an earlier one, and returns its file.
+    /// `resource` is what the data was made from. Throws when the file cannot be written.
+    virtual std::filesystem::path write(std::string_view identifier, std::string_view data,
+                                        const ResourceType& resource) = 0;
+
+    /// Removes the payload of an upload that is over; `response` is what the collector answered, nothing when it was
+    /// given up. Throws when there is no such file or it cannot be removed.
+    virtual void finish(std::string_view identifier, const std::optional<UploadResponse>& response) = 0;
+
+    /// The payload file of an upload, if there is one.
+    [[nodiscard]] virtual std::optional<std::filesystem::path> existingFile(std::string_view identifier) = 0;
+};
+
+}  // namespace corvane

@@ -1,0 +1,228 @@
+#include <corvane/Upload/UploadManager.h>
+
+#include <corvane/Platform/Date.h>
+#include <corvane/Platform/Log.h>
+#include <corvane/Upload/UploadRequest.h>
+#include <corvane/Upload/gzip.h>
+
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+using Outcome = DeliveryLedger::Outcome;
+using Rows = Store<SignedEntity>;
+
+SignedEntity newEntity(const UploadRequest& request, std::string identifier) {
+    const auto date = now();
+    return {.identifier = std::move(identifier),
+            .createdDate = date,
+            .contentType = request.resource->contentType() + "; version=" + request.resource->version(),
+            .userAgent = request.client.identifier() + "/" + request.client.fullVersion(),
+            .retries = 0,
+            .retryAfterDate = date,
+            .signature = ""};
+}
+
+// A payload never is; a file that lost its contents would be taken for delivered by a server that accepts anything.
+bool isEmpty(const std::filesystem::path& file) {
+    std::error_code failed;
+    return std::filesystem::file_size(file, failed) == 0 && !failed;
+}
+
+PreparedUploadRequest prepared(const SignedEntity& entity, std::filesystem::path file) {
+    return {entity.identifier, entity.contentType, entity.userAgent, std::move(file)};
+}
+
+}  // namespace
+
+std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServiceType> service,
+                                                     std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
+                                                     std::shared_ptr<UploadDropboxType> dropbox,
+                                                     std::shared_ptr<DeliveryLedger> ledger) {
+    std::shared_ptr<UploadManager> manager(
+        new UploadManager(std::move(service), std::move(deferredStore), std::move(dropbox), std::move(ledger)));
+    manager->service_->setDelegate(manager);
+    return manager;
+}
+
+UploadManager::UploadManager(std::shared_ptr<UploadServiceType> service,
+                             std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
+                             std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger)
+    : service_(std::move(service)),
+      deferredStore_(std::move(deferredStore)),
+      dropbox_(std::move(dropbox)),
+      ledger_(std::move(ledger)) {}
+
+UploadManager::~UploadManager() = default;
+
+void UploadManager::open() {
+    Log::shared().default_("Open upload manager");
+    try {
+        deferredStore_->perform([](Rows& rows) {
+            rows.open();
+            rows.createTable();
+        });
+    } catch (...) {
+        Log::shared().error("Failed to open and create our table, error=%{public}@", AnyError::current().what());
+    }
+    queue_.sync([this] {
+        queue_.assertCurrent("UploadManager::open");
+        requeueCancelledRequests();
+    });
+}
+
+void UploadManager::close() {
+    Log::shared().default_("Close upload manager");
+    try {
+        deferredStore_->perform([](Rows& rows) { rows.close(); });
+    } catch (...) {
+        Log::shared().error("Failed to close database, error=%{public}@", AnyError::current().what());
+    }
+}
+
+void UploadManager::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
+    service_->registerAccessQueue(std::move(queue));
+}
+
+bool UploadManager::shouldResume(std::string_view identifier, std::function<void()> completion) {
+    return service_->shouldResume(identifier, std::move(completion));
+}
+
+void UploadManager::upload(const UploadRequest& request) {
+    queue_.sync([this, &request] {
+        queue_.assertCurrent("UploadManager::upload");
+        uploadOnQueue(request);
+    });
+}
+
+void UploadManager::uploadOnQueue(const UploadRequest& request) {
+    const auto& resource = *request.resource;
+    auto identifier = resource.identifier();
+    Log::shared().default_("Creating upload task, identifier=%{public}@", identifier);
+    auto file = dropbox_->write(identifier, gzipCompressed(resource.jsonObject().toData()), resource);
+    const auto entity = newEntity(request, std::move(identifier));
+    try {
+        insertRow(entity);
+    } catch (...) {
+        // The row only matters if this attempt fails.
+    }
+    service_->submit(prepared(entity, std::move(file)));
+}
+
+void UploadManager::requeueCancelledRequests() {
+    if (std::exchange(retriedIncompleteRequests_, true)) return;
+    try {
+        retryStoredRequests();
+    } catch (...) {
+        Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", AnyError::current().what());
+    }
+}
+
+void UploadManager::retryStoredRequests() {
+    auto entities = deferredStore_->perform([](Rows& rows) { return rows.fetchAll(); });
+    std::vector<SignedEntity> kept;
+    for (auto& entity : entities) {
+        if (ledger_) ledger_->resubmitted(entity.identifier);
+        if (entity.retries > maximumRetries) {
+            dropExceeded(entity);
+        } else {
+            kept.push_back(std::move(entity));
+        }
+    }
+    std::vector<PreparedUploadRequest> requests;
+    for (const auto& entity : kept) {
+        if (auto request = preparedRequest(entity)) requests.push_back(*std::move(request));
+    }
+    service_->resubmit(std::move(requests));
+}
+
+void UploadManager::dropExceeded(const SignedEntity& entity) {
+    Log::shared().default_("Retry dropped for exceeding allowed attempts, identifier=%{public}@", entity.identifier);
+    try {
+        deleteRow(entity.identifier);
+        dropbox_->finish(entity.identifier, std::nullopt);
+    } catch (...) {
+        Log::shared().error(
+            "Failed to cleanup request that exceeded allowed attempts, identifier=%{public}@, error=%{public}@",
+            entity.identifier, AnyError::current().what());
+    }
+    settle(entity.identifier, Outcome::givenUp);
+}
+
+std::optional<PreparedUploadRequest> UploadManager::preparedRequest(const SignedEntity& entity) {
+    auto file = dropbox_->existingFile(entity.identifier);
+    if (file && !isEmpty(*file)) return prepared(entity, *std::move(file));
+    Log::shared().default_("Retry dropped for missing upload file, identifier=%{public}@", entity.identifier);
+    try {
+        deleteRow(entity.identifier);
+        if (file) dropbox_->finish(entity.identifier, std::nullopt);
+    } catch (...) {
+        Log::shared().error(
+            "Failed to cleanup request from db missing upload file, identifier=%{public}@, error=%{public}@",
+            entity.identifier, AnyError::current().what());
+    }
+    settle(entity.identifier, Outcome::givenUp);
+    return std::nullopt;
+}
+
+void UploadManager::uploadService(UploadServiceType&, const UploadResult& result) {
+    if (const auto* retry = std::get_if<UploadResult::Retry>(&result.value)) {
+        didFailForNow(*retry);
+    } else if (const auto* success = std::get_if<UploadResult::Success>(&result.value)) {
+        didFinish(success->identifier, success->response, Outcome::delivered);
+    } else if (const auto* failed = std::get_if<UploadResult::Failed>(&result.value)) {
+        didFinish(failed->identifier, failed->response, Outcome::givenUp);
+    }
+}
+
+void UploadManager::didFinish(const std::string& identifier, const UploadResponse& response, Outcome outcome) {
+    try {
+        deleteRow(identifier);
+        dropbox_->finish(identifier, response);
+    } catch (...) {
+        Log::shared().error(
+            "Completed upload but failed to cleanup tracking data, identifier=%{public}@, error=%{public}@", identifier,
+            AnyError::current().what());
+    }
+    settle(identifier, outcome);
+}
+
+void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
+    bool goesOutAgain = true;
+    try {
+        goesOutAgain = markRetry(retry);
+    } catch (...) {
+        Log::shared().error("Failed to mark retry, identifier=%{public}@, error=%{public}@", retry.identifier,
+                            AnyError::current().what());
+    }
+    settle(retry.identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp);
+}
+
+bool UploadManager::markRetry(const UploadResult::Retry& retry) {
+    // One turn on the store's queue: the count must not be read before and written after another's.
+    return deferredStore_->perform([&](Rows& rows) {
+        auto found = rows.fetchWhere("identifier", retry.identifier);
+        if (found.empty()) return false;
+        auto& entity = found.front();
+        ++entity.retries;
+        entity.retryAfterDate = retry.after;
+        rows.insert(entity);
+        return true;
+    });
+}
+
+void UploadManager::insertRow(const SignedEntity& entity) {
+    deferredStore_->perform([&](Rows& rows) { rows.insert(entity); });
+}
+
+void UploadManager::deleteRow(const std::string& identifier) {
+    deferredStore_->perform([&](Rows& rows) { rows.deleteWhere("identifier", identifier); });
+}
+
+void UploadManager::settle(const std::string& identifier, Outcome outcome) {
+    if (ledger_) ledger_->settle(identifier, outcome);
+}
+
+}  // namespace corvane

@@ -1,0 +1,93 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Platform/SerialQueue.h>
+#include <corvane/Store/DeferredStore.h>
+#include <corvane/Upload/DeliveryLedger.h>
+#include <corvane/Upload/PreparedUploadRequest.h>
+#include <corvane/Upload/SignedEntity.h>
+#include <corvane/Upload/UploadDropboxType.h>
+#include <corvane/Upload/UploadManagerType.h>
+#include <corvane/Upload/UploadResult.h>
+#include <corvane/Upload/UploadServiceDelegate.h>
+#include <corvane/Upload/UploadServiceType.h>
+
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace corvane {
+
+/// Keeps the books of uploads: a row in the database and a payload file for each, from the moment a document is taken
+/// over until the collector has it, refuses it, or has been tried too often.
+///
+/// One per batching processor, which owns it; the service holds it weakly as its delegate, and what ends after it has
+/// gone is found by the next manager. Rows and files outlive the process. An upload that ends with a retry stays, and
+/// goes out again when a manager for its endpoint is next opened; one that was retried more than four times, or whose
+/// file has gone or lost its contents, is dropped then.
+///
+/// `open` and `upload` run on the manager's own queue, in the caller's time, and use the deferred store from there;
+/// results are handled where they arrive. States: built, opened (what was left over has been sent again, once), closed;
+/// uploads work in each of them.
+class CORVANE_EXPORT UploadManager final : public UploadManagerType,
+                                           public UploadServiceDelegate,
+                                           public std::enable_shared_from_this<UploadManager> {
+  public:
+    /// An upload whose row counts more retries than this is not sent again.
+    static constexpr std::int64_t maximumRetries = 4;
+
+    /// Makes a manager and sets it as the service's delegate. No argument but `ledger` may be empty.
+    [[nodiscard]] static std::shared_ptr<UploadManager> create(
+        std::shared_ptr<UploadServiceType> service, std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
+        std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger = nullptr);
+    ~UploadManager() override;
+
+    /// Opens the store, creates the table, and the first time sends again what is stored. Requires: not on the
+    /// manager's queue or the store's.
+    void open() override;
+    void close() override;
+    void registerAccessQueue(std::shared_ptr<SerialQueue> queue) override;
+    /// Throws what the encoding, the compression or the payload file failed with; there is then no row. That the row
+    /// cannot be written is no reason not to send. Requires: not on the manager's queue or the store's.
+    void upload(const UploadRequest& request) override;
+    bool shouldResume(std::string_view identifier, std::function<void()> completion) override;
+
+    /// Deletes row and file of an upload that is over, or counts a retry.
+    void uploadService(UploadServiceType& service, const UploadResult& result) override;
+
+  private:
+    UploadManager(std::shared_ptr<UploadServiceType> service,
+                  std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
+                  std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger);
+
+    void uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(queue_);
+    void requeueCancelledRequests() CORVANE_REQUIRES(queue_);
+    void retryStoredRequests() CORVANE_REQUIRES(queue_);
+    /// Deletes the row and the file of an upload that was retried too often.
+    void dropExceeded(const SignedEntity& entity);
+    /// The row's request, or nothing when its payload file has gone or is empty; the row is then deleted.
+    [[nodiscard]] std::optional<PreparedUploadRequest> preparedRequest(const SignedEntity& entity);
+
+    void didFinish(const std::string& identifier, const UploadResponse& response, DeliveryLedger::Outcome outcome);
+    void didFailForNow(const UploadResult::Retry& retry);
+    /// Counts a retry in the row. Returns false when there is no row.
+    bool markRetry(const UploadResult::Retry& retry);
+
+    void insertRow(const SignedEntity& entity);
+    void deleteRow(const std::string& identifier);
+    void settle(const std::string& identifier, DeliveryLedger::Outcome outcome);
+
+    const std::shared_ptr<UploadServiceType> service_;
+    const std::shared_ptr<DeferredStore<SignedEntity>> deferredStore_;
+    const std::shared_ptr<UploadDropboxType> dropbox_;
+    const std::shared_ptr<DeliveryLedger> ledger_;
+
+    SerialQueue queue_{"com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background};
+    bool retriedIncompleteRequests_ CORVANE_GUARDED_BY(queue_) = false;
+};
+
+}  // namespace corvane

@@ -1,0 +1,35 @@
+#pragma once
+
+#include <corvane/Export.h>
+
+#include <functional>
+#include <memory>
+#include <string_view>
+
+namespace corvane {
+
+class SerialQueue;
+struct UploadRequest;
+
+/// Takes documents for upload and sees to it that each reaches the collector, is refused by it, or is given up after
+/// too many attempts, over restarts of the process too.
+///
+/// Owned by the batching processor, which calls everything here on the access queue, one call at a time.
+class CORVANE_EXPORT UploadManagerType {
+  public:
+    virtual ~UploadManagerType();
+
+    /// Gets ready for uploads, and the first time sends again what earlier runs left unfinished. Failures are logged.
+    virtual void open() = 0;
+    /// Lets go of the database until it is needed again. Uploads that are running go on. Failures are logged.
+    virtual void close() = 0;
+    /// The queue on which the results of uploads arrive. Called before the first upload.
+    virtual void registerAccessQueue(std::shared_ptr<SerialQueue> queue) = 0;
+    /// Takes a document over: when the call returns it is on disk and its upload has been started. Throws when the
+    /// document cannot be encoded, compressed or written; it is then not taken over.
+    virtual void upload(const UploadRequest& request) = 0;
+    /// Offers a background wake-up: see `UploadServiceType::shouldResume`.
+    virtual bool shouldResume(std::string_view identifier, std::function<void()> completion) = 0;
+};
+
+}  // namespace corvane

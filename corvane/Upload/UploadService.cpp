@@ -1,0 +1,290 @@
+#include <corvane/Upload/UploadService.h>
+
+#include <corvane/Platform/Bundle.h>
+#include <corvane/Platform/DocumentsDirectory.h>
+#include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/JSONText.h>
+#include <corvane/Platform/Log.h>
+#include <corvane/Platform/MainQueue.h>
+#include <corvane/Platform/PrivateFile.h>
+#include <corvane/Platform/Require.h>
+#include <corvane/Upload/PreparedUploadRequest.h>
+#include <corvane/Upload/UploadServiceDelegate.h>
+
+#include <algorithm>
+#include <set>
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+constexpr const char* unknown = "unknown";
+
+// Text that stays in its header whatever it says.
+std::string headerText(std::string text) {
+    std::replace_if(
+        text.begin(), text.end(), [](char c) { return c == '\r' || c == '\n' || c == '\0'; }, ' ');
+    return text;
+}
+
+using jsontext::isUTF8;
+
+UploadResponse uploadResponse(const TransferResponse& response) {
+    UploadResponse made{response.statusCode, response.headers};
+    const bool readable = std::all_of(made.headers.begin(), made.headers.end(),
+                                      [](const auto& header) { return isUTF8(header.first) && isUTF8(header.second); });
+    if (!readable) made.headers.clear();
+    return made;
+}
+
+}  // namespace
+
+UploadService::Verdict UploadService::classify(std::int64_t statusCode) noexcept {
+    if (statusCode >= 200 && statusCode <= 299) return Verdict::delivered;
+    if (statusCode == 401) return Verdict::unauthorized;
+    if (statusCode == 429 || statusCode >= 500) return Verdict::unavailable;
+    if (statusCode >= 400) return Verdict::refused;
+    return Verdict::unhandled;
+}
+
+std::string UploadService::ownerKey(const Endpoint& endpoint) {
+    std::string application = Bundle::main().entry(Bundle::identifierKey).value_or("");
+    if (application.empty()) application = executablePath().filename().string();
+    std::string documents;
+    try {
+        documents = DocumentsDirectory::path().string();
+    } catch (const Error&) {  // without a directory there is nothing to tell apart by it
+    }
+    return application + '\n' + documents + '\n' + DocumentsDirectory::fileNamePart(endpoint.name());
+}
+
+UploadService::UploadService(Endpoint endpoint, std::shared_ptr<SignerType> signer, TransferSession::Factory factory)
+    : endpoint_(endpoint),
+      signer_(std::move(signer)),
+      factory_(factory ? std::move(factory) : &TransferSession::make),
+      lazyURLSession_([this] { return openSession(); }) {
+    if (!signer_) throw InvalidArgument("an upload service needs a signer");
+}
+
+UploadService::~UploadService() {
+    if (backgroundCompletions_.empty()) return;
+    MainQueue::async([completions = std::move(backgroundCompletions_)] { invoke(completions); });
+}
+
+void UploadService::setDelegate(std::weak_ptr<UploadServiceDelegate> delegate) {
+    std::lock_guard lock(mutex_);
+    delegate_ = std::move(delegate);
+}
+
+void UploadService::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
+    std::lock_guard lock(mutex_);
+    accessQueue_ = std::move(queue);
+}
+
+std::shared_ptr<TransferSession> UploadService::openSession() {
+    const std::string identifier(sessionIdentifier);
+    Log::shared().default_("Upload session configuration will be created, identifier=%{public}@", identifier);
+    TransferSessionConfiguration configuration;
+    configuration.identifier = identifier;
+    configuration.ownerKey = ownerKey(endpoint_);
+    configuration.relaunchesForEvents = true;
+    configuration.discretionary = true;
+    configuration.sharedContainerIdentifier = endpoint_.sharedContainerIdentifier();
+    std::shared_ptr<SerialQueue> queue;
+    {
+        std::lock_guard lock(mutex_);
+        queue = accessQueue_;
+    }
+    CORVANE_REQUIRE(!weak_from_this().expired(), "an upload service must be made with std::make_shared");
+    auto opened = factory_(std::move(configuration), weak_from_this(), std::move(queue));
+    if (!opened) throw InvalidArgument("the transfer session factory returned nothing");
+    opened->setDescription(identifier);
+    Log::shared().default_("Upload session configuration has been created, identifier=%{public}@", identifier);
+    return opened;
+}
+
+// The session, or nothing when it could not be opened.
+std::shared_ptr<TransferSession> UploadService::session() noexcept {
+    try {
+        return lazyURLSession_.value();
+    } catch (...) {
+        Log::shared().error("Upload session could not be created, error=%{public}@", AnyError::current().what());
+        return nullptr;
+    }
+}
+
+void UploadService::submit(const PreparedUploadRequest& request) {
+    if (const auto opened = session()) submit(*opened, request);
+}
+
+void UploadService::submit(TransferSession& session, const PreparedUploadRequest& request) {
+    const std::string signatureText = signature(request.dataFileURL);
+    const auto task = session.uploadTask({.url = endpoint_.url(),
+                                          .method = "PUT",
+                                          .headers = {{"Content-Type", headerText(request.contentType)},
+                                                      {"User-Agent", headerText(request.userAgent)},
+                                                      {"Content-Encoding", "gzip"},
+                                                      {"X-Veskar-ActionSignature", signatureText}}},
+                                         request.dataFileURL);
+    task->setDescription(request.identifier);
+    task->resume();
+    Log::shared().default_("Upload task submitted, identifier=%{public}@, urlSessionTaskID=%{public}@, signature=%@",
+                           request.identifier, urlSessionTaskID(*task), signatureText);
+}
+
+std::string UploadService::signature(const std::filesystem::path& file) {
+    try {
+        return headerText(signer_->sign(readWholeFile(file)));
+    } catch (...) {
+        return headerText("SigningFailure=" + std::string(AnyError::current().what()));
+    }
+}
+
+void UploadService::resubmit(std::vector<PreparedUploadRequest> requests) {
+    if (requests.empty()) return;
+    const auto opened = session();
+    if (!opened) return;
+    opened->tasks([weak = weak_from_this(), requests = std::move(requests)](const auto& tasks) {
+        if (const auto service = weak.lock()) service->resubmit(requests, tasks);
+    });
+}
+
+void UploadService::resubmit(const std::vector<PreparedUploadRequest>& requests,
+                             const std::vector<std::shared_ptr<TransferTask>>& tasks) {
+    std::set<std::string> inFlight;
+    for (const auto& task : tasks) {
+        if (task->state() != TransferTask::State::running) continue;
+        if (auto identifier = task->description()) inFlight.insert(*std::move(identifier));
+    }
+    for (const auto& request : requests) {
+        Log::shared().default_("Attempting resubmission of request, identifier=%{public}@", request.identifier);
+        if (inFlight.contains(request.identifier)) {
+            Log::shared().default_("Resubmission of request cancelled. Already in flight, identifier=%{public}@",
+                                   request.identifier);
+        } else {
+            submit(request);
+        }
+    }
+}
+
+void UploadService::taskDidSendBodyData(const TransferTask& task, std::int64_t sent, std::int64_t total,
+                                        std::int64_t expected) {
+    Log::shared().default_(
+        "Upload sent data, identifier=%{public}@, urlSessionTaskID=%{public}@, sent=%@, total=%@, expected=%@",
+        task.description().value_or(unknown), urlSessionTaskID(task), std::to_string(sent), std::to_string(total),
+        std::to_string(expected));
+}
+
+void UploadService::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
+                                    const std::optional<TransferResponse>& response) {
+    const UploadResult ending = result(task, error, response);
+    std::shared_ptr<UploadServiceDelegate> delegate;
+    {
+        std::lock_guard lock(mutex_);
+        delegate = delegate_.lock();
+    }
+    if (delegate) delegate->uploadService(*this, ending);
+}
+
+UploadResult UploadService::result(const TransferTask& task, const std::optional<AnyError>& error,
+                                   const std::optional<TransferResponse>& response) {
+    const std::string identifier = task.description().value_or(unknown);
+    const std::string taskID = urlSessionTaskID(task);
+    if (error) {
+        Log::shared().error("Upload failed, identifier=%{public}@, urlSessionTaskID=%{public}@, error=%{public}@",
+                            identifier, taskID, error->what());
+        return UploadResult::retry(identifier, now());
+    }
+    if (!response || !response->isHTTP) {
+        Log::shared().default_("Upload unknown state, identifier=%{public}@, urlSessionTaskID=%{public}@", identifier,
+                               taskID);
+        return UploadResult::retry(identifier, now());
+    }
+    return result(identifier, taskID, uploadResponse(*response));
+}
+
+UploadResult UploadService::result(const std::string& identifier, const std::string& taskID, UploadResponse response) {
+    auto& log = Log::shared();
+    const auto status = response.statusCode;
+    const auto text = response.description();
+    switch (classify(status)) {
+        case Verdict::delivered:
+            log.default_(
+                "Upload completed successfully, identifier=%{public}@, urlSessionTaskID=%{public}@, status=%ld, "
+                "uploadResponse=%@",
+                identifier, taskID, status, text);
+            return UploadResult::success(identifier, std::move(response));
+        case Verdict::unauthorized:
+            log.default_(
+                "Upload HTTP failed authorization, and will retry, identifier=%{public}@, "
+                "urlSessionTaskID=%{public}@, status=%ld, uploadResponse=%@",
+                identifier, taskID, status, text);
+            return UploadResult::retry(identifier, now());
+        case Verdict::refused:
+            log.default_(
+                "Upload HTTP failed and won't retry, identifier=%{public}@, urlSessionTaskID=%{public}@, "
+                "status=%ld, uploadResponse=%@",
+                identifier, taskID, status, text);
+            return UploadResult::failed(identifier, std::move(response));
+        case Verdict::unavailable:
+            log.default_("Upload HTTP failed, identifier=%{public}@, urlSessionTaskID=%{public}@, statusCode=%ld",
+                         identifier, taskID, status);
+            return UploadResult::retry(identifier, now());
+        case Verdict::unhandled:
+            break;
+    }
+    log.default_(
+        "Upload HTTP failed and unhandled. No retry, identifier=%{public}@, urlSessionTaskID=%{public}@, "
+        "statusCode=%ld, uploadResponse=%@",
+        identifier, taskID, status, text);
+    return UploadResult::failed(identifier, std::move(response));
+}
+
+std::string UploadService::urlSessionTaskID(const TransferTask& task) {
+    const auto opened = session();
+    const auto description = opened ? opened->description() : std::nullopt;
+    return "<" + description.value_or("") + ">.<" + std::to_string(task.identifier()) + ">";
+}
+
+bool UploadService::shouldResume(std::string_view identifier, std::function<void()> completion) {
+    const auto opened = session();
+    const bool resumes = opened && opened->description() == identifier;
+    std::size_t waiting = 0;
+    {
+        std::lock_guard lock(mutex_);
+        waiting = backgroundCompletions_.size();
+        if (resumes && completion) backgroundCompletions_.push_back(std::move(completion));
+    }
+    Log::shared().default_("Should resume session? identifier=%{public}@, result=%d, numberOfCompletions=%ld",
+                           identifier, resumes, waiting);
+    if (resumes) opened->deliverPendingEvents();
+    return resumes;
+}
+
+void UploadService::allEventsDelivered() {
+    const auto opened = session();
+    const auto description = opened ? opened->description() : std::nullopt;
+    const std::string name = description.value_or(unknown);
+    Log::shared().default_("Upload finished for background session, identifier=%{public}@", name);
+    MainQueue::async([self = shared_from_this(), name] { self->invokeBackgroundCompletions(name); });
+}
+
+// Taken off the list first, so that each is called once, whatever the completions do.
+void UploadService::invokeBackgroundCompletions(const std::string& session) {
+    Completions completions;
+    {
+        std::lock_guard lock(mutex_);
+        completions.swap(backgroundCompletions_);
+    }
+    Log::shared().default_(
+        "Upload invoking background completions for session, identifier=%{public}@, numberOfCompletions=%ld", session,
+        completions.size());
+    invoke(completions);
+}
+
+void UploadService::invoke(const Completions& completions) noexcept {
+    for (const auto& completion : completions) callHost("background completion", completion);
+}
+
+}  // namespace corvane

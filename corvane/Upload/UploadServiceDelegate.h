@@ -1,0 +1,20 @@
+#pragma once
+
+#include <corvane/Export.h>
+
+namespace corvane {
+
+class UploadServiceType;
+struct UploadResult;
+
+/// Whoever keeps the books of an upload service's uploads: the upload manager. The service holds it weakly.
+class CORVANE_EXPORT UploadServiceDelegate {
+  public:
+    virtual ~UploadServiceDelegate();
+
+    /// Called once for every upload that ended, on the queue that was registered with the service. It runs its database
+    /// work where it is called, and reports failures to the log; it does not throw.
+    virtual void uploadService(UploadServiceType& service, const UploadResult& result) = 0;
+};
+
+}  // namespace corvane

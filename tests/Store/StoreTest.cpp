@@ -1,0 +1,155 @@
+#include <corvane/Platform/DocumentsDirectory.h>
+
+#include <gtest/gtest.h>
+
+#include "tests/Store/Note.h"
+#include "tests/support/TemporaryDocuments.h"
+
+namespace corvane::test {
+namespace {
+
+template <class Function>
+StoreError thrownBy(Function&& function) {
+    try {
+        function();
+    } catch (const StoreError& error) {
+        return error;
+    }
+    ADD_FAILURE() << "nothing was thrown";
+    return StoreError::makeMissingHandle();
+}
+
+const Note apple{.identifier = "a", .count = 1, .weight = 0.5, .body = std::string("\0x", 2), .remark = "it's ripe"};
+const Note pear{.identifier = "p", .count = -2};
+
+TEST(StoreTable, StatementsAreExact) {
+    const auto& table = Store<Note>::table();
+    EXPECT_EQ(table.createSQL(),
+              "CREATE TABLE IF NOT EXISTS notes (identifier TEXT NOT NULL, count INTEGER NOT NULL, weight DOUBLE NOT "
+              "NULL, body DATA, remark TEXT, PRIMARY KEY (identifier));");
+    EXPECT_EQ(table.dropSQL(), "DROP TABLE IF EXISTS notes;");
+    EXPECT_EQ(table.insertSQL({"a", 1, 2.0, StorableValue::bytes("z"), StorableValue::absent()}),
+              "INSERT OR REPLACE INTO notes (identifier, count, weight, body, remark) VALUES ('a', 1, 2.0, x'7a', "
+              "NULL);");
+    EXPECT_EQ(table.selectSQL(), "SELECT * FROM notes;");
+    EXPECT_EQ(table.selectSQL("identifier", "a'b"), "SELECT * FROM notes WHERE identifier = 'a''b';");
+    EXPECT_EQ(table.deleteSQL("count", 4), "DELETE FROM notes where count = 4;");
+}
+
+TEST(Store, KeepsOneRowPerKeyAndFindsRowsByColumn) {
+    Store<Note> store(StoreLocation::memory());
+    store.createTable();
+    EXPECT_TRUE(store.fetchAll().empty());
+    store.insert(apple);
+    store.insert(pear);
+    auto riper = apple;
+    riper.remark.reset();
+    store.insert(riper);
+
+    EXPECT_EQ(store.fetchAll().size(), 2U);
+    EXPECT_EQ(store.fetchWhere("identifier", "a"), std::vector{riper});
+    EXPECT_EQ(store.fetchWhere("count", -2), std::vector{pear});
+    store.deleteWhere("identifier", "no such key");
+    store.deleteWhere("identifier", "a");
+    EXPECT_EQ(store.fetchAll(), std::vector{pear});
+}
+
+TEST(Store, AClosedStoreOpensForOneStatement) {
+    const TemporaryDocuments documents;
+    Store<Note> store(StoreLocation::default_("main"));
+    EXPECT_TRUE(store.isOpen());
+    store.createTable();
+    store.close();
+    store.close();
+    store.insert(apple);
+    EXPECT_FALSE(store.isOpen());
+    EXPECT_THROW(static_cast<void>(store.fetchWhere("no such column", 1)), StoreError);
+    EXPECT_FALSE(store.isOpen());
+    store.open();
+    EXPECT_EQ(store.fetchAll(), std::vector{apple});
+    EXPECT_TRUE(store.isOpen());
+}
+
+TEST(Store, AMemoryStoreKeepsItsRowsWhenItIsClosed) {
+    Store<Note> store(StoreLocation::memory());
+    store.createTable();
+    store.insert(apple);
+    store.close();
+    EXPECT_EQ(store.fetchAll(), std::vector{apple});
+}
+
+TEST(Store, FilesAreNamedAfterTheLocationAndArePrivate) {
+    const TemporaryDocuments documents;
+    DocumentsDirectory::set(documents / "made on demand 100%");
+    Store<Note> store(StoreLocation::default_(" Main Store\n"));
+    store.createTable();
+    store.insert(apple);
+    const auto directory = documents / "made on demand 100%";
+    const auto file = directory / "com.veskar.corvane.main store.db";
+    EXPECT_EQ(permissions(directory), 0700U);
+    EXPECT_EQ(permissions(file), 0600U);
+    EXPECT_EQ(permissions(file.string() + "-wal"), 0600U);
+    EXPECT_EQ(permissions(file.string() + "-shm"), 0600U);
+    EXPECT_EQ(Store<Note>(StoreLocation::default_("MAIN STORE")).fetchAll(), std::vector{apple});
+}
+
+TEST(Store, SaysWhereItCannotOpen) {
+    const TemporaryDocuments documents;
+    std::filesystem::create_directories(documents / "com.veskar.corvane.taken.db");
+    for (const char* name : {"taken", "../outside", ""}) {
+        const auto location = StoreLocation::default_(name);
+        const auto error = thrownBy([&] { const Store<Note> store(location); });
+        EXPECT_EQ(error.value(), StoreError::cantOpen);
+        EXPECT_EQ(error.location(), location);
+    }
+    writeFile(documents / "file", "");
+    DocumentsDirectory::set(documents / "file");
+    EXPECT_EQ(thrownBy([] { const Store<Note> store(StoreLocation::default_("main")); }).value(), StoreError::cantOpen);
+}
+
+TEST(Store, FailedStatementsCarryTheirTextAndKeepDataOutOfTheMessage) {
+    Store<Note> store(StoreLocation::memory());
+    const auto unprepared = thrownBy([&] { store.insert(apple); });
+    EXPECT_EQ(unprepared.value(), StoreError::prepare);
+    EXPECT_NE(unprepared.sql().find("it''s ripe"), std::string::npos);
+    EXPECT_EQ(std::string(unprepared.what()).find("ripe"), std::string::npos);
+
+    StoreConnection connection(StoreLocation::memory());
+    connection.run("CREATE TABLE t (x TEXT NOT NULL);");
+    const auto unexecuted = thrownBy([&] { connection.run("INSERT INTO t VALUES (NULL);"); });
+    EXPECT_EQ(unexecuted.value(), StoreError::execute);
+    EXPECT_EQ(unexecuted.sql(), "INSERT INTO t VALUES (NULL);");
+}
+
+TEST(Store, ARowThatCannotBeReadFailsTheQuery) {
+    Store<Note> store(StoreLocation::memory());
+    store.createTable();
+    store.insert(apple);
+    store.insert({.identifier = "b", .body = ""});
+    try {
+        static_cast<void>(store.fetchAll());
+        FAIL();
+    } catch (const StoreStepper::Errors& error) {
+        EXPECT_EQ(error.value(), StoreStepper::Errors::badColumn);
+    }
+    store.dropTable();  // the failed query holds nothing
+    store.dropTable();
+}
+
+TEST(StoreStepper, AReadTakesItsColumnWhetherItFailsOrNot) {
+    StoreStepper nowhere(nullptr);
+    EXPECT_THROW(static_cast<void>(nowhere.integer()), StoreStepperError);
+    EXPECT_EQ(nowhere.index(), 1);
+
+    StoreConnection connection(StoreLocation::memory());
+    connection.query("SELECT NULL, 'text', NULL, x'', 1.5;", [](StoreStepper& stepper) {
+        EXPECT_THROW(static_cast<void>(stepper.text()), StoreStepperError);
+        EXPECT_EQ(stepper.text(), "text");
+        EXPECT_EQ(stepper.optionalText(), std::nullopt);
+        EXPECT_THROW(static_cast<void>(stepper.bytes()), StoreStepperError);
+        EXPECT_EQ(stepper.double_(), 1.5);
+    });
+}
+
+}  // namespace
+}  // namespace corvane::test

@@ -1,0 +1,42 @@
+#include <corvane/Platform/Error.h>
+#include <corvane/Upload/Endpoint.h>
+#include <corvane/Upload/UploadResponse.h>
+
+#include <gtest/gtest.h>
+
+namespace corvane::test {
+namespace {
+
+TEST(Endpoint, RefusesWhatBreaksOutOfARequestOrOfItsDirectory) {
+    const std::string good = "https://collector.example.com/events";
+    for (const std::string url : {"", "https://a b", "https://a\r\nX: y", "https://a\x7f"}) {
+        EXPECT_THROW(Endpoint(url, "main"), InvalidArgument) << url;
+    }
+    for (const std::string name : {"", " \n", "..", "a/b"}) EXPECT_THROW(Endpoint(good, name), InvalidArgument) << name;
+    EXPECT_EQ(Endpoint(good, "main").sharedContainerIdentifier(), std::nullopt);
+}
+
+TEST(Endpoint, AHostsOwnIsReadOnceAndCheckedAlike) {
+    struct Computed final : EndpointType {
+        mutable int reads = 0;
+        std::string target = "https://collector.example.com";
+        [[nodiscard]] std::string url() const override { return ++reads, target; }
+        [[nodiscard]] std::string name() const override { return "main"; }
+        [[nodiscard]] std::optional<std::string> sharedContainerIdentifier() const override { return "group"; }
+    } computed;
+    const auto endpoint = Endpoint::copyOf(computed);
+    EXPECT_EQ(endpoint.url(), computed.target);
+    EXPECT_EQ(endpoint.sharedContainerIdentifier(), "group");
+    EXPECT_EQ(computed.reads, 1);
+    computed.target = "\n";
+    EXPECT_THROW(static_cast<void>(Endpoint::copyOf(computed)), InvalidArgument);
+}
+
+TEST(UploadResponse, IsWrittenAsJSONAndDescribed) {
+    const UploadResponse response{429, {{"Retry-After", "\"1\""}}};
+    EXPECT_EQ(response.jsonText(), R"({"statusCode":429,"headers":{"Retry-After":"\"1\""}})");
+    EXPECT_EQ(UploadResponse{200}.description(), "UploadResponse(statusCode: 200, headers: [:])");
+}
+
+}  // namespace
+}  // namespace corvane::test

@@ -1,0 +1,143 @@
+#include <corvane/Platform/Bytes.h>
+#include <corvane/Platform/FileSigningService.h>
+#include <corvane/Platform/SigningError.h>
+#include <corvane/Upload/OstrelSigner.h>
+
+#include <gtest/gtest.h>
+
+#include <future>
+#include <set>
+
+#include "tests/support/CapturedLog.h"
+#include "tests/support/Documents.h"
+#include "tests/support/TemporaryDocuments.h"
+
+namespace corvane::test {
+namespace {
+
+const std::string emptySHA1 = "da39a3ee5e6b4b0d3255bfef95601890afd80709";
+
+class FakeSigningService final : public SigningServiceType {
+  public:
+    explicit FakeSigningService(std::string signature) : signature_(std::move(signature)) {}
+    std::string sign(std::string_view digest) override {
+        digests.push_back(hexString(digest));
+        if (signature_.empty()) throw SigningError(SigningError::failed, "no hardware");
+        return signature_;
+    }
+    std::vector<std::string> digests;
+
+  private:
+    std::string signature_;
+};
+
+class SharedSigningService {
+  public:
+    explicit SharedSigningService(std::shared_ptr<SigningServiceType> service) {
+        SigningServiceType::setShared(std::move(service));
+    }
+    ~SharedSigningService() { SigningServiceType::setShared(nullptr); }
+};
+
+TEST(Bytes, AreWrittenInHexAndBase64) {
+    EXPECT_EQ(hexString(std::string("\x00\x0f\xa0", 3)), "000fa0");
+    const std::pair<std::string, std::string> cases[] = {{"", ""}, {"f", "Zg=="}, {"fo", "Zm8="}, {"foo", "Zm9v"}};
+    for (const auto& [bytes, text] : cases) EXPECT_EQ(base64String(bytes), text);
+    EXPECT_EQ(base64String(std::string(64, '\xff')).size(), 88U);
+}
+
+TEST(OstrelSigner, SignsTheDigestAndLogsEachStep) {
+    const CapturedLog log;
+    const auto service = std::make_shared<FakeSigningService>(std::string("\x00\xff", 2));
+    const SharedSigningService shared(service);
+    OstrelSigner signer;
+    EXPECT_EQ(signer.sign(""), "AP8=");
+    EXPECT_EQ(service->digests, std::vector{emptySHA1});
+    EXPECT_TRUE(log.has(LogLevel::debug, "Generated SHA1 from data, SHA1=" + emptySHA1));
+    EXPECT_TRUE(log.has(LogLevel::debug, "Generated signature from SHA1, signature=00ff"));
+    EXPECT_TRUE(log.has(LogLevel::debug, "Generated base64 from signature, base64=AP8="));
+}
+
+TEST(OstrelSigner, PassesTheServicesErrorOn) {
+    const CapturedLog log;
+    const SharedSigningService shared(std::make_shared<FakeSigningService>(""));
+    OstrelSigner signer;
+    EXPECT_THROW(static_cast<void>(signer.sign("body")), SigningError);
+    EXPECT_TRUE(log.has(LogLevel::error, "Failed to sign our data, error=cannot sign: no hardware"));
+}
+
+TEST(FileSigningService, MakesAPrivateKeyOnceThatOthersCanVerify) {
+    const TemporaryDocuments documents;
+    const auto keyFile = documents / FileSigningService::keyFileName;
+    const auto publicFile = documents / FileSigningService::publicKeyFileName;
+    const std::string digest = sha1Digest("body");
+
+    const auto signature = FileSigningService().sign(digest);
+    EXPECT_EQ(permissions(keyFile), 0600U);
+    const auto key = readFile(keyFile);
+    EXPECT_TRUE(verifies(readFile(publicFile), digest, signature));
+    EXPECT_FALSE(verifies(readFile(publicFile), sha1Digest("another"), signature));
+
+    std::filesystem::remove(publicFile);
+    EXPECT_EQ(FileSigningService().sign(digest), signature);  // the same key in the next run
+    EXPECT_EQ(readFile(keyFile), key);
+    EXPECT_TRUE(std::filesystem::exists(publicFile));
+}
+
+TEST(FileSigningService, ThoseWhoRaceForTheFirstUseAgreeOnOneKey) {
+    const TemporaryDocuments documents;
+    std::vector<std::future<std::string>> racing;
+    for (int i = 0; i < 8; ++i) {
+        racing.push_back(std::async(std::launch::async, [] { return FileSigningService().sign("digest"); }));
+    }
+    std::set<std::string> signatures;
+    for (auto& one : racing) signatures.insert(one.get());
+    EXPECT_EQ(signatures.size(), 1U);
+}
+
+TEST(FileSigningService, SaysWhatIsWrongWithItsKeyFile) {
+    const TemporaryDocuments documents;
+    writeFile(documents / FileSigningService::keyFileName, "no key");
+    FileSigningService service;
+    try {
+        static_cast<void>(service.sign("digest"));
+        FAIL();
+    } catch (const SigningError& error) {
+        EXPECT_EQ(error.value(), SigningError::badKey);
+    }
+    std::filesystem::remove(documents / FileSigningService::keyFileName);
+    EXPECT_EQ(service.sign("digest").size(), 64U);  // mended
+
+    writeFile(documents / "file", "");
+    EXPECT_THROW(static_cast<void>(FileSigningService(documents / "file").sign("digest")), SystemError);
+}
+
+/// Signs in a static destructor, which runs after the exit handlers that were installed after it was made.
+struct SignsAtExit {
+    std::unique_ptr<FileSigningService> service;
+    ~SignsAtExit() {
+        if (!service) return;
+        try {
+            static_cast<void>(service->sign("digest"));
+            std::_Exit(1);
+        } catch (const SigningError& error) {
+            std::_Exit(error.value() == SigningError::unavailable ? 7 : 2);
+        }
+    }
+};
+
+TEST(FileSigningServiceDeathTest, ThrowsOnceTheProcessExits) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            static SignsAtExit atExit;
+            const TemporaryDocuments documents;
+            atExit.service = std::make_unique<FileSigningService>();
+            static_cast<void>(atExit.service->sign("digest"));
+            std::exit(0);
+        },
+        testing::ExitedWithCode(7), "");
+}
+
+}  // namespace
+}  // namespace corvane::test

@@ -1,0 +1,200 @@
+#include <corvane/Upload/UploadDropbox.h>
+#include <corvane/Upload/UploadManager.h>
+#include <corvane/Upload/UploadRequest.h>
+#include <corvane/Upload/gzip.h>
+
+#include <gtest/gtest.h>
+
+#include "tests/support/CapturedLog.h"
+#include "tests/support/FakeUploadService.h"
+#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/TextResource.h"
+
+namespace corvane::test {
+namespace {
+
+/// What one run of a process has: a manager over the files that earlier runs left.
+struct ProcessRun {
+    explicit ProcessRun(std::optional<std::string> location = "main")
+        : store(std::make_shared<DeferredStore<SignedEntity>>(std::move(location))),
+          manager(UploadManager::create(service, store, dropbox, ledger)) {}
+    ~ProcessRun() {
+        manager.reset();
+        store.reset();
+        DeferredStoreCore::queue().sync([] {});
+    }
+
+    void upload(const std::string& identifier) {
+        ledger->add(identifier, 10);
+        manager->upload({{"com.example.player", "Player", "2.3", 117}, std::make_shared<TextResource>(identifier)});
+    }
+    [[nodiscard]] std::vector<SignedEntity> rows() const {
+        return store->perform([](Store<SignedEntity>& rows) { return rows.fetchAll(); });
+    }
+    void insert(const SignedEntity& entity) const {
+        store->perform([&](Store<SignedEntity>& rows) {
+            rows.createTable();
+            rows.insert(entity);
+        });
+    }
+    [[nodiscard]] std::vector<std::string> resubmitted() const {
+        std::vector<std::string> identifiers;
+        for (const auto& list : service->resubmitted) {
+            for (const auto& request : list) identifiers.push_back(request.identifier);
+        }
+        return identifiers;
+    }
+
+    std::shared_ptr<FakeUploadService> service = std::make_shared<FakeUploadService>();
+    std::shared_ptr<UploadDropbox> dropbox = std::make_shared<UploadDropbox>("main");
+    std::shared_ptr<DeliveryLedger> ledger = std::make_shared<DeliveryLedger>();
+    std::shared_ptr<DeferredStore<SignedEntity>> store;
+    std::shared_ptr<UploadManager> manager;
+};
+
+SignedEntity row(std::string identifier, std::int64_t retries) {
+    return {.identifier = std::move(identifier), .contentType = "c", .userAgent = "u", .retries = retries};
+}
+
+TEST(UploadManager, TakesADocumentOverAndForgetsItOnceTheCollectorHasAnswered) {
+    const TemporaryDocuments documents;
+    const CapturedLog log;
+    ProcessRun run;
+    run.manager->open();
+    for (const bool delivered : {true, false}) {
+        run.upload("I");
+        const auto sent = run.service->submitted.back();
+        EXPECT_EQ(sent, (PreparedUploadRequest{"I", "application/test+json; version=0.1.0",
+                                               "com.example.player/2.3.117", run.dropbox->baseURL() / "I"}));
+        EXPECT_EQ(readFile(sent.dataFileURL), gzipCompressed(R"({"data":[1,2,3]})"));
+        const auto stored = run.rows().at(0);
+        EXPECT_EQ(stored.signature, "");
+        EXPECT_EQ(stored.retries, 0);
+        EXPECT_LT(std::chrono::abs(now() - stored.createdDate), std::chrono::minutes(1));
+
+        run.service->complete(delivered ? UploadResult::success("I", {200}) : UploadResult::failed("I", {404}));
+        EXPECT_TRUE(run.rows().empty());
+        EXPECT_EQ(run.dropbox->existingFile("I"), std::nullopt);
+    }
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{.delivered = {10, 1}, .pending = {}, .givenUp = {10, 1}}));
+    EXPECT_EQ(log.count("Creating upload task, identifier=I"), 2);
+    EXPECT_EQ(log.count("Failed"), 0);
+}
+
+TEST(UploadManager, ARetrysWholeLife) {
+    const TemporaryDocuments documents;
+    const Date later = now() + std::chrono::hours(1);
+    // 1. The first attempt does not get through: the row counts it, the payload stays, and nothing more happens in
+    //    this run, even when the manager is opened again.
+    {
+        ProcessRun run;
+        run.manager->open();
+        run.upload("I");
+        run.service->complete(UploadResult::retry("I", later));
+        EXPECT_EQ(run.rows().at(0).retries, 1);
+        EXPECT_LT(std::chrono::abs(run.rows().at(0).retryAfterDate - later), std::chrono::milliseconds(1));
+        EXPECT_EQ(run.ledger->report().pending, (DeliveryReport::Count{10, 1}));
+        run.manager->close();
+        run.manager->open();
+        EXPECT_TRUE(run.resubmitted().empty());
+    }
+    // 2. The next four runs send it again, whatever its date, and do not get through either.
+    for (int retries = 2; retries <= 5; ++retries) {
+        ProcessRun run;
+        run.manager->open();
+        EXPECT_EQ(run.resubmitted(), std::vector<std::string>{"I"});
+        run.service->complete(UploadResult::retry("I", later));
+        EXPECT_EQ(run.rows().at(0).retries, retries);
+        EXPECT_EQ(run.ledger->report().pending, (DeliveryReport::Count{0, 1}));
+    }
+    // 3. The run after that gives it up, row and payload.
+    const CapturedLog log;
+    ProcessRun run;
+    run.manager->open();
+    EXPECT_TRUE(run.resubmitted().empty());
+    EXPECT_TRUE(run.rows().empty());
+    EXPECT_EQ(run.dropbox->existingFile("I"), std::nullopt);
+    EXPECT_EQ(run.ledger->report().givenUp, (DeliveryReport::Count{0, 1}));
+    EXPECT_EQ(log.count("Retry dropped for exceeding allowed attempts, identifier=I"), 1);
+    // 4. A late answer to the last attempt changes nothing.
+    run.service->complete(UploadResult::retry("I", later));
+    EXPECT_TRUE(run.rows().empty());
+}
+
+TEST(UploadManager, ARowWithoutItsPayloadIsDroppedAndTheOthersGoOn) {
+    const TemporaryDocuments documents;
+    const CapturedLog log;
+    ProcessRun run;
+    run.insert(row("gone", 0));
+    run.insert(row("exceeded and gone", 5));
+    run.insert(row("there", 4));
+    run.dropbox->write("there", "x", TextResource("there"));
+    run.manager->open();
+    EXPECT_EQ(run.resubmitted(), std::vector<std::string>{"there"});
+    EXPECT_EQ(run.rows().size(), 1U);
+    EXPECT_EQ(log.count("Retry dropped for missing upload file, identifier=gone"), 1);
+    EXPECT_EQ(log.count("Failed to cleanup request that exceeded allowed attempts, identifier=exceeded and gone"), 1);
+
+    std::filesystem::remove(*run.dropbox->existingFile("there"));
+    run.service->complete(UploadResult::success("there", {200}));
+    EXPECT_EQ(log.count("Completed upload but failed to cleanup tracking data, identifier=there"), 1);
+    EXPECT_EQ(run.ledger->report().delivered.documents, 1);
+}
+
+TEST(UploadManager, SendsWithoutARowAndThenCannotRetry) {
+    const TemporaryDocuments documents;
+    ProcessRun run(std::nullopt);  // never opened: there is no table
+    run.upload("I");
+    EXPECT_EQ(run.service->submitted.size(), 1U);
+    run.store->perform([](Store<SignedEntity>& rows) { rows.createTable(); });
+    run.service->complete(UploadResult::retry("I", now()));
+    EXPECT_EQ(run.ledger->report().givenUp, (DeliveryReport::Count{10, 1}));
+}
+
+TEST(UploadManager, RefusesWhatItCannotWriteAndLeavesNoRow) {
+    const TemporaryDocuments documents;
+    ProcessRun run;
+    run.manager->open();
+    const auto upload = [&](const std::string& identifier, const std::string& text) {
+        run.manager->upload({{"a", "b", "1", 1}, std::make_shared<TextResource>(identifier, text)});
+    };
+    EXPECT_THROW(upload("I", "\"not an object\""), JSONError);
+    EXPECT_THROW(upload("../I", "{}"), InvalidArgument);
+    EXPECT_TRUE(run.rows().empty());
+    EXPECT_TRUE(run.service->submitted.empty());
+}
+
+TEST(UploadManager, TellsOfABrokenTableAndGoesOn) {
+    const TemporaryDocuments documents;
+    const CapturedLog log;
+    ProcessRun run;
+    // A view in the table's place can neither be read as rows of the table nor written to.
+    run.store->perform([](Store<SignedEntity>& rows) { rows.open(); });
+    StoreConnection(StoreLocation::default_("main")).run("CREATE VIEW signed_requests AS SELECT 'I' AS identifier;");
+    run.manager->open();
+    run.upload("I");
+    run.service->complete(UploadResult::retry("I", now()));
+    run.service->complete(UploadResult::success("I", {200}));
+    EXPECT_EQ(log.count("Failed to requeue cancelled requests, error="), 1);
+    EXPECT_EQ(log.count("Failed to mark retry, identifier=I, error="), 1);
+    EXPECT_EQ(log.count("Completed upload but failed to cleanup tracking data, identifier=I, error="), 1);
+    EXPECT_NE(run.dropbox->existingFile("I"), std::nullopt);  // kept with its row
+    EXPECT_EQ(run.service->submitted.size(), 1U);
+}
+
+TEST(UploadManager, PassesQueueAndWakeUpsOnAndIsHeldWeaklyByItsService) {
+    const TemporaryDocuments documents;
+    ProcessRun run(std::nullopt);
+    const auto queue = std::make_shared<SerialQueue>("test");
+    run.manager->registerAccessQueue(queue);
+    EXPECT_EQ(run.service->accessQueue, queue);
+    EXPECT_TRUE(run.manager->shouldResume("mine", [] {}));
+    EXPECT_FALSE(run.manager->shouldResume("another's", [] {}));
+    const std::weak_ptr<UploadManager> manager = run.manager;
+    run.manager.reset();
+    EXPECT_TRUE(manager.expired());
+    run.service->complete(UploadResult::success("I", {200}));  // nobody is there
+}
+
+}  // namespace
+}  // namespace corvane::test
