@@ -1,0 +1,48 @@
+#include <corvane/Processing/UploadBatchEntity.h>
+
+#include <algorithm>
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+[[noreturn]] void failBadData(const char* detail) {
+    throw StoreStepper::Errors(StoreStepper::Errors::badDataInColumn, detail);
+}
+
+std::shared_ptr<const EncodedEvents> readEvents(const std::string& bytes) {
+    const auto events = JSON(bytes)["events"].array();
+    if (!events) failBadData("there is no array of events");
+    auto encoded = std::make_shared<EncodedEvents>();
+    for (const JSON& event : *events) {
+        if (!event.isObject()) failBadData("an event is not an object");
+        encoded->append(event);
+    }
+    return encoded;
+}
+
+}  // namespace
+
+std::vector<StoreColumn> UploadBatchEntity::columns() {
+    return {{.name = "identifier", .type = "TEXT", .nullable = false, .primary = true},
+            {.name = "events", .type = "DATA", .nullable = false, .primary = false},
+            {.name = "session", .type = "DATA", .nullable = false, .primary = false}};
+}
+
+StorableValue UploadBatchEntity::storableValue(std::string_view columnName) const {
+    if (columnName == "identifier") return identifier;
+    if (columnName == "events") return events->blob();
+    if (columnName == "session") return StorableValue::bytes(session.text());
+    return StorableValue::absent();
+}
+
+UploadBatchEntity UploadBatchEntity::read(StoreStepper& stepper) {
+    std::string identifier = stepper.text();
+    auto events = readEvents(stepper.bytes());
+    JSON session(stepper.bytes());
+    if (!session.isObject()) failBadData("the session is not an object");
+    return {std::move(identifier), std::move(session), std::move(events)};
+}
+
+}  // namespace corvane

@@ -1,0 +1,32 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Models/JSON.h>
+#include <corvane/Processing/EncodedEvents.h>
+#include <corvane/Store/Storable.h>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace corvane {
+
+/// The backup of a batch that has not been handed over yet: one row of "upload_batches". The format outlives the
+/// process: names and layout may not change without a new schema version.
+struct CORVANE_EXPORT UploadBatchEntity {
+    static constexpr std::string_view tableName = "upload_batches";
+    static constexpr std::int64_t schemaVersion = 0;
+
+    std::string identifier;                       ///< the queue's
+    JSON session;                                 ///< the session's JSON form as of the last event
+    std::shared_ptr<const EncodedEvents> events;  ///< never null
+
+    [[nodiscard]] static std::vector<StoreColumn> columns();
+    [[nodiscard]] StorableValue storableValue(std::string_view columnName) const;
+    /// Throws `StoreStepper::Errors`: badColumn, or badDataInColumn for a blob that is not JSON of this shape.
+    [[nodiscard]] static UploadBatchEntity read(StoreStepper& stepper);
+};
+
+}  // namespace corvane

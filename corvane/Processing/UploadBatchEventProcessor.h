@@ -1,0 +1,121 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Models/Client.h>
+#include <corvane/Models/Session.h>
+#include <corvane/Platform/ForkMark.h>
+#include <corvane/Platform/SerialQueue.h>
+#include <corvane/Processing/EventProcessorType.h>
+#include <corvane/Processing/UploadBatchEntity.h>
+#include <corvane/Processing/UploadBatchEventConfig.h>
+#include <corvane/Processing/UploadBatchQueueKey.h>
+#include <corvane/Store/DeferredStore.h>
+#include <corvane/Upload/DeliveryLedger.h>
+#include <corvane/Upload/DeliveryReport.h>
+#include <corvane/Upload/Endpoint.h>
+#include <corvane/Upload/EndpointUse.h>
+#include <corvane/Upload/UploadManagerType.h>
+
+#include <chrono>
+#include <functional>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <string>
+
+namespace corvane {
+
+/// Turns events into uploads: collects them per session, or per group within a session, keeps a backup of every open
+/// batch on disk, and hands each finished batch to the upload manager as one user-events document.
+///
+/// A session's batch is finished when it holds `batchSize` events, a group's when the group is left, and all of them
+/// when the session ends. Backups that an earlier run left behind are sent when a session starts. While the database is
+/// on disk and reports no error, an event whose submission succeeded is on disk before its completion is called;
+/// hand-over is at least once. Failures are logged, and never reach the code that submitted the event.
+///
+/// The host makes it and adds it to one processor manager, which shares it. Its state lives on the access queue. When
+/// it is released, uploads in this process are cancelled; what is not delivered stays on disk for the next run.
+///
+///     auto uploads = std::make_shared<UploadBatchEventProcessor>(client, endpoint);
+///     sessions.processorManager()->add(uploads);
+class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType {
+  public:
+    /// Uploads to `endpoint`, under whose name the database and the payload files are kept in the documents directory.
+    /// Touches neither disk nor network. Throws `InvalidArgument`: see `Endpoint`.
+    UploadBatchEventProcessor(Client client, const EndpointType& endpoint,
+                              const UploadBatchEventConfig& config = UploadBatchEventConfig::default_());
+    /// Works with an upload manager and a store of the caller's, for hosts and tests that bring their own. `ledger` is
+    /// the one that the manager keeps.
+    UploadBatchEventProcessor(Client client, std::shared_ptr<UploadManagerType> uploadManager,
+                              std::shared_ptr<DeferredStore<UploadBatchEntity>> deferredStore,
+                              const UploadBatchEventConfig& config, std::shared_ptr<DeliveryLedger> ledger);
+    ~UploadBatchEventProcessor() override;
+
+    /// Waits until everything that was submitted before this call and is in a finished batch has an outcome, and at
+    /// most until `deadline`. Returns what became of all documents so far: delivered, given up, or pending, which is
+    /// kept on disk and goes out again with the next run. Documents of earlier runs are waited for too.
+    ///
+    /// In a child made by `fork` it returns an empty report at once.
+    ///
+    /// Requires: any thread but the library's queues (the process is stopped with a message).
+    DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline) const;
+
+    /// Throws `InvalidArgument` when the processor was added to another session manager before: its batches are that
+    /// one's.
+    void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override;
+    // The callbacks require the access queue (the process is stopped with a message).
+    void process(const ProcessEvent& processEvent) override;
+    void didLeaveGroup(const Group& group) override;
+    void didStartSession(const Session& session) override;
+    void didUpdateSession(const Session& session, bool submitQueues) override;
+    void didEndSession(const Session& session, Date endDate) override;
+    bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion) override;
+
+  private:
+    /// An open batch. The identifier names its backup row.
+    struct UploadBatchQueue {
+        std::string identifier;
+        JSON session;  // the session's JSON form as of the last event
+        std::shared_ptr<EncodedEvents> events;
+    };
+    using Rows = Store<UploadBatchEntity>;
+
+    UploadBatchEventProcessor(Client client, const Endpoint& endpoint, const UploadBatchEventConfig& config,
+                              const std::shared_ptr<DeliveryLedger>& ledger);
+
+    // On the access queue.
+    void assertOnQueue(const char* operation) const CORVANE_ASSERT_CAPABILITY(*accessQueue_);
+    [[nodiscard]] UploadBatchQueueKey keyOf(const ProcessEvent& processEvent) const CORVANE_REQUIRES(*accessQueue_);
+    void add(const UploadBatchQueueKey& key, const JSON& payload) CORVANE_REQUIRES(*accessQueue_);
+    /// Writes the batch's row. Returns whether it is written; if not, that has been logged.
+    bool backUp(const UploadBatchQueue& queue);
+    void backUpAll() CORVANE_REQUIRES(*accessQueue_);
+    void submit(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
+    /// Makes a document and hands it to the upload manager. Throws what that throws.
+    void upload(const JSON& session, const std::shared_ptr<const EncodedEvents>& events);
+    void resubmitTerminated() CORVANE_REQUIRES(*accessQueue_);
+    void resubmit(const UploadBatchEntity& batch) CORVANE_REQUIRES(*accessQueue_);
+    void deleteRow(const std::string& identifier);
+    void deleteUnlessGrown(const UploadBatchEntity& batch);
+
+    const Client client_;
+    const std::shared_ptr<DeliveryLedger> ledger_;
+    const std::shared_ptr<UploadManagerType> uploadManager_;
+    const std::shared_ptr<DeferredStore<UploadBatchEntity>> deferredStore_;
+    const UploadBatchEventConfig config_;
+    std::shared_ptr<const EndpointUse> endpointUse_;  // nothing with a manager of the caller's
+
+    const ForkMark born_;
+
+    // Set once, before the first callback: the queue's own tasks read it without the mutex.
+    mutable std::mutex registrationMutex_;
+    std::shared_ptr<SerialQueue> accessQueue_;
+
+    std::map<UploadBatchQueueKey, UploadBatchQueue> batchQueues_ CORVANE_GUARDED_BY(*accessQueue_);
+    std::optional<Session> currentSession_ CORVANE_GUARDED_BY(*accessQueue_);
+    // A row could not be written; once one can, all are.
+    bool backupsAreBehind_ CORVANE_GUARDED_BY(*accessQueue_) = false;
+};
+
+}  // namespace corvane

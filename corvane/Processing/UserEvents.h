@@ -1,0 +1,38 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Processing/EncodedEvents.h>
+#include <corvane/Upload/ResourceType.h>
+
+#include <memory>
+#include <string>
+#include <string_view>
+#include <utility>
+
+namespace corvane {
+
+/// The user-events document: the events of one batch with the session they belong to.
+class CORVANE_EXPORT UserEvents final : public ResourceType {
+  public:
+    static constexpr std::string_view mediaType = "application/vnd.veskar.corvane.user_events+json";
+    static constexpr std::string_view formatVersion = "0.1.0";
+
+    /// @param session the session's JSON form, an object
+    /// @param identifier a new UUID: the document's, not its batch's
+    UserEvents(JSON session, std::shared_ptr<const EncodedEvents> events, std::string identifier)
+        : session_(std::move(session)), events_(std::move(events)), identifier_(std::move(identifier)) {}
+    ~UserEvents() override;
+
+    [[nodiscard]] std::string contentType() const override { return std::string(mediaType); }
+    [[nodiscard]] std::string version() const override { return std::string(formatVersion); }
+    [[nodiscard]] std::string identifier() const override { return identifier_; }
+    /// `{"metadata":{"version","identifier"},"data":{"session","events"}}`.
+    [[nodiscard]] JSON jsonObject() const override;
+
+  private:
+    const JSON session_;
+    const std::shared_ptr<const EncodedEvents> events_;
+    const std::string identifier_;
+};
+
+}  // namespace corvane

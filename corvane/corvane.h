@@ -1,0 +1,25 @@
+#pragma once
+
+/// Everything that a host uses. Includes the standard library and Corvane's own headers, and nothing else.
+
+#include <corvane/Models/Client.h>
+#include <corvane/Models/DataEvent.h>
+#include <corvane/Models/Decoding.h>
+#include <corvane/Models/EventData.h>
+#include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/Session.h>
+#include <corvane/Models/SessionData.h>
+#include <corvane/Models/TimedData.h>
+#include <corvane/Platform/DocumentsDirectory.h>
+#include <corvane/Platform/Log.h>
+#include <corvane/Platform/MainQueue.h>
+#include <corvane/Processing/LoggingEventProcessor.h>
+#include <corvane/Processing/ProcessorManager.h>
+#include <corvane/Processing/UploadBatchEventProcessor.h>
+#include <corvane/Session/SessionManager.h>
+#include <corvane/Session/SessionObserver.h>
+#include <corvane/Snapshot/Snapshot.h>
+#include <corvane/Tracker/AccessTracker.h>
+#include <corvane/Tracker/Tracker.h>
+#include <corvane/Upload/Endpoint.h>
+#include <corvane/Upload/ExternalAnalyticsUploader.h>

@@ -1,0 +1,118 @@
+#include "tests/Integration/Application.h"
+
+#include <corvane/Upload/UploadRequest.h>
+
+#include "tests/support/Documents.h"
+#include "tests/support/TemporaryDocuments.h"
+
+#include <gtest/gtest.h>
+
+#include <future>
+#include <map>
+
+namespace corvane::test {
+namespace {
+
+struct Attachment {
+    JSON content;
+};
+struct Attached {
+    EventProperty<EventData> event = required;
+    EventProperty<Attachment> attachment = required;
+};
+
+class Input : public ::testing::Test {
+  protected:
+    static JSON objects(int levels) {
+        std::string text = "{}";
+        for (int i = 1; i < levels; ++i) text = R"({"a":)" + text + "}";
+        return JSON::fromEncodedText(text);
+    }
+
+    /// The attachments that have arrived, in order.
+    [[nodiscard]] std::vector<std::string> arrived() const {
+        std::vector<std::string> contents;
+        for (const auto& document : documentsAt(server)) {
+            const auto events = document["data"]["events"].array().value();
+            for (const auto& event : events) contents.push_back(event["data"]["attachment"]["content"].text());
+        }
+        return contents;
+    }
+
+    TemporaryDocuments documents;
+    ScriptedServer server;
+};
+
+TEST_F(Input, LargeWideAndDeepEventsAreDeliveredAndAlsoReadBackAfterARestart) {
+    std::map<std::string, std::string> wide;
+    for (int i = 0; i < 200; ++i) wide.emplace("property " + std::to_string(i), "it's '\"\n\x01 " + std::to_string(i));
+#if defined(__SANITIZE_THREAD__)
+    constexpr std::size_t size = 1'000'000;  // watched access by access, ten times that takes minutes
+#else
+    constexpr std::size_t size = 10'000'000;
+#endif
+    std::string large;
+    for (int i = 0; large.size() < size; ++i) large += "'" + std::to_string(i) + "\xe2\x82\xac\\\"";
+    // The attachment is one level itself.
+    const std::vector<JSON> contents{encoded(wide), objects(127), encoded(large)};
+    std::vector<std::string> expected;
+    for (const auto& content : contents) expected.push_back(content.text());
+
+    const auto record = [&](Application& application) {
+        int succeeded = 0;
+        application.sessions.push(SessionData{std::string("o'clock\"\0", 9), Screen{std::string("'\0\n\"", 4)}});
+        for (const auto& content : contents) {
+            application.sessions.tracker()->push(Attachment{content}, {DataEventTrait::unique});
+            application.sessions.tracker()->submit<Attached>(
+                [&](const EventSubmitResult& result) { succeeded += result.succeeded(); });
+        }
+        std::promise<void> done;
+        application.sessions.transaction([&](AccessSessionManager&) { done.set_value(); });
+        done.get_future().wait();
+        EXPECT_EQ(succeeded, 3);
+    };
+    {
+        Application application(server.url());
+        record(application);
+        application.sessions.endSync();
+        EXPECT_EQ(application.wait().delivered, (DeliveryReport::Count{3, 1}));
+    }
+    EXPECT_TRUE(arrived() == expected) << "not printed: they are large";
+    {
+        Application application(server.url());  // its session never ends: the batch stays in its backup
+        record(application);
+    }
+    Application next(server.url());
+    EXPECT_EQ(next.wait().delivered, (DeliveryReport::Count{3, 1}));
+    for (const auto& content : contents) expected.push_back(content.text());
+    EXPECT_TRUE(arrived() == expected);
+    for (const auto& document : documentsAt(server)) {
+        const JSON viewer = document["data"]["session"][std::string_view("o'clock\"\0", 9)];
+        EXPECT_EQ(viewer["name"].string(), std::string("'\0\n\"", 4));
+    }
+}
+
+TEST_F(Input, TextThatWouldBreakOutOfAHeaderIsRefused) {
+    struct Document final : ResourceType {
+        std::string type, format;
+        [[nodiscard]] std::string contentType() const override { return type; }
+        [[nodiscard]] std::string version() const override { return format; }
+        [[nodiscard]] std::string identifier() const override { return "I"; }
+        [[nodiscard]] JSON jsonObject() const override { return JSON("{}"); }
+    };
+    const Client good("com.example.app", "App", "1", 1);
+    for (const std::string& bad : {std::string("a\0b", 3), std::string("a\rb"), std::string("a\nX-Y: b")}) {
+        EXPECT_THROW(Client(bad, "App", "1", 1), InvalidArgument);
+        EXPECT_THROW(Client("com.example.app", bad, "1", 1), InvalidArgument);
+        EXPECT_THROW(Client("com.example.app", "App", bad, 1), InvalidArgument);
+        EXPECT_THROW(Endpoint(server.url() + bad, "main"), InvalidArgument);
+        const auto document = std::make_shared<Document>();
+        document->type = bad;
+        EXPECT_THROW(UploadRequest(good, document), InvalidArgument);
+        std::swap(document->type, document->format);
+        EXPECT_THROW(UploadRequest(good, document), InvalidArgument);
+    }
+}
+
+}  // namespace
+}  // namespace corvane::test

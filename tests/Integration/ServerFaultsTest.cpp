@@ -1,0 +1,218 @@
+#include "tests/Integration/FaultFixture.h"
+
+#include <corvane/Platform/InProcessTransferSession.h>
+
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <functional>
+#include <future>
+#include <memory>
+#include <mutex>
+
+namespace corvane::test {
+namespace {
+
+using Reply = ScriptedServer::Reply;
+using Ending = Reply::Ending;
+
+/// Opens sessions that give up within two seconds, and remembers the last one.
+class ImpatientSessions {
+  public:
+    ImpatientSessions() {
+        TransferSession::setFactory([kept = kept_](auto configuration, auto delegate, auto queue) {
+            configuration.limits.timeWithoutProgress = 1s;
+            configuration.limits.answer = 2s;
+            auto session = std::make_shared<InProcessTransferSession>(configuration, std::move(delegate), queue);
+            const std::lock_guard lock(kept->mutex);
+            kept->last = session;
+            return session;
+        });
+    }
+    ImpatientSessions(const ImpatientSessions&) = delete;
+    ImpatientSessions& operator=(const ImpatientSessions&) = delete;
+    ~ImpatientSessions() { TransferSession::setFactory(nullptr); }
+
+    /// How many transfers of the last session are not completed.
+    [[nodiscard]] std::size_t inFlight() const {
+        std::shared_ptr<TransferSession> session;
+        {
+            const std::lock_guard lock(kept_->mutex);
+            session = kept_->last.lock();
+        }
+        std::promise<std::size_t> counted;
+        session->tasks([&](const auto& tasks) { counted.set_value(tasks.size()); });
+        return counted.get_future().get();
+    }
+
+  private:
+    struct Kept {
+        std::mutex mutex;
+        std::weak_ptr<TransferSession> last;
+    };
+    const std::shared_ptr<Kept> kept_ = std::make_shared<Kept>();
+};
+
+int endings(const CapturedLog& log) {
+    return log.count("Upload failed, identifier=") + log.count("Upload completed successfully, identifier=") +
+           log.count("Upload HTTP failed") + log.count("Upload unknown state");
+}
+
+enum class Becomes { delivered, pending, givenUp };
+
+TEST(ServerFaults, OneFaultCostsOneDocumentAtMostAndTheOthersArrive) {
+    std::string endlessHead = "HTTP/1.1 200 OK\r\n";
+    for (int i = 0; i < 6000; ++i) endlessHead += "X-" + std::to_string(i) + ": " + std::string(50, 'x') + "\r\n";
+    const struct {
+        const char* name;
+        Reply reply;
+        Becomes becomes;
+        const char* says;  // what the log has then
+    } cases[] = {
+        {"204", Reply::status(204), Becomes::delivered, "status=204"},
+        {"redirect", Reply::status(302, {{"Location", "/elsewhere"}}), Becomes::givenUp, "statusCode=302"},
+        {"401", Reply::status(401), Becomes::pending, "status=401"},
+        {"413", Reply::status(413), Becomes::givenUp, "status=413"},
+        {"429", Reply::status(429, {{"Retry-After", "1"}}), Becomes::pending, "statusCode=429"},
+        {"503", Reply::status(503), Becomes::pending, "statusCode=503"},
+        {"status of no class", Reply::status(999), Becomes::pending, "statusCode=999"},
+        {"reset inside the request",
+         {.bytes = "", .ending = Ending::reset, .bodyLimit = 0},
+         Becomes::pending,
+         "Upload failed"},
+        {"reset inside the answer", Reply::partial(Ending::reset), Becomes::pending, "Upload failed"},
+        {"closed without an answer", Reply::raw(""), Becomes::pending, "Upload failed"},
+        {"garbage", Reply::raw("SSH-2.0-server\r\n\r\n"), Becomes::pending, "Upload failed"},
+        {"endless head", Reply::raw(endlessHead), Becomes::pending, "Upload failed"},
+        {"endless body", Reply::partial(Ending::endless), Becomes::delivered, "status=200"},
+        {"never an answer", Reply::never(), Becomes::pending, "nothing was sent or received for 1000 ms"},
+        {"stall inside the answer", Reply::partial(Ending::silence), Becomes::pending, "nothing was sent or received"},
+        {"head that trickles",
+         {.bytes = "HTTP/1.1 200 OK\r\n", .ending = Ending::trickle},
+         Becomes::pending,
+         "no answer came within 2000 ms"},
+        {"body that trickles", Reply::partial(Ending::trickle), Becomes::delivered, "status=200"},
+    };
+    for (const auto& one : cases) {
+        SCOPED_TRACE(one.name);
+        FaultFixture disk;
+        {
+            const ImpatientSessions sessions;
+            disk.server.script(one.reply);
+            Application application(disk.server.url(), 1);
+            application.submit(5);
+            const auto report = application.wait();
+            const auto expected = [&](Becomes which, std::int64_t others) {
+                const auto count = others + (one.becomes == which ? 1 : 0);
+                return DeliveryReport::Count{count, count};
+            };
+            EXPECT_EQ(report.delivered, expected(Becomes::delivered, 4));
+            EXPECT_EQ(report.pending, expected(Becomes::pending, 0));
+            EXPECT_EQ(report.givenUp, expected(Becomes::givenUp, 0));
+            EXPECT_GE(disk.log.count(one.says), 1);
+            EXPECT_EQ(sessions.inFlight(), 0u);
+        }
+        EXPECT_EQ(endings(disk.log), 5) << "each transfer ends once";
+        EXPECT_EQ(disk.server.requests().size(), 5u);
+        const auto rows = FaultFixture::rows();
+        ASSERT_EQ(rows.size(), one.becomes == Becomes::pending ? 1u : 0u);
+        EXPECT_EQ(disk.payloads().size(), rows.size());
+        for (const auto& row : rows) {
+            EXPECT_EQ(row.retries, 1);
+            EXPECT_TRUE(std::filesystem::exists(disk.dropbox() / row.identifier));
+        }
+        EXPECT_EQ(disk.runAgain().delivered.documents, std::ssize(rows));
+        EXPECT_TRUE(FaultFixture::rows().empty());
+        EXPECT_TRUE(disk.payloads().empty());
+    }
+}
+
+/// A TLS server on a loopback port whose certificate nobody has signed.
+class UntrustedServer {
+  public:
+    explicit UntrustedServer(const std::filesystem::path& directory) {
+        const std::string key = directory / "key.pem", certificate = directory / "certificate.pem";
+        run({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256", "-nodes", "-keyout",
+             key, "-out", certificate, "-subj", "/CN=localhost", "-addext", "subjectAltName=IP:127.0.0.1"},
+            -1);
+        int output[2];
+        if (pipe2(output, O_CLOEXEC) != 0) throw std::runtime_error("pipe");
+        server_ = start({"openssl", "s_server", "-www", "-accept", "127.0.0.1:0", "-key", key, "-cert", certificate},
+                        output[1]);
+        close(output[1]);
+        output_ = fdopen(output[0], "r");
+        char line[256];
+        while (url_.empty() && fgets(line, sizeof line, output_)) {
+            const std::string_view text = line;
+            constexpr std::string_view prefix = "ACCEPT ";
+            if (text.starts_with(prefix)) url_ = "https://" + std::string(text.substr(prefix.size(), text.size() - 8));
+        }
+    }
+    UntrustedServer(const UntrustedServer&) = delete;
+    UntrustedServer& operator=(const UntrustedServer&) = delete;
+    ~UntrustedServer() {
+        kill(server_, SIGKILL);
+        waitpid(server_, nullptr, 0);
+        fclose(output_);
+    }
+    [[nodiscard]] const std::string& url() const { return url_; }
+
+  private:
+    static pid_t start(const std::vector<std::string>& command, int output) {
+        std::vector<char*> arguments;
+        for (const auto& argument : command) arguments.push_back(const_cast<char*>(argument.c_str()));
+        arguments.push_back(nullptr);
+        const pid_t child = fork();
+        if (child == 0) {
+            const int null = open("/dev/null", O_RDWR);
+            dup2(null, STDIN_FILENO);
+            dup2(output < 0 ? null : output, STDOUT_FILENO);
+            dup2(null, STDERR_FILENO);
+            execvp(arguments[0], arguments.data());
+            _exit(127);
+        }
+        return child;
+    }
+    static void run(const std::vector<std::string>& command, int output) {
+        int status = 0;
+        waitpid(start(command, output), &status, 0);
+        if (status != 0) throw std::runtime_error("openssl failed");
+    }
+
+    pid_t server_ = -1;
+    FILE* output_ = nullptr;
+    std::string url_;
+};
+
+TEST(ServerFaults, AServerThatIsNotThereOrCannotBeTrustedGetsNothingAndCostsNothing) {
+    const TemporaryDocuments certificates;
+    const UntrustedServer untrusted(certificates.path());
+    std::string nobody;
+    {
+        const ScriptedServer gone;
+        nobody = gone.url();
+    }
+    const std::pair<std::string, const char*> cases[] = {{nobody, "Couldn't connect to server"},
+                                                         {untrusted.url(), "self-signed certificate"}};
+    for (const auto& [url, reason] : cases) {
+        SCOPED_TRACE(url);
+        FaultFixture disk;
+        {
+            Application application(url, 1);
+            application.submit(5);
+            EXPECT_EQ(application.wait().pending, (DeliveryReport::Count{5, 5}));
+        }
+        EXPECT_EQ(disk.log.count(reason), 5);
+        EXPECT_EQ(endings(disk.log), 5);
+        EXPECT_EQ(FaultFixture::rows().size(), 5u);
+        EXPECT_EQ(disk.runAgain().delivered.documents, 5);
+        EXPECT_EQ(disk.distinctEvents(), 5u);
+    }
+}
+
+}  // namespace
+}  // namespace corvane::test

@@ -1,0 +1,269 @@
+#include <corvane/Processing/UploadBatchEventProcessor.h>
+
+#include <corvane/Processing/UserEvents.h>
+#include <corvane/Upload/UploadRequest.h>
+
+#include "tests/support/CapturedLog.h"
+#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/TrackingFixture.h"
+
+#include <functional>
+#include <set>
+#include <thread>
+
+namespace corvane::test {
+namespace {
+
+using namespace std::chrono_literals;
+using Rows = Store<UploadBatchEntity>;
+
+/// Takes documents over, or refuses them.
+class FakeUploadManager final : public UploadManagerType {
+  public:
+    void open() override { calls.emplace_back("open"); }
+    void close() override { calls.emplace_back("close"); }
+    void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override { queue = std::move(accessQueue); }
+    void upload(const UploadRequest& request) override {
+        if (refuses) throw std::runtime_error("refused");
+        documents.push_back(request.resource->jsonObject());
+        if (didTake) didTake();
+        contentType = request.resource->contentType() + " " + request.resource->version();
+        if (ledger) ledger->settle(request.resource->identifier(), DeliveryLedger::Outcome::delivered);
+    }
+    bool shouldResume(std::string_view identifier, std::function<void()>) override { return identifier == "mine"; }
+
+    /// How many events each document holds.
+    [[nodiscard]] std::vector<std::size_t> sizes() const {
+        std::vector<std::size_t> sizes;
+        for (const auto& document : documents) sizes.push_back(document["data"]["events"].array()->size());
+        return sizes;
+    }
+
+    bool refuses = false;
+    std::function<void()> didTake;
+    std::vector<JSON> documents;
+    std::string contentType;
+    std::vector<std::string> calls;
+    std::shared_ptr<SerialQueue> queue;
+    std::shared_ptr<DeliveryLedger> ledger;
+};
+
+struct Mark {
+    EventProperty<Screen> screen = EventProperty<Screen>::optional;
+};
+
+class UploadBatch : public ::testing::Test {
+  protected:
+    void SetUp() override { launch(); }
+
+    /// As a new run of the application does; the database stays.
+    void launch(int batchSize = 3) {
+        sessions.reset();
+        manager = std::make_shared<FakeUploadManager>();
+        ledger = manager->ledger = std::make_shared<DeliveryLedger>();
+        store = std::make_shared<DeferredStore<UploadBatchEntity>>("main");
+        batching = std::make_shared<UploadBatchEventProcessor>(Client{"com.example.app", "App", "1.0", 1}, manager,
+                                                               store, UploadBatchEventConfig(batchSize, false), ledger);
+        sessions = std::make_unique<SessionManager>();
+        sessions->processorManager()->add(batching);
+        root = sessions->tracker();
+    }
+
+    void submit(int count) {
+        for (int i = 0; i < count; ++i) root->submit<Mark>();
+        drain();
+    }
+    void drain() {
+        manager->queue->sync([] {});
+    }
+    std::vector<UploadBatchEntity> rows() {
+        return store->perform([](Rows& table) {
+            table.createTable();
+            return table.fetchAll();
+        });
+    }
+
+    CapturedLog log;
+    TemporaryDocuments documents;
+    std::shared_ptr<FakeUploadManager> manager;
+    std::shared_ptr<DeliveryLedger> ledger;
+    std::shared_ptr<DeferredStore<UploadBatchEntity>> store;
+    std::shared_ptr<UploadBatchEventProcessor> batching;
+    std::unique_ptr<SessionManager> sessions;
+    std::shared_ptr<Tracker> root;
+};
+
+TEST_F(UploadBatch, SendsAFullSessionQueueAsOneDocumentAndBacksUpTheOpenOne) {
+    sessions->push(SessionData{"user", Viewer{"7", {}}});
+    sessions->start(Session::Kind::userEvents());
+    root->push(Screen{"home"});
+    submit(2);
+    const auto backup = rows();
+    ASSERT_EQ(backup.size(), 1u);
+    EXPECT_EQ(backup[0].events->count(), 2u);
+    EXPECT_EQ(backup[0].session["user"]["id"].string(), "7");
+
+    submit(2);
+    ASSERT_EQ(manager->sizes(), (std::vector<std::size_t>{3}));
+    const JSON& document = manager->documents[0];
+    EXPECT_EQ(manager->contentType, "application/vnd.veskar.corvane.user_events+json 0.1.0");
+    EXPECT_EQ(document["metadata"]["version"].string(), "0.1.0");
+    EXPECT_NE(document["metadata"]["identifier"].string(), backup[0].identifier);
+    EXPECT_EQ(document["metadata"].object()->size() + document["data"].object()->size() + document.object()->size(),
+              6u);
+    EXPECT_EQ(document["data"]["session"].text(), backup[0].session.text());
+    EXPECT_EQ(document["data"]["events"][2].text(),
+              R"({"data":{"screen":{"name":"home"}},"metadata":{"name":"Mark","version":"0.1.0"}})");
+    ASSERT_EQ(rows().size(), 1u) << "the fourth event began a queue of its own";
+    EXPECT_NE(rows()[0].identifier, backup[0].identifier);
+}
+
+TEST_F(UploadBatch, SendsEverythingThatIsOpenWhenTheSessionEnds) {
+    sessions->start(Session::Kind::userEvents());
+    const auto left = root->chain("left");
+    const auto right = root->chain("right");
+    left->enterGroup("a");
+    right->enterGroup("b");
+    for (int i = 0; i < 5; ++i) left->submit<Mark>();
+    right->submit<Mark>();
+    submit(1);
+    EXPECT_TRUE(manager->documents.empty()) << "a group's queue is not sent when it is full";
+    left->leaveGroup();
+    drain();
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{5}));
+    sessions->endSync();
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{5, 1, 1}));
+    EXPECT_TRUE(rows().empty());
+    EXPECT_EQ(manager->calls, (std::vector<std::string>{"open", "close"}));
+    const auto report = batching->waitForDelivery(std::chrono::steady_clock::now() + 10s);
+    EXPECT_EQ(report.delivered, (DeliveryReport::Count{7, 3}));
+}
+
+TEST_F(UploadBatch, SendsASessionsQueueBeforeItsDataChangesWhenAsked) {
+    sessions->start(Session::Kind::userEvents());
+    submit(1);
+    sessions->push(SessionData{"user", Viewer{"7", {}}});
+    drain();
+    EXPECT_TRUE(manager->documents.empty());
+    sessions->push(SessionData{"user", Viewer{"8", {}}}, {}, true);
+    drain();
+    ASSERT_EQ(manager->sizes(), (std::vector<std::size_t>{1}));
+    EXPECT_EQ(manager->documents[0]["data"]["session"]["user"]["id"].string(), "7");
+}
+
+TEST_F(UploadBatch, RefusedDocumentsStayInTheirBackupAndGoOutWithTheNextSession) {
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    manager->refuses = true;
+    submit(4);
+    EXPECT_TRUE(log.has(LogLevel::error, "Failed to submit request for upload, error=refused"));
+    sessions->endSync();
+    ASSERT_EQ(rows().size(), 1u);
+    const std::string row = rows()[0].identifier;
+
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    EXPECT_TRUE(log.has(LogLevel::default_, "Attempting to resubmit terminated batch, identifier=" + row));
+    EXPECT_TRUE(log.has(LogLevel::error, "Failed to submit rehydrated request for upload, error=refused"));
+    sessions->endSync();
+    EXPECT_EQ(log.count("session/queue key mismatch"), 1) << "a queue of an earlier session waits for its backup";
+
+    manager->refuses = false;
+    sessions->start(Session::Kind::userEvents());
+    submit(1);
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{4}));
+    sessions->endSync();
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{4, 1}));
+    EXPECT_EQ(log.count("session/queue key mismatch"), 1);
+}
+
+TEST_F(UploadBatch, WhatAnEarlierRunLeftBehindIsSentWithItsOwnSessionData) {
+    sessions->push(SessionData{"user", Viewer{"7", {}}});
+    sessions->start(Session::Kind::userEvents());
+    root->enterGroup("g");
+    submit(2);
+    root->leaveGroup();
+    drain();
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{2}));
+    root->enterGroup("h");
+    submit(1);
+    launch();
+    sessions->start(Session::Kind::userEvents());
+    submit(0);
+    ASSERT_EQ(manager->sizes(), (std::vector<std::size_t>{1}));
+    EXPECT_EQ(manager->documents[0]["data"]["session"]["user"]["id"].string(), "7");
+    EXPECT_TRUE(rows().empty());
+}
+
+TEST_F(UploadBatch, ABackupThatGrewWhileItWasSentStaysForItsOwner) {
+    sessions->start(Session::Kind::userEvents());
+    submit(1);
+    UploadBatchEntity batch = rows().at(0);
+    launch();
+    manager->didTake = [&] {  // the other process goes on at this moment
+        auto events = std::make_shared<EncodedEvents>(*batch.events);
+        events->append(JSON("{}"));
+        batch.events = events;
+        store->perform([&](Rows& table) { table.insert(batch); });
+    };
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    EXPECT_EQ(manager->sizes(), std::vector<std::size_t>{1});
+    ASSERT_EQ(rows().size(), 1u);
+    EXPECT_EQ(rows()[0].events->count(), 2u);
+}
+
+TEST_F(UploadBatch, LogsEventsAndGroupsThatHaveNoSessionAndBackupsThatCannotBeWritten) {
+    manager->queue->sync([&] {
+        batching->process(ProcessEvent("Mark", JSON("{}"), std::nullopt));
+        batching->didLeaveGroup({"g", Date()});
+    });
+    EXPECT_TRUE(log.has(LogLevel::error,
+                        "Failed to process event for batching, error=no session is current, so the event belongs to "
+                        "no batch"));
+    EXPECT_TRUE(log.has(LogLevel::error, "Attempt to leave group and perform upload without a current session"));
+
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    store->perform([](Rows& table) { table.dropTable(); });
+    submit(2);
+    EXPECT_EQ(log.count("Failed to write queue to disk for backup uploads, identifier="), 2);
+    sessions->endSync();
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{2})) << "what could not be backed up is sent all the same";
+    EXPECT_EQ(log.count("Failed to clean up request after submission, error="), 1);
+}
+
+TEST_F(UploadBatch, RowsOfAnotherShapeFailTheFetchWithAClearError) {
+    for (const char* sql : {"x'7b7d', x'7b7d'", "x'5b5d', x'7b7d'", "x'7b226576656e7473223a5b315d7d', x'7b7d'",
+                            "x'7b226576656e7473223a5b5d7d', x'5b5d'"}) {
+        auto shared = std::make_shared<StoreConnection>(StoreLocation::memory());
+        Rows table(shared);
+        table.createTable();
+        shared->run("INSERT INTO upload_batches VALUES ('id', " + std::string(sql) + ");");
+        EXPECT_THROW((void)table.fetchAll(), StoreStepper::Errors) << sql;
+    }
+}
+
+TEST_F(UploadBatch, WaitsForDeliveryNoLongerThanAskedAndNotOnItsQueue) {
+    sessions->start(Session::Kind::userEvents());
+    manager->ledger = nullptr;
+    submit(3);
+    const auto report = batching->waitForDelivery(std::chrono::steady_clock::now());
+    EXPECT_EQ(report.pending, (DeliveryReport::Count{3, 1}));
+    root->suspend();
+    EXPECT_EQ(batching->waitForDelivery(std::chrono::steady_clock::now() + 1ms), report) << "a suspended queue too";
+    root->resume();
+    EXPECT_THROW(UploadBatchEventConfig(0, false), InvalidArgument);
+    EXPECT_EQ(UploadBatchEventConfig::default_().batchSize(), 50u);
+
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_DEATH(
+        {
+            sessions->transaction([&](AccessSessionManager&) { (void)batching->waitForDelivery({}); });
+            drain();
+        },
+        "waitForDelivery must not be called on queue com.veskar.corvane.event-tracker");
+}
+
+}  // namespace
+}  // namespace corvane::test
