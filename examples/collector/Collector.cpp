@@ -1,0 +1,79 @@
+#include "Collector.h"
+
+#include "Document.h"
+#include "Refusal.h"
+#include "gunzip.h"
+
+#include <cstdio>
+#include <exception>
+#include <string_view>
+
+namespace collector {
+
+namespace {
+
+constexpr std::string_view contentType = "application/vnd.veskar.corvane.user_events+json; version=0.1.0";
+constexpr std::size_t largestDocument = std::size_t{256} << 20;
+
+void checkHeaders(const Upload& upload) {
+    if (upload.contentType != contentType) {
+        throw Refusal(400, "Content-Type is not \"" + std::string(contentType) + "\"");
+    }
+    if (upload.contentEncoding != "gzip") throw Refusal(400, "Content-Encoding is not \"gzip\"");
+    if (upload.userAgent.empty()) throw Refusal(400, "User-Agent is missing");
+}
+
+long long shown(std::int64_t number) {
+    return number;
+}
+
+}  // namespace
+
+Collector::Collector(const std::filesystem::path& directory, const std::optional<std::filesystem::path>& publicKeyFile)
+    : archive_(directory) {
+    if (publicKeyFile) verifier_.emplace(*publicKeyFile);
+}
+
+Answer Collector::receive(const Upload& upload) noexcept {
+    try {
+        return accept(upload);
+    } catch (const Refusal& refusal) {
+        return refuse(refusal.status(), refusal.what());
+    } catch (const std::exception& error) {
+        return refuse(500, error.what());
+    }
+}
+
+Answer Collector::accept(const Upload& upload) {
+    checkHeaders(upload);
+    if (verifier_) verifier_->verify(upload.body, upload.signature);
+    const Document document = readDocument(gunzip(upload.body, largestDocument));
+
+    const std::lock_guard lock(mutex_);
+    const Archive::Counts added = archive_.add(document);
+    std::printf("%s %s: %lld new events, %lld duplicate, %zu bytes%s\n",
+                added.documents > 0 ? "document" : "duplicate document", document.identifier.c_str(),
+                shown(added.events), shown(added.duplicateEvents), upload.body.size(),
+                verifier_ ? ", signature verified" : "");
+    std::fflush(stdout);
+    return {200, "accepted\n"};
+}
+
+Answer Collector::refuse(int status, const char* reason) {
+    const std::lock_guard lock(mutex_);
+    ++refused_;
+    std::printf("refused with %d: %s\n", status, reason);
+    std::fflush(stdout);
+    return {status, std::string(reason) + "\n"};
+}
+
+void Collector::printTotals() {
+    const std::lock_guard lock(mutex_);
+    const Archive::Counts& counts = archive_.counts();
+    std::printf("documents: %lld, and %lld duplicate\n", shown(counts.documents), shown(counts.duplicateDocuments));
+    std::printf("events: %lld, and %lld duplicate\n", shown(counts.events), shown(counts.duplicateEvents));
+    std::printf("requests refused: %lld\n", shown(refused_));
+    std::fflush(stdout);
+}
+
+}  // namespace collector

@@ -1,0 +1,37 @@
+#pragma once
+
+#include "Archive.h"
+#include "SignatureVerifier.h"
+#include "Upload.h"
+
+#include <cstdint>
+#include <filesystem>
+#include <mutex>
+#include <optional>
+
+namespace collector {
+
+/// Judges uploads, keeps the good ones, and prints a line for each. Safe from any thread.
+class Collector {
+  public:
+    /// @param publicKeyFile the key to verify signatures with; nothing to leave them unverified
+    Collector(const std::filesystem::path& directory, const std::optional<std::filesystem::path>& publicKeyFile);
+
+    /// Never throws: what is wrong with an upload is in the answer.
+    [[nodiscard]] Answer receive(const Upload& upload) noexcept;
+    /// Counts a request that was turned away before it was an upload.
+    Answer refuse(int status, const char* reason);
+
+    void printTotals();
+
+  private:
+    Answer accept(const Upload& upload);
+
+    std::optional<SignatureVerifier> verifier_;
+    std::mutex mutex_;
+    // Guarded by mutex_, as is standard output.
+    Archive archive_;
+    std::int64_t refused_ = 0;
+};
+
+}  // namespace collector
