@@ -23,8 +23,7 @@ struct ExitState {
     }
 
     ExitState() {
-        // Exit handlers run in reverse order, so OpenSSL's must be there before ours.
-        OPENSSL_init_crypto(OPENSSL_INIT_LOAD_CRYPTO_STRINGS, nullptr);  // asked for nothing, it registers nothing
+        OpenSSLUse::initialize();
         instance = this;
         exiting = std::atexit([] {
                       // A thread of the parent may have held it when the child was made; there are none in the child.
@@ -44,6 +43,10 @@ OpenSSLUse::OpenSSLUse() : lock_(ExitState::shared().mutex) {
     if (ExitState::shared().exiting) {
         throw SigningError(SigningError::unavailable, "the process is exiting");
     }
+}
+
+void OpenSSLUse::initialize() {
+    OPENSSL_init_crypto(OPENSSL_INIT_NO_ATEXIT | OPENSSL_INIT_LOAD_CRYPTO_STRINGS, nullptr);
 }
 
 OpenSSLUse::~OpenSSLUse() {

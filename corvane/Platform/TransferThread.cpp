@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/CurlTransfer.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/OpenSSLUse.h>
 #include <corvane/Platform/Thread.h>
 #include <corvane/Platform/TransferError.h>
 
@@ -100,7 +101,7 @@ class Engine {
 
 Engine::Engine() {
     // Whatever registers handlers of its own for the exit comes first, so that ours runs before them.
-    OPENSSL_init_crypto(OPENSSL_INIT_LOAD_CRYPTO_STRINGS, nullptr);  // asked for nothing, it registers nothing
+    OpenSSLUse::initialize();
     if (curl_global_init(CURL_GLOBAL_DEFAULT) != CURLE_OK) throw std::bad_alloc();
     OPENSSL_thread_stop();  // this thread may end after OpenSSL's exit handler, which leaves it nothing to free with
     multi_.reset(curl_multi_init());
