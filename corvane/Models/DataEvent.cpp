@@ -41,13 +41,11 @@ AnyDataEvent::Base::~Base() = default;
 
 JSON AnyDataEvent::toDict() const {
     const auto box = box_;  // the host's code, which is not called under the lock, may replace this object
-    {
-        std::lock_guard lock(box->mutex);
-        if (box->dict) return *box->dict;
-    }
+    if (box->isEncoded.load(std::memory_order_acquire)) return *box->dict;
     JSON dict = box->makeDict();
     std::lock_guard lock(box->mutex);
     if (!box->dict) box->dict = std::move(dict);
+    box->isEncoded.store(true, std::memory_order_release);
     return *box->dict;
 }
 

@@ -5,6 +5,7 @@
 #include <corvane/Models/Encoding.h>
 #include <corvane/Platform/DataType.h>
 
+#include <atomic>
 #include <concepts>
 #include <memory>
 #include <mutex>
@@ -67,7 +68,8 @@ class CORVANE_EXPORT AnyDataEvent {
         [[nodiscard]] virtual JSON makeDict() const = 0;
 
         mutable std::mutex mutex;
-        mutable std::optional<JSON> dict;  // guarded by mutex
+        mutable std::optional<JSON> dict;             // written once, under the mutex
+        mutable std::atomic<bool> isEncoded = false;  // `dict` is there, and does not change any more
     };
 
     template <class T>

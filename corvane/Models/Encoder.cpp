@@ -33,6 +33,11 @@ EncodingError EncodingError::within(std::string_view name) const {
     return {value(), path_.empty() ? std::string(name) : std::string(name) + "." + path_};
 }
 
+// Most records fit, and the text does not move while it grows; take() gives back what a small one leaves.
+Encoder::Encoder() {
+    out_.reserve(240);
+}
+
 void Encoder::fail(EncodingError::Code code) const {
     std::string path;
     for (int level = 1; level <= depth_; ++level) {
@@ -139,6 +144,7 @@ void Encoder::json(const JSON& value) {
 
 std::string Encoder::take() && {
     if (depth_ != 0 || out_.empty()) fail(EncodingError::malformed);
+    if (out_.capacity() > 2 * out_.size()) out_.shrink_to_fit();
     return std::move(out_);
 }
 

@@ -45,7 +45,7 @@ class CORVANE_EXPORT EncodingError : public Error {
 /// the encoder is of no further use.
 class CORVANE_EXPORT Encoder {
   public:
-    Encoder() = default;
+    Encoder();
     Encoder(const Encoder&) = delete;
     Encoder& operator=(const Encoder&) = delete;
 

@@ -18,6 +18,8 @@ constexpr int maximumParseDepth = 512;
 struct JSON::Storage {
     // Numbers of parsed text are of one generic kind; the library's own text keeps exact kinds.
     bool genericNumbers = false;
+    // The text was there from the start, and does not change any more.
+    bool isWritten = false;
     mutable std::once_flag textOnce;
     mutable std::string text;
     mutable std::once_flag treeOnce;
@@ -71,6 +73,7 @@ JSON::JSON(std::string_view bytes) {
 JSON JSON::fromEncodedText(std::string text) {
     auto storage = std::make_shared<Storage>();
     storage->text = std::move(text);
+    storage->isWritten = true;
     return JSON(std::move(storage));
 }
 
@@ -98,7 +101,7 @@ bool JSON::isNull() const {
 
 bool JSON::isObject() const {
     // The library's own text says so in its first character; only other text must be parsed.
-    if (!storage_->text.empty() && !storage_->genericNumbers) return storage_->text.front() == '{';
+    if (storage_->isWritten) return storage_->text.starts_with('{');
     const auto* value = storage_->value();
     return value && value->is_object();
 }
@@ -201,8 +204,9 @@ JSON JSON::payload() const {
 }
 
 const std::string& JSON::text() const {
+    if (storage_->isWritten) return storage_->text;
     std::call_once(storage_->textOnce, [this] {
-        if (storage_->text.empty() && storage_->tree) storage_->text = jsontree::write(*storage_->tree, {});
+        if (storage_->tree) storage_->text = jsontree::write(*storage_->tree, {});
     });
     return storage_->text;
 }

@@ -1,20 +1,58 @@
 #include <corvane/Platform/UUID.h>
 
+#include <corvane/Platform/Error.h>
+#include <corvane/Platform/ForkMark.h>
+
+#include <unistd.h>
 #include <boost/uuid/random_generator.hpp>
+
+#include <array>
+#include <cerrno>
+#include <cstdint>
+#include <limits>
 
 namespace corvane {
 
+namespace {
+
+/// The system's entropy, read ahead for a few identifiers: a system call for each would cost as much as making the rest
+/// of its event. A child made by fork reads anew, so that it never repeats its parent's.
+class Entropy {
+  public:
+    using result_type = std::uint64_t;
+    static constexpr result_type min() { return 0; }
+    static constexpr result_type max() { return std::numeric_limits<result_type>::max(); }
+
+    result_type operator()() {
+        if (used_ == words_.size() || read_.isInChild()) read();
+        return words_[used_++];
+    }
+
+  private:
+    void read() {
+        if (getentropy(words_.data(), sizeof words_) != 0) throw SystemError("read entropy", errno);
+        used_ = 0;
+        read_ = ForkMark();
+    }
+
+    std::array<result_type, 32> words_{};  // as much as one call gives
+    std::size_t used_ = words_.size();
+    ForkMark read_;
+};
+
+thread_local Entropy entropy;
+
+}  // namespace
+
 std::string newUUID() {
-    // The generator reads the system's entropy for every identifier, so a forked child never
-    // repeats its parent's.
-    const boost::uuids::uuid uuid = boost::uuids::random_generator()();
+    const boost::uuids::uuid uuid = boost::uuids::basic_random_generator<Entropy>(entropy)();
     constexpr char digits[] = "0123456789ABCDEF";
-    std::string text;
-    text.reserve(36);
+    std::string text(36, '-');
+    char* out = text.data();
     for (std::size_t i = 0; i < uuid.size(); ++i) {
-        if (i == 4 || i == 6 || i == 8 || i == 10) text += '-';
-        text += digits[uuid.data[i] >> 4];
-        text += digits[uuid.data[i] & 0xF];
+        if (i == 4 || i == 6 || i == 8 || i == 10) ++out;
+        *out++ = digits[uuid.data[i] >> 4];
+        *out++ = digits[uuid.data[i] & 0xF];
     }
     return text;
 }

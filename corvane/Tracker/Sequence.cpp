@@ -1,5 +1,7 @@
 #include <corvane/Tracker/Sequence.h>
 
+#include <boost/container/small_vector.hpp>
+
 #include <algorithm>
 #include <string>
 #include <utility>
@@ -25,16 +27,24 @@ bool isReplaced(const Sequence& sequence, std::size_t index) {
 }  // namespace
 
 JSON encode(const Sequence& sequence) {
+    boost::container::small_vector<JSON, 8> dicts;
+    dicts.reserve(sequence.entries.size());
+    std::size_t size = 2;
+    for (const SequenceEntry& entry : sequence.entries) {
+        dicts.push_back(dictOf(entry));
+        size += entry.name.size() + dicts.back().text().size() + 4;
+    }
     // The entries' texts were checked when they were made, so they are joined as they are.
-    std::string text = "{";
+    std::string text;
+    text.reserve(size);
+    text += '{';
     for (std::size_t i = 0; i < sequence.entries.size(); ++i) {
         const SequenceEntry& entry = sequence.entries[i];
-        const JSON dict = dictOf(entry);
         if (isReplaced(sequence, i)) continue;
         if (text.size() > 1) text += ',';
         if (!jsontext::appendString(text, entry.name)) throw EncodingError(EncodingError::notUTF8, "(property name)");
         text += ':';
-        text += dict.text();
+        text += dicts[i].text();
     }
     text += '}';
     return JSON::fromEncodedText(std::move(text));
