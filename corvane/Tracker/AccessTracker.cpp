@@ -20,4 +20,9 @@ void AccessTracker::pop(std::string_view key, DataType type) const {
     if (const auto tracker = tracker_.lock()) tracker->performPop(key, type);
 }
 
+bool AccessTracker::isUsable() const {
+    const auto tracker = tracker_.lock();
+    return !tracker || tracker->accessQueue_->isCurrent();
+}
+
 }  // namespace corvane

@@ -63,6 +63,10 @@ class CORVANE_EXPORT AccessTracker {
     void push(AnyDataEventEntry entry) const;
     void pop(std::string_view key, DataType type) const;
 
+    /// Whether the operations may be called here: the caller is on the tracker's queue, or the tracker is gone and they
+    /// do nothing. Any thread.
+    [[nodiscard]] bool isUsable() const;
+
     /// The tracker, or nullptr when it is gone.
     [[nodiscard]] std::shared_ptr<Tracker> tracker() const { return tracker_.lock(); }
 

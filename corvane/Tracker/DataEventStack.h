@@ -14,10 +14,10 @@ namespace corvane {
 
 /// One entry of a stack, with the key it is filed under and where in the host's code it was pushed.
 struct AnyDataEventEntry {
-    std::string_view key;  ///< lives as long as the program
+    std::string_view key;  ///< lives as long as the program, or as `data`
     AnyDataEvent data;
     DataEventTraits traits;
-    const char* file;  ///< lives as long as the program
+    const char* file;  ///< lives as long as the program, or as `data`
     std::uint_least32_t line;
 };
 
@@ -30,7 +30,7 @@ class CORVANE_EXPORT DataEventStack {
   public:
     DataEventStack(std::string_view stackKey, DataType type) : stackKey_(stackKey), type_(type) {}
 
-    [[nodiscard]] std::string_view stackKey() const { return stackKey_; }
+    [[nodiscard]] const std::string& stackKey() const { return stackKey_; }
     [[nodiscard]] DataType type() const { return type_; }
     [[nodiscard]] bool isEmpty() const { return entries_.empty(); }
     /// Oldest first.
@@ -44,7 +44,7 @@ class CORVANE_EXPORT DataEventStack {
     std::optional<AnyDataEventEntry> pop();
 
   private:
-    std::string_view stackKey_;
+    std::string stackKey_;  // its own: the entry that brought the key may be gone
     DataType type_;
     std::vector<AnyDataEventEntry> entries_;
 };
