@@ -33,6 +33,9 @@ class CORVANE_EXPORT EventProcessorType {
     virtual void didUpdateSession(const Session& session, bool submitQueues);
     virtual void didEndSession(const Session& session, Date endDate);
 
+    /// What tells this processor apart from others: itself, or what it stands for.
+    [[nodiscard]] virtual const void* identity() const { return this; }
+
     /// Returns true when this processor owns the background transfer session `identifier` and takes the completion
     /// over, which it then calls when the session's events are delivered.
     virtual bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion);

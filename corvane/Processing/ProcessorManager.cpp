@@ -49,9 +49,11 @@ void ProcessorManager::append(const std::shared_ptr<EventProcessorType>& eventPr
 }
 
 void ProcessorManager::remove(std::shared_ptr<EventProcessorType> eventProcessor) {
+    if (!eventProcessor) return;
     accessQueue_->async([self = shared_from_this(), eventProcessor = std::move(eventProcessor)] {
         self->accessQueue_->assertCurrent("ProcessorManager remove");
-        std::erase(self->eventProcessors_, eventProcessor);
+        std::erase_if(self->eventProcessors_,
+                      [&](const auto& added) { return added->identity() == eventProcessor->identity(); });
     });
 }
 

@@ -32,7 +32,7 @@ class CORVANE_EXPORT ProcessorManager : public std::enable_shared_from_this<Proc
     /// had just started. `registerAccessQueue` is called before this returns, and what it throws reaches the caller.
     /// Throws `InvalidArgument` for a null pointer.
     void add(std::shared_ptr<EventProcessorType> eventProcessor);
-    /// Removes every entry of a processor, which gets no further callback and no notice.
+    /// Removes every entry of the processor's `identity`, which gets no further callback and no notice.
     void remove(std::shared_ptr<EventProcessorType> eventProcessor);
     /// Hands on that the platform woke the application for a background transfer session. Every processor is asked; a
     /// request that none takes is kept, one at a time, and offered to each processor added later.
