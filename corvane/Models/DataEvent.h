@@ -27,6 +27,12 @@ namespace detail {
 CORVANE_EXPORT JSON requireObject(JSON json);
 /// The same for a value that the host made, which may also nest too deep.
 CORVANE_EXPORT JSON requireHostObject(JSON json);
+
+/// A type whose `toDict` gives what the library's own encoder wrote, which needs no second look.
+template <class T>
+concept EncodedByLibrary = requires {
+    requires T::isEncodedByLibrary;
+};
 }  // namespace detail
 
 /// A data event as a JSON object: what its own `JSON toDict() const` returns where it has one, its encoded fields
@@ -36,7 +42,8 @@ template <DataEventType T>
     if constexpr (requires {
                       { data.toDict() } -> std::same_as<JSON>;
                   }) {
-        return detail::requireHostObject(data.toDict());
+        return detail::EncodedByLibrary<T> ? detail::requireObject(data.toDict())
+                                           : detail::requireHostObject(data.toDict());
     } else {
         return detail::requireObject(encoded(data));
     }

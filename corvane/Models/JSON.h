@@ -15,6 +15,8 @@
 
 namespace corvane {
 
+class BridgedError;
+
 /// How JSON text is laid out. The default is compact, keys in the order in which they were written.
 struct JSONWritingOptions {
     bool prettyPrinted = false;  ///< one member a line, indented by two blanks
@@ -88,6 +90,9 @@ class CORVANE_EXPORT JSON {
 
     /// Serialises an object or an array. Throws `JSONError` for anything else.
     [[nodiscard]] std::string toData(JSONWritingOptions options = {}) const;
+
+    /// The same for object-facing callers: a failure returns nothing and fills `error`, unless that is nullptr.
+    [[nodiscard]] std::optional<std::string> toDataWithOptions(JSONWritingOptions options, BridgedError* error) const;
 
     /// This value if it is an object. Throws `JSONError` otherwise.
     [[nodiscard]] JSON payload() const;
