@@ -4,6 +4,9 @@ include(CMakePackageConfigHelpers)
 # Headers that only the library's own sources include: what they pull in is not a consumer's affair.
 file(GLOB_RECURSE headers RELATIVE ${PROJECT_SOURCE_DIR} CONFIGURE_DEPENDS ${PROJECT_SOURCE_DIR}/corvane/*.h)
 set(internal_headers
+    corvane/Bridge/Data/EventMirrors.h
+    corvane/Bridge/Data/StackEntry.h
+    corvane/Bridge/Models/Refusal.h
     corvane/Models/JSONTree.h
     corvane/Platform/CurlTransfer.h
     corvane/Platform/HostCall.h

@@ -1,0 +1,25 @@
+#pragma once
+
+#include <corvane/Bridge/Data/BridgedEventProperty.h>
+#include <corvane/Export.h>
+#include <corvane/Tracker/EventPropertyType.h>
+
+namespace corvane {
+
+/// A property of an event class as the tracker reads it. Immutable.
+class CORVANE_EXPORT BridgedEventMirrorProperty final : public EventPropertyType {
+  public:
+    explicit BridgedEventMirrorProperty(BridgedEventProperty bridgedEventProperty);
+    ~BridgedEventMirrorProperty() override;
+
+    [[nodiscard]] std::string_view dataKey() const override;
+    [[nodiscard]] bool isOptional() const override;
+    [[nodiscard]] EventPropertyTrait trait() const override;
+    [[nodiscard]] DataType dataType() const override;
+    [[nodiscard]] bool isDataType(DataType type) const override;
+
+  private:
+    const BridgedEventProperty bridgedEventProperty_;
+};
+
+}  // namespace corvane

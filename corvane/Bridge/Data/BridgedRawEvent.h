@@ -1,0 +1,39 @@
+#pragma once
+
+#include <corvane/Bridge/Data/BridgedRawEventProperty.h>
+#include <corvane/Export.h>
+#include <corvane/Tracker/EventSubmit.h>
+
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace corvane {
+
+/// An event that is nothing but its name and what it carries. Callers see it as `CVRawEvent`. Immutable; copies share
+/// the declaration, so an event that is submitted often is best made once. May be read from any thread.
+///
+///     const CVRawEvent view{"ScreenView", {{"screen", {"Screen", CVEventPropertyRequirement::required}}}};
+class CORVANE_EXPORT BridgedRawEvent {
+  public:
+    /// Property names with what fills them, in the order in which they stand in the event's JSON.
+    using Properties = std::vector<std::pair<std::string, BridgedRawEventProperty>>;
+
+    /// A name that is not UTF-8, a property that is declared twice, a requirement that is unknown: the event can be
+    /// made all the same, and each use of it fails with the `BridgeError` that says so.
+    BridgedRawEvent(std::string name, Properties properties);
+
+    [[nodiscard]] const std::string& name() const;
+    [[nodiscard]] const Properties& properties() const;
+
+    /// The event as trackers take it.
+    [[nodiscard]] EventSubmit eventSubmit() const;
+    /// Throws what is wrong with the declaration, if anything is.
+    void check() const;
+
+  private:
+    struct Declaration;
+    std::shared_ptr<const Declaration> declaration_;
+};
+
+}  // namespace corvane

@@ -1,0 +1,26 @@
+#pragma once
+
+#include <corvane/Bridge/Data/BridgedRawEventProperty.h>
+#include <corvane/Export.h>
+#include <corvane/Tracker/EventPropertyType.h>
+
+namespace corvane {
+
+/// A property of a raw event as the tracker reads it: data of any type under a name, which is always looked up. What a
+/// tracker knows of an event itself is for typed and bridged event classes. Immutable.
+class CORVANE_EXPORT BridgedRawEventMirrorProperty final : public EventPropertyType {
+  public:
+    explicit BridgedRawEventMirrorProperty(BridgedRawEventProperty rawEventProperty);
+    ~BridgedRawEventMirrorProperty() override;
+
+    [[nodiscard]] std::string_view dataKey() const override;
+    [[nodiscard]] bool isOptional() const override;
+    [[nodiscard]] EventPropertyTrait trait() const override;
+    [[nodiscard]] DataType dataType() const override;
+    [[nodiscard]] bool isDataType(DataType type) const override;
+
+  private:
+    const BridgedRawEventProperty rawEventProperty_;
+};
+
+}  // namespace corvane

@@ -1,0 +1,36 @@
+#pragma once
+
+#include <corvane/Bridge/Data/BridgedDataEventClass.h>
+#include <corvane/Export.h>
+#include <corvane/Models/BridgedDataEventType.h>
+#include <corvane/Models/EventData.h>
+
+#include <string>
+
+namespace corvane {
+
+/// What identifies an event, as an object. Callers see it as `CVEventData`. Immutable.
+///
+/// An event class that requires `BridgedEventData::dataClass()` gets the record that the tracker makes for the event.
+class CORVANE_EXPORT BridgedEventData final : public BridgedDataEventType {
+  public:
+    explicit BridgedEventData(EventData eventData);
+    ~BridgedEventData() override;
+
+    /// The class, named "EventData".
+    [[nodiscard]] static BridgedDataEventClass dataClass();
+
+    [[nodiscard]] const std::string& eventID() const { return eventData_.eventID; }
+    [[nodiscard]] Date eventDate() const { return eventData_.eventTimestamp; }
+    [[nodiscard]] const std::string& eventPath() const { return eventData_.eventPath; }
+    [[nodiscard]] const std::string& sessionID() const { return eventData_.sessionID; }
+
+    [[nodiscard]] std::string dataName() const override;
+    /// With the keys that the tracker's own record has in an event.
+    [[nodiscard]] HostValue::Dictionary toDict() const override;
+
+  private:
+    const EventData eventData_;
+};
+
+}  // namespace corvane
