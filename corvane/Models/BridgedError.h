@@ -13,7 +13,7 @@ namespace corvane {
 /// A value; it can be thrown too.
 ///
 ///     BridgedError error;
-///     if (!tracker.pushDataEvent(data, {}, {}, &error)) report(error.domain(), error.code(), error.what());
+///     if (!tracker.pushDataEvent(data, {}, &error)) report(error.domain(), error.code(), error.what());
 class CORVANE_EXPORT BridgedError : public std::exception {
   public:
     /// No error: an empty domain, the code 0 and no message.

@@ -1,0 +1,65 @@
+#include <corvane/Bridge/Logging/BridgingLoggingEventProcessor.h>
+
+#include <corvane/Bridge/Models/BridgeError.h>
+
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+class HostFormatter final : public LoggingEventProcessorFormatterType {
+  public:
+    explicit HostFormatter(BridgingLoggingEventProcessor::Formatter formatter) : formatter_(std::move(formatter)) {}
+    [[nodiscard]] std::string format(const ProcessEvent& processEvent) const override {
+        return formatter_(BridgedProcessEvent(processEvent));
+    }
+
+  private:
+    const BridgingLoggingEventProcessor::Formatter formatter_;
+};
+
+LoggingEventProcessorFormat libraryFormat(BridgedLoggingEventProcessorFormat format,
+                                          BridgingLoggingEventProcessor::Formatter formatter) {
+    switch (format) {
+        case BridgedLoggingEventProcessorFormat::json:
+            return LoggingEventProcessorFormat::json();
+        case BridgedLoggingEventProcessorFormat::custom:
+            if (!formatter) throw BridgeError(BridgeError::missingObject, "the formatter of the custom format");
+            return LoggingEventProcessorFormat::custom(std::make_shared<HostFormatter>(std::move(formatter)));
+        case BridgedLoggingEventProcessorFormat::default_:
+            return LoggingEventProcessorFormat::default_();
+    }
+    throw BridgeError(BridgeError::unknownValue, "the logging format");
+}
+
+}  // namespace
+
+BridgingLoggingEventProcessor::BridgingLoggingEventProcessor(BridgedLoggingEventProcessorFormat format,
+                                                             Formatter formatter)
+    : proxyEventProcessor_(libraryFormat(format, std::move(formatter))) {}
+BridgingLoggingEventProcessor::~BridgingLoggingEventProcessor() = default;
+
+void BridgingLoggingEventProcessor::registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) {
+    proxyEventProcessor_.registerAccessQueue(std::move(accessQueue));
+}
+void BridgingLoggingEventProcessor::processEvent(const BridgedProcessEvent& event) {
+    proxyEventProcessor_.process(event.processEvent());
+}
+void BridgingLoggingEventProcessor::didEnterGroup(const Group& group) {
+    proxyEventProcessor_.didEnterGroup(group);
+}
+void BridgingLoggingEventProcessor::didLeaveGroup(const Group& group) {
+    proxyEventProcessor_.didLeaveGroup(group);
+}
+void BridgingLoggingEventProcessor::didStartSession(const BridgedSession& session) {
+    proxyEventProcessor_.didStartSession(session.session());
+}
+void BridgingLoggingEventProcessor::didUpdateSession(const BridgedSession& session, bool submitEventQueues) {
+    proxyEventProcessor_.didUpdateSession(session.session(), submitEventQueues);
+}
+void BridgingLoggingEventProcessor::didEndSession(const BridgedSession& session, Date endDate) {
+    proxyEventProcessor_.didEndSession(session.session(), endDate);
+}
+
+}  // namespace corvane

@@ -1,0 +1,39 @@
+#pragma once
+
+#include <corvane/Bridge/Logging/BridgedLoggingEventProcessorFormat.h>
+#include <corvane/Bridge/Session/BridgedEventProcessorType.h>
+#include <corvane/Export.h>
+#include <corvane/Processing/LoggingEventProcessor.h>
+
+#include <functional>
+#include <string>
+
+namespace corvane {
+
+/// The logging processor for object-facing hosts, which add it like one of their own. Callers see it as
+/// `CVLoggingEventProcessor`. Shared by the host.
+class CORVANE_EXPORT BridgingLoggingEventProcessor final : public BridgedEventProcessorType {
+  public:
+    /// Turns an event into its line. Called on the session manager's queue; what it throws is logged instead.
+    using Formatter = std::function<std::string(const BridgedProcessEvent&)>;
+
+    /// @param formatter for the format `custom`; the others do not use it
+    /// Throws `BridgeError`: for an integer that is no format, and for `custom` without a formatter.
+    explicit BridgingLoggingEventProcessor(
+        BridgedLoggingEventProcessorFormat format = BridgedLoggingEventProcessorFormat::default_,
+        Formatter formatter = {});
+    ~BridgingLoggingEventProcessor() override;
+
+    void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override;
+    void processEvent(const BridgedProcessEvent& event) override;
+    void didEnterGroup(const Group& group) override;
+    void didLeaveGroup(const Group& group) override;
+    void didStartSession(const BridgedSession& session) override;
+    void didUpdateSession(const BridgedSession& session, bool submitEventQueues) override;
+    void didEndSession(const BridgedSession& session, Date endDate) override;
+
+  private:
+    LoggingEventProcessor proxyEventProcessor_;
+};
+
+}  // namespace corvane
