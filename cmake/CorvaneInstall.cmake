@@ -44,11 +44,9 @@ install(FILES
 
 # A static library leaves it to its user to link what it is made of; a shared one brings that itself.
 if(BUILD_SHARED_LIBS)
-    set(pc_cflags "")
     set(pc_libs_extra "")
     set(pc_requires "")
 else()
-    set(pc_cflags "-DCORVANE_STATIC_DEFINE")
     set(pc_libs_extra "-lboost_json -lboost_container -pthread")
     set(pc_requires "sqlite3 zlib libcurl libcrypto spdlog")
 endif()

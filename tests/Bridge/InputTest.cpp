@@ -154,10 +154,10 @@ TEST_F(BridgeInput, NamesAndObjectsThatCannotBeUsedChangeNothing) {
     CVError refused;
     EXPECT_FALSE(root->pushDataEvent(std::make_shared<Nameless>(), {}, &refused));
     EXPECT_EQ(describe(refused), "Corvane.HostError 0: no name");
-    EXPECT_THROW(CVTracker(nullptr), BridgeError);
-    EXPECT_THROW(CVSessionManager(nullptr), BridgeError);
-    EXPECT_THROW(CVLoggingEventProcessor(static_cast<CVLoggingEventProcessorFormat>(3)), BridgeError);
-    EXPECT_THROW(CVLoggingEventProcessor(CVLoggingEventProcessorFormat::custom), BridgeError);
+    EXPECT_THROW(CVTracker{nullptr}, BridgeError);
+    EXPECT_THROW(CVSessionManager{nullptr}, BridgeError);
+    EXPECT_THROW(CVLoggingEventProcessor{static_cast<CVLoggingEventProcessorFormat>(3)}, BridgeError);
+    EXPECT_THROW(CVLoggingEventProcessor{CVLoggingEventProcessorFormat::custom}, BridgeError);
     sessions->processorManager()->removeEventProcessor(nullptr);
     sessions->endSessionWithCompletion(nullptr);
     sessions->transaction(nullptr);
