@@ -1,3 +1,4 @@
+#include <corvane/Bridge/CV.h>
 #include <corvane/corvane.h>
 
 #include <cstdio>
@@ -27,7 +28,9 @@ int main(int argc, char** argv) {
     std::promise<bool> outcome;
     sessions.tracker()->submit<ScreenView>(
         [&](const EventSubmitResult& result) { outcome.set_value(result.succeeded()); });
-    const bool succeeded = outcome.get_future().get();
+    CVTracker bridged(sessions.tracker());
+    const bool pushed = bridged.pushDataEvent(std::make_shared<CVRawDataEvent>("Screen", CVDictionary{}));
+    const bool succeeded = outcome.get_future().get() && pushed;
     sessions.endSync();
     std::puts(succeeded ? "consumer: recorded" : "consumer: failed");
     return succeeded ? 0 : 1;
