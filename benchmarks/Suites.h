@@ -5,6 +5,7 @@
 namespace corvane::bench {
 
 // Each registers its figures, their yardsticks and their bars.
+void addBridgeBenchmarks();
 void addCallerBenchmarks(const std::string& serverURL);
 void addPipelineBenchmarks();
 void addDurableBenchmarks();

@@ -22,6 +22,7 @@ int main(int argc, char** argv) {
     std::string interleave = "--benchmark_enable_random_interleaving=true";
     arguments.push_back(interleave.data());
     int count = static_cast<int>(arguments.size());
+    addBridgeBenchmarks();
     addCallerBenchmarks(server.url());
     addPipelineBenchmarks();
     addDurableBenchmarks();
