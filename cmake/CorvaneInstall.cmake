@@ -9,12 +9,14 @@ set(internal_headers
     corvane/Bridge/Models/Refusal.h
     corvane/Models/JSONTree.h
     corvane/Platform/CurlTransfer.h
+    corvane/Platform/Descriptor.h
     corvane/Platform/HostCall.h
     corvane/Platform/HTTPTransfer.h
     corvane/Platform/OpenSSLUse.h
     corvane/Platform/PrivateFile.h
     corvane/Platform/TaskList.h
     corvane/Platform/Thread.h
+    corvane/Platform/TransferScheduler.h
     corvane/Platform/TransferThread.h
     corvane/Session/SessionCore.h)
 list(REMOVE_ITEM headers ${internal_headers})

@@ -80,9 +80,6 @@ void CurlTransfer::EasyDeleter::operator()(void* easy) const noexcept {
 void CurlTransfer::HeaderListDeleter::operator()(void* list) const noexcept {
     curl_slist_free_all(static_cast<curl_slist*>(list));
 }
-CurlTransfer::File::~File() {
-    if (descriptor >= 0) close(descriptor);
-}
 
 std::string CurlTransfer::hostKey(const HTTPTransfer& transfer) {
     const URLParts url = parse(transfer.request.url);
@@ -95,21 +92,28 @@ CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
       deadline_(Clock::now() + limits_.timeWithoutProgress),
       easy_(curl_easy_init()) {
     if (!easy_) throw std::bad_alloc();
-    if (transfer.bodyFile) openBody(*transfer.bodyFile);
+    if (transfer.bodyFile) openBody(*transfer.bodyFile, transfer.bodyMustBeOwn);
     setHeaders(transfer.request);
     setOptions(transfer);
 }
 
 CurlTransfer::~CurlTransfer() = default;
 
-void CurlTransfer::openBody(const std::filesystem::path& file) {
+void CurlTransfer::openBody(const std::filesystem::path& file, bool mustBeOwn) {
     // Not to wait for the other end where somebody put a pipe in the file's place.
-    body_.descriptor = open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+    const int flags = O_RDONLY | O_CLOEXEC | O_NONBLOCK | (mustBeOwn ? O_NOFOLLOW : 0);
+    body_ = Descriptor(open(file.c_str(), flags));
     struct stat status {};
-    const bool opened = body_.descriptor >= 0 && fstat(body_.descriptor, &status) == 0;
-    if (!opened || !S_ISREG(status.st_mode)) {
-        const auto why = opened ? std::string("it is not a file") : std::system_category().message(errno);
-        throw TransferError(Code::bodyUnavailable, "cannot read " + file.string() + ": " + why);
+    std::string problem;
+    if (!body_ || fstat(body_.get(), &status) != 0) {
+        problem = std::system_category().message(errno);
+    } else if (!S_ISREG(status.st_mode)) {
+        problem = "it is not a file";
+    } else if (mustBeOwn && status.st_uid != geteuid()) {
+        problem = "it belongs to another user";
+    }
+    if (!problem.empty()) {
+        throw TransferError(Code::bodyUnavailable, "cannot read " + file.string() + ": " + problem);
     }
     bodySize_ = status.st_size;
 }
@@ -197,7 +201,13 @@ std::optional<AnyError> CurlTransfer::error(int curlCode) const {
     if (curlCode == CURLE_OPERATION_TIMEDOUT) return timeoutError();
     std::string text = curl_easy_strerror(static_cast<CURLcode>(curlCode));
     if (errorText_[0]) text += std::string(": ") + errorText_;
-    return AnyError(TransferError(Code::network, std::move(text)));
+    return AnyError(TransferError(isConnected() ? Code::network : Code::unreachable, std::move(text)));
+}
+
+bool CurlTransfer::isConnected() const {
+    curl_off_t reached = 0;
+    curl_easy_getinfo(easy_.get(), CURLINFO_CONNECT_TIME_T, &reached);
+    return reached > 0;
 }
 
 std::optional<AnyError> CurlTransfer::timeoutError() const {
@@ -206,8 +216,9 @@ std::optional<AnyError> CurlTransfer::timeoutError() const {
         return AnyError(
             TransferError(Code::timedOut, "no answer came within " + std::to_string(limits_.answer.count()) + " ms"));
     }
-    return AnyError(TransferError(Code::timedOut, "nothing was sent or received for " +
-                                                      std::to_string(limits_.timeWithoutProgress.count()) + " ms"));
+    const std::string time = std::to_string(limits_.timeWithoutProgress.count()) + " ms";
+    if (!isConnected()) return AnyError(TransferError(Code::unreachable, "no connection was made for " + time));
+    return AnyError(TransferError(Code::timedOut, "nothing was sent or received for " + time));
 }
 
 std::optional<TransferResponse> CurlTransfer::response() const {
@@ -246,7 +257,7 @@ std::size_t CurlTransfer::readBody(char* buffer, std::size_t size, std::size_t c
     if (wanted <= 0) return 0;  // what was added to the file meanwhile is not part of the body
     ssize_t got = 0;
     do {
-        got = pread(transfer.body_.descriptor, buffer, static_cast<std::size_t>(wanted), transfer.bodyRead_);
+        got = pread(transfer.body_.get(), buffer, static_cast<std::size_t>(wanted), transfer.bodyRead_);
     } while (got < 0 && errno == EINTR);
     if (got <= 0) {
         transfer.bodyProblem_ = got < 0 ? "cannot read the body file: " + std::system_category().message(errno)

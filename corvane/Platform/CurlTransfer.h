@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/HTTPTransfer.h>
 
 #include <algorithm>
@@ -52,16 +53,8 @@ class CurlTransfer {
     struct HeaderListDeleter {
         void operator()(void* list) const noexcept;
     };
-    /// A file descriptor that is closed at the end.
-    struct File {
-        int descriptor = -1;
-        File() = default;
-        File(const File&) = delete;
-        File& operator=(const File&) = delete;
-        ~File();
-    };
-
-    void openBody(const std::filesystem::path& file);
+    void openBody(const std::filesystem::path& file, bool mustBeOwn);
+    [[nodiscard]] bool isConnected() const;
     void setHeaders(const TransferRequest& request);
     void setOptions(const HTTPTransfer& transfer);
     void takeHeader(std::string_view line);
@@ -74,7 +67,7 @@ class CurlTransfer {
     // Constant after construction.
     const TransferLimits limits_;
     const std::function<void(std::int64_t, std::int64_t)> didSend_;
-    File body_;
+    Descriptor body_;
     std::int64_t bodySize_ = 0;
     std::unique_ptr<void, HeaderListDeleter> headerList_;
 

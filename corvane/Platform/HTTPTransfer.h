@@ -19,6 +19,8 @@ struct HTTPTransfer {
     TransferRequest request;
     /// Sent as the body, when there is one.
     std::optional<std::filesystem::path> bodyFile;
+    /// Whether the body is sent only from a file of the process's own user that is no symbolic link.
+    bool bodyMustBeOwn = false;
     TransferLimits limits;
     /// Transfers of one pool share the limit per host.
     std::string pool;

@@ -1,5 +1,6 @@
 #include <corvane/Platform/PrivateFile.h>
 
+#include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/UUID.h>
 
@@ -17,26 +18,6 @@ namespace corvane {
 namespace {
 
 constexpr std::string_view partialExtension = ".partial";
-
-class Descriptor {
-  public:
-    explicit Descriptor(int descriptor) : descriptor_(descriptor) {}
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
-    ~Descriptor() {
-        if (descriptor_ >= 0) ::close(descriptor_);
-    }
-    [[nodiscard]] int get() const { return descriptor_; }
-    /// Closes at once: some file systems report a failed write only here.
-    [[nodiscard]] bool close() {
-        const int descriptor = descriptor_;
-        descriptor_ = -1;
-        return ::close(descriptor) == 0;
-    }
-
-  private:
-    int descriptor_;
-};
 
 bool writeAll(int descriptor, std::string_view contents) {
     while (!contents.empty()) {

@@ -14,7 +14,8 @@ class CORVANE_EXPORT TransferError : public Error {
         invalidRequest,   ///< the URL or a header cannot be sent; another attempt ends the same way
         bodyUnavailable,  ///< the body file is missing, not readable, or changed its size while it was sent
         timedOut,         ///< no byte went either way for as long as the limits allow
-        network,          ///< no name, no connection, no trust, or the connection broke
+        network,          ///< no trust, or the connection broke
+        unreachable,      ///< no name or no connection: nothing was sent
     };
 
     TransferError(Code code, std::string message);

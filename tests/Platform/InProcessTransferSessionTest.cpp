@@ -103,7 +103,7 @@ class InProcessTransferSessionTest : public testing::Test {
     }
     static std::string describe(const Recorder::Completion& completion) {
         if (const auto* error = completion.error ? completion.error->as<TransferError>() : nullptr) {
-            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut", "network"};
+            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut", "network", "unreachable"};
             return names[error->code()];
         }
         if (completion.error) return completion.error->what();
@@ -206,7 +206,7 @@ TEST_F(InProcessTransferSessionTest, FailsTheTaskAndNotTheCallWhenItCannotBeSent
         std::filesystem::path file;
         const char* expected;
     } cases[] = {
-        {closedPort, {}, body(), "network"},
+        {closedPort, {}, body(), "unreachable"},
         {server.url(), {}, documents / "missing", "bodyUnavailable"},
         {server.url(), {}, documents.path(), "bodyUnavailable"},
         {server.url(), {}, pipe, "bodyUnavailable"},
