@@ -8,18 +8,31 @@ set(internal_headers
     corvane/Bridge/Data/StackEntry.h
     corvane/Bridge/Models/Refusal.h
     corvane/Models/JSONTree.h
+    corvane/Platform/AgentDirectory.h
+    corvane/Platform/AgentLink.h
+    corvane/Platform/AgentMessage.h
+    corvane/Platform/AgentProgram.h
+    corvane/Platform/AgentThread.h
+    corvane/Platform/BackgroundTransferCore.h
+    corvane/Platform/BackgroundTransferTask.h
     corvane/Platform/CurlTransfer.h
     corvane/Platform/Descriptor.h
+    corvane/Platform/FrameSocket.h
     corvane/Platform/HostCall.h
     corvane/Platform/HTTPTransfer.h
     corvane/Platform/OpenSSLUse.h
     corvane/Platform/PrivateFile.h
     corvane/Platform/TaskList.h
     corvane/Platform/Thread.h
+    corvane/Platform/TransferOutcome.h
     corvane/Platform/TransferScheduler.h
+    corvane/Platform/TransferSubmission.h
     corvane/Platform/TransferThread.h
+    corvane/Platform/WireReader.h
+    corvane/Platform/WireWriter.h
     corvane/Session/SessionCore.h)
 list(REMOVE_ITEM headers ${internal_headers})
+list(FILTER headers EXCLUDE REGEX "^corvane/Transferd/")  # the agent's own
 foreach(header IN LISTS headers)
     get_filename_component(folder ${header} DIRECTORY)
     install(FILES ${PROJECT_SOURCE_DIR}/${header} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/${folder})
@@ -31,6 +44,10 @@ install(TARGETS corvane EXPORT corvaneTargets
     RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
     ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR})
+
+if(CORVANE_BUILD_AGENT)
+    install(TARGETS corvane-transferd RUNTIME DESTINATION ${CMAKE_INSTALL_LIBEXECDIR})
+endif()
 
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/corvane)
 install(EXPORT corvaneTargets NAMESPACE corvane:: DESTINATION ${package_dir})

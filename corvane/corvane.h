@@ -10,7 +10,9 @@
 #include <corvane/Models/Session.h>
 #include <corvane/Models/SessionData.h>
 #include <corvane/Models/TimedData.h>
+#include <corvane/Platform/BackgroundTransferSession.h>
 #include <corvane/Platform/DocumentsDirectory.h>
+#include <corvane/Platform/InProcessTransferSession.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/MainQueue.h>
 #include <corvane/Processing/LoggingEventProcessor.h>

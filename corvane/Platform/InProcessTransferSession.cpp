@@ -215,6 +215,13 @@ std::shared_ptr<TransferSessionDelegate> InProcessTransferSession::Core::listene
     return delegate_.lock();
 }
 
+TransferSession::Factory InProcessTransferSession::factory() {
+    return [](const TransferSessionConfiguration& configuration, std::weak_ptr<TransferSessionDelegate> delegate,
+              std::shared_ptr<SerialQueue> queue) {
+        return std::make_shared<InProcessTransferSession>(configuration, std::move(delegate), std::move(queue));
+    };
+}
+
 InProcessTransferSession::InProcessTransferSession(const TransferSessionConfiguration& configuration,
                                                    std::weak_ptr<TransferSessionDelegate> delegate,
                                                    std::shared_ptr<SerialQueue> queue)

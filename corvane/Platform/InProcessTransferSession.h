@@ -18,6 +18,9 @@ namespace corvane {
 /// Otherwise see `TransferSession`.
 class CORVANE_EXPORT InProcessTransferSession final : public TransferSession {
   public:
+    /// Opens sessions of this kind, for `TransferSession::setFactory`.
+    [[nodiscard]] static Factory factory();
+
     /// An empty `queue` means one of the session's own.
     InProcessTransferSession(const TransferSessionConfiguration& configuration,
                              std::weak_ptr<TransferSessionDelegate> delegate,

@@ -45,10 +45,6 @@ OpenSSLUse::OpenSSLUse() : lock_(ExitState::shared().mutex) {
     }
 }
 
-void OpenSSLUse::initialize() {
-    OPENSSL_init_crypto(OPENSSL_INIT_NO_ATEXIT | OPENSSL_INIT_LOAD_CRYPTO_STRINGS, nullptr);
-}
-
 OpenSSLUse::~OpenSSLUse() {
     OPENSSL_thread_stop();
 }

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <openssl/crypto.h>
+
 #include <shared_mutex>
 
 namespace corvane {
@@ -20,7 +22,9 @@ class OpenSSLUse {
     /// Initializes OpenSSL, before anything else that may use it, without its exit handler: a child made by fork while a
     /// thread of its parent is inside OpenSSL would wait in that handler forever. A host that was first decides for
     /// itself; then its handler is registered when this returns, so that ours, registered later, run before it.
-    static void initialize();
+    static void initialize() {
+        OPENSSL_init_crypto(OPENSSL_INIT_NO_ATEXIT | OPENSSL_INIT_LOAD_CRYPTO_STRINGS, nullptr);
+    }
 
   private:
     std::shared_lock<std::shared_mutex> lock_;

@@ -1,7 +1,8 @@
 #include <corvane/Platform/TransferSession.h>
 
+#include <corvane/Platform/BackgroundTransferSession.h>
 #include <corvane/Platform/InProcessTransferSession.h>
-#include <corvane/Platform/TransferError.h>
+#include <corvane/Platform/Log.h>
 
 #include <mutex>
 #include <utility>
@@ -19,10 +20,6 @@ Registry& registry() {
     return instance;
 }
 }  // namespace
-
-TransferError::TransferError(Code code, std::string message)
-    : Error("Corvane.TransferError", static_cast<int>(code), std::move(message)) {}
-TransferError::~TransferError() = default;
 
 TransferTask::~TransferTask() = default;
 TransferSessionDelegate::~TransferSessionDelegate() = default;
@@ -43,6 +40,11 @@ std::shared_ptr<TransferSession> TransferSession::make(TransferSessionConfigurat
         factory = registry().factory;
     }
     if (factory) return (*factory)(std::move(configuration), std::move(delegate), std::move(queue));
+    if (BackgroundTransferSession::isAvailable()) {
+        return std::make_shared<BackgroundTransferSession>(configuration, std::move(delegate), std::move(queue));
+    }
+    Log::shared().default_("Transfer agent is not installed, transfers run inside the process, session=%{public}@",
+                           configuration.identifier);
     return std::make_shared<InProcessTransferSession>(configuration, std::move(delegate), std::move(queue));
 }
 

@@ -36,8 +36,9 @@ class CORVANE_EXPORT TransferSession {
     using Listing = std::function<void(std::vector<std::shared_ptr<TransferTask>>)>;
 
     /// Replaces the way in which `make` opens sessions for the whole process; an empty factory brings back the
-    /// library's own, which transfers inside the process. Call it before the first session is opened: sessions that are
-    /// open stay as they are.
+    /// library's own: background sessions with the default options where the transfer agent is installed or was built
+    /// with the library, and sessions inside the process otherwise. Call it before the first session is opened:
+    /// sessions that are open stay as they are.
     static void setFactory(Factory factory);
 
     /// Opens a session through the process's factory. Throws what the factory throws.

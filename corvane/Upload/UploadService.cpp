@@ -30,6 +30,11 @@ std::string headerText(std::string text) {
 
 using jsontext::isUTF8;
 
+bool isGone(const std::filesystem::path& file) {
+    std::error_code failed;
+    return !std::filesystem::exists(file, failed) && !failed;
+}
+
 UploadResponse uploadResponse(const TransferResponse& response) {
     UploadResponse made{response.statusCode, response.headers};
     const bool readable = std::all_of(made.headers.begin(), made.headers.end(),
@@ -145,6 +150,10 @@ void UploadService::resubmit(std::vector<PreparedUploadRequest> requests) {
     if (requests.empty()) return;
     const auto opened = session();
     if (!opened) return;
+    {
+        std::lock_guard lock(mutex_);
+        ++pendingListings_;
+    }
     opened->tasks([weak = weak_from_this(), requests = std::move(requests)](const auto& tasks) {
         if (const auto service = weak.lock()) service->resubmit(requests, tasks);
     });
@@ -157,10 +166,19 @@ void UploadService::resubmit(const std::vector<PreparedUploadRequest>& requests,
         if (task->state() != TransferTask::State::running) continue;
         if (auto identifier = task->description()) inFlight.insert(*std::move(identifier));
     }
+    std::set<std::string> ended;
+    {
+        std::lock_guard lock(mutex_);
+        ended = endedMeanwhile_;
+        if (--pendingListings_ == 0) endedMeanwhile_.clear();
+    }
     for (const auto& request : requests) {
         Log::shared().default_("Attempting resubmission of request, identifier=%{public}@", request.identifier);
         if (inFlight.contains(request.identifier)) {
             Log::shared().default_("Resubmission of request cancelled. Already in flight, identifier=%{public}@",
+                                   request.identifier);
+        } else if (ended.contains(request.identifier) && isGone(request.dataFileURL)) {
+            Log::shared().default_("Resubmission of request cancelled. Ended meanwhile, identifier=%{public}@",
                                    request.identifier);
         } else {
             submit(request);
@@ -183,6 +201,7 @@ void UploadService::taskDidComplete(const TransferTask& task, const std::optiona
     {
         std::lock_guard lock(mutex_);
         delegate = delegate_.lock();
+        if (pendingListings_ > 0) endedMeanwhile_.insert(task.description().value_or(unknown));
     }
     if (delegate) delegate->uploadService(*this, ending);
 }

@@ -14,6 +14,7 @@
 #include <memory>
 #include <mutex>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -102,6 +103,10 @@ class CORVANE_EXPORT UploadService final : public UploadServiceType,
     std::weak_ptr<UploadServiceDelegate> delegate_;
     std::shared_ptr<SerialQueue> accessQueue_;
     Completions backgroundCompletions_;
+    // What ended while a retry pass waits for the listing of tasks: an earlier run's upload that has had its outcome is
+    // neither in flight then nor to be sent again.
+    int pendingListings_ = 0;
+    std::set<std::string> endedMeanwhile_;
 };
 
 }  // namespace corvane

@@ -10,6 +10,8 @@
 
 #include "tests/Integration/Application.h"
 
+#include <corvane/Platform/InProcessTransferSession.h>
+
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -68,6 +70,7 @@ int main(int argc, char** argv) {
     const std::string mode = argv[5];
     const int events = std::atoi(argv[4]);
     DocumentsDirectory::set(argv[2]);
+    TransferSession::setFactory(InProcessTransferSession::factory());
     Log::shared().setSink([](LogLevel, std::string_view) {});
     staticHost.application = std::make_unique<Application>(argv[1], std::atoi(argv[3]));
     Application& application = *staticHost.application;

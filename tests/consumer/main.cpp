@@ -19,6 +19,9 @@ struct ScreenView {
 int main(int argc, char** argv) {
     if (argc > 1) DocumentsDirectory::set(argv[1]);
     Log::shared().setSink([](LogLevel, std::string_view) {});
+    // The agent comes with the package; this program does not start it.
+    if (!BackgroundTransferSession::isAvailable()) return 2;
+    TransferSession::setFactory(InProcessTransferSession::factory());
     SessionManager sessions;
     const Endpoint endpoint{"http://127.0.0.1:1/events", "main"};  // nobody listens there
     sessions.processorManager()->add(

@@ -1,0 +1,142 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <variant>
+#include <vector>
+
+namespace corvane {
+
+/// What the library and the transfer agent say to each other; docs/formats/transfer-protocol.md has the bytes and the
+/// order. Values, which are neither renumbered nor changed without a new protocol version. Internal.
+namespace agent {
+
+/// The version that both must speak.
+constexpr std::int64_t protocolVersion = 1;
+
+/// The library's first message.
+struct Hello {
+    static constexpr std::uint8_t kind = 1;
+    std::int64_t version = protocolVersion;
+    std::string session;
+    std::string owner;
+    /// As in `TransferSubmission`; replaces what the agent knows, unless it is empty.
+    std::vector<std::string> wakeCommand;
+    void visit(auto&& with) { with(version, session, owner, wakeCommand); }
+};
+/// A submission has been put into the spool.
+struct Submit {
+    static constexpr std::uint8_t kind = 2;
+    std::string token;
+    void visit(auto&& with) { with(token); }
+};
+/// Asks for the owner's tasks.
+struct List {
+    static constexpr std::uint8_t kind = 3;
+    void visit(auto&&) {}
+};
+/// The delegate has been told of a completion; the agent may forget the task.
+struct Acknowledge {
+    static constexpr std::uint8_t kind = 4;
+    std::string token;
+    void visit(auto&& with) { with(token); }
+};
+/// Changes a task's description.
+struct Describe {
+    static constexpr std::uint8_t kind = 5;
+    std::string token;
+    std::string description;
+    void visit(auto&& with) { with(token, description); }
+};
+/// Asks to be told when nothing more waits for the library.
+struct Flush {
+    static constexpr std::uint8_t kind = 6;
+    void visit(auto&&) {}
+};
+/// Asks for a sign of life.
+struct Ping {
+    static constexpr std::uint8_t kind = 7;
+    void visit(auto&&) {}
+};
+
+/// The agent's first message.
+struct Welcome {
+    static constexpr std::uint8_t kind = 65;
+    std::int64_t version = protocolVersion;
+    void visit(auto&& with) { with(version); }
+};
+/// The task is in the journal, and the agent's affair from now on.
+struct Accepted {
+    static constexpr std::uint8_t kind = 66;
+    std::string token;
+    void visit(auto&& with) { with(token); }
+};
+/// The task was not taken, and is not in the journal.
+struct Refused {
+    static constexpr std::uint8_t kind = 67;
+    std::string token;
+    std::string reason;
+    void visit(auto&& with) { with(token, reason); }
+};
+/// One of the owner's tasks, in the order in which they were accepted.
+struct Known {
+    static constexpr std::uint8_t kind = 68;
+    std::string token;
+    std::optional<std::string> description;
+    void visit(auto&& with) { with(token, description); }
+};
+/// Every task was named.
+struct Listed {
+    static constexpr std::uint8_t kind = 69;
+    void visit(auto&&) {}
+};
+/// So much of a task's body has gone out.
+struct Progress {
+    static constexpr std::uint8_t kind = 70;
+    std::string token;
+    std::int64_t total = 0;
+    std::int64_t expected = 0;
+    void visit(auto&& with) { with(token, total, expected); }
+};
+/// A task is over; said again to the next connection unless it is acknowledged.
+struct Completed {
+    static constexpr std::uint8_t kind = 71;
+    std::string token;
+    std::optional<std::string> description;
+    std::string outcome;  ///< the bytes of a `TransferOutcome`
+    void visit(auto&& with) { with(token, description, outcome); }
+};
+/// Nothing waits for the library any more.
+struct Flushed {
+    static constexpr std::uint8_t kind = 72;
+    void visit(auto&&) {}
+};
+struct Pong {
+    static constexpr std::uint8_t kind = 73;
+    void visit(auto&&) {}
+};
+/// An acknowledged task has left the journal.
+struct Forgotten {
+    static constexpr std::uint8_t kind = 74;
+    std::string token;
+    void visit(auto&& with) { with(token); }
+};
+
+using Request = std::variant<Hello, Submit, List, Acknowledge, Describe, Flush, Ping>;
+using Reply = std::variant<Welcome, Accepted, Refused, Known, Listed, Progress, Completed, Flushed, Pong, Forgotten>;
+
+/// The longest message there may be, without its length: an answer's head of 256 KiB fits.
+constexpr std::size_t longestMessage = std::size_t{512} * 1024;
+
+/// The bytes of a message, without its length.
+[[nodiscard]] std::string encode(Request message);
+[[nodiscard]] std::string encode(Reply message);
+/// Throw `InvalidArgument` for bytes that are no such message.
+[[nodiscard]] Request decodeRequest(std::string_view bytes);
+[[nodiscard]] Reply decodeReply(std::string_view bytes);
+
+}  // namespace agent
+}  // namespace corvane

@@ -1,0 +1,115 @@
+#include <corvane/Platform/AgentThread.h>
+
+#include <corvane/Platform/AgentLink.h>
+#include <corvane/Platform/Error.h>
+#include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/Thread.h>
+
+#include <poll.h>
+#include <sys/eventfd.h>
+#include <sys/wait.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <chrono>
+#include <cstdlib>
+#include <limits>
+#include <utility>
+
+namespace corvane {
+
+AgentThread& AgentThread::shared() {
+    static auto& instance = *new AgentThread;
+    return instance;
+}
+
+AgentThread::AgentThread() : wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
+    if (!wakeUp_) throw SystemError("make an event descriptor", errno);
+    SignalsBlocked blocked;
+    thread_ = std::thread([this] {
+        prepareThread("com.veskar.corvane.agent-link", false);
+        run();
+    });
+    std::atexit([] { shared().stop(); });
+}
+
+void AgentThread::stop() {
+    if (made_.isInChild()) return;
+    {
+        std::lock_guard lock(mutex_);
+        stopping_ = true;
+    }
+    wakeUp();
+    thread_.join();
+}
+
+void AgentThread::wakeUp() const noexcept {
+    eventfd_write(wakeUp_.get(), 1);
+}
+
+void AgentThread::post(std::function<void()> work) {
+    if (made_.isInChild()) return;  // a thread of the parent may have held the lock
+    {
+        std::lock_guard lock(mutex_);
+        if (stopping_) return;
+        inbox_.push_back(std::move(work));
+        if (inbox_.size() > 1) return;  // it has been woken for the first
+    }
+    wakeUp();
+}
+
+void AgentThread::attach(std::shared_ptr<AgentLink> link) {
+    post([this, link = std::move(link)] { links_.push_back(link); });
+}
+
+void AgentThread::run() {
+    while (takeInbox()) {
+        for (const auto& link : links_)
+            callHost("transfer agent link", [&] { link->proceed(AgentLink::Clock::now()); });
+        std::erase_if(links_, [](const auto& link) { return link->isClosed(); });
+        reapEnded();
+        wait();
+    }
+}
+
+bool AgentThread::takeInbox() {
+    std::vector<std::function<void()>> inbox;
+    {
+        std::lock_guard lock(mutex_);
+        if (stopping_) return false;
+        inbox.swap(inbox_);
+    }
+    for (const auto& work : inbox) callHost("transfer agent link", work);
+    return true;
+}
+
+// By number, and never for "any child": the host's own children are the host's.
+void AgentThread::reapEnded() {
+    std::erase_if(unreaped_, [](pid_t process) {
+        const pid_t ended = waitpid(process, nullptr, WNOHANG);
+        return ended == process || (ended < 0 && errno == ECHILD);
+    });
+}
+
+void AgentThread::wait() {
+    constexpr int untilReaped = 5;
+    std::vector<pollfd> polled{{wakeUp_.get(), POLLIN, 0}};
+    auto next = AgentLink::Clock::time_point::max();
+    for (const auto& link : links_) {
+        if (const auto wanted = link->polled(); wanted.fd >= 0) polled.push_back(wanted);
+        next = std::min(next, link->nextDeadline());
+    }
+    int milliseconds = -1;
+    if (next != AgentLink::Clock::time_point::max()) {
+        const auto left = std::chrono::ceil<std::chrono::milliseconds>(next - AgentLink::Clock::now()).count();
+        milliseconds = static_cast<int>(std::clamp<std::int64_t>(left, 0, std::numeric_limits<int>::max()));
+    }
+    if (!unreaped_.empty()) milliseconds = milliseconds < 0 ? untilReaped : std::min(milliseconds, untilReaped);
+    poll(polled.data(), polled.size(), milliseconds);
+    if (polled.front().revents != 0) {
+        eventfd_t ignored = 0;
+        eventfd_read(wakeUp_.get(), &ignored);
+    }
+}
+
+}  // namespace corvane

@@ -1,0 +1,373 @@
+#include <corvane/Transferd/Agent.h>
+
+#include <corvane/Platform/Error.h>
+#include <corvane/Platform/TransferError.h>
+#include <corvane/Platform/TransferOutcome.h>
+#include <corvane/Transferd/WakeUp.h>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <limits>
+#include <type_traits>
+#include <utility>
+
+namespace corvane::transferd {
+
+namespace {
+
+using namespace std::chrono_literals;
+
+// Completions that a client may leave unacknowledged, and bytes that it may leave unread, before it gets more.
+constexpr std::size_t mostTold = 32;
+constexpr std::size_t mostUnreadForMore = std::size_t{64} * 1024;
+// A host that has started the agent, or lost it, is about to connect.
+constexpr auto beforeWaking = 500ms;
+
+std::int64_t milliseconds() {
+    return std::chrono::duration_cast<std::chrono::milliseconds>(std::chrono::system_clock::now().time_since_epoch())
+        .count();
+}
+
+// A submission as a host has left it. Throws for anything that no host of this user can have put there.
+TransferSubmission readSubmission(const std::filesystem::path& file) {
+    const Descriptor opened(open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
+    struct stat status {};
+    if (!opened || fstat(opened.get(), &status) != 0) throw SystemError("read " + file.string(), errno);
+    if (!S_ISREG(status.st_mode) || status.st_uid != geteuid()) throw InvalidArgument("not a file of this user");
+    if (status.st_size > static_cast<off_t>(TransferSubmission::longest)) throw InvalidArgument("too long");
+    std::string bytes(static_cast<std::size_t>(status.st_size), '\0');
+    const ssize_t count = read(opened.get(), bytes.data(), bytes.size());
+    if (count != status.st_size) throw InvalidArgument("the submission cannot be read whole");
+    return TransferSubmission::decode(bytes);
+}
+
+}  // namespace
+
+Agent::Agent(const AgentDirectory& directory, Journal& journal, const Options& options)
+    : directory_(directory),
+      options_(options),
+      book_(journal),
+      queue_(*this, options.retryDelay),
+      clients_(*this),
+      listener_(directory.listen()),
+      watch_(directory) {
+    book_.load([this](std::int64_t number, const TransferSubmission& submission) { enqueue(number, submission); });
+}
+
+void Agent::run() {
+    while (!isRemoved_) {
+        if (std::exchange(spoolChanged_, false)) {
+            dropWithdrawn();
+            importSpool();
+        }
+        const auto now = Clock::now();
+        queue_.proceed(now);
+        reportProgress();
+        settleEnded();
+        deliver();
+        answerFlushes();
+        wakeHosts(now);
+        clients_.flush();
+        if (isIdle(now) && endsNow()) break;
+        waitForNews();
+    }
+    directory_.removeSocket();
+}
+
+void Agent::waitForNews() {
+    const auto now = Clock::now();
+    std::vector<pollfd> polled{{listener_.get(), POLLIN, 0}, {watch_.descriptor(), POLLIN, 0}};
+    if (watch_.descriptor() < 0) polled.pop_back();
+    const std::size_t own = polled.size();
+    clients_.appendTo(polled);
+    const bool isAwaited = spoolChanged_;
+    queue_.wait(polled, isAwaited ? 0 : std::min(queue_.millisecondsToDeadline(now), millisecondsToTimer(now)));
+    if (own > 1 && polled[1].revents != 0) {
+        isRemoved_ = !watch_.take();
+        spoolChanged_ = true;
+    }
+    clients_.proceed(std::span(polled).subspan(own));
+    if (polled[0].revents != 0) clients_.accept(listener_.get());
+}
+
+// --- Submissions. ----------------------------------------------------------------------------------------------------
+
+// One that cannot be read stays nobody's: its host has not been told that it was accepted.
+void Agent::importSpool() {
+    for (const auto& token : directory_.spooled()) {
+        try {
+            import(token);
+        } catch (const std::exception&) {
+        }
+    }
+}
+
+// Removes the submission once the journal has it, or once it is clear that it never will.
+std::int64_t Agent::import(const std::string& token) {
+    const auto file = directory_.submission(token);
+    if (const auto known = book_.find(token)) {
+        unlink(file.c_str());
+        return *known;
+    }
+    TransferSubmission submission;
+    try {
+        submission = readSubmission(file);
+        if (submission.token != token) throw InvalidArgument("the submission is another task's");
+    } catch (const InvalidArgument&) {
+        unlink(file.c_str());
+        throw;
+    }
+    const auto number = book_.add(submission, milliseconds());
+    if (unlink(file.c_str()) != 0) spoolChanged_ = true;  // taken back in this moment
+    book_.setWakeCommand(*book_.task(number).owner, submission.wakeCommand);
+    enqueue(number, submission);
+    return number;
+}
+
+void Agent::enqueue(std::int64_t number, const TransferSubmission& submission) {
+    try {
+        queue_.add(number, UploadQueue::hostKey(submission.request), submission.limits.transfersPerHost);
+    } catch (const TransferError&) {
+        book_.finish(number, TransferOutcome::of(AnyError::current(), std::nullopt));
+    }
+}
+
+// What a host has taken back it sends itself; nobody waits for the agent's word on it.
+void Agent::dropWithdrawn() {
+    for (const auto& token : directory_.withdrawn()) {
+        try {
+            if (const auto number = book_.find(token)) {
+                queue_.remove(*number);
+                book_.forget(*number);
+            }
+            directory_.removeMark(token);
+        } catch (const InvalidArgument&) {  // the journal: the mark stays for the next start
+        }
+    }
+}
+
+std::optional<HTTPTransfer> Agent::transfer(std::int64_t number) {
+    if (directory_.isWithdrawn(book_.task(number).token)) {
+        spoolChanged_ = true;
+        return std::nullopt;
+    }
+    TransferSubmission submission = book_.submission(number);
+    HTTPTransfer transfer;
+    transfer.request = std::move(submission.request);
+    transfer.bodyFile = std::move(submission.file);
+    transfer.bodyMustBeOwn = true;
+    transfer.limits = submission.limits;
+    return transfer;
+}
+
+bool Agent::mayWait(std::int64_t number) {
+    return milliseconds() < book_.task(number).expires;
+}
+
+// --- Clients. --------------------------------------------------------------------------------------------------------
+
+void Agent::request(Client& client, const agent::Request& request) {
+    const auto* hello = std::get_if<agent::Hello>(&request);
+    if ((hello != nullptr) == (client.owner != nullptr))
+        throw InvalidArgument("a greeting is expected once, and first");
+    if (hello) return greet(client, *hello);
+    std::visit(
+        [&](const auto& one) {
+            using One = std::remove_cvref_t<decltype(one)>;
+            if constexpr (std::is_same_v<One, agent::Submit>) {
+                submit(client, one.token);
+            } else if constexpr (std::is_same_v<One, agent::List>) {
+                list(client);
+            } else if constexpr (std::is_same_v<One, agent::Acknowledge>) {
+                acknowledge(client, one.token);
+            } else if constexpr (std::is_same_v<One, agent::Describe>) {
+                describe(client, one);
+            } else if constexpr (std::is_same_v<One, agent::Flush>) {
+                client.isFlushing = true;
+            } else if constexpr (std::is_same_v<One, agent::Ping>) {
+                client.send(agent::Pong{});
+            }
+        },
+        request);
+}
+
+// One that speaks another version learns which this one is, and goes.
+void Agent::greet(Client& client, const agent::Hello& hello) {
+    client.send(agent::Welcome{});
+    if (hello.version != agent::protocolVersion) {
+        client.isLeaving = true;
+        return;
+    }
+    client.owner = &book_.owner(hello.session, hello.owner);
+    client.owner->isWoken = false;
+    book_.setWakeCommand(*client.owner, hello.wakeCommand);
+}
+
+void Agent::submit(Client& client, const std::string& token) {
+    if (!TransferSubmission::isToken(token)) throw InvalidArgument("not a token");
+    try {
+        const auto number = import(token);
+        if (book_.task(number).owner != client.owner) throw InvalidArgument("the task is another owner's");
+        book_.task(number).submitter = client.id;
+        client.send(agent::Accepted{token});
+    } catch (const std::exception& error) {
+        client.send(agent::Refused{token, error.what()});
+    }
+}
+
+void Agent::list(Client& client) {
+    importSpool();  // what another host of this owner has left there is under way, too
+    std::set<std::int64_t> numbers = client.owner->open;
+    for (const auto& [number, told] : client.owner->over) numbers.insert(number);
+    for (const auto number : numbers) client.send(agent::Known{book_.task(number).token, book_.description(number)});
+    client.send(agent::Listed{});
+}
+
+void Agent::acknowledge(Client& client, const std::string& token) {
+    const auto number = book_.find(token);
+    if (number && book_.task(*number).owner == client.owner) {
+        if (!client.owner->over.contains(*number)) throw InvalidArgument("the task is not over");
+        book_.forget(*number);
+        client.told.erase(*number);
+    }
+    client.send(agent::Forgotten{token});
+}
+
+void Agent::describe(const Client& client, const agent::Describe& change) {
+    const auto number = book_.find(change.token);
+    if (number && book_.task(*number).owner == client.owner) book_.describe(*number, change.description);
+}
+
+// What it was told and has not acknowledged is for the next one. Its last submission may still be in the spool.
+void Agent::left(Client& client) {
+    spoolChanged_ = true;
+    if (!client.owner) return;
+    for (const auto number : client.told) {
+        if (const auto found = client.owner->over.find(number); found != client.owner->over.end()) found->second = 0;
+    }
+}
+
+// --- Completions. ----------------------------------------------------------------------------------------------------
+
+void Agent::settleEnded() {
+    for (auto& ended : queue_.takeEnded()) {
+        if (!book_.contains(ended.number)) continue;
+        book_.finish(ended.number, TransferOutcome::of(ended.error, std::move(ended.response)));
+    }
+}
+
+void Agent::reportProgress() {
+    for (const auto& progress : queue_.takeProgress()) {
+        if (!book_.contains(progress.number)) continue;
+        const auto& task = book_.task(progress.number);
+        Client* client = addressee(*task.owner, progress.number);
+        if (client && client->socket.unsent() < mostUnreadForMore) {
+            client->send(agent::Progress{task.token, progress.total, progress.expected});
+        }
+    }
+}
+
+void Agent::deliver() {
+    for (auto& [key, owner] : book_.owners()) {
+        if (!owner.over.empty() && hasClient(owner)) deliver(owner);
+    }
+}
+
+void Agent::deliver(Owner& owner) {
+    for (auto& [number, told] : owner.over) {
+        if (told == 0) deliver(owner, number);
+    }
+}
+
+void Agent::deliver(Owner& owner, std::int64_t number) {
+    Client* client = addressee(owner, number);
+    if (!client || client->told.size() >= mostTold || client->socket.unsent() >= mostUnreadForMore) return;
+    client->send(agent::Completed{book_.task(number).token, book_.description(number), book_.outcome(number)});
+    client->told.insert(number);
+    owner.over[number] = client->id;
+}
+
+// The host that submitted a task hears of it while it is there, and then the first of the same owner.
+ClientList::Client* Agent::addressee(const Owner& owner, std::int64_t number) {
+    if (Client* submitter = clients_.find(book_.task(number).submitter)) return submitter;
+    const auto found = std::find_if(clients_.all().begin(), clients_.all().end(),
+                                    [&](const Client& client) { return client.owner == &owner; });
+    return found == clients_.all().end() ? nullptr : &*found;
+}
+
+void Agent::answerFlushes() {
+    for (auto& client : clients_.all()) {
+        if (!client.isFlushing || !client.told.empty()) continue;
+        const auto& over = client.owner->over;
+        const bool isWaitedFor = std::any_of(over.begin(), over.end(), [&](const auto& one) {
+            return one.second == 0 && addressee(*client.owner, one.first) == &client;
+        });
+        if (isWaitedFor) continue;
+        client.isFlushing = false;
+        client.send(agent::Flushed{});
+    }
+}
+
+// --- Waking, and the end. --------------------------------------------------------------------------------------------
+
+bool Agent::hasClient(const Owner& owner) const {
+    return std::any_of(clients_.all().begin(), clients_.all().end(),
+                       [&](const Client& client) { return client.owner == &owner; });
+}
+
+bool Agent::isDueToWake(const Owner& owner, Clock::time_point now) const {
+    return !owner.over.empty() && !owner.isWoken && !owner.wakeCommand.empty() && !hasClient(owner) &&
+           (owner.open.empty() || queue_.isStalled(now));
+}
+
+void Agent::wakeHosts(Clock::time_point now) {
+    bool isDue = false;
+    for (auto& [key, owner] : book_.owners()) isDue = isDue || isDueToWake(owner, now);
+    if (!isDue) return wakesFrom_.reset();
+    if (!wakesFrom_) wakesFrom_ = now + beforeWaking;
+    if (now < *wakesFrom_) return;
+    for (auto& [key, owner] : book_.owners()) {
+        if (!isDueToWake(owner, now)) continue;
+        auto command = owner.wakeCommand;
+        command.push_back(owner.session);
+        owner.isWoken = true;
+        runDetached(command, options_.mask);
+    }
+    wakesFrom_.reset();
+}
+
+int Agent::millisecondsToTimer(Clock::time_point now) {
+    auto next = Clock::time_point::max();
+    if (idleSince_) next = std::min(next, *idleSince_ + options_.idleTime);
+    if (wakesFrom_) next = std::min(next, *wakesFrom_);
+    if (next == Clock::time_point::max()) return std::numeric_limits<int>::max();
+    const auto left = std::chrono::ceil<std::chrono::milliseconds>(next - now).count();
+    return static_cast<int>(std::clamp<std::int64_t>(left, 0, std::numeric_limits<int>::max()));
+}
+
+bool Agent::isIdle(Clock::time_point now) {
+    if (!queue_.isEmpty() || clients_.hasGuests() || wakesFrom_) {
+        idleSince_.reset();
+        return false;
+    }
+    if (!idleSince_) idleSince_ = now;
+    return now >= *idleSince_ + options_.idleTime;
+}
+
+// A host that comes in this moment finds no socket, and starts an agent that waits for this one's lock; a submission
+// that it left before is still seen here.
+bool Agent::endsNow() {
+    directory_.removeSocket();
+    listener_ = Descriptor();
+    dropWithdrawn();
+    importSpool();
+    if (queue_.isEmpty()) return true;
+    listener_ = directory_.listen();
+    idleSince_.reset();
+    return false;
+}
+
+}  // namespace corvane::transferd

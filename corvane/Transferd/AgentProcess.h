@@ -1,0 +1,31 @@
+#pragma once
+
+#include <corvane/Platform/AgentDirectory.h>
+#include <corvane/Platform/Descriptor.h>
+
+#include <sys/types.h>
+
+#include <optional>
+#include <string>
+
+namespace corvane::transferd {
+
+/// What makes a process an agent: it leaves its parent and everything that it has inherited behind.
+namespace process {
+
+/// Makes the process independent of whoever started it: default signals, no descriptors but the standard ones,
+/// directory "/", file mode mask 077. Returns the mask that it had. First of all, while there is one thread.
+mode_t leaveEverything() noexcept;
+
+/// Goes on in a child that has no terminal and whose parent has ended, which ends this process.
+void becomeDaemon() noexcept;
+
+/// Holds the directory's lock; nothing when a living agent has it. Waits a moment for one that is about to end. Throws
+/// `SystemError`.
+[[nodiscard]] std::optional<Descriptor> lock(const AgentDirectory& directory);
+
+/// Tells whoever started the process how that went, and lets go of the standard output.
+void report(const std::string& line) noexcept;
+
+}  // namespace process
+}  // namespace corvane::transferd

@@ -1,0 +1,67 @@
+#pragma once
+
+#include <corvane/Platform/AgentMessage.h>
+#include <corvane/Platform/FrameSocket.h>
+#include <corvane/Transferd/TaskBook.h>
+
+#include <poll.h>
+
+#include <cstdint>
+#include <list>
+#include <set>
+#include <span>
+#include <vector>
+
+namespace corvane::transferd {
+
+/// The connections of the agent. One that breaks the protocol, belongs to another user or does not read what it is
+/// sent is closed, and no other notices.
+class ClientList {
+  public:
+    static constexpr std::size_t mostClients = 64;
+
+    struct Client {
+        Client(std::uint64_t number, FrameSocket connected) : id(number), socket(std::move(connected)) {}
+
+        std::uint64_t id;
+        FrameSocket socket;
+        TaskBook::Owner* owner = nullptr;  ///< from its greeting on
+        std::set<std::int64_t> told;       ///< completions that it has not acknowledged
+        bool isFlushing = false;
+        bool isLeaving = false;  ///< closed at the next opportunity
+
+        void send(agent::Reply reply) { socket.send(agent::encode(std::move(reply))); }
+    };
+
+    /// What the clients say. What a call throws closes the client's connection.
+    class Handler {
+      public:
+        virtual ~Handler() = default;
+        virtual void request(Client& client, const agent::Request& request) = 0;
+        virtual void left(Client& client) = 0;
+    };
+
+    explicit ClientList(Handler& handler) : handler_(handler) {}
+
+    /// Takes connections that wait at a listening socket.
+    void accept(int listener);
+    void appendTo(std::vector<pollfd>& polled) const;
+    /// Reads, handles and sends, and lets go of those that left. `polled` are the entries that `appendTo` appended.
+    void proceed(std::span<const pollfd> polled);
+    void flush();
+
+    [[nodiscard]] std::list<Client>& all() { return clients_; }
+    [[nodiscard]] const std::list<Client>& all() const { return clients_; }
+    [[nodiscard]] Client* find(std::uint64_t id);
+    [[nodiscard]] bool hasGuests() const;
+
+  private:
+    void read(Client& client);
+    void removeLeaving();
+
+    Handler& handler_;
+    std::list<Client> clients_;
+    std::uint64_t lastID_ = 0;
+};
+
+}  // namespace corvane::transferd

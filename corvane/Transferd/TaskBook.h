@@ -1,0 +1,76 @@
+#pragma once
+
+#include <corvane/Platform/TransferOutcome.h>
+#include <corvane/Transferd/Journal.h>
+
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <optional>
+#include <set>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <utility>
+#include <vector>
+
+namespace corvane::transferd {
+
+/// The agent's tasks and their owners: what the journal holds, with an index in memory that costs a task a few hundred
+/// bytes. Throws what the journal throws; the index then is as before.
+class TaskBook {
+  public:
+    /// Beyond this many tasks no more are taken, so that a host that runs wild fills neither memory nor disk.
+    static constexpr std::size_t mostTasks = 50'000;
+
+    /// All hosts that use one session identifier with one owner key.
+    struct Owner {
+        std::string session;
+        std::string key;
+        std::vector<std::string> wakeCommand;
+        std::set<std::int64_t> open;                 ///< tasks that are not over
+        std::map<std::int64_t, std::uint64_t> over;  ///< tasks that are; with the client that was told, or 0
+        bool isWoken = false;                        ///< the command was run, and no host has connected since
+    };
+    struct Task {
+        std::string token;
+        Owner* owner = nullptr;
+        std::int64_t expires = 0;     ///< when it stops waiting for its server, in milliseconds since 1970
+        std::uint64_t submitter = 0;  ///< the client that asked for it to be taken, or 0
+    };
+
+    explicit TaskBook(Journal& journal) : journal_(journal) {}
+
+    /// Reads the journal; `visit` gets every task that is not over.
+    void load(const std::function<void(std::int64_t number, const TransferSubmission&)>& visit);
+
+    /// The owner, made when it is not known yet.
+    Owner& owner(const std::string& session, const std::string& key);
+    void setWakeCommand(Owner& owner, const std::vector<std::string>& command);
+
+    std::int64_t add(const TransferSubmission& submission, std::int64_t now);
+    /// A task that the journal cannot be told of any more counts as over until the agent ends.
+    void finish(std::int64_t number, const TransferOutcome& outcome);
+    void forget(std::int64_t number);
+    void describe(std::int64_t number, const std::string& description) { journal_.describe(number, description); }
+
+    [[nodiscard]] std::optional<std::int64_t> find(std::string_view token) const;
+    [[nodiscard]] Task& task(std::int64_t number) { return tasks_.at(number); }
+    [[nodiscard]] bool contains(std::int64_t number) const { return tasks_.contains(number); }
+    [[nodiscard]] std::size_t size() const { return tasks_.size(); }
+    [[nodiscard]] std::map<std::pair<std::string, std::string>, Owner>& owners() { return owners_; }
+    [[nodiscard]] TransferSubmission submission(std::int64_t number) { return journal_.submission(number); }
+    [[nodiscard]] std::optional<std::string> description(std::int64_t number) { return journal_.description(number); }
+    [[nodiscard]] std::string outcome(std::int64_t number);
+
+  private:
+    void index(std::int64_t number, std::int64_t accepted, const TransferSubmission& submission, bool isOver);
+
+    Journal& journal_;
+    std::map<std::pair<std::string, std::string>, Owner> owners_;
+    std::unordered_map<std::int64_t, Task> tasks_;
+    std::unordered_map<std::string, std::int64_t> numbers_;
+    std::map<std::int64_t, std::string> unwritten_;  // outcomes that the journal has not taken
+};
+
+}  // namespace corvane::transferd

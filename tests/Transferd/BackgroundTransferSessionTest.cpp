@@ -1,0 +1,216 @@
+#include "tests/Transferd/AgentFixture.h"
+
+#include <arpa/inet.h>
+#include <signal.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace corvane::test {
+namespace {
+
+using Reply = ScriptedServer::Reply;
+using Outcomes = std::map<std::string, std::string>;
+
+class BackgroundTransferSessionTest : public AgentFixture {};
+
+TEST_F(BackgroundTransferSessionTest, UploadsThroughTheAgentAndForgetsWhatWasReported) {
+    server.script(Reply::status(201));
+    server.script(Reply::status(503));
+    auto session = open(recorder);
+    upload(*session, server.url("/a"), "a");
+    ASSERT_TRUE(recorder->wait(1));
+    const auto before = recorder->bytesSent();
+    upload(*session, server.url("/b"), "b");
+    ASSERT_TRUE(recorder->wait(2));
+    EXPECT_EQ(recorder->bytesSent() - before, 1);
+    EXPECT_EQ(recorder->outcomes(), (Outcomes{{"a", "201"}, {"b", "503"}}));
+    const auto requests = server.requests();
+    EXPECT_EQ(requests.at(0).method, "PUT");
+    EXPECT_EQ(requests.at(0).header("X-Task"), "a");
+    EXPECT_EQ(requests.at(0).body, "a");
+    EXPECT_TRUE(running(*session).empty());
+    EXPECT_GT(agent(), 0) << "it was the agent that sent them";
+    EXPECT_EQ(log.count("agent"), 0);
+}
+
+TEST_F(BackgroundTransferSessionTest, TasksOutliveTheirSessionAndAreReportedOnceToTheNext) {
+    server.script(Reply::status(200).hold(), 3);
+    auto first = open(recorder);
+    for (const auto* name : {"a", "b", "c"}) upload(*first, server.url(), name);
+    ASSERT_TRUE(server.waitForRequests(3));
+    first.reset();
+
+    auto second = std::make_shared<SessionRecorder>();
+    auto session = open(second);
+    EXPECT_EQ(running(*session), (std::vector<std::string>{"a", "b", "c"}));
+    session->deliverPendingEvents();
+    ASSERT_TRUE(second->waitForSignal()) << "nothing is pending yet";
+    EXPECT_EQ(second->completedAtSignal(), 0u);
+    session.reset();
+    server.release(3);
+    second = std::make_shared<SessionRecorder>();
+    session = open(second);
+    ASSERT_TRUE(second->wait(3));
+    EXPECT_EQ(second->outcomes(), (Outcomes{{"a", "200"}, {"b", "200"}, {"c", "200"}}));
+    session->deliverPendingEvents();
+    ASSERT_TRUE(second->waitForSignal());
+    EXPECT_EQ(second->completedAtSignal(), 3u);
+    EXPECT_TRUE(running(*session).empty());
+    EXPECT_TRUE(recorder->outcomes().empty()) << "its session had gone";
+    EXPECT_EQ(server.requests().size(), 3u);
+}
+
+TEST_F(BackgroundTransferSessionTest, OwnersSeeTheirOwnTasksOnly) {
+    server.script(Reply::status(200).hold(), 2);
+    const auto other = std::make_shared<SessionRecorder>();
+    auto mine = open(recorder, "mine");
+    auto theirs = open(other, "theirs");
+    upload(*mine, server.url(), "a");
+    upload(*theirs, server.url(), "b");
+    ASSERT_TRUE(server.waitForRequests(2));
+    EXPECT_EQ(running(*mine), std::vector<std::string>{"a"});
+    EXPECT_EQ(running(*theirs), std::vector<std::string>{"b"});
+    server.release(2);
+    ASSERT_TRUE(recorder->wait(1) && other->wait(1));
+    EXPECT_EQ(recorder->outcomes(), (Outcomes{{"a", "200"}}));
+    EXPECT_EQ(other->outcomes(), (Outcomes{{"b", "200"}}));
+}
+
+TEST_F(BackgroundTransferSessionTest, RefusesBodiesThatAreNoFilesOfTheUser) {
+    auto session = open(recorder);
+    const auto file = body("file");
+    std::filesystem::create_symlink(file, documents / "link");
+    ASSERT_EQ(mkfifo((documents / "pipe").c_str(), 0600), 0);
+    std::vector<std::filesystem::path> cases{documents / "missing", documents.path(), documents / "link",
+                                             documents / "pipe", "/dev/null"};
+    if (geteuid() == 0 && chown(body("foreign").c_str(), 1, 1) == 0) cases.push_back(documents / "foreign");
+    Outcomes expected;
+    for (const auto& one : cases) {
+        const auto task = session->uploadTask({.url = server.url(), .headers = {}}, one);
+        task->setDescription(one.string());
+        task->resume();
+        expected[one.string()] = "bodyUnavailable";
+    }
+    ASSERT_TRUE(recorder->wait(cases.size()));
+    EXPECT_EQ(recorder->outcomes(), expected);
+    EXPECT_TRUE(server.requests().empty());
+}
+
+// A port of the loopback address at which nobody listens until it is told to.
+class LatePort {
+  public:
+    LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+        address_.sin_family = AF_INET;
+        address_.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+        socklen_t size = sizeof address_;
+        EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address_), size), 0);
+        getsockname(socket_, reinterpret_cast<sockaddr*>(&address_), &size);
+    }
+    ~LatePort() { close(socket_); }
+    [[nodiscard]] std::string url() const { return "http://127.0.0.1:" + std::to_string(ntohs(address_.sin_port)); }
+    void answerOne() const {
+        listen(socket_, 8);
+        const int connection = accept(socket_, nullptr, nullptr);
+        char buffer[4096];
+        EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
+        const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
+        send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
+        recv(connection, buffer, sizeof buffer, 0);
+        close(connection);
+    }
+
+  private:
+    int socket_;
+    sockaddr_in address_{};
+};
+
+TEST_F(BackgroundTransferSessionTest, WaitsForAServerThatIsNotThereYetUntilItsPatienceIsOver) {
+    LatePort late;
+    const LatePort never;
+    auto session = open(recorder);
+    upload(*session, late.url(), "late");
+    options.patience = 100ms;
+    const auto other = std::make_shared<SessionRecorder>();
+    auto impatient = open(other, "impatient");
+    for (const auto* name : {"a", "b", "c"}) upload(*impatient, never.url(), name);
+    ASSERT_TRUE(other->wait(3));
+    EXPECT_EQ(other->outcomes(), (Outcomes{{"a", "unreachable"}, {"b", "unreachable"}, {"c", "unreachable"}}));
+    EXPECT_EQ(running(*session), std::vector<std::string>{"late"});
+    late.answerOne();
+    ASSERT_TRUE(recorder->wait(1));
+    EXPECT_EQ(recorder->outcomes(), (Outcomes{{"late", "200"}}));
+}
+
+TEST_F(BackgroundTransferSessionTest, TransfersInsideTheProcessWhenNoAgentCanBeHad) {
+    const auto broken = body("broken", "no program");
+    chmod(broken.c_str(), 0700);
+    options.deadline = 300ms;
+    const std::filesystem::path programs[] = {"/nowhere/agent", broken, "/bin/false", "/bin/true"};
+    for (const auto& program : programs) {
+        const auto told = std::make_shared<SessionRecorder>();
+        const int before = log.count("Transfer agent is not available");
+        options.program = program;
+        auto session = open(told);
+        upload(*session, server.url(), "a");
+        EXPECT_TRUE(told->wait(1)) << program;
+        EXPECT_EQ(told->outcomes(), (Outcomes{{"a", "200"}})) << program;
+        EXPECT_TRUE(running(*session).empty());
+        session->deliverPendingEvents();
+        EXPECT_TRUE(told->waitForSignal());
+        EXPECT_EQ(log.count("Transfer agent is not available"), before + 1) << program;
+        EXPECT_EQ(files("spool"), 0u) << "no agent will send it again";
+    }
+    EXPECT_EQ(server.requests().size(), 4u);
+}
+
+TEST_F(BackgroundTransferSessionTest, TakesOverFromAnAgentThatHangsWhichThenLeavesTheTasksAlone) {
+    options.deadline = 300ms;
+    options.holdOff = 0ms;
+    auto session = open(recorder);
+    server.script(Reply::status(200).hold(), 4);  // the agent has four under way, and others wait
+    const auto name = [](int i) { return "task " + std::to_string(i); };
+    for (int i = 0; i < 8; ++i) upload(*session, server.url(), name(i));
+    ASSERT_TRUE(server.waitForRequests(4));
+    kill(SIGSTOP);
+    for (int i = 8; i < 12; ++i) upload(*session, server.url(), name(i));
+    ASSERT_TRUE(recorder->wait(12));
+    EXPECT_EQ(recorder->outcomes().size(), 12u);
+    EXPECT_EQ(log.count("Transfer agent is not available"), 1);
+    kill(SIGCONT);
+    server.release(4);
+    upload(*session, server.url(), name(12));
+    ASSERT_TRUE(recorder->wait(13));
+    EXPECT_TRUE(running(*session).empty());
+    EXPECT_EQ(recorder->outcomes()[name(12)], "200");
+    const auto arrived = bodies(server);
+    EXPECT_EQ(arrived.size(), 13u);
+    for (int i = 4; i < 13; ++i) EXPECT_EQ(arrived.at(name(i)), 1) << i << ": was not under way";
+    EXPECT_TRUE(eventually([&] { return files("withdrawn") == 0 && files("spool") == 0; }));
+}
+
+TEST_F(BackgroundTransferSessionTest, GoesOnWithAJournalThatSurvivesItsAgentOrIsDamaged) {
+    server.script(Reply::never(), 4);
+    auto session = open(recorder);
+    for (int i = 0; i < 10; ++i) upload(*session, server.url(), std::to_string(i));
+    ASSERT_TRUE(server.waitForRequests(4));
+    EXPECT_EQ(running(*session).size(), 10u);
+    kill(SIGKILL);
+    ASSERT_TRUE(recorder->wait(10));
+    for (const auto& [name, outcome] : recorder->outcomes()) EXPECT_EQ(outcome, "200") << name;
+    EXPECT_EQ(log.count("Transfer agent was lost"), 1);
+    session.reset();
+    end(options.directory);
+
+    std::filesystem::remove(options.directory / "journal.db-wal");
+    writeFile(options.directory / "journal.db", std::string(8192, 'x'));
+    const auto told = std::make_shared<SessionRecorder>();
+    session = open(told);
+    upload(*session, server.url(), "after");
+    ASSERT_TRUE(told->wait(1));
+    EXPECT_EQ(log.count("Transfer agent reports a problem"), 1);
+    EXPECT_TRUE(std::filesystem::exists(options.directory / "journal.db.damaged"));
+}
+
+}  // namespace
+}  // namespace corvane::test
