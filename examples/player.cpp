@@ -235,6 +235,9 @@ int main(int argc, char** argv) {
         std::shared_ptr<UploadBatchEventProcessor> uploads;
         if (argc > 1) {
             DocumentsDirectory::set("corvane-player");
+            // It waits for its delivery, so nothing needs to go on when it has ended; examples/background shows the
+            // rest.
+            TransferSession::setFactory(InProcessTransferSession::factory());
             uploads = std::make_shared<UploadBatchEventProcessor>(Client{"com.example.player", "Player", "2.3", 117},
                                                                   Endpoint{argv[1], "main"});
         }

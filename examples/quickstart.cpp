@@ -78,6 +78,8 @@ int main(int argc, char** argv) {
     try {
         Log::shared().setLevel(LogLevel::debug);  // the logging processor writes at debug level
         DocumentsDirectory::set(argc == 3 ? argv[2] : "corvane-quickstart");
+        // It waits for its delivery, so nothing needs to go on when it has ended.
+        TransferSession::setFactory(InProcessTransferSession::factory());
         return record(argv[1]) ? EXIT_SUCCESS : EXIT_FAILURE;
     } catch (const std::exception& error) {
         std::fprintf(stderr, "quickstart: %s\n", error.what());

@@ -126,6 +126,7 @@ void print(const char* what, const DeliveryReport::Count& count) {
 bool replayLog(const Options& options) {
     Input input(options.file);  // first: a wrong name leaves nothing behind
     DocumentsDirectory::set(options.documents);
+    TransferSession::setFactory(InProcessTransferSession::factory());  // it waits for its delivery
     Log::shared().setLevel(LogLevel::error);
     const Client client{"com.example.replay", "Replay", "1.0", 1};
     const Endpoint endpoint{options.endpoint, "replay"};
