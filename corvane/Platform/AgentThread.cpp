@@ -63,24 +63,28 @@ void AgentThread::attach(std::shared_ptr<AgentLink> link) {
 }
 
 void AgentThread::run() {
-    while (takeInbox()) {
+    bool goesOn = true;
+    while (goesOn) {
+        goesOn = takeInbox();
         for (const auto& link : links_)
             callHost("transfer agent link", [&] { link->proceed(AgentLink::Clock::now()); });
         std::erase_if(links_, [](const auto& link) { return link->isClosed(); });
         reapEnded();
-        wait();
+        if (goesOn) wait();
     }
 }
 
+// The last round, at the exit, still sends what was handed over: an acknowledgement spares the next run a report.
 bool AgentThread::takeInbox() {
     std::vector<std::function<void()>> inbox;
+    bool isLast = false;
     {
         std::lock_guard lock(mutex_);
-        if (stopping_) return false;
+        isLast = stopping_;
         inbox.swap(inbox_);
     }
     for (const auto& work : inbox) callHost("transfer agent link", work);
-    return true;
+    return !isLast;
 }
 
 // By number, and never for "any child": the host's own children are the host's.

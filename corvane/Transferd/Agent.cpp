@@ -138,14 +138,11 @@ void Agent::enqueue(std::int64_t number, const TransferSubmission& submission) {
 // What a host has taken back it sends itself; nobody waits for the agent's word on it.
 void Agent::dropWithdrawn() {
     for (const auto& token : directory_.withdrawn()) {
-        try {
-            if (const auto number = book_.find(token)) {
-                queue_.remove(*number);
-                book_.forget(*number);
-            }
-            directory_.removeMark(token);
-        } catch (const InvalidArgument&) {  // the journal: the mark stays for the next start
+        if (const auto number = book_.find(token)) {
+            queue_.remove(*number);
+            book_.forget(*number);
         }
+        directory_.removeMark(token);
     }
 }
 
@@ -285,7 +282,11 @@ void Agent::deliver(Owner& owner) {
 void Agent::deliver(Owner& owner, std::int64_t number) {
     Client* client = addressee(owner, number);
     if (!client || client->told.size() >= mostTold || client->socket.unsent() >= mostUnreadForMore) return;
-    client->send(agent::Completed{book_.task(number).token, book_.description(number), book_.outcome(number)});
+    try {
+        client->send(agent::Completed{book_.task(number).token, book_.description(number), book_.outcome(number)});
+    } catch (const InvalidArgument&) {  // the journal cannot be read: it is tried again when something happens
+        return;
+    }
     client->told.insert(number);
     owner.over[number] = client->id;
 }

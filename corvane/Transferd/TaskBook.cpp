@@ -23,8 +23,11 @@ TaskBook::Owner& TaskBook::owner(const std::string& session, const std::string& 
 
 void TaskBook::setWakeCommand(Owner& owner, const std::vector<std::string>& command) {
     if (command.empty() || command == owner.wakeCommand) return;
-    journal_.setWake({owner.session, owner.key, command});
     owner.wakeCommand = command;
+    try {
+        journal_.setWake({owner.session, owner.key, command});
+    } catch (const InvalidArgument&) {  // said again with every submission and every connection
+    }
 }
 
 std::int64_t TaskBook::add(const TransferSubmission& submission, std::int64_t now) {
@@ -57,7 +60,14 @@ void TaskBook::finish(std::int64_t number, const TransferOutcome& outcome) {
 }
 
 void TaskBook::forget(std::int64_t number) {
-    journal_.forget(number);
+    unforgotten_.push_back(number);
+    try {
+        while (!unforgotten_.empty()) {
+            journal_.forget(unforgotten_.back());
+            unforgotten_.pop_back();
+        }
+    } catch (const InvalidArgument&) {  // tried again with the next one
+    }
     const auto found = tasks_.find(number);
     found->second.owner->open.erase(number);
     found->second.owner->over.erase(number);

@@ -17,7 +17,7 @@
 namespace corvane::transferd {
 
 /// The agent's tasks and their owners: what the journal holds, with an index in memory that costs a task a few hundred
-/// bytes. Throws what the journal throws; the index then is as before.
+/// bytes. What reads the journal, and `add` and `describe`, throw what it throws; the index then is as before.
 class TaskBook {
   public:
     /// Beyond this many tasks no more are taken, so that a host that runs wild fills neither memory nor disk.
@@ -51,6 +51,7 @@ class TaskBook {
     std::int64_t add(const TransferSubmission& submission, std::int64_t now);
     /// A task that the journal cannot be told of any more counts as over until the agent ends.
     void finish(std::int64_t number, const TransferOutcome& outcome);
+    /// A row that the journal cannot remove goes with a later one, or is reported again by the next agent.
     void forget(std::int64_t number);
     void describe(std::int64_t number, const std::string& description) { journal_.describe(number, description); }
 
@@ -71,6 +72,7 @@ class TaskBook {
     std::unordered_map<std::int64_t, Task> tasks_;
     std::unordered_map<std::string, std::int64_t> numbers_;
     std::map<std::int64_t, std::string> unwritten_;  // outcomes that the journal has not taken
+    std::vector<std::int64_t> unforgotten_;          // rows that it has not removed
 };
 
 }  // namespace corvane::transferd
