@@ -122,6 +122,7 @@ void BackgroundTransferCore::start(const std::shared_ptr<Task>& task) {
         directory_->withdraw(task->token());
         return;
     }
+    task->setSpooled();
     AgentThread::shared().post([self = shared_from_this(), token = task->token()] { self->submitted(token); });
 }
 
@@ -156,8 +157,15 @@ bool BackgroundTransferCore::mayBecomeReady() const {
 }
 
 void BackgroundTransferCore::submitted(const std::string& token) {
-    link_->send(agent::Submit{token}, 1);
+    if (const auto task = find(token)) submit(*task);
     watch();
+}
+
+// An agent that found the submission by itself may be through with it, and have forgotten it: to ask for it then would
+// look like a task that was lost.
+void BackgroundTransferCore::submit(const Task& task) {
+    if (!task.isKeptBy(Keeper::agent) || !task.isUnanswered() || isReported(task.token())) return;
+    link_->send(agent::Submit{task.token()}, 1);
 }
 
 void BackgroundTransferCore::takeOver(const std::shared_ptr<Task>& task) {
@@ -242,10 +250,7 @@ void BackgroundTransferCore::signal() {
 }
 
 void BackgroundTransferCore::agentIsReady() {
-    for (const auto& task : openTasks()) {
-        if (!task->isKeptBy(Keeper::agent)) continue;
-        if (!task->isAccepted()) link_->send(agent::Submit{task->token()}, 1);
-    }
+    for (const auto& task : openTasks()) submit(*task);
     answered_ = asked_;  // what was asked of the lost one is not answered any more
     for (auto& [question, listing] : listings_) question = asked_ + 1;
     ask();
@@ -258,7 +263,8 @@ void BackgroundTransferCore::agentAccepted(const std::string& token) {
 }
 
 void BackgroundTransferCore::agentRefused(const std::string& token, const std::string& reason) {
-    if (const auto task = find(token)) takeBack(task, reason.c_str());
+    const auto task = find(token);
+    if (task && !isReported(token)) takeBack(task, reason.c_str());
     watch();
 }
 

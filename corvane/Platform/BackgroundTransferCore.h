@@ -79,6 +79,7 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     [[nodiscard]] static std::set<std::string>& acknowledged();
     [[nodiscard]] bool isReported(const std::string& token);
     void submitted(const std::string& token);
+    void submit(const Task& task);
     void takeOver(const std::shared_ptr<Task>& task);
     void takeBack(const std::shared_ptr<Task>& task, const char* why);
     void missed(const std::vector<AgentLink::Task>& listed);

@@ -70,6 +70,16 @@ bool BackgroundTransferTask::moveTo(Keeper keeper) {
     return true;
 }
 
+void BackgroundTransferTask::setSpooled() {
+    std::lock_guard lock(mutex_);
+    spooled_ = true;
+}
+
+bool BackgroundTransferTask::isUnanswered() const {
+    std::lock_guard lock(mutex_);
+    return spooled_ && !accepted_;
+}
+
 void BackgroundTransferTask::setAccepted() {
     std::lock_guard lock(mutex_);
     accepted_ = true;

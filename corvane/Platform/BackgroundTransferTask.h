@@ -50,7 +50,11 @@ class BackgroundTransferTask final : public TransferTask, public std::enable_sha
     [[nodiscard]] bool isKeptBy(Keeper keeper) const;
     /// False when the keeper was this one, or a later one, already, and for a task that is over.
     bool moveTo(Keeper keeper);
+    /// The submission is there for the agent to take, and has been taken.
+    void setSpooled();
     void setAccepted();
+    /// Whether the agent can have the submission and has not said so.
+    [[nodiscard]] bool isUnanswered() const;
     [[nodiscard]] bool isAccepted() const;
     void setCompleted();
 
@@ -70,6 +74,7 @@ class BackgroundTransferTask final : public TransferTask, public std::enable_sha
     std::optional<std::string> description_;
     State state_ = State::suspended;
     Keeper keeper_ = Keeper::nobody;
+    bool spooled_ = false;
     bool accepted_ = false;
     Progress noted_;
     std::int64_t reported_ = 0;

@@ -148,11 +148,15 @@ std::string UploadService::signature(const std::filesystem::path& file) {
 
 void UploadService::resubmit(std::vector<PreparedUploadRequest> requests) {
     if (requests.empty()) return;
-    const auto opened = session();
-    if (!opened) return;
     {
-        std::lock_guard lock(mutex_);
+        std::lock_guard lock(mutex_);  // before the session is opened: its first words may be completions
         ++pendingListings_;
+    }
+    const auto opened = session();
+    if (!opened) {
+        std::lock_guard lock(mutex_);
+        --pendingListings_;
+        return;
     }
     opened->tasks([weak = weak_from_this(), requests = std::move(requests)](const auto& tasks) {
         if (const auto service = weak.lock()) service->resubmit(requests, tasks);
