@@ -67,8 +67,7 @@ std::vector<std::string> tokensIn(const std::filesystem::path& directory) {
 
 }  // namespace
 
-AgentDirectory::AgentDirectory(std::filesystem::path directory)
-    : path_(std::filesystem::absolute(std::move(directory))) {
+AgentDirectory::AgentDirectory(const std::filesystem::path& directory) : path_(std::filesystem::absolute(directory)) {
     for (const auto& one : {path_, spool(), path_ / "withdrawn"}) {
         createPrivateDirectories(one);
         requireOwn(one);

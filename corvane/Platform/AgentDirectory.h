@@ -17,7 +17,7 @@ namespace corvane {
 class AgentDirectory {
   public:
     /// Creates what is missing. Throws `SystemError`, and `InvalidArgument` when the directory is another user's.
-    explicit AgentDirectory(std::filesystem::path directory);
+    explicit AgentDirectory(const std::filesystem::path& directory);
 
     [[nodiscard]] const std::filesystem::path& path() const { return path_; }
     [[nodiscard]] std::filesystem::path journal() const { return path_ / "journal.db"; }
