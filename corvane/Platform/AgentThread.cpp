@@ -3,6 +3,7 @@
 #include <corvane/Platform/AgentLink.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/OpenSSLUse.h>
 #include <corvane/Platform/Thread.h>
 
 #include <poll.h>
@@ -25,6 +26,9 @@ AgentThread& AgentThread::shared() {
 
 AgentThread::AgentThread() : wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
     if (!wakeUp_) throw SystemError("make an event descriptor", errno);
+    // Whatever registers handlers of its own for the exit comes first: transfers that the thread takes over begin on
+    // it.
+    OpenSSLUse::initialize();
     SignalsBlocked blocked;
     thread_ = std::thread([this] {
         prepareThread("com.veskar.corvane.agent-link", false);
