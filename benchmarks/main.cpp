@@ -7,6 +7,7 @@
 #include "benchmarks/Table.h"
 #include "tests/support/TemporaryDocuments.h"
 
+#include <corvane/Platform/InProcessTransferSession.h>
 #include <corvane/Platform/Log.h>
 
 #include <cstring>
@@ -17,6 +18,7 @@ int main(int argc, char** argv) {
     using namespace corvane::bench;
     const Server server;  // before there are threads
     const corvane::test::TemporaryDocuments documents;
+    corvane::TransferSession::setFactory(corvane::InProcessTransferSession::factory());
     corvane::Log::shared().setLevel(corvane::LogLevel::error);
     std::vector<char*> arguments(argv, argv + argc);
     std::string interleave = "--benchmark_enable_random_interleaving=true";

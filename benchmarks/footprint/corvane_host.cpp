@@ -17,6 +17,7 @@ using namespace corvane::bench;
 int main(int argc, char** argv) {
     if (argc != 3) return 2;
     DocumentsDirectory::set(argv[1]);
+    TransferSession::setFactory(InProcessTransferSession::factory());  // an agent's memory is its own
     Log::shared().setLevel(LogLevel::error);
     Log::shared().setSink([](LogLevel, std::string_view) {});
     Host host(std::make_shared<UploadBatchEventProcessor>(Client{"com.example.footprint", "Footprint", "1.0", 1},

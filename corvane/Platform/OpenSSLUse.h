@@ -19,8 +19,8 @@ class OpenSSLUse {
     OpenSSLUse(const OpenSSLUse&) = delete;
     OpenSSLUse& operator=(const OpenSSLUse&) = delete;
 
-    /// Initializes OpenSSL, before anything else that may use it, without its exit handler: a child made by fork while a
-    /// thread of its parent is inside OpenSSL would wait in that handler forever. A host that was first decides for
+    /// Initializes OpenSSL, before anything else that may use it, without its exit handler: a child made by fork while
+    /// a thread of its parent is inside OpenSSL would wait in that handler forever. A host that was first decides for
     /// itself; then its handler is registered when this returns, so that ours, registered later, run before it.
     static void initialize() {
         OPENSSL_init_crypto(OPENSSL_INIT_NO_ATEXIT | OPENSSL_INIT_LOAD_CRYPTO_STRINGS, nullptr);
