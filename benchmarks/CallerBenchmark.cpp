@@ -8,10 +8,12 @@
 #include <corvane/Store/DeferredStoreCore.h>
 
 #include <spdlog/async.h>
-#include <spdlog/sinks/null_sink.h>
+#include <spdlog/sinks/base_sink.h>
+#include <spdlog/sinks/basic_file_sink.h>
 
 #include <array>
 #include <condition_variable>
+#include <future>
 #include <mutex>
 #include <thread>
 
@@ -65,17 +67,55 @@ class BareQueue {
     std::thread thread_;
 };
 
-/// spdlog's asynchronous logger with a sink that does nothing, and room for a whole burst.
+/// spdlog's asynchronous logger with room for a whole burst. Its lines are formatted and dropped by the system.
 class AsyncLogger {
   public:
+    explicit AsyncLogger(spdlog::sink_ptr sink = std::make_shared<spdlog::sinks::basic_file_sink_mt>("/dev/null"))
+        : logger_("bench", std::move(sink), pool_, spdlog::async_overflow_policy::block) {}
+
     void log(int i) { logger_.info("screen={} depth={} viewer={} plan={}", home.name, i, viewer.id, *viewer.plan); }
 
   private:
     std::shared_ptr<spdlog::details::thread_pool> pool_ =
         std::make_shared<spdlog::details::thread_pool>(4 * burstCalls, 1);
-    spdlog::async_logger logger_{"bench", std::make_shared<spdlog::sinks::null_sink_mt>(), pool_,
-                                 spdlog::async_overflow_policy::block};
+    spdlog::async_logger logger_;
 };
+
+/// Holds up the logger's thread with the first line, until it is released.
+class HeldSink final : public spdlog::sinks::base_sink<std::mutex> {
+  public:
+    void release() { released_.set_value(); }
+
+  protected:
+    void sink_it_(const spdlog::details::log_msg&) override { isReleased_.wait(); }
+    void flush_() override {}
+
+  private:
+    std::promise<void> released_;
+    std::shared_future<void> isReleased_ = released_.get_future().share();
+};
+
+/// The enqueueing alone, without another thread that takes the same lock.
+void addUncontended() {
+    const std::string name = "caller/submit, burst, worker held";
+    add(name, [] {
+        Host host;
+        host.tracker->suspend();
+        auto figures = burst(burstCalls, [&](int) { host.tracker->submit<ScreenView>(); });
+        host.tracker->resume();
+        host.drain();
+        return figures;
+    });
+    add(name + "~spdlog async", [] {
+        const auto sink = std::make_shared<HeldSink>();
+        AsyncLogger logger(sink);
+        auto figures = burst(burstCalls, [&](int i) { logger.log(i); });
+        sink->release();
+        return figures;
+    });
+    setBar(name + "~spdlog async", "mean ns", 0.5);
+    setBar(name + "~spdlog async", "p99.9 ns", 1);
+}
 
 void addSubmit() {
     add("caller/submit, burst", [] {
@@ -201,6 +241,7 @@ void addOperation(const std::string& name, Call call) {
 
 void addCallerBenchmarks(const std::string& serverURL) {
     addSubmit();
+    addUncontended();
     addThreads();
     addStalls(serverURL);
     addOperation("caller/push", [](Host& host, int) { host.tracker->push(home); });
