@@ -17,7 +17,7 @@ class NullUploadManager final : public UploadManagerType {
     void open() override {}
     void close() override {}
     void registerAccessQueue(std::shared_ptr<SerialQueue>) override {}
-    void upload(const UploadRequest&) override {}
+    UploadTaken upload(const UploadRequest&) override { return UploadTaken::recorded; }
     bool shouldResume(std::string_view, std::function<void()>) override { return false; }
 };
 

@@ -7,6 +7,7 @@ set(internal_headers
     corvane/Bridge/Data/EventMirrors.h
     corvane/Bridge/Data/StackEntry.h
     corvane/Bridge/Models/Refusal.h
+    corvane/Models/JSONShape.h
     corvane/Models/JSONTree.h
     corvane/Platform/AgentDirectory.h
     corvane/Platform/AgentLink.h

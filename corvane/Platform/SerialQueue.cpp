@@ -88,6 +88,7 @@ struct SerialQueue::State {
 
     static void startWorker(const std::shared_ptr<State>& state);
     void work();
+    void workUntil(const bool& done, std::unique_lock<std::mutex>& lock);
     void runTaken(TaskList& taken);
 };
 
@@ -97,10 +98,11 @@ void SerialQueue::State::startWorker(const std::shared_ptr<State>& state) {
     try {
         startDetachedThread(state->label, state->qualityOfService == QualityOfService::background,
                             [state] { state->work(); });
-    } catch (const std::system_error& error) {
+    } catch (const std::exception& error) {  // no thread, or no memory for one
         Log::shared().error("Failed to start thread, queue=%{public}@, error=%{public}@", state->label, error.what());
         std::lock_guard lock(state->mutex);
         state->workerStarted = false;  // what waits stays; the next call tries again
+        state->syncDone.notify_all();  // whoever waits for the queue sees to it now
     }
 }
 
@@ -120,6 +122,26 @@ void SerialQueue::State::work() {
         runTaken(taken);
         lock.lock();
         running = false;
+    }
+}
+
+// For a caller that waits for its own task on a queue without a thread: runs what waits, in order, where it is. `done`
+// is guarded by the mutex.
+void SerialQueue::State::workUntil(const bool& done, std::unique_lock<std::mutex>& lock) {
+    while (!done) {
+        if (workerStarted || running || suspended()) {
+            syncDone.wait(lock);
+            continue;
+        }
+        TaskList taken;
+        taken.takeAll(waiting);
+        running = true;
+        lock.unlock();
+        runTaken(taken);
+        lock.lock();
+        running = false;
+        if (workerStarted) wake.notify_one();
+        syncDone.notify_all();
     }
 }
 
@@ -191,6 +213,7 @@ void SerialQueue::runSync(FunctionRef function) {
                     std::lock_guard guard(state->mutex);
                     state->running = false;
                     wake = state->asleep && (!state->waiting.empty() || state->closed);
+                    if (!state->workerStarted) state->syncDone.notify_all();
                 }
                 if (wake) state->wake.notify_one();
             }
@@ -201,6 +224,7 @@ void SerialQueue::runSync(FunctionRef function) {
         return;
     }
 
+    const auto held = state_;  // the last reference to the queue may go while the caller waits
     struct Call {
         FunctionRef function;
         const Frame* outer;
@@ -222,10 +246,10 @@ void SerialQueue::runSync(FunctionRef function) {
     state.workerStarted = true;
     const bool wake = state.asleep && !state.running && !state.suspended();
     lock.unlock();
-    if (start) State::startWorker(state_);
+    if (start) State::startWorker(held);
     if (wake) state.wake.notify_one();
     lock.lock();
-    while (!call.done) state.syncDone.wait(lock);
+    state.workUntil(call.done, lock);
     lock.unlock();
     if (call.error) std::rethrow_exception(call.error);
 }
@@ -241,7 +265,8 @@ void SerialQueue::resume() {
         CORVANE_REQUIRE(state_->suspended(), "resume of a queue that is not suspended, queue=" + label());
         --state_->suspensions;
     }
-    state_->wake.notify_one();
+    state_->wake.notify_all();  // the worker, or a caller that works in its place
+    state_->syncDone.notify_all();
 }
 
 bool SerialQueue::isCurrent() const noexcept {

@@ -46,7 +46,8 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
 
     /// Runs `function` on the queue, after everything enqueued before, and returns its result or
     /// rethrows what it threw. When the queue is idle and not suspended it runs on the caller's
-    /// thread; otherwise the caller waits. Either way the function is on this queue and still on
+    /// thread; otherwise the caller waits. When the process has no thread left for the queue, the caller runs what was
+    /// enqueued before, too. Either way the function is on this queue and still on
     /// every queue the caller was on.
     ///
     /// Requires: the caller is not on this queue (it would wait for itself; the process is stopped

@@ -57,4 +57,14 @@ std::string newUUID() {
     return text;
 }
 
+bool isUUID(std::string_view text) noexcept {
+    if (text.size() != 36) return false;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        const bool isHyphen = i == 8 || i == 13 || i == 18 || i == 23;
+        const bool isDigit = (text[i] >= '0' && text[i] <= '9') || (text[i] >= 'A' && text[i] <= 'F');
+        if (isHyphen ? text[i] != '-' : !isDigit) return false;
+    }
+    return true;
+}
+
 }  // namespace corvane

@@ -1,5 +1,7 @@
 #include <corvane/Processing/UploadBatchEntity.h>
 
+#include <corvane/Models/JSONShape.h>
+
 #include <algorithm>
 #include <utility>
 
@@ -11,7 +13,15 @@ namespace {
     throw StoreStepper::Errors(StoreStepper::Errors::badDataInColumn, detail);
 }
 
-std::shared_ptr<const EncodedEvents> readEvents(const std::string& bytes) {
+// The texts go out as they were written: a number may have more digits than a reader keeps, and a key may be there
+// twice. A row that is laid out in another way, which only another program writes, is written anew.
+std::shared_ptr<const EncodedEvents> readEvents(std::string bytes) {
+    constexpr auto opening = EncodedEvents::opening, closing = EncodedEvents::closing;
+    if (const auto count = jsonshape::objectsBetween(bytes, opening, closing)) {
+        bytes.resize(bytes.size() - closing.size());
+        bytes.erase(0, opening.size());
+        return std::make_shared<EncodedEvents>(std::move(bytes), *count);
+    }
     const auto events = JSON(bytes)["events"].array();
     if (!events) failBadData("there is no array of events");
     auto encoded = std::make_shared<EncodedEvents>();
@@ -40,9 +50,9 @@ StorableValue UploadBatchEntity::storableValue(std::string_view columnName) cons
 UploadBatchEntity UploadBatchEntity::read(StoreStepper& stepper) {
     std::string identifier = stepper.text();
     auto events = readEvents(stepper.bytes());
-    JSON session(stepper.bytes());
-    if (!session.isObject()) failBadData("the session is not an object");
-    return {std::move(identifier), std::move(session), std::move(events)};
+    auto session = stepper.bytes();
+    if (!JSON(session).isObject()) failBadData("the session is not an object");
+    return {std::move(identifier), JSON::fromEncodedText(std::move(session)), std::move(events)};
 }
 
 }  // namespace corvane

@@ -10,8 +10,10 @@
 #include <corvane/Upload/UploadRequest.h>
 #include <corvane/Upload/UploadService.h>
 
+#include <algorithm>
 #include <condition_variable>
 #include <mutex>
+#include <set>
 #include <utility>
 
 namespace corvane {
@@ -92,7 +94,10 @@ DeliveryReport UploadBatchEventProcessor::waitForDelivery(std::chrono::steady_cl
         queue->assertNotCurrent("UploadBatchEventProcessor::waitForDelivery");
         waitForQueue(*queue, deadline);
     }
-    return ledger_->wait(deadline);
+    const auto report = ledger_->wait(deadline);
+    // What is settled inside a callback is acknowledged behind it: a host that exits now must not be told again.
+    if (queue) waitForQueue(*queue, deadline);
+    return report;
 }
 
 void UploadBatchEventProcessor::registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) {
@@ -132,8 +137,9 @@ void UploadBatchEventProcessor::add(const UploadBatchQueueKey& key, const JSON& 
     auto found = batchQueues_.find(key);
     if (found == batchQueues_.end()) {
         found = batchQueues_
-                    .emplace(key, UploadBatchQueue{newUUID(), currentSession_->sessionData,
-                                                   std::make_shared<EncodedEvents>()})
+                    .emplace(key, UploadBatchQueue{.identifier = newUUID(),
+                                                   .session = currentSession_->sessionData,
+                                                   .events = std::make_shared<EncodedEvents>()})
                     .first;
     }
     UploadBatchQueue& queue = found->second;
@@ -146,23 +152,26 @@ void UploadBatchEventProcessor::add(const UploadBatchQueueKey& key, const JSON& 
     }
 }
 
-bool UploadBatchEventProcessor::backUp(const UploadBatchQueue& queue) {
+bool UploadBatchEventProcessor::backUp(UploadBatchQueue& queue) {
+    queue.isBackedUp = false;
     try {
         const UploadBatchEntity backup{queue.identifier, queue.session, queue.events};
         deferredStore_->perform([&](Rows& rows) { rows.insert(backup); });
-        return true;
+        queue.isBackedUp = true;
     } catch (...) {
         Log::shared().error("Failed to write queue to disk for backup uploads, identifier=%{public}@, error=%{public}@",
                             queue.identifier, AnyError::current().what());
-        return false;
     }
+    return queue.isBackedUp;
 }
 
 void UploadBatchEventProcessor::backUpAll() {
     backupsAreBehind_ = false;
-    for (const auto& [key, queue] : batchQueues_) {
+    std::erase_if(unsaved_, [this](UploadBatchQueue& queue) { return backUp(queue); });
+    for (auto& [key, queue] : batchQueues_) {
         if (!backUp(queue)) backupsAreBehind_ = true;
     }
+    if (!unsaved_.empty()) backupsAreBehind_ = true;
 }
 
 void UploadBatchEventProcessor::submit(const UploadBatchQueueKey& key, bool force) {
@@ -179,31 +188,94 @@ void UploadBatchEventProcessor::submit(const UploadBatchQueueKey& key, bool forc
         return;
     }
     if (found->second.events->count() < config_.batchSize() && !force) return;
+    // A manager of the host's may submit events from inside its call: they go into a batch of their own.
+    auto handedOver = batchQueues_.extract(found);
     try {
-        upload(currentSession_->sessionData, found->second.events);
+        handOver(handedOver.mapped());
     } catch (...) {
         Log::shared().error("Failed to submit request for upload, error=%{public}@", AnyError::current().what());
-        return;
-    }
-    const std::string identifier = std::move(found->second.identifier);
-    batchQueues_.erase(found);
-    try {
-        deleteRow(identifier);
-    } catch (...) {
-        Log::shared().error("Failed to clean up request after submission, error=%{public}@",
-                            AnyError::current().what());
+        putBack(std::move(handedOver));
     }
 }
 
-void UploadBatchEventProcessor::upload(const JSON& session, const std::shared_ptr<const EncodedEvents>& events) {
+void UploadBatchEventProcessor::handOver(UploadBatchQueue& queue) {
+    const auto removal = upload(queue.identifier, currentSession_->sessionData, queue.events, {});
+    if (removal.error) {
+        Log::shared().error("Failed to clean up request after submission, error=%{public}@", removal.error->what());
+    }
+    if (removal.taken == UploadTaken::underWay) keep(queue);
+}
+
+void UploadBatchEventProcessor::keep(UploadBatchQueue& queue) {
+    if (queue.isBackedUp || backUp(queue)) return;
+    unsaved_.push_back(std::move(queue));
+    backupsAreBehind_ = true;
+}
+
+void UploadBatchEventProcessor::putBack(Queues::node_type refused) {
+    const auto back = batchQueues_.insert(std::move(refused));
+    if (back.inserted) return;
+    UploadBatchQueue& successor = back.position->second;
+    UploadBatchQueue& queue = back.node.mapped();
+    queue.events->append(*successor.events);
+    std::swap(queue.identifier, successor.identifier);
+    std::swap(queue.events, successor.events);
+    if (!backUp(successor)) {
+        backupsAreBehind_ = true;
+        return;
+    }
+    try {
+        deferredStore_->perform([&](Rows& rows) { rows.deleteWhere("identifier", queue.identifier); });
+    } catch (...) {
+        Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
+                            queue.identifier, AnyError::current().what());
+    }
+}
+
+UploadBatchEventProcessor::Removal UploadBatchEventProcessor::upload(const std::string& identifier, const JSON& session,
+                                                                     const std::shared_ptr<const EncodedEvents>& events,
+                                                                     const MayDelete& mayDelete) {
     const auto document = std::make_shared<UserEvents>(session, events, newUUID());
+    Removal removal;
     ledger_->add(document->identifier(), static_cast<std::int64_t>(events->count()));
     try {
-        uploadManager_->upload(UploadRequest{client_, document});
+        UploadRequest request{client_, document};
+        request.removeBackup = [&](const std::shared_ptr<StoreConnection>& connection) {
+            removeBackup(connection, identifier, mayDelete, removal);
+        };
+        removal.taken = uploadManager_->upload(request);
     } catch (...) {
         ledger_->remove(document->identifier());
         throw;
     }
+    if (removal.taken == UploadTaken::underWay) return {};  // what the transaction did is undone
+    if (removal.isKept || removal.isDone || removal.error) return removal;
+    try {
+        deferredStore_->perform([&](Rows& rows) { rows.transaction([&] { deleteRow(rows, identifier, mayDelete); }); });
+    } catch (...) {
+        removal.error = AnyError::current();
+    }
+    return removal;
+}
+
+// Only where both tables are in one file; otherwise the row is deleted afterwards, and a kill in between sends it
+// again.
+void UploadBatchEventProcessor::removeBackup(const std::shared_ptr<StoreConnection>& connection,
+                                             const std::string& identifier, const MayDelete& mayDelete,
+                                             Removal& removal) {
+    removal.isKept = connection->location().isMemory() && !deferredStore_->isInMemory();
+    if (!deferredStore_->sharesFileWith(*connection)) return;
+    try {
+        Rows rows(connection);
+        deleteRow(rows, identifier, mayDelete);
+        removal.isDone = true;
+    } catch (...) {
+        removal.error = AnyError::current();
+    }
+}
+
+void UploadBatchEventProcessor::deleteRow(Rows& rows, const std::string& identifier, const MayDelete& mayDelete) {
+    if (!mayDelete || mayDelete(rows)) rows.deleteWhere("identifier", identifier);
 }
 
 void UploadBatchEventProcessor::didLeaveGroup(const Group& group) {
@@ -230,38 +302,92 @@ void UploadBatchEventProcessor::didStartSession(const Session& session) {
     // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
     // rest.
     backUpAll();
+    listTerminated();
     resubmitTerminated();
 }
 
-/// Sends the batches that were open when their process ended.
-void UploadBatchEventProcessor::resubmitTerminated() {
-    std::vector<UploadBatchEntity> batches;
+void UploadBatchEventProcessor::listTerminated() {
+    std::vector<std::string> identifiers;
     try {
-        batches = deferredStore_->perform([](Rows& rows) { return rows.fetchAll(); });
+        identifiers = deferredStore_->perform([](Rows& rows) { return rows.keys(); });
     } catch (...) {
         Log::shared().error("Failed to submit rehydrated failed queues, error=%{public}@", AnyError::current().what());
         return;
     }
-    for (const auto& batch : batches) resubmit(batch);
+    const std::set<std::string> listed(terminated_.begin(), terminated_.end());
+    for (auto& identifier : identifiers) {
+        if (listed.contains(identifier)) continue;
+        ledger_->resubmitted(identifier);
+        terminated_.push_back(std::move(identifier));
+    }
 }
 
-void UploadBatchEventProcessor::resubmit(const UploadBatchEntity& batch) {
-    Log::shared().default_("Attempting to resubmit terminated batch, identifier=%{public}@", batch.identifier);
+void UploadBatchEventProcessor::resubmitTerminated() {
+    constexpr std::size_t atOnce = std::size_t{256} * 1024;
+    const auto self = weak_from_this();
+    for (std::size_t bytes = 0; !terminated_.empty() && (bytes < atOnce || self.expired());) {
+        const std::string identifier = std::move(terminated_.front());
+        terminated_.pop_front();
+        bytes += resubmit(identifier);
+        ledger_->remove(identifier);  // its document is there in its place
+    }
+    if (terminated_.empty()) return;
+    accessQueue_->async([self] {
+        const auto processor = self.lock();
+        if (!processor) return;
+        processor->assertOnQueue("UploadBatchEventProcessor::resubmitTerminated");
+        processor->resubmitTerminated();
+    });
+}
+
+// One at a time: rows are as large as the groups that they hold.
+std::size_t UploadBatchEventProcessor::resubmit(const std::string& identifier) {
+    std::vector<UploadBatchEntity> found;
     try {
-        upload(batch.session, batch.events);
+        found = deferredStore_->perform([&](Rows& rows) { return rows.fetchWhere("identifier", identifier); });
+    } catch (...) {
+        Log::shared().error("Failed to submit rehydrated failed queues, error=%{public}@",
+                            identifier + ": " + AnyError::current().what());
+    }
+    if (found.empty()) return 0;  // unreadable, or sent by another process meanwhile
+    const std::size_t size = found.front().events->text().size();
+    resubmit(std::move(found.front()));
+    return size;
+}
+
+void UploadBatchEventProcessor::resubmit(UploadBatchEntity batch) {
+    Log::shared().default_("Attempting to resubmit terminated batch, identifier=%{public}@", batch.identifier);
+    // A batch of this run that could not be handed over at its session's end. Its row may be behind: then the batch
+    // itself goes out.
+    const std::size_t stored = batch.events->count();
+    const auto isThis = [&](const auto& one) { return one.second.identifier == batch.identifier; };
+    auto open = std::find_if(batchQueues_.begin(), batchQueues_.end(), isThis);
+    if (open != batchQueues_.end() && open->second.events->count() > stored) {
+        batch.session = open->second.session;
+        batch.events = open->second.events;
+    }
+    // A row that has grown since it was read belongs to a processor that is at work, in this process or another: the
+    // row is the only backup of the events that were added, and its owner will send and delete it.
+    const auto hasNotGrown = [&](Rows& rows) {
+        const auto now = rows.fetchWhere("identifier", batch.identifier);
+        return now.empty() || now.front().events->count() <= batch.events->count();
+    };
+    Removal removal;
+    try {
+        removal = upload(batch.identifier, batch.session, batch.events, hasNotGrown);
+        if (removal.error) {
+            Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
+                                batch.identifier, removal.error->what());
+        }
     } catch (...) {
         Log::shared().error("Failed to submit rehydrated request for upload, error=%{public}@",
                             AnyError::current().what());
         return;
     }
-    // A batch of this run that could not be handed over at its session's end has gone out from its backup just now.
-    std::erase_if(batchQueues_, [&](const auto& open) { return open.second.identifier == batch.identifier; });
-    try {
-        deleteUnlessGrown(batch);
-    } catch (...) {
-        Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
-                            batch.identifier, AnyError::current().what());
-    }
+    open = std::find_if(batchQueues_.begin(), batchQueues_.end(), isThis);
+    if (open == batchQueues_.end()) return;
+    auto handedOver = batchQueues_.extract(open);
+    if (removal.taken == UploadTaken::underWay) keep(handedOver.mapped());
 }
 
 void UploadBatchEventProcessor::didUpdateSession(const Session& session, bool submitQueues) {
@@ -288,22 +414,6 @@ void UploadBatchEventProcessor::didEndSession(const Session&, Date) {
 bool UploadBatchEventProcessor::resumeBackgroundProcessing(const std::string& identifier,
                                                            const std::function<void()>& completion) {
     return uploadManager_->shouldResume(identifier, completion);
-}
-
-void UploadBatchEventProcessor::deleteRow(const std::string& identifier) {
-    deferredStore_->perform([&](Rows& rows) { rows.deleteWhere("identifier", identifier); });
-}
-
-// A row that has grown since it was read belongs to a processor that is at work, in this process or another: the row is
-// the only backup of the events that were added, and its owner will send and delete it.
-void UploadBatchEventProcessor::deleteUnlessGrown(const UploadBatchEntity& batch) {
-    deferredStore_->perform([&](Rows& rows) {
-        rows.transaction([&] {
-            const auto found = rows.fetchWhere("identifier", batch.identifier);
-            const bool hasGrown = !found.empty() && found.front().events->count() > batch.events->count();
-            if (!hasGrown) rows.deleteWhere("identifier", batch.identifier);
-        });
-    });
 }
 
 }  // namespace corvane

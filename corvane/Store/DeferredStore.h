@@ -59,6 +59,14 @@ class DeferredStore {
         });
     }
 
+    /// Whether a transaction on `connection` holds for this store too: both are on one file. Requires: on the shared
+    /// queue, as inside another store's `perform`.
+    [[nodiscard]] bool sharesFileWith(const StoreConnection& connection) const {
+        return core_->sharesFileWith(connection);
+    }
+    /// Whether the store is in memory, or there is none. Requires: on the shared queue.
+    [[nodiscard]] bool isInMemory() const { return core_->isInMemory(); }
+
   private:
     const std::shared_ptr<DeferredStoreCore> core_;
 };

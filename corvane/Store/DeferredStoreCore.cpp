@@ -123,6 +123,16 @@ void DeferredStoreCore::makeAnew() {
     if (!wasOpen) connection_->close();
 }
 
+bool DeferredStoreCore::sharesFileWith(const StoreConnection& other) const {
+    queue().assertCurrent("DeferredStoreCore::sharesFileWith");
+    return connection_ && connection_->sharesFileWith(other);
+}
+
+bool DeferredStoreCore::isInMemory() const {
+    queue().assertCurrent("DeferredStoreCore::isInMemory");
+    return !connection_ || connection_->location().isMemory();
+}
+
 void DeferredStoreCore::throwIfFileWasLost() const {
     queue().assertCurrent("DeferredStoreCore::throwIfFileWasLost");
     if (lost_) {

@@ -35,6 +35,11 @@ class CORVANE_EXPORT DeferredStoreCore {
     /// The connection to use now. When its file has been removed or replaced, it is made anew first, with the table.
     /// Requires: on the queue. Throws `DeferredStoreError` noStore.
     [[nodiscard]] const std::shared_ptr<StoreConnection>& connection();
+    /// Whether the connection is to the same file as `other`. As it was used last: a file that was lost since is not
+    /// made anew, which would wait for the transaction that asks. Requires: on the queue.
+    [[nodiscard]] bool sharesFileWith(const StoreConnection& other) const;
+    /// Whether there is no file under the connection. Requires: on the queue.
+    [[nodiscard]] bool isInMemory() const;
     /// Throws `StoreError` cantOpen when the last `connection()` found its file lost. Requires: on the queue.
     void throwIfFileWasLost() const;
 

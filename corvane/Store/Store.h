@@ -5,6 +5,7 @@
 #include <corvane/Store/StoreTable.h>
 
 #include <memory>
+#include <string>
 #include <string_view>
 #include <utility>
 #include <vector>
@@ -57,6 +58,27 @@ class Store {
     [[nodiscard]] std::vector<Entity> fetchWhere(std::string_view column, const StorableValue& value) {
         return fetch(table().selectSQL(column, value));
     }
+    /// All records that can be read; of each other one `unreadable` is told the error, and it stays where it is.
+    template <class Unreadable>
+    [[nodiscard]] std::vector<Entity> fetchReadable(Unreadable&& unreadable) {
+        std::vector<Entity> entities;
+        connection_->query(table().selectSQL(), [&](StoreStepper& stepper) {
+            try {
+                entities.push_back(Entity::read(stepper));
+            } catch (const StoreStepperError& error) {
+                unreadable(error);
+            }
+        });
+        return entities;
+    }
+    /// The key of every record as text, in the order in which they were written last. Reads nothing else of them.
+    [[nodiscard]] std::vector<std::string> keys() {
+        std::vector<std::string> keys;
+        connection_->query(table().keysSQL(), [&](StoreStepper& stepper) {
+            if (auto key = stepper.optionalText()) keys.push_back(*std::move(key));
+        });
+        return keys;
+    }
     /// Deletes the records whose `column` equals `value`, if there are any.
     void deleteWhere(std::string_view column, const StorableValue& value) {
         connection_->run(table().deleteSQL(column, value));
@@ -68,6 +90,9 @@ class Store {
     void transaction(Operations&& operations) {
         connection_->transaction(std::forward<Operations>(operations));
     }
+
+    /// What the store works on, for other tables of the same file.
+    [[nodiscard]] const std::shared_ptr<StoreConnection>& connection() const { return connection_; }
 
     /// The entity's table and its statements.
     [[nodiscard]] static const StoreTable& table() {

@@ -43,6 +43,10 @@ class CORVANE_EXPORT StoreConnection {
     /// Whether the file that was opened last has since been removed, or another has taken its name. The database goes
     /// on writing to such a file and reports no error, though nobody will ever read it.
     [[nodiscard]] bool hasLostItsFile() const noexcept;
+    /// Whether both are connections to one and the same file, so that a transaction of the one holds for the other.
+    [[nodiscard]] bool sharesFileWith(const StoreConnection& other) const noexcept {
+        return opened_ && opened_ == other.opened_;
+    }
     /// Opens the database again under its name, with its directory if that has gone too. Throws what `open` throws.
     void reopen();
 

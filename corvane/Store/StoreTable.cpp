@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Require.h>
 
+#include <algorithm>
 #include <utility>
 
 namespace corvane {
@@ -63,6 +64,13 @@ std::string StoreTable::insertSQL(const std::vector<StorableValue>& values) cons
 
 std::string StoreTable::selectSQL() const {
     return "SELECT * FROM " + name_ + ";";
+}
+
+std::string StoreTable::keysSQL() const {
+    const auto key =
+        std::find_if(columns_.begin(), columns_.end(), [](const StoreColumn& column) { return column.primary; });
+    CORVANE_REQUIRE(key != columns_.end(), "the table " + name_ + " has no key");
+    return "SELECT " + key->name + " FROM " + name_ + " ORDER BY rowid;";
 }
 
 std::string StoreTable::selectSQL(std::string_view column, const StorableValue& value) const {

@@ -24,6 +24,8 @@ class CORVANE_EXPORT StoreTable {
     /// @param values one for each column, in table order. Throws `InvalidArgument` when one cannot be written.
     [[nodiscard]] std::string insertSQL(const std::vector<StorableValue>& values) const;
     [[nodiscard]] std::string selectSQL() const;
+    /// Selects the key column alone. Requires: the table has one.
+    [[nodiscard]] std::string keysSQL() const;
     /// Throws `InvalidArgument` when the value cannot be written.
     [[nodiscard]] std::string selectSQL(std::string_view column, const StorableValue& value) const;
     /// Throws `InvalidArgument` when the value cannot be written.

@@ -1,4 +1,4 @@
-// The destructors of the folder's interfaces, here so that each has its table of functions in one place.
+// The destructors and defaults of the folder's interfaces, here so that each has its table of functions in one place.
 #include <corvane/Upload/EndpointType.h>
 #include <corvane/Upload/ResourceType.h>
 #include <corvane/Upload/SignerType.h>
@@ -16,5 +16,10 @@ UploadDropboxType::~UploadDropboxType() = default;
 UploadManagerType::~UploadManagerType() = default;
 UploadServiceDelegate::~UploadServiceDelegate() = default;
 UploadServiceType::~UploadServiceType() = default;
+
+std::vector<std::string> UploadDropboxType::abandonedPayloads(const std::set<std::string>&) {
+    return {};
+}
+void UploadServiceType::inFlight(std::function<void(const std::set<std::string>&)>) {}
 
 }  // namespace corvane

@@ -3,12 +3,14 @@
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/PrivateFile.h>
+#include <corvane/Platform/UUID.h>
 #include <corvane/Upload/ResourceType.h>
 #include <corvane/Upload/UploadResponse.h>
 
 #include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
 
 namespace corvane {
 
@@ -54,7 +56,12 @@ std::filesystem::path UploadDropbox::write(std::string_view identifier, std::str
         if (debugging().baseURL()) removeAbandonedPartialFiles(*debugging().baseURL());
     });
     replacePrivateFile(payload, data);
-    if (debugging().baseURL()) writeCopy(debugging(), identifier, ".request.json", resource.jsonObject().toData());
+    try {
+        if (debugging().baseURL()) writeCopy(debugging(), identifier, ".request.json", resource.jsonObject().toData());
+    } catch (...) {
+        ::unlink(payload.c_str());  // the document is refused, and the next attempt has a name of its own
+        throw;
+    }
     return payload;
 }
 
@@ -62,6 +69,20 @@ void UploadDropbox::finish(std::string_view identifier, const std::optional<Uplo
     const auto payload = file(baseURL(), identifier);
     if (::unlink(payload.c_str()) != 0) throw SystemError("remove file " + payload.string(), errno);
     if (response && debugging().baseURL()) writeCopy(debugging(), identifier, ".response.json", response->jsonText());
+}
+
+std::vector<std::string> UploadDropbox::abandonedPayloads(const std::set<std::string>& recorded) {
+    std::vector<std::string> abandoned;
+    const auto oldest = std::filesystem::file_time_type::clock::now() - std::chrono::hours(1);
+    std::error_code failed;
+    for (std::filesystem::directory_iterator entry(baseURL(), failed), end; !failed && entry != end;
+         entry.increment(failed)) {
+        auto name = entry->path().filename().string();
+        if (recorded.contains(name) || !isUUID(name)) continue;
+        std::error_code unseen;
+        if (entry->last_write_time(unseen) < oldest && !unseen) abandoned.push_back(std::move(name));
+    }
+    return abandoned;
 }
 
 std::optional<std::filesystem::path> UploadDropbox::existingFile(std::string_view identifier) {

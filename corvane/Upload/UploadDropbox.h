@@ -45,10 +45,12 @@ class CORVANE_EXPORT UploadDropbox final : public UploadDropboxType {
     [[nodiscard]] const std::filesystem::path& baseURL() const { return baseURL_.value(); }
     [[nodiscard]] const Debugging& debugging() const { return debugging_.value(); }
 
-    /// With debugging, a copy of the document that cannot be written is an error too; the payload is then in place.
+    /// With debugging, a copy of the document that cannot be written is an error too, and leaves no payload.
     std::filesystem::path write(std::string_view identifier, std::string_view data,
                                 const ResourceType& resource) override;
     void finish(std::string_view identifier, const std::optional<UploadResponse>& response) override;
+    /// Of names that are UUIDs, as those of the library's own documents are: anything else may be somebody else's file.
+    [[nodiscard]] std::vector<std::string> abandonedPayloads(const std::set<std::string>& recorded) override;
     /// A name that cannot be a payload's has no file.
     [[nodiscard]] std::optional<std::filesystem::path> existingFile(std::string_view identifier) override;
 

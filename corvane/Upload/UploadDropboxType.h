@@ -4,7 +4,10 @@
 
 #include <filesystem>
 #include <optional>
+#include <set>
+#include <string>
 #include <string_view>
+#include <vector>
 
 namespace corvane {
 
@@ -25,6 +28,10 @@ class CORVANE_EXPORT UploadDropboxType {
     /// Removes the payload of an upload that is over; `response` is what the collector answered, nothing when it was
     /// given up. Throws when there is no such file or it cannot be removed.
     virtual void finish(std::string_view identifier, const std::optional<UploadResponse>& response) = 0;
+
+    /// The identifiers of the payloads that are older than an hour and not among `recorded`: what a process that was
+    /// killed may have left. A dropbox that cannot tell names none, which is what happens here.
+    [[nodiscard]] virtual std::vector<std::string> abandonedPayloads(const std::set<std::string>& recorded);
 
     /// The payload file of an upload, if there is one.
     [[nodiscard]] virtual std::optional<std::filesystem::path> existingFile(std::string_view identifier) = 0;

@@ -90,25 +90,39 @@ bool UploadManager::shouldResume(std::string_view identifier, std::function<void
     return service_->shouldResume(identifier, std::move(completion));
 }
 
-void UploadManager::upload(const UploadRequest& request) {
-    queue_.sync([this, &request] {
+UploadTaken UploadManager::upload(const UploadRequest& request) {
+    return queue_.sync([this, &request] {
         queue_.assertCurrent("UploadManager::upload");
-        uploadOnQueue(request);
+        return uploadOnQueue(request);
     });
 }
 
-void UploadManager::uploadOnQueue(const UploadRequest& request) {
+UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     const auto& resource = *request.resource;
     auto identifier = resource.identifier();
     Log::shared().default_("Creating upload task, identifier=%{public}@", identifier);
     auto file = dropbox_->write(identifier, gzipCompressed(resource.jsonObject().toData()), resource);
     const auto entity = newEntity(request, std::move(identifier));
-    try {
-        insertRow(entity);
-    } catch (...) {
-        // The row only matters if this attempt fails.
-    }
+    const auto taken = record(entity, request);
     service_->submit(prepared(entity, std::move(file)));
+    return taken;
+}
+
+UploadTaken UploadManager::record(const SignedEntity& entity, const UploadRequest& request) {
+    try {
+        deferredStore_->perform([&](Rows& rows) {
+            rows.transaction([&] {
+                rows.insert(entity);
+                if (request.removeBackup) request.removeBackup(rows.connection());
+            });
+        });
+        return UploadTaken::recorded;
+    } catch (...) {
+        // This attempt is made all the same; if it fails, the contents go out again from where they are kept.
+        const std::lock_guard lock(mutex_);
+        unrecorded_.insert(entity.identifier);
+        return UploadTaken::underWay;
+    }
 }
 
 void UploadManager::requeueCancelledRequests() {
@@ -121,7 +135,12 @@ void UploadManager::requeueCancelledRequests() {
 }
 
 void UploadManager::retryStoredRequests() {
-    auto entities = deferredStore_->perform([](Rows& rows) { return rows.fetchAll(); });
+    auto entities = deferredStore_->perform([](Rows& rows) {
+        return rows.fetchReadable([](const StoreStepperError& error) {
+            Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", error.what());
+        });
+    });
+    removeOrphans();
     std::vector<SignedEntity> kept;
     for (auto& entity : entities) {
         if (ledger_) ledger_->resubmitted(entity.identifier);
@@ -136,6 +155,34 @@ void UploadManager::retryStoredRequests() {
         if (auto request = preparedRequest(entity)) requests.push_back(*std::move(request));
     }
     service_->resubmit(std::move(requests));
+}
+
+void UploadManager::removeOrphans() {
+    // A store in memory knows nothing of the rows on disk.
+    const auto recorded = deferredStore_->perform([](Rows& rows) -> std::optional<std::set<std::string>> {
+        if (rows.connection()->location().isMemory()) return std::nullopt;
+        const auto keys = rows.keys();
+        return std::set<std::string>(keys.begin(), keys.end());
+    });
+    if (!recorded) return;
+    auto orphans = dropbox_->abandonedPayloads(*recorded);
+    if (orphans.empty()) return;
+    service_->inFlight([weak = weak_from_this(), orphans = std::move(orphans)](const std::set<std::string>& inFlight) {
+        if (const auto manager = weak.lock()) manager->removeOrphans(orphans, inFlight);
+    });
+}
+
+void UploadManager::removeOrphans(const std::vector<std::string>& orphans, const std::set<std::string>& inFlight) {
+    for (const auto& identifier : orphans) {
+        if (inFlight.contains(identifier) || !dropbox_->existingFile(identifier)) continue;
+        try {
+            dropbox_->finish(identifier, std::nullopt);
+            Log::shared().default_("Payload without a row was removed, identifier=%{public}@", identifier);
+        } catch (...) {
+            Log::shared().error("Failed to remove a payload without a row, identifier=%{public}@, error=%{public}@",
+                                identifier, AnyError::current().what());
+        }
+    }
 }
 
 void UploadManager::dropExceeded(const SignedEntity& entity) {
@@ -178,6 +225,7 @@ void UploadManager::uploadService(UploadServiceType&, const UploadResult& result
 }
 
 void UploadManager::didFinish(const std::string& identifier, const UploadResponse& response, Outcome outcome) {
+    forgetUnrecorded(identifier);
     try {
         deleteRow(identifier);
         dropbox_->finish(identifier, response);
@@ -189,15 +237,23 @@ void UploadManager::didFinish(const std::string& identifier, const UploadRespons
     settle(identifier, outcome);
 }
 
+// Without a row nothing is left to send again, unless the row could not be written: then the contents stayed where they
+// were kept.
 void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
+    const bool wasUnrecorded = forgetUnrecorded(retry.identifier);
     bool goesOutAgain = true;
     try {
-        goesOutAgain = markRetry(retry);
+        goesOutAgain = markRetry(retry) || wasUnrecorded;
     } catch (...) {
         Log::shared().error("Failed to mark retry, identifier=%{public}@, error=%{public}@", retry.identifier,
                             AnyError::current().what());
     }
     settle(retry.identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp);
+}
+
+bool UploadManager::forgetUnrecorded(const std::string& identifier) {
+    const std::lock_guard lock(mutex_);
+    return unrecorded_.erase(identifier) > 0;
 }
 
 bool UploadManager::markRetry(const UploadResult::Retry& retry) {
@@ -211,10 +267,6 @@ bool UploadManager::markRetry(const UploadResult::Retry& retry) {
         rows.insert(entity);
         return true;
     });
-}
-
-void UploadManager::insertRow(const SignedEntity& entity) {
-    deferredStore_->perform([&](Rows& rows) { rows.insert(entity); });
 }
 
 void UploadManager::deleteRow(const std::string& identifier) {

@@ -15,7 +15,9 @@
 #include <filesystem>
 #include <functional>
 #include <memory>
+#include <mutex>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -53,7 +55,7 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
     void registerAccessQueue(std::shared_ptr<SerialQueue> queue) override;
     /// Throws what the encoding, the compression or the payload file failed with; there is then no row. That the row
     /// cannot be written is no reason not to send. Requires: not on the manager's queue or the store's.
-    void upload(const UploadRequest& request) override;
+    UploadTaken upload(const UploadRequest& request) override;
     bool shouldResume(std::string_view identifier, std::function<void()> completion) override;
 
     /// Deletes row and file of an upload that is over, or counts a retry.
@@ -64,7 +66,9 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
                   std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                   std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger);
 
-    void uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(queue_);
+    UploadTaken uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(queue_);
+    /// Writes the document's row, and has its backup removed, both or neither.
+    [[nodiscard]] UploadTaken record(const SignedEntity& entity, const UploadRequest& request);
     void requeueCancelledRequests() CORVANE_REQUIRES(queue_);
     void retryStoredRequests() CORVANE_REQUIRES(queue_);
     /// Deletes the row and the file of an upload that was retried too often.
@@ -76,8 +80,13 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
     void didFailForNow(const UploadResult::Retry& retry);
     /// Counts a retry in the row. Returns false when there is no row.
     bool markRetry(const UploadResult::Retry& retry);
+    /// Notes the end of an upload. Returns whether it was under way without a row.
+    bool forgetUnrecorded(const std::string& identifier);
+    /// Removes the payloads that are old, of which there is no row, and which nobody has under way: a process was
+    /// killed between payload and row, and the events went out, or will, from their batch's backup.
+    void removeOrphans();
+    void removeOrphans(const std::vector<std::string>& orphans, const std::set<std::string>& inFlight);
 
-    void insertRow(const SignedEntity& entity);
     void deleteRow(const std::string& identifier);
     void settle(const std::string& identifier, DeliveryLedger::Outcome outcome);
 
@@ -88,6 +97,9 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
 
     SerialQueue queue_{"com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background};
     bool retriedIncompleteRequests_ CORVANE_GUARDED_BY(queue_) = false;
+
+    std::mutex mutex_;                  // guards this one
+    std::set<std::string> unrecorded_;  // documents that are under way without a row
 };
 
 }  // namespace corvane

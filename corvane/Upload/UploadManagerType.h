@@ -11,6 +11,13 @@ namespace corvane {
 class SerialQueue;
 struct UploadRequest;
 
+/// What became of a document that was taken over: whether its upload outlives a kill of the process.
+enum class UploadTaken {
+    recorded,  ///< its row is written: whoever keeps its contents elsewhere may let go of them
+    underWay,  ///< its row could not be written, and only this attempt is made: its contents must stay where they are
+               ///< kept
+};
+
 /// Takes documents for upload and sees to it that each reaches the collector, is refused by it, or is given up after
 /// too many attempts, over restarts of the process too.
 ///
@@ -25,9 +32,9 @@ class CORVANE_EXPORT UploadManagerType {
     virtual void close() = 0;
     /// The queue on which the results of uploads arrive. Called before the first upload.
     virtual void registerAccessQueue(std::shared_ptr<SerialQueue> queue) = 0;
-    /// Takes a document over: when the call returns it is on disk and its upload has been started. Throws when the
-    /// document cannot be encoded, compressed or written; it is then not taken over.
-    virtual void upload(const UploadRequest& request) = 0;
+    /// Takes a document over: when the call returns its payload is on disk and its upload has been started. Throws when
+    /// the document cannot be encoded, compressed or written; it is then not taken over.
+    virtual UploadTaken upload(const UploadRequest& request) = 0;
     /// Offers a background wake-up: see `UploadServiceType::shouldResume`.
     virtual bool shouldResume(std::string_view identifier, std::function<void()> completion) = 0;
 };

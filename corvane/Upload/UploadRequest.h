@@ -4,17 +4,27 @@
 #include <corvane/Models/Client.h>
 #include <corvane/Upload/ResourceType.h>
 
+#include <functional>
 #include <memory>
 
 namespace corvane {
 
+class StoreConnection;
+
 /// A document to upload and the application that sends it. A value; the document is shared.
+///
+/// Whoever keeps the document's contents elsewhere hands along how they are let go of, so that one transaction puts the
+/// document's row in and takes them out: a process that is killed, or a disk that fills up, leaves the one or the
+/// other.
 struct CORVANE_EXPORT UploadRequest {
     /// Throws `InvalidArgument` when the document's type or version holds a control character: both go into a header.
     UploadRequest(Client sender, std::shared_ptr<const ResourceType> document);
 
     Client client;
     std::shared_ptr<const ResourceType> resource;  ///< never null
+    /// Called at most once, on the queue of the deferred stores, inside the transaction that has written the document's
+    /// row on the connection that it is given. Must not throw. May be empty.
+    std::function<void(const std::shared_ptr<StoreConnection>&)> removeBackup = {};
 };
 
 }  // namespace corvane

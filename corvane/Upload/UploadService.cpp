@@ -30,6 +30,15 @@ std::string headerText(std::string text) {
 
 using jsontext::isUTF8;
 
+std::set<std::string> identifiersOfRunning(const std::vector<std::shared_ptr<TransferTask>>& tasks) {
+    std::set<std::string> identifiers;
+    for (const auto& task : tasks) {
+        if (task->state() != TransferTask::State::running) continue;
+        if (auto identifier = task->description()) identifiers.insert(*std::move(identifier));
+    }
+    return identifiers;
+}
+
 bool isGone(const std::filesystem::path& file) {
     std::error_code failed;
     return !std::filesystem::exists(file, failed) && !failed;
@@ -163,13 +172,15 @@ void UploadService::resubmit(std::vector<PreparedUploadRequest> requests) {
     });
 }
 
+void UploadService::inFlight(std::function<void(const std::set<std::string>&)> answer) {
+    if (const auto opened = session()) {
+        opened->tasks([answer = std::move(answer)](const auto& tasks) { answer(identifiersOfRunning(tasks)); });
+    }
+}
+
 void UploadService::resubmit(const std::vector<PreparedUploadRequest>& requests,
                              const std::vector<std::shared_ptr<TransferTask>>& tasks) {
-    std::set<std::string> inFlight;
-    for (const auto& task : tasks) {
-        if (task->state() != TransferTask::State::running) continue;
-        if (auto identifier = task->description()) inFlight.insert(*std::move(identifier));
-    }
+    const auto inFlight = identifiersOfRunning(tasks);
     std::set<std::string> ended;
     {
         std::lock_guard lock(mutex_);

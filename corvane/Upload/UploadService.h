@@ -69,6 +69,7 @@ class CORVANE_EXPORT UploadService final : public UploadServiceType,
     void registerAccessQueue(std::shared_ptr<SerialQueue> queue) override;
     void submit(const PreparedUploadRequest& request) override;
     void resubmit(std::vector<PreparedUploadRequest> requests) override;
+    void inFlight(std::function<void(const std::set<std::string>&)> answer) override;
     bool shouldResume(std::string_view identifier, std::function<void()> completion) override;
 
     // For the transfer session.

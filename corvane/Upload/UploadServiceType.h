@@ -4,6 +4,8 @@
 
 #include <functional>
 #include <memory>
+#include <set>
+#include <string>
 #include <string_view>
 #include <vector>
 
@@ -34,6 +36,11 @@ class CORVANE_EXPORT UploadServiceType {
     /// Starts those of `requests` that are not still running, as transfers of an earlier run may be, in order. An empty
     /// list does nothing. Returns before the uploads have been started.
     virtual void resubmit(std::vector<PreparedUploadRequest> requests) = 0;
+
+    /// Tells, later and on the registered queue, the identifiers of the uploads that are running, also those of earlier
+    /// runs and other processes where transfers outlive them. A service that cannot tell never answers, which is what
+    /// happens here.
+    virtual void inFlight(std::function<void(const std::set<std::string>&)> answer);
 
     /// Whether `identifier` names this service's transfer session. If so, `completion` is kept and called once, on the
     /// main queue, when all events of the session have been delivered; otherwise it is dropped. Callable from any

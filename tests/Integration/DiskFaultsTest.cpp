@@ -216,10 +216,10 @@ TEST_F(DiskFaults, ABrokenDatabaseIsToldOfAndHoldsUpNothingNew) {
                   "INSERT INTO upload_batches SELECT * FROM old;", "DROP TABLE old;",
                   "INSERT INTO upload_batches VALUES ('bad', NULL, NULL);"});
          },
-         unread, 2, [&] { run({"DELETE FROM upload_batches WHERE identifier = 'bad';"}); }, 1},
+         unread, 3, [&] { run({"DELETE FROM upload_batches WHERE identifier = 'bad';"}); }, 0},
         {"a row with broken JSON",
-         [&] { run({"INSERT INTO upload_batches VALUES ('bad', x'7b226576656e7473223a5b', x'7b7d');"}); }, unread, 2,
-         [&] { run({"DELETE FROM upload_batches WHERE identifier = 'bad';"}); }, 1},
+         [&] { run({"INSERT INTO upload_batches VALUES ('bad', x'7b226576656e7473223a5b', x'7b7d');"}); }, unread, 3,
+         [&] { run({"DELETE FROM upload_batches WHERE identifier = 'bad';"}); }, 0},
         {"a document's row with NULL",
          [&] {
              run({"ALTER TABLE signed_requests RENAME TO old;",
@@ -229,8 +229,8 @@ TEST_F(DiskFaults, ABrokenDatabaseIsToldOfAndHoldsUpNothingNew) {
                   "INSERT INTO signed_requests SELECT * FROM old;", "DROP TABLE old;",
                   "INSERT INTO signed_requests VALUES ('bad', 0, NULL, 'u', 0, 0, '');"});
          },
-         "Failed to requeue cancelled requests, error=bad", 2,
-         [&] { run({"DELETE FROM signed_requests WHERE identifier = 'bad';"}); }, 1},
+         "Failed to requeue cancelled requests, error=bad", 3,
+         [&] { run({"DELETE FROM signed_requests WHERE identifier = 'bad';"}); }, 0},
     };
     for (const auto& one : cases) {
         SCOPED_TRACE(one.name);
@@ -261,6 +261,22 @@ TEST_F(DiskFaults, ABrokenDatabaseIsToldOfAndHoldsUpNothingNew) {
         }
         std::filesystem::remove_all(documents.path());
     }
+}
+
+TEST_F(DiskFaults, ADocumentWhoseRowCannotBeWrittenGoesOutAgainFromItsBackup) {
+    {
+        Application application(server.url(), 2);
+        application.wait();
+        StoreConnection other(StoreLocation::default_("main"));
+        other.run("CREATE TRIGGER refuse BEFORE INSERT ON signed_requests BEGIN SELECT RAISE(FAIL, 'full'); END;");
+        server.script(Reply::status(500), 3);
+        application.submit(6);
+        EXPECT_EQ(application.wait(), (DeliveryReport{.delivered = {}, .pending = {6, 3}, .givenUp = {}}));
+        application.abandon();
+        other.run("DROP TRIGGER refuse;");
+    }
+    EXPECT_EQ(runAgain().delivered.documents, 3);
+    EXPECT_EQ(distinctEvents(), 6u);
 }
 
 TEST_F(DiskFaults, APayloadThatIsNotWhatItWasEndsItsDocumentAlone) {

@@ -4,9 +4,14 @@
 
 #include <gtest/gtest.h>
 
+#include <sys/resource.h>
+#include <unistd.h>
+
 #include <atomic>
+#include <cstdlib>
 #include <future>
 #include <stdexcept>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -129,6 +134,27 @@ TEST(SerialQueue, LogsWhatATaskThrowsAndGoesOn) {
     queue.async([] { throw std::runtime_error("no luck"); });
     queue.sync([] {});
     EXPECT_TRUE(log.has(LogLevel::error, "Task failed, queue=com.example.q, error=no luck"));
+}
+
+// The limit holds for users without privileges, in a process of its own.
+TEST(SerialQueueDeathTest, SyncRunsWhatWaitsItselfWhenThereIsNoThreadToBeHad) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    const auto withoutThreads = [] {
+        const rlimit none{1, 1};
+        if (geteuid() == 0 && setuid(65534) != 0) std::_Exit(2);
+        setrlimit(RLIMIT_NPROC, &none);
+        SerialQueue queue("com.example.q");
+        std::string order;
+        queue.async([&] { order += 'a'; });
+        queue.async([&] { order += 'b'; });
+        const bool same = queue.sync([&, caller = std::this_thread::get_id()] {
+            order += 'c';
+            return caller == std::this_thread::get_id();
+        });
+        queue.sync([&] { order += 'd'; });
+        std::_Exit(order == "abcd" && same ? 0 : 1);
+    };
+    EXPECT_EXIT(withoutThreads(), ::testing::ExitedWithCode(0), "Failed to start thread, queue=com.example.q");
 }
 
 TEST(SerialQueueDeathTest, StopsOnProgrammingErrors) {

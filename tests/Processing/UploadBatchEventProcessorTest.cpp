@@ -8,6 +8,7 @@
 #include "tests/support/TrackingFixture.h"
 
 #include <functional>
+#include <future>
 #include <set>
 #include <thread>
 
@@ -23,12 +24,13 @@ class FakeUploadManager final : public UploadManagerType {
     void open() override { calls.emplace_back("open"); }
     void close() override { calls.emplace_back("close"); }
     void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override { queue = std::move(accessQueue); }
-    void upload(const UploadRequest& request) override {
+    UploadTaken upload(const UploadRequest& request) override {
         if (refuses) throw std::runtime_error("refused");
         documents.push_back(request.resource->jsonObject());
         if (didTake) didTake();
         contentType = request.resource->contentType() + " " + request.resource->version();
         if (ledger) ledger->settle(request.resource->identifier(), DeliveryLedger::Outcome::delivered);
+        return taken;
     }
     bool shouldResume(std::string_view identifier, std::function<void()>) override { return identifier == "mine"; }
 
@@ -40,6 +42,7 @@ class FakeUploadManager final : public UploadManagerType {
     }
 
     bool refuses = false;
+    UploadTaken taken = UploadTaken::recorded;
     std::function<void()> didTake;
     std::vector<JSON> documents;
     std::string contentType;
@@ -244,6 +247,108 @@ TEST_F(UploadBatch, RowsOfAnotherShapeFailTheFetchWithAClearError) {
     }
 }
 
+TEST_F(UploadBatch, ADocumentThatIsUnderWayWithoutARowStaysInItsBackup) {
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    manager->taken = UploadTaken::underWay;
+    submit(3);
+    EXPECT_EQ(rows().size(), 1u);
+
+    // A batch that has no backup either gets one as soon as something can be written.
+    store->perform([](Rows& table) { table.dropTable(); });
+    submit(3);
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{3, 3}));
+    EXPECT_EQ(log.count("Failed to write queue to disk for backup uploads, identifier="), 4);
+    EXPECT_EQ(log.count("Failed to clean up"), 0) << "what was not written is not deleted";
+    rows();  // makes the table
+    manager->taken = UploadTaken::recorded;
+    submit(1);
+    EXPECT_EQ(rows().size(), 2u);
+    launch();
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{3, 1}));
+    EXPECT_TRUE(rows().empty());
+}
+
+TEST_F(UploadBatch, WhatIsOpenGoesOutInPlaceOfABackupThatIsBehind) {
+    sessions->start(Session::Kind::userEvents());
+    submit(1);
+    manager->refuses = true;
+    const auto outdated = rows().at(0);
+    submit(4);
+    sessions->endSync();
+    manager->refuses = false;
+    // A lock keeps the row as it was, also while the next session starts.
+    StoreConnection::setBusyTimeout(1ms);
+    StoreConnection other(StoreLocation::default_("main"));
+    store->perform([&](Rows& table) { table.insert(outdated); });
+    other.run("BEGIN IMMEDIATE;");
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{5}));
+    other.run("COMMIT;");
+    StoreConnection::setBusyTimeout(5s);
+}
+
+TEST_F(UploadBatch, EventsSubmittedWhileABatchIsHandedOverGoIntoABatchOfTheirOwn) {
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    int depth = 0;
+    manager->didTake = [&] {
+        if (depth++ > 0) return;
+        for (int i = 0; i < 4; ++i) batching->process(ProcessEvent("Inline", JSON("{}"), std::nullopt));
+    };
+    submit(3);
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{3, 3}));
+    EXPECT_EQ(rows().size(), 1u);
+
+    // The same in front of a refusal: what was refused stays before what came after it, in one row.
+    manager->didTake = [&] {
+        if (depth++ < 3) batching->process(ProcessEvent("Inline", JSON("{}"), std::nullopt));
+        throw std::runtime_error("refused late");
+    };
+    submit(2);
+    ASSERT_EQ(rows().size(), 1u);
+    EXPECT_EQ(rows()[0].events->count(), 4u);
+    EXPECT_EQ(JSON("[" + rows()[0].events->text() + "]")[3]["metadata"]["name"].string(), "Inline");
+}
+
+TEST_F(UploadBatch, RecoveredTextGoesOutAsItWasWrittenAndABadRowHoldsBackNoOther) {
+    const std::string events =
+        R"({"data":{"a":-0,"b":12345678901234567890123,"b":1.10},"metadata":{"name":"N","version":"0"}})";
+    const auto put = [&](const std::string& identifier, const std::string& blob, const std::string& session) {
+        StoreConnection(StoreLocation::default_("main"))
+            .run("INSERT INTO upload_batches VALUES ('" + identifier + "', " + StorableValue::bytes(blob).sqlLiteral() +
+                 ", " + StorableValue::bytes(session).sqlLiteral() + ");");
+    };
+    rows();
+    put("cut off", R"({"events":[)" + events, "{}");
+    put("no object", R"({"events":[1]})", "{}");
+    put("no session", R"({"events":[]})", "[]");
+    put("two keys", R"({"events":[],"events":[{"n":1}]})", "{}");
+    put("blanks", R"({ "events" : [ { "n" : 2 } ] })", "{}");
+    put("good", R"({"events":[)" + events + "," + events + "]}", R"({"s":1E2,"s":1.0})");
+    for (int i = 0; i < 3; ++i)
+        put("large" + std::to_string(i), R"({"events":[{"t":")" + std::string(300'000, 'x') + R"("}]})", "{}");
+    sessions->start(Session::Kind::userEvents());
+    root->push(Screen{"home"});
+    drain();
+    EXPECT_LT(manager->documents.size(), 6u) << "a new session's events need not wait for all of them";
+    const auto report = batching->waitForDelivery(std::chrono::steady_clock::now() + 10s);
+    EXPECT_EQ(report.delivered.documents, 6);
+    EXPECT_EQ(report.pending.documents, 0);
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{1, 1, 2, 1, 1, 1}));
+    EXPECT_EQ(manager->documents[0]["data"]["events"].text(), R"([{"n":1}])");
+    EXPECT_NE(manager->documents[2].text().find(events + "," + events), std::string::npos);
+    EXPECT_NE(manager->documents[2].text().find(R"({"s":1E2,"s":1.0})"), std::string::npos);
+    EXPECT_EQ(store->perform([](Rows& table) { return table.keys(); }),
+              (std::vector<std::string>{"cut off", "no object", "no session"}));
+    for (const char* bad : {"cut off", "no object", "no session"}) {
+        EXPECT_EQ(log.count("Failed to submit rehydrated failed queues, error=" + std::string(bad) + ": bad data"), 1);
+    }
+}
+
 TEST_F(UploadBatch, WaitsForDeliveryNoLongerThanAskedAndNotOnItsQueue) {
     sessions->start(Session::Kind::userEvents());
     manager->ledger = nullptr;
@@ -253,6 +358,21 @@ TEST_F(UploadBatch, WaitsForDeliveryNoLongerThanAskedAndNotOnItsQueue) {
     root->suspend();
     EXPECT_EQ(batching->waitForDelivery(std::chrono::steady_clock::now() + 1ms), report) << "a suspended queue too";
     root->resume();
+
+    // A document is settled inside the callback that brings its outcome; what follows that callback is waited for too.
+    std::promise<void> settled, goOn;
+    manager->queue->async([&] {
+        ledger->settle(*manager->documents[0]["metadata"]["identifier"].string(), DeliveryLedger::Outcome::delivered);
+        settled.set_value();
+        goOn.get_future().wait();
+    });
+    settled.get_future().wait();
+    auto waiting = std::async(std::launch::async,
+                              [&] { return batching->waitForDelivery(std::chrono::steady_clock::now() + 10s); });
+    EXPECT_EQ(waiting.wait_for(20ms), std::future_status::timeout);
+    goOn.set_value();
+    EXPECT_EQ(waiting.get().delivered, (DeliveryReport::Count{3, 1}));
+
     EXPECT_THROW(UploadBatchEventConfig(0, false), InvalidArgument);
     EXPECT_EQ(UploadBatchEventConfig::default_().batchSize(), 50u);
 

@@ -13,6 +13,8 @@
 namespace corvane::test {
 namespace {
 
+using namespace std::chrono_literals;
+
 /// What one run of a process has: a manager over the files that earlier runs left.
 struct ProcessRun {
     explicit ProcessRun(std::optional<std::string> location = "main")
@@ -24,9 +26,10 @@ struct ProcessRun {
         DeferredStoreCore::queue().sync([] {});
     }
 
-    void upload(const std::string& identifier) {
+    UploadTaken upload(const std::string& identifier) {
         ledger->add(identifier, 10);
-        manager->upload({{"com.example.player", "Player", "2.3", 117}, std::make_shared<TextResource>(identifier)});
+        return manager->upload(
+            {{"com.example.player", "Player", "2.3", 117}, std::make_shared<TextResource>(identifier)});
     }
     [[nodiscard]] std::vector<SignedEntity> rows() const {
         return store->perform([](Store<SignedEntity>& rows) { return rows.fetchAll(); });
@@ -141,14 +144,43 @@ TEST(UploadManager, ARowWithoutItsPayloadIsDroppedAndTheOthersGoOn) {
     EXPECT_EQ(run.ledger->report().delivered.documents, 1);
 }
 
-TEST(UploadManager, SendsWithoutARowAndThenCannotRetry) {
+TEST(UploadManager, SendsWithoutARowAndSaysSo) {
     const TemporaryDocuments documents;
     ProcessRun run(std::nullopt);  // never opened: there is no table
-    run.upload("I");
+    EXPECT_EQ(run.upload("I"), UploadTaken::underWay);
     EXPECT_EQ(run.service->submitted.size(), 1U);
     run.store->perform([](Store<SignedEntity>& rows) { rows.createTable(); });
+    EXPECT_EQ(run.upload("J"), UploadTaken::recorded);
+    run.store->perform([](Store<SignedEntity>& rows) { rows.deleteWhere("identifier", "J"); });
     run.service->complete(UploadResult::retry("I", now()));
+    run.service->complete(UploadResult::retry("J", now()));
+    EXPECT_EQ(run.ledger->report().pending, (DeliveryReport::Count{10, 1})) << "whoever handed it over still has it";
     EXPECT_EQ(run.ledger->report().givenUp, (DeliveryReport::Count{10, 1}));
+}
+
+TEST(UploadManager, RemovesOldPayloadsThatNobodyHas) {
+    const TemporaryDocuments documents;
+    const CapturedLog log;
+    ProcessRun run;
+    const std::string name = "00000000-0000-4000-8000-00000000000";
+    const auto payload = [&](char last, bool isOld) {
+        const auto file = run.dropbox->write(name + last, "x", TextResource(name + last));
+        if (isOld) std::filesystem::last_write_time(file, std::filesystem::file_time_type::clock::now() - 2h);
+    };
+    for (const char last : {'1', '2', '3'}) payload(last, true);
+    payload('4', false);
+    writeFile(run.dropbox->baseURL() / "a user's", "x");
+    std::filesystem::last_write_time(run.dropbox->baseURL() / "a user's", std::filesystem::file_time_type());
+    run.insert(row(name + "2", 0));
+    run.service->running = {name + "3"};
+    {
+        ProcessRun inMemory(std::nullopt);  // knows of no rows
+        inMemory.manager->open();
+    }
+    EXPECT_NE(run.dropbox->existingFile(name + "1"), std::nullopt);
+    run.manager->open();
+    EXPECT_EQ(run.dropbox->existingFile(name + "1"), std::nullopt);
+    EXPECT_EQ(log.count("Payload without a row was removed"), 1);
 }
 
 TEST(UploadManager, RefusesWhatItCannotWriteAndLeavesNoRow) {

@@ -6,6 +6,7 @@
 #include <corvane/Upload/UploadServiceDelegate.h>
 #include <corvane/Upload/UploadServiceType.h>
 
+#include <set>
 #include <string>
 #include <utility>
 #include <vector>
@@ -20,6 +21,7 @@ class FakeUploadService final : public UploadServiceType {
     void registerAccessQueue(std::shared_ptr<SerialQueue> queue) override { accessQueue = std::move(queue); }
     void submit(const PreparedUploadRequest& request) override { submitted.push_back(request); }
     void resubmit(std::vector<PreparedUploadRequest> requests) override { resubmitted.push_back(std::move(requests)); }
+    void inFlight(std::function<void(const std::set<std::string>&)> answer) override { answer(running); }
     bool shouldResume(std::string_view identifier, std::function<void()>) override { return identifier == "mine"; }
 
     /// Ends an upload.
@@ -29,6 +31,7 @@ class FakeUploadService final : public UploadServiceType {
 
     std::vector<PreparedUploadRequest> submitted;
     std::vector<std::vector<PreparedUploadRequest>> resubmitted;  // one list per call
+    std::set<std::string> running;
     std::shared_ptr<SerialQueue> accessQueue;
 
   private:
