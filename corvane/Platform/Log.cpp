@@ -1,8 +1,11 @@
 #include <corvane/Platform/Log.h>
 
+#include <corvane/Platform/JSONText.h>
+
 #include <spdlog/sinks/stdout_sinks.h>
 #include <spdlog/spdlog.h>
 
+#include <algorithm>
 #include <mutex>
 #include <utility>
 
@@ -67,13 +70,43 @@ std::string render(std::string_view format, std::initializer_list<LogArgument> a
     return out;
 }
 
+void appendEscape(std::string& out, unsigned char c) {
+    constexpr char digits[] = "0123456789abcdef";
+    if (c == '\n' || c == '\t') {
+        out.append(c == '\n' ? "\\n" : "\\t");
+    } else {
+        out.append("\\x").append(1, digits[c >> 4]).append(1, digits[c & 0xF]);
+    }
+}
+
+// The length of the character that `text` begins with, or 0 when it is not to be printed.
+std::size_t printableLength(std::string_view text, bool keepsLines) {
+    const auto first = static_cast<unsigned char>(text.front());
+    if (first < 0x80)
+        return (first >= 0x20 && first != 0x7F) || (keepsLines && (first == '\n' || first == '\t')) ? 1 : 0;
+    for (std::size_t length = 2; length <= 4 && length <= text.size(); ++length) {
+        if (!jsontext::isUTF8(text.substr(0, length))) continue;
+        const bool isControl = first == 0xC2 && static_cast<unsigned char>(text[1]) < 0xA0;
+        return isControl ? 0 : length;
+    }
+    return 0;
+}
+
 }  // namespace
 
 void LogArgument::appendTo(std::string& out) const {
     if (isNumber_) {
         out += std::to_string(number_);
-    } else {
-        out += text_;
+        return;
+    }
+    for (auto rest = text_; !rest.empty();) {
+        const std::size_t length = printableLength(rest, keepsLines_);
+        if (length > 0) {
+            out.append(rest.substr(0, length));
+        } else {
+            appendEscape(out, static_cast<unsigned char>(rest.front()));
+        }
+        rest.remove_prefix(std::max<std::size_t>(length, 1));
     }
 }
 

@@ -20,13 +20,22 @@ enum class LogLevel {
     error,     ///< failures
 };
 
+/// Text of several lines that a log message prints as they are.
+struct LogLines {
+    std::string_view text;
+};
+
 /// One value that a log message prints: text or an integer. Holds a view, good for the length of
 /// the call.
+///
+/// Control characters and bytes that are not UTF-8 are printed as "\x1b", "\n" and the like: what a
+/// server or a damaged file says must neither forge a line nor steer a terminal.
 class LogArgument {
   public:
-    LogArgument(std::string_view text) : text_(text) {}    // NOLINT(google-explicit-constructor)
-    LogArgument(const std::string& text) : text_(text) {}  // NOLINT(google-explicit-constructor)
-    LogArgument(const char* text) : text_(text) {}         // NOLINT(google-explicit-constructor)
+    LogArgument(LogLines lines) : text_(lines.text), keepsLines_(true) {}  // NOLINT(google-explicit-constructor)
+    LogArgument(std::string_view text) : text_(text) {}                    // NOLINT(google-explicit-constructor)
+    LogArgument(const std::string& text) : text_(text) {}                  // NOLINT(google-explicit-constructor)
+    LogArgument(const char* text) : text_(text) {}                         // NOLINT(google-explicit-constructor)
     template <std::integral I>
     LogArgument(I number) : number_(static_cast<std::int64_t>(number)), isNumber_(true) {}  // NOLINT
 
@@ -36,14 +45,15 @@ class LogArgument {
     std::string_view text_;
     std::int64_t number_ = 0;
     bool isNumber_ = false;
+    bool keepsLines_ = false;
 };
 
 /// The library's log: subsystem "com.veskar.corvane", category "Analytics".
 ///
 /// Messages go through the spdlog logger named by the subsystem to standard error, unless the host
 /// attaches a sink of its own. A host that has registered an spdlog logger of that name before the
-/// first message keeps that one. The default active level is `default_`; a message below it costs a
-/// load and a branch. All operations may be called from any thread.
+/// first message keeps that one. The active level is `error` until the host sets another one: a
+/// message below it costs a load and a branch. All operations may be called from any thread.
 ///
 /// A format is fixed text with placeholders, taken in order: "%{public}@" and "%@" print text,
 /// "%ld" and "%d" numbers. Text of "%@" is the host's data: `setHidesPrivateArguments` prints it as
@@ -53,7 +63,7 @@ class CORVANE_EXPORT Log {
     static constexpr std::string_view subsystem = "com.veskar.corvane";
     static constexpr std::string_view category = "Analytics";
 
-    /// Receives a finished message without level, time or line break. Called on any library thread,
+    /// Receives a finished message, UTF-8, without level, time or line break at its end. Called on any library thread,
     /// on several at once; must not call back into the library and wait. What it throws is dropped.
     using Sink = std::function<void(LogLevel, std::string_view message)>;
 
@@ -94,7 +104,7 @@ class CORVANE_EXPORT Log {
     }
     void write(LogLevel level, std::string_view format, std::initializer_list<LogArgument> arguments) noexcept;
 
-    std::atomic<LogLevel> level_ = LogLevel::default_;
+    std::atomic<LogLevel> level_ = LogLevel::error;
     std::atomic<bool> hidesPrivate_ = false;
     Output* output_;
 };

@@ -63,8 +63,11 @@ void replacePrivateFile(const std::filesystem::path& file, std::string_view cont
     partial.keep();
 }
 
+// Once linked the file is never written again, so a power cut must not leave the name without the contents.
 bool createPrivateFile(const std::filesystem::path& file, std::string_view contents) {
     const PartialFile partial(file, contents);
+    const Descriptor written(::open(partial.path(), O_RDONLY | O_CLOEXEC));
+    if (!written || ::fsync(written.get()) != 0) throw SystemError("write file " + file.string(), errno);
     if (::link(partial.path(), file.c_str()) == 0) return true;
     if (errno == EEXIST) return false;
     throw SystemError("create file " + file.string(), errno);
@@ -85,12 +88,15 @@ void removeAbandonedPartialFiles(const std::filesystem::path& directory) noexcep
     }
 }
 
+// Whoever puts a pipe in the file's place must not make the reader wait for the other end.
 std::string readWholeFile(const std::filesystem::path& file) {
-    const Descriptor descriptor(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
+    const Descriptor descriptor(::open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
     struct stat status {};
     if (descriptor.get() < 0 || ::fstat(descriptor.get(), &status) != 0) {
         throw SystemError("read file " + file.string(), errno);
     }
+    if (S_ISDIR(status.st_mode)) throw SystemError("read file " + file.string(), EISDIR);
+    if (!S_ISREG(status.st_mode)) throw SystemError("read file " + file.string(), EINVAL);
     std::string contents(static_cast<std::size_t>(status.st_size), '\0');
     std::size_t size = 0;
     while (size < contents.size()) {

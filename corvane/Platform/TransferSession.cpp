@@ -28,7 +28,7 @@ TransferSession::~TransferSession() = default;
 void TransferSession::setFactory(Factory factory) {
     auto shared = factory ? std::make_shared<const Factory>(std::move(factory)) : nullptr;
     std::lock_guard lock(registry().mutex);
-    registry().factory = std::move(shared);
+    registry().factory.swap(shared);  // the old one, and what it holds, goes behind the lock
 }
 
 std::shared_ptr<TransferSession> TransferSession::make(TransferSessionConfiguration configuration,

@@ -2,6 +2,7 @@
 
 #include <chrono>
 #include <cstddef>
+#include <filesystem>
 #include <optional>
 #include <string>
 
@@ -35,6 +36,9 @@ struct TransferSessionConfiguration {
     /// Whether the host is to be started again, or woken, for the session's events.
     bool relaunchesForEvents = false;
     TransferLimits limits = {};
+    /// The authorities that a server's certificate may come from, in place of the system's: a file in PEM, or a
+    /// directory as OpenSSL's `rehash` makes one. Empty: the system's.
+    std::filesystem::path trustedCertificates = {};
 };
 
 }  // namespace corvane

@@ -17,7 +17,7 @@ LoggingEventProcessor::~LoggingEventProcessor() = default;
 void LoggingEventProcessor::registerAccessQueue(std::shared_ptr<SerialQueue>) {}
 
 void LoggingEventProcessor::process(const ProcessEvent& processEvent) {
-    if (isVisible()) Log::shared().debug("%@", logFormatter_->format(processEvent));
+    if (isVisible()) Log::shared().debug("%@", LogLines{logFormatter_->format(processEvent)});
 }
 
 void LoggingEventProcessor::didEnterGroup(const Group& group) {

@@ -31,10 +31,18 @@ using Database = std::unique_ptr<sqlite3, CloseDatabase>;
 using Statement = std::unique_ptr<sqlite3_stmt, FinalizeStatement>;
 
 /// Creates the file so that it is private from its first moment; the database gives its side files the same mode. An
-/// error here shows again, with its reason, when the database is opened.
+/// error here shows again, with its reason, when the database is opened. A symbolic link that leads nowhere is refused:
+/// the database would make its target, readable for everybody.
 void precreatePrivately(const std::string& path) {
     const int descriptor = ::open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
-    if (descriptor >= 0) ::close(descriptor);
+    if (descriptor >= 0) {
+        ::close(descriptor);
+        return;
+    }
+    struct stat status {};
+    if (::stat(path.c_str(), &status) != 0 && ::lstat(path.c_str(), &status) == 0 && S_ISLNK(status.st_mode)) {
+        throw InvalidArgument(path + " is a symbolic link that leads nowhere");
+    }
 }
 
 }  // namespace
@@ -95,10 +103,10 @@ void StoreConnection::open() {
         try {
             file = path();
             createPrivateDirectories(std::filesystem::path(file).parent_path());
+            precreatePrivately(file);
         } catch (const std::exception& error) {
             throw StoreError::makeCantOpen(location_, error.what());
         }
-        precreatePrivately(file);
     }
     sqlite3* opened = nullptr;
     const int result = sqlite3_open_v2(file.c_str(), &opened, openFlags, nullptr);

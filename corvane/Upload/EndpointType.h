@@ -1,7 +1,10 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Upload/EndpointOptions.h>
 
+#include <filesystem>
+#include <functional>
 #include <optional>
 #include <string>
 
@@ -16,13 +19,16 @@ class CORVANE_EXPORT EndpointType {
   public:
     virtual ~EndpointType();
 
-    /// The absolute URL that documents are PUT to.
+    /// The absolute URL, http or https, that documents are PUT to.
     [[nodiscard]] virtual std::string url() const = 0;
     /// The text that keys the destination's database, payload directory and transfers. Two destinations of one
     /// application need two names; surrounding white space and capitals do not tell them apart.
     [[nodiscard]] virtual std::string name() const = 0;
     /// The storage that an application shares with its extensions, or nothing.
     [[nodiscard]] virtual std::optional<std::string> sharedContainerIdentifier() const = 0;
+    /// See `EndpointOptions`; nothing unless it is overridden.
+    [[nodiscard]] virtual std::filesystem::path trustedCertificates() const;
+    [[nodiscard]] virtual std::function<HTTPHeaders()> headers() const;
 
   protected:
     EndpointType() = default;

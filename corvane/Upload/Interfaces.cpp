@@ -10,6 +10,12 @@
 namespace corvane {
 
 EndpointType::~EndpointType() = default;
+std::filesystem::path EndpointType::trustedCertificates() const {
+    return {};
+}
+std::function<HTTPHeaders()> EndpointType::headers() const {
+    return {};
+}
 ResourceType::~ResourceType() = default;
 SignerType::~SignerType() = default;
 UploadDropboxType::~UploadDropboxType() = default;

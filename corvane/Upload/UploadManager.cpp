@@ -261,6 +261,7 @@ bool UploadManager::markRetry(const UploadResult::Retry& retry) {
     return deferredStore_->perform([&](Rows& rows) {
         auto found = rows.fetchWhere("identifier", retry.identifier);
         if (found.empty()) return false;
+        if (!retry.isCounted) return true;
         auto& entity = found.front();
         ++entity.retries;
         entity.retryAfterDate = retry.after;

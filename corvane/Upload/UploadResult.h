@@ -23,7 +23,8 @@ struct [[nodiscard]] UploadResult {
     /// The document may get through another time: keep it, and count the attempt.
     struct Retry {
         std::string identifier;
-        Date after;  ///< the date from which it may be sent again
+        Date after;             ///< the date from which it may be sent again
+        bool isCounted = true;  ///< not when it is certain that nothing of the document was sent
         bool operator==(const Retry&) const = default;
     };
     /// The collector will never take the document: forget it.
@@ -38,7 +39,9 @@ struct [[nodiscard]] UploadResult {
     static UploadResult success(std::string identifier, UploadResponse response) {
         return {Success{std::move(identifier), std::move(response)}};
     }
-    static UploadResult retry(std::string identifier, Date after) { return {Retry{std::move(identifier), after}}; }
+    static UploadResult retry(std::string identifier, Date after, bool isCounted = true) {
+        return {Retry{std::move(identifier), after, isCounted}};
+    }
     static UploadResult failed(std::string identifier, UploadResponse response) {
         return {Failed{std::move(identifier), std::move(response)}};
     }

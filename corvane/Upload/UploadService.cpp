@@ -1,6 +1,7 @@
 #include <corvane/Upload/UploadService.h>
 
 #include <corvane/Platform/Bundle.h>
+#include <corvane/Platform/Bytes.h>
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/JSONText.h>
@@ -29,6 +30,31 @@ std::string headerText(std::string text) {
 }
 
 using jsontext::isUTF8;
+
+bool isTokenCharacter(char c) {
+    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
+           std::string_view("!#$%&'*+-.^_`|~").find(c) != std::string_view::npos;
+}
+
+// Why a host's header is not sent; nothing when it is.
+std::string_view problemOf(const std::pair<std::string, std::string>& header) {
+    const auto& [name, value] = header;
+    if (name.empty() || !std::all_of(name.begin(), name.end(), isTokenCharacter)) return "the name is none";
+    if (holdsControlCharacter(value)) return "the value holds a control character";
+    constexpr std::string_view taken[] = {"content-type",
+                                          "user-agent",
+                                          "content-encoding",
+                                          "x-veskar-actionsignature",
+                                          "content-length",
+                                          "transfer-encoding",
+                                          "host",
+                                          "connection",
+                                          "expect"};
+    std::string lower = name;
+    std::transform(lower.begin(), lower.end(), lower.begin(),
+                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+    return std::find(std::begin(taken), std::end(taken), lower) == std::end(taken) ? "" : "the library sends its own";
+}
 
 std::set<std::string> identifiersOfRunning(const std::vector<std::shared_ptr<TransferTask>>& tasks) {
     std::set<std::string> identifiers;
@@ -105,6 +131,7 @@ std::shared_ptr<TransferSession> UploadService::openSession() {
     configuration.relaunchesForEvents = true;
     configuration.discretionary = true;
     configuration.sharedContainerIdentifier = endpoint_.sharedContainerIdentifier();
+    configuration.trustedCertificates = endpoint_.trustedCertificates();
     std::shared_ptr<SerialQueue> queue;
     {
         std::lock_guard lock(mutex_);
@@ -134,17 +161,32 @@ void UploadService::submit(const PreparedUploadRequest& request) {
 
 void UploadService::submit(TransferSession& session, const PreparedUploadRequest& request) {
     const std::string signatureText = signature(request.dataFileURL);
-    const auto task = session.uploadTask({.url = endpoint_.url(),
-                                          .method = "PUT",
-                                          .headers = {{"Content-Type", headerText(request.contentType)},
-                                                      {"User-Agent", headerText(request.userAgent)},
-                                                      {"Content-Encoding", "gzip"},
-                                                      {"X-Veskar-ActionSignature", signatureText}}},
+    HTTPHeaders headers{{"Content-Type", headerText(request.contentType)},
+                        {"User-Agent", headerText(request.userAgent)},
+                        {"Content-Encoding", "gzip"},
+                        {"X-Veskar-ActionSignature", signatureText}};
+    appendHostHeaders(headers);
+    const auto task = session.uploadTask({.url = endpoint_.url(), .method = "PUT", .headers = std::move(headers)},
                                          request.dataFileURL);
     task->setDescription(request.identifier);
     task->resume();
     Log::shared().default_("Upload task submitted, identifier=%{public}@, urlSessionTaskID=%{public}@, signature=%@",
                            request.identifier, urlSessionTaskID(*task), signatureText);
+}
+
+// Their values are the host's secrets, so a line in the log names the header alone.
+void UploadService::appendHostHeaders(HTTPHeaders& headers) const {
+    HTTPHeaders added;
+    if (const auto asked = endpoint_.headers()) callHost("endpoint headers", [&] { added = asked(); });
+    for (auto& header : added) {
+        const auto problem = problemOf(header);
+        if (problem.empty()) {
+            headers.push_back(std::move(header));
+        } else {
+            Log::shared().error("Header of the endpoint is not sent, name=%{public}@, reason=%{public}@", header.first,
+                                problem);
+        }
+    }
 }
 
 std::string UploadService::signature(const std::filesystem::path& file) {

@@ -88,6 +88,7 @@ class CORVANE_EXPORT UploadService final : public UploadServiceType,
     void resubmit(const std::vector<PreparedUploadRequest>& requests,
                   const std::vector<std::shared_ptr<TransferTask>>& tasks);
     std::string signature(const std::filesystem::path& file);
+    void appendHostHeaders(HTTPHeaders& headers) const;
     UploadResult result(const TransferTask& task, const std::optional<AnyError>& error,
                         const std::optional<TransferResponse>& response);
     UploadResult result(const std::string& identifier, const std::string& taskID, UploadResponse response);

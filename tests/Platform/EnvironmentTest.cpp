@@ -6,6 +6,7 @@
 #include <corvane/Platform/Lazy.h>
 #include <corvane/Platform/MainQueue.h>
 
+#include "tests/support/CapturedLog.h"
 #include "tests/support/TemporaryDocuments.h"
 
 #include <gtest/gtest.h>
@@ -61,6 +62,17 @@ TEST(Date, ConvertsOnlyWhatADateCanHold) {
     EXPECT_EQ(secondsSince1970(Date(-250ms)), -0.25);
     for (const double seconds : {1e300, -1e300, std::nan(""), HUGE_VAL}) EXPECT_FALSE(dateFromSeconds(seconds));
     EXPECT_EQ(description(Date(-1ms)), "1969-12-31 23:59:59 +0000");
+}
+
+TEST(Log, ShowsErrorsUnlessToldOtherwiseAndPrintsNothingThatSteersATerminal) {
+    EXPECT_TRUE(Log::shared().isEnabled(LogLevel::error));
+    EXPECT_FALSE(Log::shared().isEnabled(LogLevel::default_));
+    const test::CapturedLog log;
+    const std::string foreign = "a\x1b[31m\r\n\x7f\xff\xc2\x9b\xe2\x82\xac\xc3";
+    Log::shared().error("%{public}@", foreign);
+    Log::shared().error("%@", LogLines{foreign});
+    EXPECT_EQ(log.lines()[0].message, "a\\x1b[31m\\x0d\\n\\x7f\\xff\\xc2\\x9b\xe2\x82\xac\\xc3");
+    EXPECT_EQ(log.lines()[1].message, "a\\x1b[31m\\x0d\n\\x7f\\xff\\xc2\\x9b\xe2\x82\xac\\xc3");
 }
 
 TEST(Lazy, LoadsOnceAndAgainOnlyAfterAFailure) {

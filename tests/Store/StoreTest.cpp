@@ -96,12 +96,14 @@ TEST(Store, FilesAreNamedAfterTheLocationAndArePrivate) {
 TEST(Store, SaysWhereItCannotOpen) {
     const TemporaryDocuments documents;
     std::filesystem::create_directories(documents / "com.veskar.corvane.taken.db");
-    for (const char* name : {"taken", "../outside", ""}) {
+    std::filesystem::create_symlink(documents / "nowhere", documents / "com.veskar.corvane.dangling.db");
+    for (const char* name : {"taken", "../outside", "", "dangling"}) {
         const auto location = StoreLocation::default_(name);
         const auto error = thrownBy([&] { const Store<Note> store(location); });
         EXPECT_EQ(error.value(), StoreError::cantOpen);
         EXPECT_EQ(error.location(), location);
     }
+    EXPECT_FALSE(std::filesystem::exists(documents / "nowhere"));
     writeFile(documents / "file", "");
     DocumentsDirectory::set(documents / "file");
     EXPECT_EQ(thrownBy([] { const Store<Note> store(StoreLocation::default_("main")); }).value(), StoreError::cantOpen);

@@ -5,6 +5,8 @@
 
 #include <gtest/gtest.h>
 
+#include <sys/stat.h>
+
 #include <future>
 #include <set>
 
@@ -107,6 +109,14 @@ TEST(FileSigningService, SaysWhatIsWrongWithItsKeyFile) {
     }
     std::filesystem::remove(documents / FileSigningService::keyFileName);
     EXPECT_EQ(service.sign("digest").size(), 64U);  // mended
+
+    // A pipe has nothing to wait for, in the place of either half.
+    std::filesystem::remove(documents / FileSigningService::publicKeyFileName);
+    ASSERT_EQ(mkfifo((documents / FileSigningService::publicKeyFileName).c_str(), 0600), 0);
+    EXPECT_EQ(FileSigningService().sign("digest").size(), 64U);
+    std::filesystem::remove(documents / FileSigningService::keyFileName);
+    ASSERT_EQ(mkfifo((documents / FileSigningService::keyFileName).c_str(), 0600), 0);
+    EXPECT_THROW(static_cast<void>(FileSigningService().sign("digest")), SystemError);
 
     writeFile(documents / "file", "");
     EXPECT_THROW(static_cast<void>(FileSigningService(documents / "file").sign("digest")), SystemError);

@@ -94,6 +94,7 @@ TEST(UploadManager, ARetrysWholeLife) {
         run.manager->open();
         run.upload("I");
         run.service->complete(UploadResult::retry("I", later));
+        run.service->complete(UploadResult::retry("I", later, false));  // nothing was sent
         EXPECT_EQ(run.rows().at(0).retries, 1);
         EXPECT_LT(std::chrono::abs(run.rows().at(0).retryAfterDate - later), std::chrono::milliseconds(1));
         EXPECT_EQ(run.ledger->report().pending, (DeliveryReport::Count{10, 1}));

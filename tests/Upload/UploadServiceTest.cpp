@@ -136,6 +136,35 @@ TEST_F(UploadServiceTest, OpensItsSessionOnFirstUseAndSubmits) {
                         "urlSessionTaskID=<com.veskar.corvane.upload-session>.<1>, signature=signed body"));
 }
 
+TEST_F(UploadServiceTest, AsksTheHostForItsHeadersAtEachHandOverAndSendsNoneInPlaceOfItsOwn) {
+    int asked = 0;
+    EndpointOptions options{.trustedCertificates = "/etc/ca.pem"};
+    options.headers = [&]() -> HTTPHeaders {
+        if (++asked == 3) throw std::runtime_error("no token");
+        return {{"Authorization", "Bearer " + std::to_string(asked)},
+                {"content-TYPE", "x"},
+                {"Host", "elsewhere"},
+                {"two words", "x"},
+                {"X-Evil", "secret\r\nA: b"},
+                {"X-Mine", ""}};
+    };
+    service = std::make_shared<UploadService>(Endpoint("https://collector.example.com/in", "Main", options),
+                                              std::make_shared<TestSigner>(), shelf.factory());
+    for (const char* identifier : {"A", "B", "C"}) service->submit(request(identifier));
+    const auto uploads = shelf.only()->uploads();
+    const auto added = [&](std::size_t upload) {
+        const auto& headers = uploads.at(upload).request.headers;
+        return HTTPHeaders(headers.begin() + 4, headers.end());
+    };
+    EXPECT_EQ(shelf.only()->configuration().trustedCertificates, "/etc/ca.pem");
+    EXPECT_EQ(added(0), (HTTPHeaders{{"Authorization", "Bearer 1"}, {"X-Mine", ""}}));
+    EXPECT_EQ(added(1), (HTTPHeaders{{"Authorization", "Bearer 2"}, {"X-Mine", ""}}));
+    EXPECT_EQ(added(2), HTTPHeaders{});
+    EXPECT_EQ(log.count("Header of the endpoint is not sent, name="), 8);
+    EXPECT_EQ(log.count("Host code failed, call=endpoint headers, error=no token"), 1);
+    EXPECT_EQ(log.count("secret") + log.count("Bearer"), 0);
+}
+
 TEST_F(UploadServiceTest, ReportsEveryEndingAndLogsIt) {
     const std::string id = "urlSessionTaskID=<com.veskar.corvane.upload-session>.<1>";
     const auto response = [](std::int64_t status) { return UploadResponse{status, {}}.description(); };

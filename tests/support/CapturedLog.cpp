@@ -16,7 +16,7 @@ CapturedLog::CapturedLog() {
 
 CapturedLog::~CapturedLog() {
     Log::shared().setSink(nullptr);
-    Log::shared().setLevel(LogLevel::default_);
+    Log::shared().setLevel(LogLevel::error);
 }
 
 std::vector<CapturedLog::Line> CapturedLog::lines() const {
