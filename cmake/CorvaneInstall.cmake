@@ -62,13 +62,12 @@ install(FILES
     ${PROJECT_SOURCE_DIR}/cmake/CorvaneApplicationBundle.cmake
     DESTINATION ${package_dir})
 
-# A static library leaves it to its user to link what it is made of; a shared one brings that itself.
-if(BUILD_SHARED_LIBS)
-    set(pc_libs_extra "")
-    set(pc_requires "")
-else()
-    set(pc_libs_extra "-lboost_json -lboost_container -pthread")
-    set(pc_requires "sqlite3 zlib libcurl libcrypto spdlog")
+# A static library leaves it to its user to link what it is made of; a shared one brings that itself. The libraries are
+# named, and not required as packages: their compiler flags are none of a host's affair, and with --static pkg-config
+# would ask for everything that they are made of in turn.
+set(pc_libs_extra "")
+if(NOT BUILD_SHARED_LIBS)
+    set(pc_libs_extra "-lsqlite3 -lz -lcurl -lcrypto -lspdlog -lfmt -lboost_json -lboost_container -pthread")
 endif()
 configure_file(${PROJECT_SOURCE_DIR}/cmake/corvane.pc.in ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc @ONLY)
 install(FILES ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
