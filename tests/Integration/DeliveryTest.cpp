@@ -1,4 +1,5 @@
 #include "tests/Integration/Application.h"
+#include "tests/support/ProcessSettings.h"
 
 #include <corvane/Platform/Bytes.h>
 #include <corvane/Platform/SigningServiceType.h>
@@ -20,8 +21,6 @@ using Reply = ScriptedServer::Reply;
 
 class Delivery : public ::testing::Test {
   protected:
-    Delivery() { SigningServiceType::setShared(nullptr); }  // a key of this test's directory
-
     std::filesystem::path dropbox() { return documents / "com.veskar.corvane.main.upload-dropbox"; }
     bool dropboxIsEmpty() { return !std::filesystem::exists(dropbox()) || std::filesystem::is_empty(dropbox()); }
 
@@ -124,7 +123,8 @@ TEST_F(Delivery, AWakeUpGoesFromTheProcessorManagerToTheMainQueueAndBack) {
     std::promise<std::thread::id> ran;
     std::thread::id mainThread;
     std::promise<std::function<void()>> posted;
-    MainQueue::setExecutor([&](std::function<void()> task) { posted.set_value(std::move(task)); });
+    ProcessSettings settings;
+    settings.setMainQueue([&](std::function<void()> task) { posted.set_value(std::move(task)); });
 
     Application application(server.url());
     application.submit();
@@ -132,7 +132,6 @@ TEST_F(Delivery, AWakeUpGoesFromTheProcessorManagerToTheMainQueueAndBack) {
         std::string(UploadService::sessionIdentifier), [&] { woken.set_value(std::this_thread::get_id()); });
     posted.get_future().get()();  // this thread is the host's event loop
     EXPECT_EQ(woken.get_future().get(), std::this_thread::get_id());
-    MainQueue::setExecutor(nullptr);
     EXPECT_TRUE(log.has(LogLevel::default_,
                         "Should resume session? identifier=com.veskar.corvane.upload-session, result=1, "
                         "numberOfCompletions=0"));

@@ -1,4 +1,5 @@
 #include "tests/Integration/FaultFixture.h"
+#include "tests/support/ProcessSettings.h"
 
 #include <corvane/Processing/UploadBatchEntity.h>
 
@@ -159,7 +160,8 @@ TEST_F(DiskFaults, WhatIsRemovedUnderARunningApplicationIsToldOfAndMadeAnew) {
 }
 
 TEST_F(DiskFaults, ALockCostsOneTimeoutAndIsToldOfBeforeEachCompletion) {
-    StoreConnection::setBusyTimeout(1s);
+    ProcessSettings settings;
+    settings.setBusyTimeout(1s);
     constexpr int events = 100;
     {
         Application application(server.url(), 1000);
@@ -184,7 +186,6 @@ TEST_F(DiskFaults, ALockCostsOneTimeoutAndIsToldOfBeforeEachCompletion) {
     EXPECT_EQ(application.wait().delivered, (DeliveryReport::Count{1, 1})) << "out of the memory store";
     EXPECT_EQ(log.count("Failed to create store for "), 2);
     EXPECT_GE(log.count("database is locked"), events) << "the reason is in each line";
-    StoreConnection::setBusyTimeout(5s);
 }
 
 TEST_F(DiskFaults, ABrokenDatabaseIsToldOfAndHoldsUpNothingNew) {

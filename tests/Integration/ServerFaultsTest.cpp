@@ -1,4 +1,5 @@
 #include "tests/Integration/FaultFixture.h"
+#include "tests/support/ProcessSettings.h"
 
 #include <corvane/Platform/InProcessTransferSession.h>
 
@@ -24,7 +25,7 @@ using Ending = Reply::Ending;
 class ImpatientSessions {
   public:
     ImpatientSessions() {
-        TransferSession::setFactory([kept = kept_](auto configuration, auto delegate, auto queue) {
+        settings_.setTransfers([kept = kept_](auto configuration, auto delegate, auto queue) {
             configuration.limits.timeWithoutProgress = 1s;
             configuration.limits.answer = 2s;
             auto session = std::make_shared<InProcessTransferSession>(configuration, std::move(delegate), queue);
@@ -33,9 +34,6 @@ class ImpatientSessions {
             return session;
         });
     }
-    ImpatientSessions(const ImpatientSessions&) = delete;
-    ImpatientSessions& operator=(const ImpatientSessions&) = delete;
-    ~ImpatientSessions() { TransferSession::setFactory(nullptr); }
 
     /// How many transfers of the last session are not completed.
     [[nodiscard]] std::size_t inFlight() const {
@@ -55,6 +53,7 @@ class ImpatientSessions {
         std::weak_ptr<TransferSession> last;
     };
     const std::shared_ptr<Kept> kept_ = std::make_shared<Kept>();
+    ProcessSettings settings_;
 };
 
 int endings(const CapturedLog& log) {

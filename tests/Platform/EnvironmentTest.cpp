@@ -7,6 +7,7 @@
 #include <corvane/Platform/MainQueue.h>
 
 #include "tests/support/CapturedLog.h"
+#include "tests/support/ProcessSettings.h"
 #include "tests/support/TemporaryDocuments.h"
 
 #include <gtest/gtest.h>
@@ -92,14 +93,14 @@ TEST(Lazy, LoadsOnceAndAgainOnlyAfterAFailure) {
 
 TEST(MainQueue, RunsOnTheHostsExecutorOrOnItsOwnQueueWhenThatFails) {
     std::promise<int> ran;
-    MainQueue::setExecutor([](const std::function<void()>&) { throw std::runtime_error("no loop"); });
+    ProcessSettings settings;
+    settings.setMainQueue([](const std::function<void()>&) { throw std::runtime_error("no loop"); });
     MainQueue::async([&] { ran.set_value(7); });
     EXPECT_EQ(ran.get_future().get(), 7);
     std::function<void()> posted;
-    MainQueue::setExecutor([&](std::function<void()> task) { posted = std::move(task); });
+    settings.setMainQueue([&](std::function<void()> task) { posted = std::move(task); });
     MainQueue::async([] { throw 1; });
     EXPECT_NO_THROW(posted());
-    MainQueue::setExecutor(nullptr);
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 
 #include "tests/Store/Note.h"
 #include "tests/support/CapturedLog.h"
+#include "tests/support/ProcessSettings.h"
 #include "tests/support/TemporaryDocuments.h"
 
 namespace corvane::test {
@@ -95,7 +96,8 @@ TEST(DeferredStore, DecidesNothingByWhatAnotherProcessIsAboutToChange) {
     const auto other = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
     Store<VersionEntity> versions(other);
     versions.createTable();
-    StoreConnection::setBusyTimeout(std::chrono::milliseconds(20));
+    ProcessSettings settings;
+    settings.setBusyTimeout(std::chrono::milliseconds(20));
     other->transaction([&] {
         versions.insert({"notes", Note::schemaVersion});
         const CapturedLog log;
@@ -104,7 +106,6 @@ TEST(DeferredStore, DecidesNothingByWhatAnotherProcessIsAboutToChange) {
         EXPECT_EQ(log.count("database is locked"), 1);
         EXPECT_EQ(log.count(dropMessage), 0) << "the table is the other's by now";
     });
-    StoreConnection::setBusyTimeout(std::chrono::seconds(5));
     drain();
 }
 

@@ -12,6 +12,7 @@
 
 #include "tests/support/CapturedLog.h"
 #include "tests/support/Documents.h"
+#include "tests/support/ProcessSettings.h"
 #include "tests/support/TemporaryDocuments.h"
 
 namespace corvane::test {
@@ -33,14 +34,6 @@ class FakeSigningService final : public SigningServiceType {
     std::string signature_;
 };
 
-class SharedSigningService {
-  public:
-    explicit SharedSigningService(std::shared_ptr<SigningServiceType> service) {
-        SigningServiceType::setShared(std::move(service));
-    }
-    ~SharedSigningService() { SigningServiceType::setShared(nullptr); }
-};
-
 TEST(Bytes, AreWrittenInHexAndBase64) {
     EXPECT_EQ(hexString(std::string("\x00\x0f\xa0", 3)), "000fa0");
     const std::pair<std::string, std::string> cases[] = {{"", ""}, {"f", "Zg=="}, {"fo", "Zm8="}, {"foo", "Zm9v"}};
@@ -51,7 +44,8 @@ TEST(Bytes, AreWrittenInHexAndBase64) {
 TEST(OstrelSigner, SignsTheDigestAndLogsEachStep) {
     const CapturedLog log;
     const auto service = std::make_shared<FakeSigningService>(std::string("\x00\xff", 2));
-    const SharedSigningService shared(service);
+    ProcessSettings settings;
+    settings.setSigning(service);
     OstrelSigner signer;
     EXPECT_EQ(signer.sign(""), "AP8=");
     EXPECT_EQ(service->digests, std::vector{emptySHA1});
@@ -62,7 +56,8 @@ TEST(OstrelSigner, SignsTheDigestAndLogsEachStep) {
 
 TEST(OstrelSigner, PassesTheServicesErrorOn) {
     const CapturedLog log;
-    const SharedSigningService shared(std::make_shared<FakeSigningService>(""));
+    ProcessSettings settings;
+    settings.setSigning(std::make_shared<FakeSigningService>(""));
     OstrelSigner signer;
     EXPECT_THROW(static_cast<void>(signer.sign("body")), SigningError);
     EXPECT_TRUE(log.has(LogLevel::error, "Failed to sign our data, error=cannot sign: no hardware"));

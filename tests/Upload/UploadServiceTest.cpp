@@ -7,6 +7,7 @@
 
 #include "tests/support/CapturedLog.h"
 #include "tests/support/FakeTransferSession.h"
+#include "tests/support/ProcessSettings.h"
 #include "tests/support/ScriptedServer.h"
 #include "tests/support/TemporaryDocuments.h"
 
@@ -240,7 +241,8 @@ TEST_F(UploadServiceTest, ResubmitsWhatIsNotRunning) {
 
 TEST_F(UploadServiceTest, CallsTheCompletionsOfAWakeUpOnceInOrderOnTheMainQueue) {
     std::vector<std::function<void()>> mainLoop;
-    MainQueue::setExecutor([&](auto task) { mainLoop.push_back(std::move(task)); });
+    test::ProcessSettings settings;
+    settings.setMainQueue([&](auto task) { mainLoop.push_back(std::move(task)); });
     const std::string identifier(UploadService::sessionIdentifier);
     std::vector<int> called;
     EXPECT_FALSE(service->shouldResume("other", [&] { called.push_back(0); }));
@@ -272,7 +274,6 @@ TEST_F(UploadServiceTest, CallsTheCompletionsOfAWakeUpOnceInOrderOnTheMainQueue)
     ASSERT_EQ(mainLoop.size(), 1u);
     mainLoop[0]();
     EXPECT_EQ(called, (std::vector<int>{1, 2, 3}));
-    MainQueue::setExecutor(nullptr);
 }
 
 TEST_F(UploadServiceTest, AFactoryThatFailsIsLoggedAndAskedAgain) {
