@@ -219,6 +219,7 @@ TEST_F(HostCode, MayBlockWithoutHoldingUpTheHostsCalls) {
         host.join();
         drain();
         application = std::make_unique<Application>(server.url());
+        application->wait();  // its files are made now, and not when the test's directory has gone
     }
 }
 
