@@ -15,6 +15,8 @@
 #include <corvane/Platform/InProcessTransferSession.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/MainQueue.h>
+#include <corvane/Platform/SigningServiceType.h>
+#include <corvane/Platform/TransferError.h>
 #include <corvane/Processing/LoggingEventProcessor.h>
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
