@@ -114,6 +114,15 @@ TEST(Encoding, RefusesWhatJSONCannotHoldAndNamesTheProperty) {
     EXPECT_EQ(failure(Named{{{"\xff", {}}}}), "tracks.(key): the text is not UTF-8");
     EXPECT_EQ(failure(chain(64)), "") << "an object and an array a level: 128 levels with the last, empty array";
     EXPECT_NE(failure(chain(65)).find("nest too deep"), std::string::npos);
+    struct Composing {
+        void encode(Encoder& encoder) const {
+            encoder.beginObject();
+            encoder.key(std::string("a \"key\" that is made in place and gone at once"));
+            encoder.real(0.0 / 0.0);
+        }
+    };
+    EXPECT_EQ(failure(Composing{}),
+              "a \"key\" that is made in place and gone at once: the number is infinite or not a number");
     EXPECT_EQ(failure(Bare{}), "the data event's encoding is not a JSON object");
 }
 
