@@ -133,7 +133,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
 
     /// Observes session changes for as long as this tracker lives, or the object given to the observer's `disposeOn`.
     std::shared_ptr<SessionObserver> onSessionChange(SessionChangeBlock block);
-    /// Ends every observation of `object`.
+    /// Ends every observation of `object`, and of what shares its ownership with it.
     void removeSessionObservers(const std::shared_ptr<const void>& object);
 
     /// Stops the whole queue after the task that runs, until as many `resume` calls; counted by the session manager.
@@ -158,6 +158,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     /// Makes a tracker; one with a parent takes its queue, store and delegate from it and observes session changes.
     static std::shared_ptr<Tracker> makeRoot(std::string name, std::shared_ptr<SerialQueue> accessQueue,
                                              std::weak_ptr<TrackerDelegate> delegate);
+    static void release(Tracker* tracker) noexcept;
 
     // On the queue.
     void performSubmit(const EventSubmit& event, Date submitTime, const SubmitOptions& options);
@@ -173,8 +174,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     EventSubmitResult process(const EventSubmit& event, Date submitTime, TrackerDelegate* delegate);
     Sequence resolve(const std::vector<EventMirrorProperty>& properties, const EventSubmit& event, Date submitTime,
                      const std::string& sessionID);
-    std::optional<AnyDataEvent> builtIn(const EventPropertyType& property, const EventSubmit& event, Date submitTime,
-                                        const std::string& sessionID);
+    std::optional<AnyDataEvent> span(const EventPropertyType& property, const EventSubmit& event, Date submitTime);
     std::optional<AnyDataEvent> lookup(std::string_view key);
     std::optional<std::string> groupName();
     const std::string& eventPath();
@@ -182,7 +182,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     const std::string name_;
     const std::shared_ptr<SerialQueue> accessQueue_;
     const std::shared_ptr<EventMirrorStore> eventMirrorStore_;
-    const std::shared_ptr<Tracker> parentTracker_;
+    std::shared_ptr<Tracker> parentTracker_;  // until it is released
     const std::weak_ptr<TrackerDelegate> delegate_;
 
     TrackerTimers timers_ CORVANE_GUARDED_BY(*accessQueue_);

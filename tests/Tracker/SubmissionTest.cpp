@@ -34,6 +34,14 @@ TEST_F(Submission, IsStampedWithTimePathAndSession) {
     EXPECT_GE(event["eventTimestamp"].integer(), millisecondsSince1970(before));
     EXPECT_LE(event["eventTimestamp"].integer(), millisecondsSince1970(now()));
 
+    struct Twice {
+        EventProperty<EventData> first = required;
+        EventProperty<EventData> second = required;
+    };
+    const JSON twice(submit<Twice>(tracker));
+    EXPECT_EQ(twice["first"].text(), twice["second"].text()) << "one identity for each submission";
+    processor->events.pop_back();
+
     tracker->explicitSubmit<Identified>(Date(1500ms));
     processor->drain();
     EXPECT_EQ(processor->events.at(1).json()["event"]["eventTimestamp"].integer(), 1500);
