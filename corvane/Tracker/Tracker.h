@@ -102,14 +102,13 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     }
 
     /// Puts data in scope, under the name of its type. An event that finds it encodes it; what cannot be encoded fails
-    /// that event's submission.
+    /// that event's submission. The data is kept: a declaration that refers to what is somebody else's, such as a view,
+    /// or that would not be written as it reads, is refused by the compiler with the name of the field.
     template <class D>
     void push(D data, DataEventTraits traits = {}, std::source_location where = std::source_location::current()) {
-        static_assert(
-            DataEventType<D>,
-            "corvane: only a data event can be pushed: a plain aggregate of up to 64 fields, or a record that "
-            "spells its fields in corvaneFields(), or a type with encode(Encoder&)");
-        push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
+        if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
+            push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
+        }
     }
     /// Takes the newest data of a type that was pushed on this very tracker out of scope; nothing if there is none.
     template <class D>
