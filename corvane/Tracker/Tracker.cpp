@@ -188,10 +188,11 @@ Sequence Tracker::resolve(const std::vector<EventMirrorProperty>& properties, co
             data = span(*property, event, submitTime);
         }
         if (!data) data = lookup(property->dataKey());
+        if (data && !property->isDataType(data->type())) reportOtherType(name, *property, data->type());
         if (data) {
             sequence.entries.push_back({name, *std::move(data)});
         } else if (!property->isOptional()) {
-            missing.push_back({name, property->dataType()});
+            missing.push_back({name, property->dataType(), std::string(property->dataKey())});
         }
     }
     if (!missing.empty()) throw TrackerError::missing(std::move(missing));
@@ -221,6 +222,18 @@ std::optional<AnyDataEvent> Tracker::lookup(std::string_view key) {
         if (auto data = tracker->dataStacks_.take(key)) return data;
     }
     return std::nullopt;
+}
+
+/// Two types of one name share their data, which a host seldom means. Declarations and data that are known by name only
+/// have no type, and mean it.
+void Tracker::reportOtherType(std::string_view name, const EventPropertyType& property, DataType found) {
+    const std::string_view key = property.dataKey();
+    const DataType declared = property.dataType();
+    if (declared.name() != key || found.name() != key || !eventMirrorStore_->isNews(declared, found)) return;
+    Log::shared().error(
+        "A property is filled by another type of the same name, property=%{public}@, declared=%{public}@, "
+        "found=%{public}@",
+        name, declared.qualifiedName(), found.qualifiedName());
 }
 
 std::optional<std::string> Tracker::groupName() {

@@ -175,6 +175,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
                      const std::string& sessionID);
     std::optional<AnyDataEvent> span(const EventPropertyType& property, const EventSubmit& event, Date submitTime);
     std::optional<AnyDataEvent> lookup(std::string_view key);
+    void reportOtherType(std::string_view name, const EventPropertyType& property, DataType found);
     std::optional<std::string> groupName();
     const std::string& eventPath();
 

@@ -1,3 +1,4 @@
+#include "tests/support/CapturedLog.h"
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {
@@ -58,9 +59,15 @@ struct Screen {
 }  // namespace other
 
 TEST_F(Stacks, APushOfAnotherTypeUnderTheSameNameReplacesTheStack) {
+    CapturedLog log;
     root->push(Screen{"A"});
     root->push(other::Screen{7});
     EXPECT_EQ(submit<ScreenView>(root), R"({"screen":{"number":7}})");
+    EXPECT_EQ(submit<ScreenView>(root->chain("child")), R"({"screen":{"number":7}})");
+    ASSERT_EQ(log.lines().size(), 1u) << "said once";
+    EXPECT_TRUE(
+        log.lines()[0].message.ends_with("property=screen, declared=corvane::test::Screen, "
+                                         "found=corvane::test::(anonymous namespace)::other::Screen"));
     root->pop<Screen>();
     EXPECT_EQ(submit<ScreenView>(root), R"({"screen":{"number":7}})") << "a pop of the other type does nothing";
     root->pop<other::Screen>();

@@ -75,9 +75,10 @@ TEST_F(Submission, ListsEveryMissingPropertyInDeclarationOrder) {
     root->submit<Three>([&](const EventSubmitResult& result) { error = *result.error()->as<TrackerError>(); });
     processor->drain();
     EXPECT_EQ(error->value(), TrackerError::eventMissingData);
-    EXPECT_EQ(error->missingData(), (std::vector<TrackerError::MissingData>{{"first", DataType::of<Screen>()},
-                                                                            {"number", DataType::of<int>()},
-                                                                            {"second", DataType::of<Viewer>()}}));
+    EXPECT_EQ(error->missingData(),
+              (std::vector<TrackerError::MissingData>{{"first", DataType::of<Screen>(), "Screen"},
+                                                      {"number", DataType::of<int>(), "int"},
+                                                      {"second", DataType::of<Viewer>(), "Viewer"}}));
     EXPECT_STREQ(error->what(), "required data is missing: first (Screen) number (int) second (Viewer)");
     EXPECT_TRUE(processor->events.empty());
     EXPECT_EQ(submit<Nothing>(root), "{}");
