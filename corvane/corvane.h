@@ -2,6 +2,10 @@
 
 /// Everything that a host uses. Includes the standard library and Corvane's own headers, and nothing else.
 
+#include <corvane/Export.h>
+
+#ifndef CORVANE_CANNOT_BE_COMPILED  // it has said why, in one sentence
+
 #include <corvane/Models/Client.h>
 #include <corvane/Models/DataEvent.h>
 #include <corvane/Models/Decoding.h>
@@ -27,3 +31,5 @@
 #include <corvane/Tracker/Tracker.h>
 #include <corvane/Upload/Endpoint.h>
 #include <corvane/Upload/ExternalAnalyticsUploader.h>
+
+#endif

@@ -5,6 +5,10 @@
 /// <corvane/corvane.h> instead and pay nothing for this. Each name below stands for the class that its header
 /// documents.
 
+#include <corvane/Export.h>
+
+#ifndef CORVANE_CANNOT_BE_COMPILED  // it has said why, in one sentence
+
 #include <corvane/Bridge/Data/BridgedAccessTracker.h>
 #include <corvane/Bridge/Data/BridgedEventClass.h>
 #include <corvane/Bridge/Data/BridgedRawDataEvent.h>
@@ -71,3 +75,5 @@ using CVDictionary = HostValue::Dictionary;
 using CVError = BridgedError;
 
 }  // namespace corvane
+
+#endif

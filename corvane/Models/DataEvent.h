@@ -33,19 +33,28 @@ template <class T>
 concept EncodedByLibrary = requires {
     requires T::isEncodedByLibrary;
 };
+
+/// `toDict` of what has been found to be a data event that can be encoded.
+template <class T>
+JSON dictOf(const T& data) {
+    if constexpr (requires {
+                      { data.toDict() } -> std::same_as<JSON>;
+                  }) {
+        return EncodedByLibrary<T> ? requireObject(data.toDict()) : requireHostObject(data.toDict());
+    } else {
+        Encoder encoder;
+        encodeValue(encoder, data);
+        return requireObject(JSON::fromEncodedText(std::move(encoder).take()));
+    }
+}
 }  // namespace detail
 
 /// A data event as a JSON object: what its own `JSON toDict() const` returns where it has one, its encoded fields
 /// otherwise. Throws `EncodingError`, `DataEventError::invalidTopLevelJson`, or what the data event itself throws.
 template <DataEventType T>
 [[nodiscard]] JSON toDict(const T& data) {
-    if constexpr (requires {
-                      { data.toDict() } -> std::same_as<JSON>;
-                  }) {
-        return detail::EncodedByLibrary<T> ? detail::requireObject(data.toDict())
-                                           : detail::requireHostObject(data.toDict());
-    } else {
-        return detail::requireObject(encoded(data));
+    if constexpr (detail::check(detail::searchDataEvent<detail::Use::now, T>())) {
+        return detail::dictOf(data);
     }
 }
 
@@ -53,9 +62,14 @@ template <DataEventType T>
 /// on a stack reuses the text. Immutable; may be read from any thread.
 class CORVANE_EXPORT AnyDataEvent {
   public:
+    /// The data event is kept and encoded later: one that refers to what is somebody else's, such as a view, is refused
+    /// by the compiler.
     template <class T>
-    requires(!std::same_as<T, AnyDataEvent> && DataEventType<T>) explicit AnyDataEvent(T data)
-        : box_(std::make_shared<Box<T>>(std::move(data))) {}
+    requires(!std::same_as<T, AnyDataEvent> && DataEventType<T>) explicit AnyDataEvent(T data) {
+        if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, T>())) {
+            box_ = std::make_shared<Box<T>>(std::move(data));
+        }
+    }
 
     /// The data event as a JSON object. Throws as the free function `toDict` does, each time anew.
     [[nodiscard]] JSON toDict() const;
@@ -83,7 +97,7 @@ class CORVANE_EXPORT AnyDataEvent {
     struct Box final : Base {
         explicit Box(T value) : data(std::move(value)) {}
         [[nodiscard]] DataType type() const override { return DataType::of<T>(); }
-        [[nodiscard]] JSON makeDict() const override { return corvane::toDict(data); }
+        [[nodiscard]] JSON makeDict() const override { return detail::dictOf(data); }
         const T data;
     };
 

@@ -75,6 +75,16 @@ T decodeDate(const JSON& json) {
 }
 
 template <class T>
+T decodeDuration(const JSON& json) {
+    using Milliseconds = std::chrono::duration<long double, std::milli>;
+    const std::chrono::milliseconds duration(require(json.integer()));
+    if (Milliseconds(duration) < Milliseconds(T::min()) || Milliseconds(duration) > Milliseconds(T::max())) {
+        throw DecodingError(DecodingError::outOfRange, {});
+    }
+    return std::chrono::duration_cast<T>(duration);
+}
+
+template <class T>
 T decodeMap(const JSON& json) {
     T map;
     for (auto& [key, member] : require(json.object())) {
@@ -139,8 +149,13 @@ T decode(const JSON& json) {
         return static_cast<T>(detail::require(json.integer()));
     } else if constexpr (std::same_as<T, std::string>) {
         return detail::require(json.string());
+    } else if constexpr (std::same_as<T, std::u8string>) {
+        const std::string text = detail::require(json.string());
+        return {text.begin(), text.end()};
     } else if constexpr (detail::isSystemTime<T>) {
         return detail::decodeDate<T>(json);
+    } else if constexpr (detail::isDuration<T>) {
+        return detail::decodeDuration<T>(json);
     } else if constexpr (detail::isOptional<T>) {
         if (!json.exists() || json.isNull()) return std::nullopt;
         return decode<typename T::value_type>(json);

@@ -38,12 +38,20 @@ Encoder::Encoder() {
     out_.reserve(240);
 }
 
+std::string Encoder::keyAt(int level) const {
+    const std::size_t begin = keys_[level];
+    if (begin == 0) return {};
+    std::size_t end = begin + 1;
+    while (out_[end] != '"') end += out_[end] == '\\' ? 2 : 1;
+    return JSON(std::string_view(out_).substr(begin, end + 1 - begin)).string().value_or("");
+}
+
 void Encoder::fail(EncodingError::Code code) const {
     std::string path;
     for (int level = 1; level <= depth_; ++level) {
         if (isObject_[level]) {
             if (!path.empty()) path += '.';
-            path += keys_[level];
+            path += keyAt(level);
         } else {
             path += "[]";
         }
@@ -64,7 +72,7 @@ void Encoder::begin(char bracket, bool isObject) {
     out_ += bracket;
     needsComma_ = false;
     isObject_[++depth_] = isObject;
-    keys_[depth_] = {};
+    keys_[depth_] = 0;
 }
 
 void Encoder::end(char bracket, bool isObject) {
@@ -76,10 +84,10 @@ void Encoder::end(char bracket, bool isObject) {
 
 void Encoder::key(std::string_view name) {
     if (depth_ == 0 || !isObject_[depth_] || hasKey_) fail(EncodingError::malformed);
-    keys_[depth_] = name;
     if (needsComma_) out_ += ',';
+    keys_[depth_] = out_.size();
     if (!jsontext::appendString(out_, name)) {
-        keys_[depth_] = "(key)";
+        out_ += "\"(key)\"";
         fail(EncodingError::notUTF8);
     }
     out_ += ':';

@@ -54,7 +54,7 @@ class CORVANE_EXPORT Encoder {
     void beginArray() { begin('[', false); }
     void endArray() { end(']', false); }
 
-    /// The key of the next value. `name` must stay as it is until the object ends: an error's message may name it.
+    /// The key of the next value.
     void key(std::string_view name);
 
     void string(std::string_view text);
@@ -79,6 +79,7 @@ class CORVANE_EXPORT Encoder {
     void begin(char bracket, bool isObject);
     void end(char bracket, bool isObject);
     void beforeValue();
+    [[nodiscard]] std::string keyAt(int level) const;
     [[noreturn]] void fail(EncodingError::Code code) const;
 
     std::string out_;
@@ -86,7 +87,7 @@ class CORVANE_EXPORT Encoder {
     bool needsComma_ = false;
     bool hasKey_ = false;
     std::bitset<jsontext::maximumDepth + 1> isObject_;
-    std::array<std::string_view, jsontext::maximumDepth + 1> keys_;
+    std::array<std::size_t, jsontext::maximumDepth + 1> keys_;  // where each level's key is in the text; 0 for none
 };
 
 }  // namespace corvane

@@ -54,8 +54,9 @@ class CORVANE_EXPORT JSON {
     using Value = std::variant<std::nullptr_t, bool, std::int64_t, double, std::string, Array, Object>;
 
     /// Parses UTF-8 text; a bare string, number, boolean or null is allowed at the top. Never fails: text that is not
-    /// JSON, or nests deeper than 512, gives a value that is nothing. The numbers of parsed text are of one kind: an
-    /// integral one such as 3.0 answers `integer`, and every one answers `double_`.
+    /// JSON, nests deeper than 512, or has a number beyond the range of a double gives a value that is nothing. The
+    /// numbers of parsed text are of one kind: an integral one such as 3.0 answers `integer`, and every one answers
+    /// `double_`.
     explicit JSON(std::string_view bytes);
 
     /// Takes compact JSON text as the library's own encoders write it, without looking at it. Its numbers keep their

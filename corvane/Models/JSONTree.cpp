@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <charconv>
+#include <cmath>
 #include <vector>
 
 namespace corvane::jsontree {
@@ -51,11 +52,15 @@ class Builder {
         number_.clear();
         return stack_.push_uint64(number), true;
     }
-    bool on_double(double approximation, json::string_view part, json::error_code&) {
+    bool on_double(double approximation, json::string_view part, json::error_code& error) {
         number_.append(part.data(), part.size());
         double exact = approximation;
         std::from_chars(number_.data(), number_.data() + number_.size(), exact);
         number_.clear();
+        if (!std::isfinite(exact)) {  // beyond the range: a number that nothing here can hold
+            error = json::error::exponent_overflow;
+            return false;
+        }
         return stack_.push_double(exact), true;
     }
     bool on_bool(bool value, json::error_code&) { return stack_.push_bool(value), true; }
@@ -87,8 +92,7 @@ void appendScalar(std::string& out, const json::value& value) {
             jsontext::appendUnsigned(out, value.get_uint64());
             break;
         case json::kind::double_:
-            // The parser makes an infinity of a number beyond the range; JSON has no word for one.
-            if (!jsontext::appendDouble(out, value.get_double())) out += "null";
+            (void)jsontext::appendDouble(out, value.get_double());  // the parser takes none that is not finite
             break;
         case json::kind::string:
             // The parser has checked the text.

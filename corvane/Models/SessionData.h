@@ -26,7 +26,7 @@ struct SessionData {
   private:
     [[nodiscard]] JSON dataDict() const {
         try {
-            return corvane::toDict(data);
+            return detail::dictOf(data);
         } catch (const EncodingError& error) {
             throw error.within(key);
         }

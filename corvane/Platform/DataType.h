@@ -1,7 +1,9 @@
 #pragma once
 
+#include <corvane/Export.h>
 #include <corvane/Platform/TypeName.h>
 
+#include <string>
 #include <string_view>
 #include <typeindex>
 #include <typeinfo>
@@ -9,7 +11,7 @@
 namespace corvane {
 
 /// A type as a value: what an event property asks for, what a stack holds. Compared by identity, printed by name.
-class DataType {
+class CORVANE_EXPORT DataType {
   public:
     template <class T>
     [[nodiscard]] static DataType of() {
@@ -18,6 +20,8 @@ class DataType {
 
     /// The type's unqualified name, in storage that lives as long as the program.
     [[nodiscard]] std::string_view name() const { return name_; }
+    /// The whole name, namespaces included, as the compiler knows it: for messages.
+    [[nodiscard]] std::string qualifiedName() const;
 
     friend bool operator==(const DataType& a, const DataType& b) { return a.type_ == b.type_; }
 

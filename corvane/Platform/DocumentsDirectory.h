@@ -31,7 +31,9 @@ class CORVANE_EXPORT DocumentsDirectory {
     static std::filesystem::path create();
 
     /// The part of file names that stands for an endpoint: `name` without leading and trailing
-    /// white space and line breaks, lower-cased. Throws `InvalidArgument` when no file in the
+    /// blanks, tabs and line breaks, and with the letters A to Z as a to z. Other letters and white
+    /// space stay as they are, so that a name keeps its files whatever a later version of Unicode
+    /// says of it. Throws `InvalidArgument` when no file in the
     /// directory can be named so: the name is empty, holds a slash or NUL, is a relative step, or
     /// is too long for a file name.
     [[nodiscard]] static std::string fileNamePart(std::string_view name);

@@ -1,7 +1,9 @@
 #pragma once
 
 #include <corvane/Platform/TieFields.h>
+#include <corvane/Platform/TypeName.h>
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <string_view>
@@ -22,22 +24,39 @@ struct AnyField {
     operator T() const noexcept;  // NOLINT(google-explicit-constructor): declared only
 };
 
-template <class T, std::size_t... I>
-consteval bool takesFields(std::index_sequence<I...>) {
-    return requires {
-        T{(static_cast<void>(I), AnyField{})...};
-    };
-}
-
 // Fields have addresses of their own, so a type has no more of them than bytes.
 template <class T>
 inline constexpr std::size_t mostFields = sizeof(T) < maximumFields ? sizeof(T) : maximumFields;
+
+// Converts to an anonymous union, which structured bindings cannot take apart.
+template <class T>
+concept AnonymousUnion = std::is_union_v<T> &&
+    (corvane::detail::typeText(corvane::detail::prettyType<T>()).ends_with("<unnamed union>") ||
+     corvane::detail::typeText(corvane::detail::prettyType<T>()).find("(anonymous union at") != std::string_view::npos);
+
+struct AnyAnonymousUnion {
+    template <AnonymousUnion T>
+    operator T() const noexcept;  // NOLINT(google-explicit-constructor): declared only
+};
+
+// What alone binds to a reference that is not const.
+struct AnyVariable {
+    template <class T>
+    operator T&() const noexcept;  // NOLINT(google-explicit-constructor): declared only
+};
+
+template <class T, class Value, std::size_t... I>
+consteval bool takes(std::index_sequence<I...>) {
+    return requires {
+        T{(static_cast<void>(I), Value{})...};
+    };
+}
 
 template <class T, std::size_t N>
 consteval std::size_t countFrom() {
     if constexpr (N == 0) {
         return 0;
-    } else if constexpr (takesFields<T>(std::make_index_sequence<N>())) {
+    } else if constexpr (takes<T, AnyField>(std::make_index_sequence<N>())) {
         return N;
     } else {
         return countFrom<T, N - 1>();
@@ -68,22 +87,55 @@ consteval bool isArrayAt(std::index_sequence<Before...>, std::index_sequence<Aft
     };
 }
 
+// Where the first array is among `N` values; `N` when there is none.
 template <class T, std::size_t N, std::size_t... I>
-consteval bool hasArray(std::index_sequence<I...>) {
-    return (isArrayAt<T>(std::make_index_sequence<I>(), std::make_index_sequence<N - 1 - I>()) || ...);
+consteval std::size_t firstArray(std::index_sequence<I...>) {
+    const std::array<bool, N> isArray{
+        isArrayAt<T>(std::make_index_sequence<I>(), std::make_index_sequence<N - 1 - I>())...};
+    return static_cast<std::size_t>(std::find(isArray.begin(), isArray.end(), true) - isArray.begin());
 }
 
+template <class T, std::size_t... Before, std::size_t... After>
+consteval bool isAnonymousUnionAt(std::index_sequence<Before...>, std::index_sequence<After...>) {
+    return requires {
+        T{(static_cast<void>(Before), AnyField{})..., AnyAnonymousUnion{}, (static_cast<void>(After), AnyField{})...};
+    };
+}
+
+template <class T, std::size_t N, std::size_t... I>
+consteval bool hasAnonymousUnion(std::index_sequence<I...>) {
+    return (isAnonymousUnionAt<T>(std::make_index_sequence<I>(), std::make_index_sequence<N - 1 - I>()) || ...);
+}
+
+template <class T, std::size_t... I>
+consteval bool takesVariables(std::index_sequence<I...>) {
+    return (takes<T, AnyVariable>(std::make_index_sequence<I + 1>()) || ...);
+}
+
+/// Why a type cannot be taken apart.
+enum class Obstacle { none, notAnAggregate, base, tooManyFields, array, anonymousUnion, reference, unknown };
+
 template <class T>
-consteval bool canReflect() {
+consteval Obstacle obstacle() {
     if constexpr (!std::is_class_v<T> || !std::is_aggregate_v<T> || !std::is_destructible_v<T>) {
-        return false;
+        return Obstacle::notAnAggregate;
     } else if constexpr (std::is_empty_v<T>) {
-        return true;
-    } else if constexpr (HasBase<T> || takesFields<T>(std::make_index_sequence<maximumFields + 1>())) {
-        return false;
+        return Obstacle::none;
+    } else if constexpr (HasBase<T>) {
+        return Obstacle::base;
     } else {
         constexpr std::size_t count = countFrom<T, mostFields<T>>();
-        return count > 0 && !hasArray<T, count>(std::make_index_sequence<count>());
+        if constexpr (count == 0) {
+            return takesVariables<T>(std::make_index_sequence<8>()) ? Obstacle::reference : Obstacle::unknown;
+        } else if constexpr (firstArray<T, count>(std::make_index_sequence<count>()) < count) {
+            return Obstacle::array;
+        } else if constexpr (takes<T, AnyField>(std::make_index_sequence<maximumFields + 1>())) {
+            return Obstacle::tooManyFields;
+        } else if constexpr (hasAnonymousUnion<T, count>(std::make_index_sequence<count>())) {
+            return Obstacle::anonymousUnion;
+        } else {
+            return Obstacle::none;
+        }
     }
 }
 
@@ -127,6 +179,12 @@ consteval std::string_view fieldName() {
     return lastName(pretty<Address{&std::get<I>(tieFields<N>(object<T>.value))}>());
 }
 
+/// Whether all fields have addresses of their own, and so names: a reference and a bit-field have none.
+template <class T, std::size_t N>
+inline constexpr bool haveAddresses = N == 0 || requires {
+    pretty<Address{&std::get<0>(tieFields<N>(object<T>.value))}>();
+};
+
 template <class T, std::size_t N, std::size_t... I>
 consteval auto collectNames(std::index_sequence<I...>) {
     return std::array<std::string_view, N>{fieldName<T, N, I>()...};
@@ -136,11 +194,55 @@ consteval auto collectNames(std::index_sequence<I...>) {
 #pragma clang diagnostic pop
 #endif
 
+// How many values the array at a place takes.
+template <class T, std::size_t Most, std::size_t... Before, std::size_t... Elements>
+consteval std::size_t countElements(std::index_sequence<Before...> before, std::index_sequence<Elements...>) {
+    if constexpr (requires {
+                      T{(static_cast<void>(Before), AnyField{})..., {(static_cast<void>(Elements), AnyField{})...}};
+                  }) {
+        return sizeof...(Elements);
+    } else {
+        return countElements<T, Most>(before, std::make_index_sequence<sizeof...(Elements) - 1>());
+    }
+}
+
+// How many fields take the values from `Place` on, arrays counted as one.
+template <class T, std::size_t Values, std::size_t Place>
+consteval std::size_t countFieldsFrom() {
+    if constexpr (Place >= Values) {
+        return 0;
+    } else if constexpr (isArrayAt<T>(std::make_index_sequence<Place>(),
+                                      std::make_index_sequence<Values - 1 - Place>())) {
+        constexpr std::size_t size =
+            countElements<T, Values>(std::make_index_sequence<Place>(), std::make_index_sequence<Values - Place>());
+        return 1 + countFieldsFrom<T, Values, Place + size>();
+    } else {
+        return 1 + countFieldsFrom<T, Values, Place + 1>();
+    }
+}
+
+/// Which field of how many is the first array, for a message; a count of 0 when there are too many values to tell.
+struct ArrayPlace {
+    std::size_t index = 0;
+    std::size_t count = 0;
+};
+
+template <class T>
+consteval ArrayPlace placeOfArray() {
+    constexpr std::size_t values = countFrom < T, sizeof(T) < 256 ? sizeof(T) : 256 > ();
+    if constexpr (takes<T, AnyField>(std::make_index_sequence<values + 1>())) {
+        return {};
+    } else {
+        return {firstArray<T, values>(std::make_index_sequence<values>()), countFieldsFrom<T, values, 0>()};
+    }
+}
+
 }  // namespace detail
 
 /// Whether `T` can be taken apart: an aggregate class without bases and arrays, of at most `maximumFields` fields.
 template <class T>
-concept Reflectable = detail::canReflect<std::remove_cv_t<T>>();
+concept Reflectable = detail::obstacle<std::remove_cv_t<T>>()
+== detail::Obstacle::none;
 
 /// The number of fields of a reflectable type.
 template <class T>

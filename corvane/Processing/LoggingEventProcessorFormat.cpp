@@ -19,6 +19,8 @@ JSONLoggingEventProcessorFormatter::JSONLoggingEventProcessorFormatter(
 JSONLoggingEventProcessorFormatter::~JSONLoggingEventProcessorFormatter() = default;
 
 std::string JSONLoggingEventProcessorFormatter::format(const ProcessEvent& processEvent) const {
+    // Text that was taken as encoded is looked at here: a line that claims to be JSON shall be.
+    if (!processEvent.json().exists()) return fallbackFormatter_->format(processEvent);
     try {
         return processEvent.name() + " -> " + processEvent.json().toData(writingOptions_);
     } catch (const JSONError&) {

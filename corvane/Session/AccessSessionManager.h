@@ -26,8 +26,10 @@ class CORVANE_EXPORT AccessSessionManager {
     template <class D>
     void push(SessionData<D> data, DataEventTraits traits = {}, bool submitEventQueues = false,
               std::source_location where = std::source_location::current()) {
-        push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
-             submitEventQueues);
+        if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
+            push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
+                 submitEventQueues);
+        }
     }
 
     /// The same for session data that is known by name.

@@ -4,8 +4,10 @@
 #include <corvane/Platform/UUID.h>
 
 #include <algorithm>
+#include <iterator>
 #include <set>
 #include <utility>
+#include <vector>
 
 namespace corvane {
 
@@ -63,6 +65,11 @@ void SessionCore::end(Date endDate) {
     pruneOnceOnlyData();
 }
 
+void SessionCore::abandon() {
+    accessQueue_->assertCurrent("SessionManager destructor");
+    state_ = None{};
+}
+
 void SessionCore::push(AnyDataEventEntry entry, bool submitEventQueues) {
     accessQueue_->assertCurrent("SessionManager push");
     dataStacks_.push(std::move(entry));
@@ -91,20 +98,28 @@ void SessionCore::addSessionObserverNow(std::shared_ptr<SessionObserver> observe
     accessQueue_->assertCurrent("SessionManager addSessionObserver");
     // Looking through all of them at every registration would make many trackers cost their square.
     if (observers_.size() >= pruneAt_) {
-        std::erase_if(observers_, [](const auto& registered) { return !registered->object(); });
+        dropObservers([](const SessionObserver& registered) { return !registered.object(); });
         pruneAt_ = std::max<std::size_t>(16, observers_.size() * 2);
     }
     observers_.push_back(std::move(observer));
 }
 
+template <class Predicate>
+void SessionCore::dropObservers(Predicate isOver) {
+    accessQueue_->assertCurrent("SessionManager dropObservers");
+    // Moved out first: what an observer's block holds is the host's, and may do anything when it is destroyed.
+    const auto over = std::stable_partition(observers_.begin(), observers_.end(),
+                                            [&](const auto& registered) { return !isOver(*registered); });
+    const std::vector<std::shared_ptr<SessionObserver>> dropped(std::make_move_iterator(over),
+                                                                std::make_move_iterator(observers_.end()));
+    observers_.erase(over, observers_.end());
+}
+
 void SessionCore::removeSessionObservers(std::weak_ptr<const void> object) {
     accessQueue_->async([self = shared_from_this(), object = std::move(object)] {
         self->accessQueue_->assertCurrent("SessionManager removeSessionObservers");
-        const auto given = object.lock();
-        std::erase_if(self->observers_, [&](const auto& registered) {
-            const auto owner = registered->object();
-            return !owner || owner == given;
-        });
+        self->dropObservers(
+            [&](const SessionObserver& registered) { return !registered.object() || registered.isOwnedBy(object); });
     });
 }
 
@@ -163,10 +178,11 @@ void SessionCore::announce(SessionChange change) {
 
 void SessionCore::pruneOnceOnlyData() {
     accessQueue_->assertCurrent("SessionManager prune");
+    std::vector<AnyDataEventEntry> used;  // goes last: the host's data may push when it is destroyed
     auto& stacks = dataStacks_.all();
     for (auto stack = stacks.begin(); stack != stacks.end();) {
         const AnyDataEventEntry* top = stack->second.top();
-        if (top && top->traits.contains(DataEventTrait::onlyOnce)) stack->second.pop();
+        if (top && top->traits.contains(DataEventTrait::onlyOnce)) used.push_back(*stack->second.pop());
         stack = stack->second.isEmpty() ? stacks.erase(stack) : std::next(stack);
     }
 }

@@ -45,6 +45,8 @@ class SessionCore final : public TrackerDelegate,
     void start(Session::Kind kind, Date startDate);
     void end(Date endDate);
     void push(AnyDataEventEntry entry, bool submitEventQueues);
+    /// The session manager is gone: whoever else still holds this, no session is active any more, and none has ended.
+    void abandon();
     [[nodiscard]] bool isActive() const { return activeSession() != nullptr; }
 
     // TrackerDelegate
@@ -71,6 +73,8 @@ class SessionCore final : public TrackerDelegate,
     [[nodiscard]] JSON sessionData(const std::string& identifier) const;
     void announce(SessionChange change);
     void pruneOnceOnlyData();
+    template <class Predicate>
+    void dropObservers(Predicate isOver);
 
     const ForkMark born_;
     const std::shared_ptr<SerialQueue> accessQueue_;

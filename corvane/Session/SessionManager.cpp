@@ -8,10 +8,14 @@ namespace corvane {
 SessionManager::SessionManager() : core_(SessionCore::make()) {}
 
 SessionManager::~SessionManager() {
-    // The last reference goes on the queue, behind everything that was enqueued before.
+    // The session goes on the queue, behind everything that was enqueued before; tasks that were enqueued later, and
+    // handles that a host has kept, may hold the core for longer.
     const auto queue = core_->accessQueue();
     if (!core_->isInForkedChild()) core_->close();
-    queue->async([core = std::move(core_)]() mutable { core.reset(); });
+    queue->async([core = std::move(core_)]() mutable {
+        core->abandon();
+        core.reset();
+    });
 }
 
 const std::shared_ptr<Tracker>& SessionManager::tracker() const {

@@ -56,9 +56,10 @@ class CORVANE_EXPORT SessionManager {
     template <class D>
     void push(SessionData<D> data, DataEventTraits traits = {}, bool submitEventQueues = false,
               std::source_location where = std::source_location::current()) {
-        static_assert(DataEventType<D>, "corvane: session data wraps a data event: a plain aggregate or a record");
-        push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
-             submitEventQueues);
+        if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
+            push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
+                 submitEventQueues);
+        }
     }
 
     /// Runs a block on the queue. What it throws is logged.

@@ -2,7 +2,6 @@
 
 #include <corvane/Models/TimedData.h>
 
-#include <source_location>
 #include <utility>
 
 namespace corvane {
@@ -10,8 +9,8 @@ namespace corvane {
 namespace {
 
 AnyDataEventEntry spanEntry(std::string_view property, const TimedData& span) {
-    const auto here = std::source_location::current();
-    return {property, AnyDataEvent(span), {}, here.file_name(), here.line()};
+    // The place is this one, without the path of the machine that compiled it.
+    return {property, AnyDataEvent(span), {}, "corvane/Snapshot/Snapshot.cpp", __LINE__};
 }
 
 }  // namespace
@@ -41,9 +40,9 @@ SnapshotEvent Snapshot::evaluate(const EventSubmit& event) const {
         if (const AnyDataEventEntry* entry = lookup(property->dataKey())) {
             result.entries.push_back({name, *entry});
         } else if (property->isOptional()) {
-            result.missingData.push_back(MissingData::optional(property->dataType()));
+            result.missingData.push_back(MissingData::optional(name, property->dataType()));
         } else {
-            result.missingData.push_back(MissingData::required(property->dataType()));
+            result.missingData.push_back(MissingData::required(name, property->dataType()));
             result.isValid = false;
         }
     }

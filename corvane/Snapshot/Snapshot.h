@@ -8,6 +8,7 @@
 #include <map>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace corvane {
@@ -37,16 +38,25 @@ struct SnapshotEvent {
     /// A property without data.
     class MissingData {
       public:
-        [[nodiscard]] static MissingData required(DataType type) { return {false, type}; }
-        [[nodiscard]] static MissingData optional(DataType type) { return {true, type}; }
+        [[nodiscard]] static MissingData required(std::string key, DataType type) {
+            return {false, std::move(key), type};
+        }
+        [[nodiscard]] static MissingData optional(std::string key, DataType type) {
+            return {true, std::move(key), type};
+        }
 
         [[nodiscard]] bool isOptional() const { return isOptional_; }
+        /// The property's name.
+        [[nodiscard]] const std::string& key() const { return key_; }
+        /// The data type that it asks for.
         [[nodiscard]] DataType type() const { return type_; }
         friend bool operator==(const MissingData&, const MissingData&) = default;
 
       private:
-        MissingData(bool isOptional, DataType type) : isOptional_(isOptional), type_(type) {}
+        MissingData(bool isOptional, std::string key, DataType type)
+            : isOptional_(isOptional), key_(std::move(key)), type_(type) {}
         bool isOptional_;
+        std::string key_;
         DataType type_;
     };
 
@@ -60,15 +70,19 @@ struct SnapshotEvent {
 
 /// The data in scope of a tracker at one moment. Immutable; it keeps no tracker alive, and may be read from any thread.
 ///
-///     auto snapshot = tracker->snapshot(SnapshotPolicy::now);
-///     if (!snapshot->evaluate<ScreenView>().isValid) ...    // a submission would fail
+///     const SnapshotEvent view = tracker->snapshot(SnapshotPolicy::now)->evaluate<ScreenView>();
+///     for (const auto& missing : view.missingData) {
+///         if (missing.isOptional() || missing.type() == DataType::of<EventData>()) continue;
+///         ...    // a submission would fail: nothing was pushed for missing.key()
+///     }
 class CORVANE_EXPORT SnapshotType {
   public:
     virtual ~SnapshotType();
 
     /// Checks an event type against the copied data. Consumes nothing; runs on the caller's thread. A required
-    /// `TimedData` is answered by the timer that ran on the nearest tracker, up to now; there is no `EventData` unless
-    /// some was pushed, since no event has been made.
+    /// `TimedData` is answered by the timer that ran on the nearest tracker, up to now, in an entry that names no place
+    /// of the host's. `EventData` is made with an event, and none has been made: an event type that requires it is
+    /// never valid here, and has it among what is missing.
     template <class E>
     [[nodiscard]] SnapshotEvent evaluate() const {
         return evaluate(EventSubmit::actual<E>());

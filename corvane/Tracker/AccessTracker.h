@@ -49,8 +49,9 @@ class CORVANE_EXPORT AccessTracker {
 
     template <class D>
     void push(D data, DataEventTraits traits = {}, std::source_location where = std::source_location::current()) const {
-        static_assert(DataEventType<D>, "corvane: only a data event can be pushed: a plain aggregate or a record");
-        push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
+        if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
+            push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
+        }
     }
     template <class D>
     void pop() const {

@@ -5,7 +5,9 @@
 namespace corvane {
 
 void DataEventStack::push(AnyDataEventEntry entry) {
-    if (entry.traits.contains(DataEventTrait::unique)) entries_.clear();
+    // The host's data may push when it is destroyed, so what is replaced goes when the stack is whole again.
+    std::vector<AnyDataEventEntry> replaced;
+    if (entry.traits.contains(DataEventTrait::unique)) replaced.swap(entries_);
     entries_.push_back(std::move(entry));
 }
 

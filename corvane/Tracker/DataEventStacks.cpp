@@ -9,9 +9,10 @@ void DataEventStacks::push(AnyDataEventEntry entry) {
     auto found = stacks_.find(entry.key);
     if (found == stacks_.end()) {
         found = stacks_.emplace(std::string(entry.key), DataEventStack(entry.key, type)).first;
-    } else if (found->second.type() != type) {
-        found->second = DataEventStack(entry.key, type);
     }
+    // Goes last, when the stacks are whole again: the host's data may push when it is destroyed.
+    std::optional<DataEventStack> replaced;
+    if (found->second.type() != type) replaced = std::exchange(found->second, DataEventStack(entry.key, type));
     found->second.push(std::move(entry));
 }
 

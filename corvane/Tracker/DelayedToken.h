@@ -18,13 +18,13 @@ class DelayedToken {
 
     /// Submits the event, with the time of the `delayedSubmit` call. Ignored on a sealed token. Any thread.
     void commit() {
-        if (!sealed_.exchange(true)) block_();
+        if (!sealed_.exchange(true)) std::exchange(block_, nullptr)();
     }
 
     [[nodiscard]] bool sealed() const { return sealed_; }
 
   private:
-    const std::function<void()> block_;
+    std::function<void()> block_;  // whoever seals the token takes it
     std::atomic<bool> sealed_ = false;
 };
 

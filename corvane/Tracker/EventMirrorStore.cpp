@@ -17,4 +17,9 @@ EventMirrorProperties EventMirrorStore::properties(std::string_view eventName,
     return cache_.try_emplace(std::string(eventName), std::move(properties)).first->second;
 }
 
+bool EventMirrorStore::isNews(DataType declared, DataType found) {
+    std::unique_lock lock(mutex_);
+    return otherTypes_.emplace(declared.qualifiedName(), found.qualifiedName()).second;
+}
+
 }  // namespace corvane

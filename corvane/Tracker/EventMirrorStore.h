@@ -5,9 +5,11 @@
 #include <corvane/Tracker/EventPropertyType.h>
 
 #include <memory>
+#include <set>
 #include <shared_mutex>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace corvane {
@@ -29,8 +31,12 @@ class CORVANE_EXPORT EventMirrorStore {
     /// looked up defines it.
     EventMirrorProperties properties(std::string_view eventName, std::vector<EventMirrorProperty> (*mirror)());
 
+    /// Notes that data of another type than the declared one was found under its name, and says whether that is news.
+    [[nodiscard]] bool isNews(DataType declared, DataType found);
+
   private:
     std::shared_mutex mutex_;
+    std::set<std::pair<std::string, std::string>> otherTypes_;
     StringMap<EventMirrorProperties> cache_;
 };
 

@@ -1,8 +1,9 @@
 #pragma once
 
-#include <corvane/Models/Fields.h>
+#include <corvane/Models/Encodable.h>
 #include <corvane/Platform/TypeName.h>
 #include <corvane/Tracker/EventMirrorStore.h>
+#include <corvane/Tracker/EventProperty.h>
 
 #include <concepts>
 #include <memory>
@@ -25,6 +26,17 @@ struct EventDeclaration {
 };
 
 namespace detail {
+
+template <class D>
+struct Declaration<EventProperty<D>> {
+    static consteval auto search() {
+        if constexpr (DataEventType<D>) {
+            return searchDataEvent<Use::later, D>();
+        } else {
+            return NoFinding();  // never found, unless it was pushed by name
+        }
+    }
+};
 
 struct PropertyCollector {
     template <class T>
@@ -60,11 +72,10 @@ class EventSubmit {
     /// The event type `E`.
     template <class E>
     [[nodiscard]] static EventSubmit actual() {
-        static_assert(EventType<E>,
-                      "corvane: an event type is a plain aggregate (or a record with corvaneFields()) that can be made "
-                      "without arguments and whose fields are EventProperty declarations");
-        // The declaration is a constant of the program: nothing owns it.
-        return EventSubmit(std::shared_ptr<const EventDeclaration>(std::shared_ptr<void>(), &detail::declarationOf<E>));
+        if constexpr (detail::check(detail::searchEvent<E>())) {
+            // The declaration is a constant of the program: nothing owns it.
+            return EventSubmit({std::shared_ptr<void>(), &detail::declarationOf<E>});
+        }
     }
 
     /// An event declared at run time.

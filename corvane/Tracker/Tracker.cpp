@@ -11,6 +11,7 @@
 
 #include <algorithm>
 #include <set>
+#include <utility>
 
 namespace corvane {
 
@@ -27,15 +28,37 @@ Tracker::Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue,
 
 Tracker::~Tracker() = default;
 
+// A chain that falls free is released from its end to its root in one loop: its length is no depth of the stack.
+void Tracker::release(Tracker* tracker) noexcept {
+    thread_local std::shared_ptr<Tracker>* next = nullptr;  // where the loop that called takes the parent from
+    auto* const loop = std::exchange(next, nullptr);
+    std::shared_ptr<Tracker> parent = std::move(tracker->parentTracker_);
+    delete tracker;  // and with it the host's data, which may release other trackers
+    next = loop;
+    if (loop) {
+        *loop = std::move(parent);
+        return;
+    }
+    while (parent) {
+        std::shared_ptr<Tracker> grandparent;
+        next = &grandparent;
+        parent.reset();
+        next = nullptr;
+        parent = std::move(grandparent);
+    }
+}
+
 std::shared_ptr<Tracker> Tracker::makeRoot(std::string name, std::shared_ptr<SerialQueue> accessQueue,
                                            std::weak_ptr<TrackerDelegate> delegate) {
-    return std::shared_ptr<Tracker>(new Tracker(std::move(name), std::move(accessQueue),
-                                                std::make_shared<EventMirrorStore>(), nullptr, std::move(delegate)));
+    return {new Tracker(std::move(name), std::move(accessQueue), std::make_shared<EventMirrorStore>(), nullptr,
+                        std::move(delegate)),
+            &Tracker::release};
 }
 
 std::shared_ptr<Tracker> Tracker::chain(std::string name) {
     std::shared_ptr<Tracker> child(
-        new Tracker(std::move(name), accessQueue_, eventMirrorStore_, shared_from_this(), delegate_));
+        new Tracker(std::move(name), accessQueue_, eventMirrorStore_, shared_from_this(), delegate_),
+        &Tracker::release);
     child->onSessionChange([](AccessTracker& access, SessionChange change) {
         if (const auto tracker = access.tracker()) tracker->react(change);
     });
@@ -154,28 +177,32 @@ Sequence Tracker::resolve(const std::vector<EventMirrorProperty>& properties, co
                           const std::string& sessionID) {
     Sequence sequence;
     std::vector<TrackerError::MissingData> missing;
+    std::optional<AnyDataEvent> identity;
     sequence.entries.reserve(properties.size());
     for (const auto& [name, property] : properties) {
         std::optional<AnyDataEvent> data;
-        if (!property->isOptional()) data = builtIn(*property, event, submitTime, sessionID);
+        if (!property->isOptional() && property->isDataType(DataType::of<EventData>())) {
+            if (!identity) identity.emplace(EventData{newUUID(), submitTime, eventPath(), sessionID});
+            data = identity;
+        } else if (!property->isOptional()) {
+            data = span(*property, event, submitTime);
+        }
         if (!data) data = lookup(property->dataKey());
+        if (data && !property->isDataType(data->type())) reportOtherType(name, *property, data->type());
         if (data) {
             sequence.entries.push_back({name, *std::move(data)});
         } else if (!property->isOptional()) {
-            missing.push_back({name, property->dataType()});
+            missing.push_back({name, property->dataType(), std::string(property->dataKey())});
         }
     }
     if (!missing.empty()) throw TrackerError::missing(std::move(missing));
     return sequence;
 }
 
-/// What the library itself knows of an event: its identity, and its span while a timer runs, which ends the timer.
-std::optional<AnyDataEvent> Tracker::builtIn(const EventPropertyType& property, const EventSubmit& event,
-                                             Date submitTime, const std::string& sessionID) {
+/// The span of an event whose timer runs, which ends the timer.
+std::optional<AnyDataEvent> Tracker::span(const EventPropertyType& property, const EventSubmit& event,
+                                          Date submitTime) {
     accessQueue_->assertCurrent("Tracker submission");
-    if (property.isDataType(DataType::of<EventData>())) {
-        return AnyDataEvent(EventData{newUUID(), submitTime, eventPath(), sessionID});
-    }
     if (property.trait() == EventPropertyTrait::data && property.isDataType(DataType::of<TimedData>())) {
         if (const auto timer = timers_.find(event.name()); timer != timers_.end()) {
             const TimedData span(timer->second.startTime, submitTime);
@@ -195,6 +222,18 @@ std::optional<AnyDataEvent> Tracker::lookup(std::string_view key) {
         if (auto data = tracker->dataStacks_.take(key)) return data;
     }
     return std::nullopt;
+}
+
+/// Two types of one name share their data, which a host seldom means. Declarations and data that are known by name only
+/// have no type, and mean it.
+void Tracker::reportOtherType(std::string_view name, const EventPropertyType& property, DataType found) {
+    const std::string_view key = property.dataKey();
+    const DataType declared = property.dataType();
+    if (declared.name() != key || found.name() != key || !eventMirrorStore_->isNews(declared, found)) return;
+    Log::shared().error(
+        "A property is filled by another type of the same name, property=%{public}@, declared=%{public}@, "
+        "found=%{public}@",
+        name, declared.qualifiedName(), found.qualifiedName());
 }
 
 std::optional<std::string> Tracker::groupName() {
@@ -256,15 +295,15 @@ void Tracker::performWhenSession(std::function<void(AccessTracker&)> block) {
         callHost("whenSession", [&] { block(access); });
         return;
     }
-    // The observation ends with its object, which the observer's own block holds until it has run.
-    auto holder = std::make_shared<std::shared_ptr<const void>>(std::make_shared<char>());
-    const std::weak_ptr<const void> token = *holder;
+    // The observation ends with its object: the host's block, which is held until it has run.
+    auto waiting = std::make_shared<std::function<void(AccessTracker&)>>(std::move(block));
+    const std::weak_ptr<const void> token = waiting;
     const auto observer = std::make_shared<SessionObserver>(
         AccessTracker(weak_from_this()),
-        [holder, block = std::move(block)](AccessTracker& access, SessionChange change) {
-            if (change != SessionChange::didStart || !*holder) return;
-            holder->reset();
-            block(access);
+        [waiting = std::move(waiting)](AccessTracker& access, SessionChange change) mutable {
+            if (change != SessionChange::didStart || !waiting) return;
+            const auto run = std::move(waiting);
+            (*run)(access);
         });
     observer->disposeOn(token);
     delegate->addSessionObserverNow(observer);

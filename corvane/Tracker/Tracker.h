@@ -102,14 +102,13 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     }
 
     /// Puts data in scope, under the name of its type. An event that finds it encodes it; what cannot be encoded fails
-    /// that event's submission.
+    /// that event's submission. The data is kept: a declaration that refers to what is somebody else's, such as a view,
+    /// or that would not be written as it reads, is refused by the compiler with the name of the field.
     template <class D>
     void push(D data, DataEventTraits traits = {}, std::source_location where = std::source_location::current()) {
-        static_assert(
-            DataEventType<D>,
-            "corvane: only a data event can be pushed: a plain aggregate of up to 64 fields, or a record that "
-            "spells its fields in corvaneFields(), or a type with encode(Encoder&)");
-        push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
+        if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
+            push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
+        }
     }
     /// Takes the newest data of a type that was pushed on this very tracker out of scope; nothing if there is none.
     template <class D>
@@ -133,7 +132,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
 
     /// Observes session changes for as long as this tracker lives, or the object given to the observer's `disposeOn`.
     std::shared_ptr<SessionObserver> onSessionChange(SessionChangeBlock block);
-    /// Ends every observation of `object`.
+    /// Ends every observation of `object`, and of what shares its ownership with it.
     void removeSessionObservers(const std::shared_ptr<const void>& object);
 
     /// Stops the whole queue after the task that runs, until as many `resume` calls; counted by the session manager.
@@ -158,6 +157,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     /// Makes a tracker; one with a parent takes its queue, store and delegate from it and observes session changes.
     static std::shared_ptr<Tracker> makeRoot(std::string name, std::shared_ptr<SerialQueue> accessQueue,
                                              std::weak_ptr<TrackerDelegate> delegate);
+    static void release(Tracker* tracker) noexcept;
 
     // On the queue.
     void performSubmit(const EventSubmit& event, Date submitTime, const SubmitOptions& options);
@@ -173,16 +173,16 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     EventSubmitResult process(const EventSubmit& event, Date submitTime, TrackerDelegate* delegate);
     Sequence resolve(const std::vector<EventMirrorProperty>& properties, const EventSubmit& event, Date submitTime,
                      const std::string& sessionID);
-    std::optional<AnyDataEvent> builtIn(const EventPropertyType& property, const EventSubmit& event, Date submitTime,
-                                        const std::string& sessionID);
+    std::optional<AnyDataEvent> span(const EventPropertyType& property, const EventSubmit& event, Date submitTime);
     std::optional<AnyDataEvent> lookup(std::string_view key);
+    void reportOtherType(std::string_view name, const EventPropertyType& property, DataType found);
     std::optional<std::string> groupName();
     const std::string& eventPath();
 
     const std::string name_;
     const std::shared_ptr<SerialQueue> accessQueue_;
     const std::shared_ptr<EventMirrorStore> eventMirrorStore_;
-    const std::shared_ptr<Tracker> parentTracker_;
+    std::shared_ptr<Tracker> parentTracker_;  // until it is released
     const std::weak_ptr<TrackerDelegate> delegate_;
 
     TrackerTimers timers_ CORVANE_GUARDED_BY(*accessQueue_);

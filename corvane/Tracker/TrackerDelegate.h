@@ -24,7 +24,8 @@ class CORVANE_EXPORT TrackerDelegate {
     virtual void addSessionObserver(std::shared_ptr<SessionObserver> observer) = 0;
     /// Registers an observer at once.
     virtual void addSessionObserverNow(std::shared_ptr<SessionObserver> observer) = 0;
-    /// Removes every observer of `object` and those whose object is gone. Any thread; takes effect on the queue.
+    /// Removes every observer whose object has the owner of `object`, and those whose object is gone. Any thread; takes
+    /// effect on the queue.
     virtual void removeSessionObservers(std::weak_ptr<const void> object) = 0;
 
     virtual void didEnterGroup(const Group& group) = 0;

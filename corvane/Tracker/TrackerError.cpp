@@ -11,7 +11,7 @@ TrackerError::~TrackerError() = default;
 TrackerError TrackerError::missing(std::vector<MissingData> missingData) {
     std::string message = "required data is missing:";
     for (const auto& missing : missingData) {
-        message += " " + missing.key + " (" + std::string(missing.type.name()) + ")";
+        message += " " + missing.key + " (" + missing.dataName + ")";
     }
     return {eventMissingData, std::move(message), std::move(missingData)};
 }

@@ -18,8 +18,9 @@ class CORVANE_EXPORT TrackerError : public Error {
     };
 
     struct MissingData {
-        std::string key;  ///< the property's name
-        DataType type;    ///< the data type that it requires
+        std::string key;       ///< the property's name
+        DataType type;         ///< the data type that it requires
+        std::string dataName;  ///< the name under which the data is pushed
         friend bool operator==(const MissingData&, const MissingData&) = default;
     };
 

@@ -22,7 +22,8 @@ class CORVANE_EXPORT EndpointType {
     /// The absolute URL, http or https, that documents are PUT to.
     [[nodiscard]] virtual std::string url() const = 0;
     /// The text that keys the destination's database, payload directory and transfers. Two destinations of one
-    /// application need two names; surrounding white space and capitals do not tell them apart.
+    /// application need two names; surrounding white space and the capitals A to Z do not tell them apart, but those of
+    /// other letters do: see `DocumentsDirectory::fileNamePart`.
     [[nodiscard]] virtual std::string name() const = 0;
     /// The storage that an application shares with its extensions, or nothing.
     [[nodiscard]] virtual std::optional<std::string> sharedContainerIdentifier() const = 0;

@@ -125,8 +125,8 @@ TEST_F(BridgeRecording, BuiltInRecordsReachTheClassesThatDeclareThem) {
     const CVRawEvent rawView{"View", {{"event", {"EventData", required}}, {"span", {"TimedData", required}}}};
     const auto named = eventClass("Named", {{CVDataEventClass("EventData"), required}});
     EXPECT_EQ(submit(child, rawView),
-              "! Corvane.TrackerError 0: required data is missing: event (BridgedDataEvent) span (BridgedDataEvent)");
-    EXPECT_EQ(submit(child, named), "! Corvane.TrackerError 0: required data is missing: EventData (BridgedDataEvent)");
+              "! Corvane.TrackerError 0: required data is missing: event (EventData) span (TimedData)");
+    EXPECT_EQ(submit(child, named), "! Corvane.TrackerError 0: required data is missing: EventData (EventData)");
     const auto event = std::make_shared<CVEventData>(EventData{"id", Date(5ms), "/p", "s"});
     const auto span = std::make_shared<CVTimedData>(TimedData(Date(4ms), Date(2ms)));
     child->pushDataEvent(event);
@@ -197,7 +197,7 @@ TEST_F(BridgeRecording, DelayedSubmissionsGoOutOnceWithTheirOwnTime) {
 
     rawToken->commit();
     processor->drain();
-    EXPECT_EQ(outcome, "! Corvane.TrackerError 0: required data is missing: track (BridgedDataEvent)");
+    EXPECT_EQ(outcome, "! Corvane.TrackerError 0: required data is missing: track (Track)");
 
     const auto orphan = child->delayedSubmitRawEvent(rawPlay, false, [](auto*, auto*) { FAIL() << "no tracker"; });
     processor->drain();

@@ -109,6 +109,7 @@ TEST_F(BridgeSessions, ObserversAreToldUntilTheirObjectGoes) {
     int removed = 0;
     const auto child = root->chainWithName("child");
     child->onSessionChangeWithBlock([&](const auto&, CVSessionChange) { ++removed; });
+    root->onSessionChangeWithBlock([&](const auto&, CVSessionChange) { ++removed; })->disposeOnObject(child);
     child->removeSessionObserversForObject(child);
     int blocks = 0;
     root->whenSession([&](const auto&) { ++blocks; });

@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <cstdint>
 #include <limits>
 #include <map>
@@ -41,6 +42,8 @@ struct Everything {
     double number = 3;
     bool flag = true;
     Date date = Date(1500ms);
+    std::chrono::minutes pause = 2min;
+    std::u8string utf8 = u8"\u00fc";
     std::optional<int> none;
     std::optional<int> some = 7;
     std::vector<Track> tracks = {{"a", 1.25}, {"b", {}}};
@@ -68,17 +71,41 @@ struct Bare {
 TEST(Encoding, WritesEveryKindOfFieldAndReadsItBack) {
     const JSON json = toDict(Everything{});
     EXPECT_EQ(json.text(), R"({"text":"t","small":-1,"large":18446744073709551615,"lowest":-9223372036854775808,)"
-                           R"("ratio":0.1,"number":3.0,"flag":true,"date":1500,"some":7,)"
+                           R"("ratio":0.1,"number":3.0,"flag":true,"date":1500,"pause":120000,"utf8":"ü","some":7,)"
                            R"("tracks":[{"title":"a","length":1.25},{"title":"b"}],"lists":{"x":[1,2],"y":[]},)"
                            R"("quality":1,"plan":"gold","bits":[true,false]})");
     EXPECT_EQ(toDict(decode<Everything>(json)).text(), json.text());
     EXPECT_EQ(toDict(decode<Hidden>(toDict(Hidden("h")))).text(), R"({"id":"h"})");
 }
 
-TEST(Encoding, TruncatesDatesTowardZero) {
+// What only a descriptor or a value that is not kept can hold.
+struct Fixed {
+    char text[4] = {'f', 'u', 'l', 'l'};
+    char8_t ended[8] = u8"end";
+    int numbers[2] = {1, 2};
+    const char* literal = "l";
+    const char* nothing = nullptr;
+    std::string_view view = "v";
+    static constexpr auto corvaneFields() {
+        return std::tuple{Field{"text", &Fixed::text},       Field{"ended", &Fixed::ended},
+                          Field{"numbers", &Fixed::numbers}, Field{"literal", &Fixed::literal},
+                          Field{"nothing", &Fixed::nothing}, Field{"view", &Fixed::view}};
+    }
+};
+
+TEST(Encoding, WritesArraysAsFarAsTheyGoAndViewsAtOnce) {
+    EXPECT_EQ(encoded(Fixed{}).text(),
+              R"({"text":"full","ended":"end","numbers":[1,2],"literal":"l","nothing":null,"view":"v"})");
+}
+
+TEST(Encoding, TruncatesDatesAndDurationsTowardZero) {
     EXPECT_EQ(encoded(Date(-500us)).text(), "0");
     EXPECT_EQ(encoded(Date(-1999us)).text(), "-1");
     EXPECT_EQ(encoded(Date(1999us)).text(), "1");
+    EXPECT_EQ(encoded(-1999us).text(), "-1");
+    EXPECT_EQ(encoded(std::chrono::duration<double>(1.9999)).text(), "1999");
+    EXPECT_THROW((void)encoded(std::chrono::hours::max()), EncodingError);
+    EXPECT_THROW((void)decode<std::chrono::nanoseconds>(encoded(std::chrono::hours(24 * 365 * 300))), DecodingError);
 }
 
 template <class T>
@@ -114,6 +141,15 @@ TEST(Encoding, RefusesWhatJSONCannotHoldAndNamesTheProperty) {
     EXPECT_EQ(failure(Named{{{"\xff", {}}}}), "tracks.(key): the text is not UTF-8");
     EXPECT_EQ(failure(chain(64)), "") << "an object and an array a level: 128 levels with the last, empty array";
     EXPECT_NE(failure(chain(65)).find("nest too deep"), std::string::npos);
+    struct Composing {
+        void encode(Encoder& encoder) const {
+            encoder.beginObject();
+            encoder.key(std::string("a \"key\" that is made in place and gone at once"));
+            encoder.real(0.0 / 0.0);
+        }
+    };
+    EXPECT_EQ(failure(Composing{}),
+              "a \"key\" that is made in place and gone at once: the number is infinite or not a number");
     EXPECT_EQ(failure(Bare{}), "the data event's encoding is not a JSON object");
 }
 

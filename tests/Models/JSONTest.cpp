@@ -20,7 +20,8 @@ TEST(JSON, HoldsAnyTopLevelValueAndSerialisesOnlyObjectsAndArrays) {
 }
 
 TEST(JSON, IsNothingWhenTheBytesAreNotJSON) {
-    for (const std::string bytes : {"", "{", "{\"a\":}", "nul", "[1] x", "\"\xff\"", "{\"a\":1}}"}) {
+    for (const std::string bytes :
+         {"", "{", "{\"a\":}", "nul", "[1] x", "\"\xff\"", "{\"a\":1}}", "1e999", "[-1e309]"}) {
         const JSON json(bytes);
         EXPECT_FALSE(json.exists()) << bytes;
         EXPECT_FALSE(json.string() || json.integer() || json.double_() || json.bool_() || json.array() ||

@@ -33,6 +33,9 @@ TEST(LoggingEventProcessor, WritesEventsInTheFormChosen) {
     const ProcessEvent nothing("View", JSON("broken"), std::nullopt);
     EXPECT_EQ(logged(Format::default_(), nothing), "View ~> nil");
     EXPECT_EQ(logged(Format::json(), nothing), "View ~> nil");
+    for (const char* broken : {"{broken", "{\"a\":1e999}", "{\"a\":\"\xff\"}"}) {
+        EXPECT_EQ(logged(Format::json(), ProcessEvent("V", JSON::fromEncodedText(broken), {})), "V ~> nil");
+    }
 }
 
 TEST(LoggingEventProcessor, WritesSessionsAndGroupsAtDebugLevel) {

@@ -50,6 +50,31 @@ TEST_F(Lifetime, EverythingCalledBeforeDestructionStillReachesTheProcessorsWhere
     }
 }
 
+TEST_F(Lifetime, NothingIsRecordedAfterwardsWhateverStillHoldsTheManager) {
+    std::promise<void> release;
+    std::unique_ptr<AccessSessionManager> kept;
+    sessions->transaction([&](AccessSessionManager& access) {
+        kept = std::make_unique<AccessSessionManager>(access);
+        release.get_future().wait();
+    });
+    sessions.reset();
+    std::vector<std::string> outcomes;
+    const auto note = [&](const EventSubmitResult& result) {
+        outcomes.emplace_back(result.succeeded() ? "recorded" : result.error()->what());
+    };
+    root->submit<Mark>(note);
+    const auto child = root->chain("late");
+    const auto observer = root->onSessionChange([](AccessTracker&, SessionChange) {});
+    root->submit<Mark>(note);
+    release.set_value();
+    processor->drain();
+    processor->drain();
+    root->submit<Mark>(note);
+    processor->drain();
+    EXPECT_EQ(outcomes, std::vector<std::string>(3, "there is no active session"));
+    EXPECT_TRUE(processor->events.empty());
+}
+
 TEST_F(Lifetime, MayEndInItsOwnBlockOnAnotherThreadOrSuspended) {
     root->submit<Mark>([this](const EventSubmitResult&) { sessions.reset(); });
     processor->drain();

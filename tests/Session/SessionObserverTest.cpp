@@ -39,11 +39,15 @@ TEST_F(Observers, EndWithTheirTrackerTheObjectTheyAreGivenOrARemoval) {
     sessions->start(Session::Kind::userEvents());
     sessions->endSync();
     EXPECT_EQ(seen.size(), 4u);
+    second->disposeOn(root);
     const auto third = observe(root);
     root->removeSessionObservers(root);
+    const auto pair = std::make_shared<std::pair<int, int>>();
+    observe(root)->disposeOn(pair);
+    root->removeSessionObservers(std::shared_ptr<int>(pair, &pair->second));  // another address, the same owner
     sessions->start(Session::Kind::userEvents());
     sessions->endSync();
-    EXPECT_EQ(seen.size(), 4u);
+    EXPECT_EQ(seen.size(), 4u) << "an observer whose owner has gone stays over, whatever it is bound to later";
 }
 
 TEST_F(Observers, MaySubmitAndPushInlineAndMayThrow) {

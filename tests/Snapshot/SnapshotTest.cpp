@@ -22,14 +22,14 @@ TEST_F(Snapshots, SayWhetherAnEventWouldBeComplete) {
     using Missing = SnapshotEvent::MissingData;
     auto event = child->snapshot(SnapshotPolicy::now)->evaluate<ScreenView>();
     EXPECT_FALSE(event.isValid);
-    EXPECT_EQ(event.missingData, (std::vector<Missing>{Missing::required(DataType::of<Screen>()),
-                                                       Missing::optional(DataType::of<Viewer>())}));
+    EXPECT_EQ(event.missingData, (std::vector<Missing>{Missing::required("screen", DataType::of<Screen>()),
+                                                       Missing::optional("viewer", DataType::of<Viewer>())}));
     EXPECT_TRUE(event.entries.empty());
 
     root->push(Screen{"home"});
     event = child->snapshot(SnapshotPolicy::all)->evaluate<ScreenView>();
     EXPECT_TRUE(event.isValid);
-    EXPECT_EQ(event.missingData, (std::vector<Missing>{Missing::optional(DataType::of<Viewer>())}));
+    EXPECT_EQ(event.missingData, (std::vector<Missing>{Missing::optional("viewer", DataType::of<Viewer>())}));
     EXPECT_EQ(answers(event), (std::vector<std::string>{R"(screen={"name":"home"})"}));
     EXPECT_TRUE(std::string(event.entries[0].dataEntry.file).ends_with("SnapshotTest.cpp"));
     EXPECT_FALSE(child->snapshot(SnapshotPolicy::now)->evaluate<Identified>().isValid) << "no event has been made";
@@ -62,6 +62,7 @@ TEST_F(Snapshots, AreCopiesThatOutliveTheirTracker) {
     ASSERT_TRUE(event.isValid);
     EXPECT_GE(event.entries[0].dataEntry.data.as<TimedData>()->duration, 2000);
     EXPECT_EQ(event.entries[0].dataEntry.key, "span");
+    EXPECT_EQ(std::string(event.entries[0].dataEntry.file), "corvane/Snapshot/Snapshot.cpp");
 }
 
 TEST_F(Snapshots, OnTheQueueAreAProgrammingError) {

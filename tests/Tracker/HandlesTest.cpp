@@ -84,6 +84,18 @@ TEST_F(Handles, WhenSessionRunsOnceNowOrWithTheNextStart) {
     EXPECT_EQ(processor->events.size(), 1u);
 }
 
+TEST_F(Handles, BlocksThatRunOnceLetGoOfWhatTheyHold) {
+    auto held = std::make_shared<int>();
+    const auto token = root->delayedSubmit<Mark>([held](const EventSubmitResult&) {});
+    token->commit();
+    root->whenSession([held](AccessTracker&) {});
+    sessions->endSync();
+    root->whenSession([held](AccessTracker&) {});
+    sessions->start(Session::Kind::userEvents());
+    processor->drain();
+    EXPECT_EQ(held.use_count(), 1);
+}
+
 TEST_F(Handles, EverythingMayBeUsedAfterTheSessionManagerIsGone) {
     const auto child = root->chain("child");
     const auto token = child->delayedSubmit<Mark>();
@@ -190,10 +202,12 @@ TEST_F(Handles, MayBeReleasedInEveryOrder) {
 
 TEST_F(Handles, LongChainsManyObserversDeepGroupsAndManyTimersWork) {
     auto tracker = root;
-    for (int i = 0; i < 1000; ++i) tracker = tracker->chain("t");
+    for (int i = 0; i < 200000; ++i) tracker = tracker->chain("t");
     root->push(Screen{"root"});
     EXPECT_EQ(submit<ScreenView>(tracker), R"({"screen":{"name":"root"}})");
-    EXPECT_EQ(tracker->path().size(), 1001u);
+    EXPECT_EQ(tracker->path().size(), 200001u);
+    tracker = root->chain("t");  // the others are released
+    processor->drain();
 
     int changes = 0;
     for (int i = 0; i < 10000; ++i) root->onSessionChange([&](AccessTracker&, SessionChange) { ++changes; });

@@ -34,6 +34,14 @@ TEST_F(Submission, IsStampedWithTimePathAndSession) {
     EXPECT_GE(event["eventTimestamp"].integer(), millisecondsSince1970(before));
     EXPECT_LE(event["eventTimestamp"].integer(), millisecondsSince1970(now()));
 
+    struct Twice {
+        EventProperty<EventData> first = required;
+        EventProperty<EventData> second = required;
+    };
+    const JSON twice(submit<Twice>(tracker));
+    EXPECT_EQ(twice["first"].text(), twice["second"].text()) << "one identity for each submission";
+    processor->events.pop_back();
+
     tracker->explicitSubmit<Identified>(Date(1500ms));
     processor->drain();
     EXPECT_EQ(processor->events.at(1).json()["event"]["eventTimestamp"].integer(), 1500);
@@ -67,9 +75,10 @@ TEST_F(Submission, ListsEveryMissingPropertyInDeclarationOrder) {
     root->submit<Three>([&](const EventSubmitResult& result) { error = *result.error()->as<TrackerError>(); });
     processor->drain();
     EXPECT_EQ(error->value(), TrackerError::eventMissingData);
-    EXPECT_EQ(error->missingData(), (std::vector<TrackerError::MissingData>{{"first", DataType::of<Screen>()},
-                                                                            {"number", DataType::of<int>()},
-                                                                            {"second", DataType::of<Viewer>()}}));
+    EXPECT_EQ(error->missingData(),
+              (std::vector<TrackerError::MissingData>{{"first", DataType::of<Screen>(), "Screen"},
+                                                      {"number", DataType::of<int>(), "int"},
+                                                      {"second", DataType::of<Viewer>(), "Viewer"}}));
     EXPECT_STREQ(error->what(), "required data is missing: first (Screen) number (int) second (Viewer)");
     EXPECT_TRUE(processor->events.empty());
     EXPECT_EQ(submit<Nothing>(root), "{}");

@@ -138,7 +138,9 @@ void BridgedTracker::removeSessionObserversForObject(const std::shared_ptr<const
 }
 
 void BridgedTracker::removeSessionObserversForObject(const std::shared_ptr<BridgedTracker>& object) {
-    if (object) tracker_->removeSessionObservers(object->tracker_);
+    if (!object) return;
+    tracker_->removeSessionObservers(object->tracker_);
+    tracker_->removeSessionObservers(object);  // those that were bounded by the bridged object
 }
 
 void BridgedTracker::transactionWithBlock(AccessBlock block) {
