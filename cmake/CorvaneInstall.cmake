@@ -9,6 +9,7 @@ set(internal_headers
     corvane/Bridge/Models/Refusal.h
     corvane/Models/JSONShape.h
     corvane/Models/JSONTree.h
+    corvane/Models/OwnJSON.h
     corvane/Platform/AgentDirectory.h
     corvane/Platform/AgentLink.h
     corvane/Platform/AgentMessage.h

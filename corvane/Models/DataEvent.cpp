@@ -31,9 +31,10 @@ JSON detail::requireObject(JSON json) {
 }
 
 JSON detail::requireHostObject(JSON json) {
+    // Text that was taken as encoded may be none.
+    if (!json.exists() && !json.text().empty()) throw EncodingError(EncodingError::malformed, {});
     json = requireObject(std::move(json));
     if (jsontext::nesting(json.text()) > jsontext::maximumDepth) throw EncodingError(EncodingError::tooDeep, {});
-    if (!json.exists()) throw EncodingError(EncodingError::malformed, {});  // text that was taken as encoded
     return json;
 }
 

@@ -44,7 +44,7 @@ JSON dictOf(const T& data) {
     } else {
         Encoder encoder;
         encodeValue(encoder, data);
-        return requireObject(JSON::fromEncodedText(std::move(encoder).take()));
+        return requireObject(std::move(encoder).takeJSON());
     }
 }
 }  // namespace detail

@@ -1,5 +1,7 @@
 #include <corvane/Models/Encoder.h>
 
+#include <corvane/Models/OwnJSON.h>
+
 #include <utility>
 
 namespace corvane {
@@ -148,6 +150,10 @@ void Encoder::json(const JSON& value) {
     if (depth_ + jsontext::nesting(text) > jsontext::maximumDepth) fail(EncodingError::tooDeep);
     if (!value.exists()) fail(EncodingError::malformed);
     out_ += text;
+}
+
+JSON Encoder::takeJSON() && {
+    return OwnJSON::of(std::move(*this).take());
 }
 
 std::string Encoder::take() && {

@@ -74,6 +74,8 @@ class CORVANE_EXPORT Encoder {
 
     /// The finished text. Throws `malformed` unless exactly one value has been written.
     [[nodiscard]] std::string take() &&;
+    /// The same as a JSON value.
+    [[nodiscard]] JSON takeJSON() &&;
 
   private:
     void begin(char bracket, bool isObject);

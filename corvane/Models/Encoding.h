@@ -140,7 +140,7 @@ template <class T>
 [[nodiscard]] JSON encoded(const T& value) {
     Encoder encoder;
     encode(encoder, value);
-    return JSON::fromEncodedText(std::move(encoder).take());
+    return std::move(encoder).takeJSON();
 }
 
 }  // namespace corvane

@@ -2,6 +2,7 @@
 
 #include <corvane/Models/BridgedError.h>
 #include <corvane/Models/JSONTree.h>
+#include <corvane/Models/OwnJSON.h>
 #include <corvane/Platform/Require.h>
 
 #include <cmath>
@@ -21,6 +22,8 @@ struct JSON::Storage {
     bool genericNumbers = false;
     // The text was there from the start, and does not change any more.
     bool isWritten = false;
+    // ... and it is known to be JSON.
+    bool isOwn = false;
     mutable std::once_flag textOnce;
     mutable std::string text;
     mutable std::once_flag treeOnce;
@@ -78,6 +81,17 @@ JSON JSON::fromEncodedText(std::string text) {
     return JSON(std::move(storage));
 }
 
+JSON OwnJSON::of(std::string text) {
+    auto storage = std::make_shared<JSON::Storage>();
+    storage->text = std::move(text);
+    storage->isWritten = storage->isOwn = true;
+    return JSON(std::move(storage));
+}
+
+bool OwnJSON::is(const JSON& json) noexcept {
+    return json.storage_->isOwn;
+}
+
 JSON JSON::operator[](std::string_view key) const {
     const auto* value = storage_->value();
     const auto* object = value ? value->if_object() : nullptr;
@@ -92,7 +106,7 @@ JSON JSON::element(std::int64_t index) const {
 }
 
 bool JSON::exists() const {
-    return storage_->value() != nullptr;
+    return storage_->isOwn || storage_->value() != nullptr;
 }
 
 bool JSON::isNull() const {
@@ -102,7 +116,7 @@ bool JSON::isNull() const {
 
 bool JSON::isObject() const {
     // The library's own text says so in its first character; only other text must be parsed.
-    if (storage_->isWritten) return storage_->text.starts_with('{');
+    if (storage_->isOwn) return storage_->text.starts_with('{');
     const auto* value = storage_->value();
     return value && value->is_object();
 }
@@ -222,7 +236,7 @@ const std::string& JSON::text() const {
 }
 
 JSON JSON::compacted() const {
-    return fromEncodedText(text());
+    return OwnJSON::is(*this) ? OwnJSON::of(text()) : fromEncodedText(text());
 }
 
 std::string JSON::description() const {

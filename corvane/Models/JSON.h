@@ -16,6 +16,7 @@
 namespace corvane {
 
 class BridgedError;
+struct OwnJSON;
 
 /// How JSON text is laid out. The default is compact, keys in the order in which they were written.
 struct JSONWritingOptions {
@@ -59,8 +60,9 @@ class CORVANE_EXPORT JSON {
     /// `double_`.
     explicit JSON(std::string_view bytes);
 
-    /// Takes compact JSON text as the library's own encoders write it, without looking at it. Its numbers keep their
-    /// exact kinds.
+    /// Takes compact JSON text as the library's own encoders write it. Its numbers keep their exact kinds. Nothing
+    /// looks at it until it is asked for a view, or becomes part of an event, a session or a document: text that turns
+    /// out to be no JSON is a value that is nothing then, and is refused there.
     [[nodiscard]] static JSON fromEncodedText(std::string text);
 
     /// The member `key` of an object; otherwise nothing.
@@ -109,6 +111,7 @@ class CORVANE_EXPORT JSON {
     [[nodiscard]] std::string description() const;
 
   private:
+    friend struct OwnJSON;
     struct Storage;
     explicit JSON(std::shared_ptr<const Storage> storage);
 

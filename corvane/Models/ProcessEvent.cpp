@@ -1,6 +1,7 @@
 #include <corvane/Models/ProcessEvent.h>
 
 #include <corvane/Models/Encoder.h>
+#include <corvane/Models/OwnJSON.h>
 #include <corvane/Platform/JSONText.h>
 
 #include <utility>
@@ -12,6 +13,10 @@ ProcessEvent::ProcessEvent(std::string name, JSON json, std::optional<std::strin
 
 JSON ProcessEvent::payload() const {
     const JSON object = json_.payload();
+    // A document nests a few levels deeper, and must be readable when it comes back from disk.
+    if (!OwnJSON::is(object) && jsontext::nesting(object.text()) > jsontext::maximumDepth) {
+        throw EncodingError(EncodingError::tooDeep, {});
+    }
     const std::string& data = object.text();
     std::string text;
     text.reserve(data.size() + name_.size() + 64);
@@ -22,7 +27,7 @@ JSON ProcessEvent::payload() const {
     text += R"(,"version":")";
     text += version();
     text += R"("}})";
-    return JSON::fromEncodedText(std::move(text));
+    return OwnJSON::of(std::move(text));
 }
 
 }  // namespace corvane

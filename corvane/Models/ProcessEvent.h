@@ -32,7 +32,8 @@ class CORVANE_EXPORT ProcessEvent {
     [[nodiscard]] const std::optional<std::string>& groupName() const { return groupName_; }
 
     /// The event as it stands in an upload document: "data" with the JSON, "metadata" with "name" and "version".
-    /// Throws `JSONError` when the JSON is not an object.
+    /// Throws `JSONError` when the JSON is not an object, also for text that claims to be one, and `EncodingError` when
+    /// it nests too deep.
     [[nodiscard]] JSON payload() const;
 
   private:

@@ -20,7 +20,7 @@ struct SessionData {
         encoder.key(key);
         encoder.json(dict);
         encoder.endObject();
-        return JSON::fromEncodedText(std::move(encoder).take());
+        return std::move(encoder).takeJSON();
     }
 
   private:

@@ -81,7 +81,7 @@ class Converter {
         encoder_.endObject();
     }
 
-    [[nodiscard]] JSON take() && { return JSON::fromEncodedText(std::move(encoder_).take()); }
+    [[nodiscard]] JSON take() && { return std::move(encoder_).takeJSON(); }
 
   private:
     void convert(const HostValue::Array& elements) {

@@ -1,6 +1,7 @@
 #include <corvane/Processing/UploadBatchEntity.h>
 
 #include <corvane/Models/JSONShape.h>
+#include <corvane/Models/OwnJSON.h>
 
 #include <algorithm>
 #include <utility>
@@ -52,7 +53,7 @@ UploadBatchEntity UploadBatchEntity::read(StoreStepper& stepper) {
     auto events = readEvents(stepper.bytes());
     auto session = stepper.bytes();
     if (!JSON(session).isObject()) failBadData("the session is not an object");
-    return {std::move(identifier), JSON::fromEncodedText(std::move(session)), std::move(events)};
+    return {std::move(identifier), OwnJSON::of(std::move(session)), std::move(events)};
 }
 
 }  // namespace corvane

@@ -167,7 +167,12 @@ bool UploadBatchEventProcessor::backUp(UploadBatchQueue& queue) {
 
 void UploadBatchEventProcessor::backUpAll() {
     backupsAreBehind_ = false;
-    std::erase_if(unsaved_, [this](UploadBatchQueue& queue) { return backUp(queue); });
+    dropDelivered();
+    for (auto one = unsaved_.begin(); one != unsaved_.end();) {
+        const bool isSaved = backUp(one->second);
+        if (isSaved) ledger_->unfollow(one->first);
+        one = isSaved ? unsaved_.erase(one) : std::next(one);
+    }
     for (auto& [key, queue] : batchQueues_) {
         if (!backUp(queue)) backupsAreBehind_ = true;
     }
@@ -203,13 +208,22 @@ void UploadBatchEventProcessor::handOver(UploadBatchQueue& queue) {
     if (removal.error) {
         Log::shared().error("Failed to clean up request after submission, error=%{public}@", removal.error->what());
     }
-    if (removal.taken == UploadTaken::underWay) keep(queue);
+    if (removal.taken == UploadTaken::underWay) keep(queue, removal.document);
 }
 
-void UploadBatchEventProcessor::keep(UploadBatchQueue& queue) {
+void UploadBatchEventProcessor::keep(UploadBatchQueue& queue, const std::string& document) {
     if (queue.isBackedUp || backUp(queue)) return;
-    unsaved_.push_back(std::move(queue));
+    dropDelivered();
+    if (!ledger_->follow(document)) return;
+    unsaved_.emplace(document, std::move(queue));
     backupsAreBehind_ = true;
+}
+
+void UploadBatchEventProcessor::dropDelivered() {
+    std::erase_if(unsaved_, [this](const auto& one) {
+        const auto outcome = ledger_->takeOutcome(one.first);
+        return outcome && *outcome != DeliveryLedger::Outcome::pending;
+    });
 }
 
 void UploadBatchEventProcessor::putBack(Queues::node_type refused) {
@@ -248,7 +262,10 @@ UploadBatchEventProcessor::Removal UploadBatchEventProcessor::upload(const std::
         ledger_->remove(document->identifier());
         throw;
     }
-    if (removal.taken == UploadTaken::underWay) return {};  // what the transaction did is undone
+    removal.document = document->identifier();
+    if (removal.taken == UploadTaken::underWay) {  // what the transaction did is undone
+        return {.document = std::move(removal.document), .error = std::nullopt};
+    }
     if (removal.isKept || removal.isDone || removal.error) return removal;
     try {
         deferredStore_->perform([&](Rows& rows) { rows.transaction([&] { deleteRow(rows, identifier, mayDelete); }); });
@@ -298,7 +315,7 @@ void UploadBatchEventProcessor::didStartSession(const Session& session) {
         Log::shared().error("Failed to open handle to the store, error=%{public}@", AnyError::current().what());
     }
     uploadManager_->open();
-    currentSession_ = session;
+    setSession(session);
     // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
     // rest.
     backUpAll();
@@ -387,13 +404,23 @@ void UploadBatchEventProcessor::resubmit(UploadBatchEntity batch) {
     open = std::find_if(batchQueues_.begin(), batchQueues_.end(), isThis);
     if (open == batchQueues_.end()) return;
     auto handedOver = batchQueues_.extract(open);
-    if (removal.taken == UploadTaken::underWay) keep(handedOver.mapped());
+    if (removal.taken == UploadTaken::underWay) keep(handedOver.mapped(), removal.document);
 }
 
 void UploadBatchEventProcessor::didUpdateSession(const Session& session, bool submitQueues) {
     assertOnQueue("UploadBatchEventProcessor::didUpdateSession");
     if (currentSession_ && submitQueues) submit(UploadBatchQueueKey::session(currentSession_->identifier), true);
+    setSession(session);
+}
+
+// What is no object, which only a caller of the host's own can hand over, would make every document of the session
+// unreadable.
+void UploadBatchEventProcessor::setSession(const Session& session) {
+    assertOnQueue("UploadBatchEventProcessor::setSession");
     currentSession_ = session;
+    if (session.sessionData.isObject()) return;
+    Log::shared().error("Session data is not a JSON object and is left out, identifier=%{public}@", session.identifier);
+    currentSession_->sessionData = JSON("{}");
 }
 
 void UploadBatchEventProcessor::didEndSession(const Session&, Date) {

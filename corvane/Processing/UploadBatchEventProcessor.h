@@ -95,22 +95,26 @@ class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType
 
     // On the access queue.
     void assertOnQueue(const char* operation) const CORVANE_ASSERT_CAPABILITY(*accessQueue_);
+    void setSession(const Session& session) CORVANE_REQUIRES(*accessQueue_);
     [[nodiscard]] UploadBatchQueueKey keyOf(const ProcessEvent& processEvent) const CORVANE_REQUIRES(*accessQueue_);
     void add(const UploadBatchQueueKey& key, const JSON& payload) CORVANE_REQUIRES(*accessQueue_);
     /// Writes the batch's row. Returns whether it is written; if not, that has been logged.
     bool backUp(UploadBatchQueue& queue);
     void backUpAll() CORVANE_REQUIRES(*accessQueue_);
+    /// Lets go of unsaved batches whose documents need no second attempt.
+    void dropDelivered() CORVANE_REQUIRES(*accessQueue_);
     void submit(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
     /// Hands a batch over that is in no list any more, with the session's data as it is now.
     /// Throws what the manager throws; the batch is then as it was.
     void handOver(UploadBatchQueue& queue) CORVANE_REQUIRES(*accessQueue_);
     /// Sees to it that a batch whose document is under way without a row of its own stays in its backup.
-    void keep(UploadBatchQueue& queue) CORVANE_REQUIRES(*accessQueue_);
+    void keep(UploadBatchQueue& queue, const std::string& document) CORVANE_REQUIRES(*accessQueue_);
     /// Puts a batch back that was refused, before what was added to its successor meanwhile.
     void putBack(Queues::node_type refused) CORVANE_REQUIRES(*accessQueue_);
 
     /// What became of a batch's row when its document was taken over.
     struct Removal {
+        std::string document;
         UploadTaken taken = UploadTaken::underWay;
         bool isKept = false;            // the document's own row would not outlive the process, as this one does
         bool isDone = false;            // it went with the transaction that wrote the document's row
@@ -146,8 +150,9 @@ class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType
     std::shared_ptr<SerialQueue> accessQueue_;
 
     Queues batchQueues_ CORVANE_GUARDED_BY(*accessQueue_);
-    // Handed over while neither the document's row nor their own could be written; they get theirs once one can be.
-    std::vector<UploadBatchQueue> unsaved_ CORVANE_GUARDED_BY(*accessQueue_);
+    // Handed over while neither the document's row nor their own could be written, by document; they get theirs once
+    // one can be, unless the document has got through before.
+    std::map<std::string, UploadBatchQueue> unsaved_ CORVANE_GUARDED_BY(*accessQueue_);
     // Rows that are still to be sent, and are in the ledger.
     std::deque<std::string> terminated_ CORVANE_GUARDED_BY(*accessQueue_);
     std::optional<Session> currentSession_ CORVANE_GUARDED_BY(*accessQueue_);

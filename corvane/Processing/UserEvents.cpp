@@ -1,6 +1,7 @@
 #include <corvane/Processing/UserEvents.h>
 
 #include <corvane/Models/Encoder.h>
+#include <corvane/Models/OwnJSON.h>
 
 namespace corvane {
 
@@ -19,7 +20,7 @@ JSON UserEvents::jsonObject() const {
     text += R"(,"events":[)";
     text += events_->text();
     text += "]}}";
-    return JSON::fromEncodedText(std::move(text));
+    return OwnJSON::of(std::move(text));
 }
 
 }  // namespace corvane

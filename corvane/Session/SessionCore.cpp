@@ -165,7 +165,7 @@ JSON SessionCore::sessionData(const std::string& identifier) const {
         }
     }
     encoder.endObject();
-    return JSON::fromEncodedText(std::move(encoder).take());
+    return std::move(encoder).takeJSON();
 }
 
 void SessionCore::announce(SessionChange change) {

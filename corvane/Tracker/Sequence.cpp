@@ -1,5 +1,7 @@
 #include <corvane/Tracker/Sequence.h>
 
+#include <corvane/Models/OwnJSON.h>
+
 #include <boost/container/small_vector.hpp>
 
 #include <algorithm>
@@ -47,7 +49,7 @@ JSON encode(const Sequence& sequence) {
         text += dicts[i].text();
     }
     text += '}';
-    return JSON::fromEncodedText(std::move(text));
+    return OwnJSON::of(std::move(text));
 }
 
 }  // namespace corvane

@@ -38,7 +38,29 @@ void DeliveryLedger::settle(std::string_view identifier, Outcome outcome) {
             break;
     }
     onTheirWay_.erase(found);
+    if (const auto followed = followed_.find(identifier); followed != followed_.end()) followed->second = outcome;
     if (onTheirWay_.empty()) settled_.notify_all();
+}
+
+bool DeliveryLedger::follow(std::string_view identifier) {
+    const std::lock_guard lock(mutex_);
+    if (!onTheirWay_.contains(identifier)) return false;
+    followed_.try_emplace(std::string(identifier));
+    return true;
+}
+
+void DeliveryLedger::unfollow(std::string_view identifier) {
+    const std::lock_guard lock(mutex_);
+    if (const auto found = followed_.find(identifier); found != followed_.end()) followed_.erase(found);
+}
+
+std::optional<DeliveryLedger::Outcome> DeliveryLedger::takeOutcome(std::string_view identifier) {
+    const std::lock_guard lock(mutex_);
+    const auto found = followed_.find(identifier);
+    if (found == followed_.end() || !found->second) return std::nullopt;
+    const auto outcome = found->second;
+    followed_.erase(found);
+    return outcome;
 }
 
 DeliveryReport DeliveryLedger::reportLocked() const {

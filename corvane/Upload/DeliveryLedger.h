@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <map>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -36,6 +37,13 @@ class CORVANE_EXPORT DeliveryLedger {
     /// Settles a document, for good. Harmless for one that is not there.
     void settle(std::string_view identifier, Outcome outcome);
 
+    /// Remembers the outcome of a document that is on its way, for `takeOutcome`. Returns false when it is not there
+    /// (any more).
+    bool follow(std::string_view identifier);
+    void unfollow(std::string_view identifier);
+    /// The outcome of a document that was followed, once, when there is one.
+    [[nodiscard]] std::optional<Outcome> takeOutcome(std::string_view identifier);
+
     /// How things stand; what is on its way counts as pending.
     [[nodiscard]] DeliveryReport report() const;
 
@@ -52,6 +60,7 @@ class CORVANE_EXPORT DeliveryLedger {
     mutable std::condition_variable settled_;
     std::map<std::string, std::int64_t, std::less<>> onTheirWay_;  // events by document identifier
     DeliveryReport totals_;                                        // of settled documents
+    std::map<std::string, std::optional<Outcome>, std::less<>> followed_;
 };
 
 }  // namespace corvane

@@ -255,11 +255,14 @@ TEST_F(UploadBatch, ADocumentThatIsUnderWayWithoutARowStaysInItsBackup) {
     submit(3);
     EXPECT_EQ(rows().size(), 1u);
 
-    // A batch that has no backup either gets one as soon as something can be written.
+    // A batch that has no backup either gets one as soon as something can be written, unless it got through before.
     store->perform([](Rows& table) { table.dropTable(); });
-    submit(3);
-    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{3, 3}));
-    EXPECT_EQ(log.count("Failed to write queue to disk for backup uploads, identifier="), 4);
+    manager->ledger = nullptr;
+    submit(6);
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{3, 3, 3}));
+    EXPECT_EQ(log.count("Failed to write queue to disk for backup uploads, identifier="), 8);
+    ledger->settle(*manager->documents[1]["metadata"]["identifier"].string(), DeliveryLedger::Outcome::delivered);
+    ledger->settle(*manager->documents[2]["metadata"]["identifier"].string(), DeliveryLedger::Outcome::pending);
     EXPECT_EQ(log.count("Failed to clean up"), 0) << "what was not written is not deleted";
     rows();  // makes the table
     manager->taken = UploadTaken::recorded;
@@ -352,6 +355,25 @@ TEST_F(UploadBatch, RecoveredTextGoesOutAsItWasWrittenAndABadRowHoldsBackNoOther
     for (const char* bad : {"cut off", "no object", "no session"}) {
         EXPECT_EQ(log.count("Failed to submit rehydrated failed queues, error=" + std::string(bad) + ": bad data"), 1);
     }
+}
+
+TEST_F(UploadBatch, TextThatOnlyClaimsToBeJSONReachesNeitherRowNorDocument) {
+    const std::string deep = std::string(200, '[') + std::string(200, ']');
+    sessions->start(Session::Kind::userEvents());
+    sessions->transaction([&](AccessSessionManager&) {
+        for (const std::string& text : {std::string("{broken"), std::string(R"({"n":1e999})"),
+                                        std::string("{\"\xff\":1}"), std::string("[]"), R"({"deep":)" + deep + "}"}) {
+            sessions->processorManager()->process(ProcessEvent("E", JSON::fromEncodedText(text), {}));
+        }
+        batching->didUpdateSession({"S", Session::Kind::userEvents(), Date(), JSON::fromEncodedText("{broken")}, false);
+        batching->process(ProcessEvent("E", JSON::fromEncodedText(R"({"n":1})"), {}));
+    });
+    drain();
+    EXPECT_EQ(log.count("Failed to process event for batching, error="), 5);
+    EXPECT_EQ(log.count("Session data is not a JSON object"), 1);
+    ASSERT_EQ(rows().size(), 1u);
+    EXPECT_EQ(rows()[0].events->count(), 1u);
+    EXPECT_EQ(rows()[0].session.text(), "{}");
 }
 
 TEST_F(UploadBatch, WaitsForDeliveryNoLongerThanAskedAndNotOnItsQueue) {
