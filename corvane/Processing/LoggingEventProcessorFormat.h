@@ -29,6 +29,8 @@ class CORVANE_EXPORT JSONLoggingEventProcessorFormatter final : public LoggingEv
     /// Throws `InvalidArgument` without a fallback.
     JSONLoggingEventProcessorFormatter(JSONWritingOptions writingOptions,
                                        std::shared_ptr<const LoggingEventProcessorFormatterType> fallbackFormatter);
+    JSONLoggingEventProcessorFormatter(const JSONLoggingEventProcessorFormatter&) = default;
+    JSONLoggingEventProcessorFormatter& operator=(const JSONLoggingEventProcessorFormatter&) = default;
     ~JSONLoggingEventProcessorFormatter() override;
     [[nodiscard]] std::string format(const ProcessEvent& processEvent) const override;
 

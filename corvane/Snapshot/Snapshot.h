@@ -84,7 +84,7 @@ class CORVANE_EXPORT SnapshotType {
     /// of the host's. `EventData` is made with an event, and none has been made: an event type that requires it is
     /// never valid here, and has it among what is missing.
     template <class E>
-    [[nodiscard]] SnapshotEvent evaluate() const {
+    [[nodiscard]] CORVANE_LOCAL SnapshotEvent evaluate() const {
         return evaluate(EventSubmit::actual<E>());
     }
     [[nodiscard]] virtual SnapshotEvent evaluate(const EventSubmit& event) const = 0;
