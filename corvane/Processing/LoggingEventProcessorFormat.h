@@ -15,6 +15,11 @@ class CORVANE_EXPORT LoggingEventProcessorFormatterType {
   public:
     virtual ~LoggingEventProcessorFormatterType();
     [[nodiscard]] virtual std::string format(const ProcessEvent& processEvent) const = 0;
+
+  protected:
+    LoggingEventProcessorFormatterType() = default;
+    LoggingEventProcessorFormatterType(const LoggingEventProcessorFormatterType&) = default;
+    LoggingEventProcessorFormatterType& operator=(const LoggingEventProcessorFormatterType&) = default;
 };
 
 /// `ScreenView -> ["screen": ["name": "home"]]`, or `ScreenView ~> nil` for an event without a value.
