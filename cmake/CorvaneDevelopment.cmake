@@ -4,7 +4,7 @@
 function(corvane_development_options target)
     target_compile_options(${target} PRIVATE -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor)
     if(CMAKE_CXX_COMPILER_ID MATCHES "Clang")
-        target_compile_options(${target} PRIVATE -Wthread-safety)
+        target_compile_options(${target} PRIVATE -Wthread-safety -Wdeprecated)
     endif()
     if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)
         # False alarms of g++ 12 about the standard library's strings and variants, in optimised builds.

@@ -18,8 +18,7 @@ void BridgedDataEvent::encode(Encoder&) const {
     throw DataEventError(DataEventError::internalError);
 }
 
-template <>
-BridgedDataEvent decode<BridgedDataEvent>(const JSON&) {
+BridgedDataEvent BridgedDataEvent::decode(const JSON&) {
     throw DataEventError(DataEventError::internalError);
 }
 

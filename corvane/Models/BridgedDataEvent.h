@@ -3,7 +3,6 @@
 #include <corvane/Export.h>
 #include <corvane/Models/BridgedDataEventType.h>
 #include <corvane/Models/DataEvent.h>
-#include <corvane/Models/Decoding.h>
 
 #include <memory>
 
@@ -26,13 +25,10 @@ class CORVANE_EXPORT BridgedDataEvent {
     static constexpr bool isEncodedByLibrary = true;
 
     [[noreturn]] void encode(Encoder& encoder) const;
+    [[noreturn]] static BridgedDataEvent decode(const JSON& json);
 
   private:
     std::shared_ptr<const BridgedDataEventType> object_;
 };
-
-/// Always throws `DataEventError::internalError`.
-template <>
-CORVANE_EXPORT BridgedDataEvent decode<BridgedDataEvent>(const JSON& json);
 
 }  // namespace corvane

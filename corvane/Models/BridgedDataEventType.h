@@ -18,6 +18,11 @@ class CORVANE_EXPORT BridgedDataEventType {
     [[nodiscard]] virtual std::string dataName() const = 0;
     /// The data event's properties. The keys are strings.
     [[nodiscard]] virtual HostValue::Dictionary toDict() const = 0;
+
+  protected:
+    BridgedDataEventType() = default;
+    BridgedDataEventType(const BridgedDataEventType&) = default;
+    BridgedDataEventType& operator=(const BridgedDataEventType&) = default;
 };
 
 }  // namespace corvane

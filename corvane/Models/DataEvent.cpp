@@ -41,7 +41,8 @@ JSON detail::requireHostObject(JSON json) {
 AnyDataEvent::Base::~Base() = default;
 
 JSON AnyDataEvent::toDict() const {
-    const auto box = box_;  // the host's code, which is not called under the lock, may replace this object
+    const AnyDataEvent held(*this);  // the host's code, which is not called under the lock, may replace this object
+    const Base* const box = held.box_;
     if (box->isEncoded.load(std::memory_order_acquire)) return *box->dict;
     JSON dict = box->makeDict();
     std::lock_guard lock(box->mutex);

@@ -7,7 +7,6 @@
 
 #include <atomic>
 #include <concepts>
-#include <memory>
 #include <mutex>
 #include <optional>
 #include <utility>
@@ -36,7 +35,7 @@ concept EncodedByLibrary = requires {
 
 /// `toDict` of what has been found to be a data event that can be encoded.
 template <class T>
-JSON dictOf(const T& data) {
+CORVANE_LOCAL JSON dictOf(const T& data) {
     if constexpr (requires {
                       { data.toDict() } -> std::same_as<JSON>;
                   }) {
@@ -52,7 +51,7 @@ JSON dictOf(const T& data) {
 /// A data event as a JSON object: what its own `JSON toDict() const` returns where it has one, its encoded fields
 /// otherwise. Throws `EncodingError`, `DataEventError::invalidTopLevelJson`, or what the data event itself throws.
 template <DataEventType T>
-[[nodiscard]] JSON toDict(const T& data) {
+[[nodiscard]] CORVANE_LOCAL JSON toDict(const T& data) {
     if constexpr (detail::check(detail::searchDataEvent<detail::Use::now, T>())) {
         return detail::dictOf(data);
     }
@@ -65,10 +64,23 @@ class CORVANE_EXPORT AnyDataEvent {
     /// The data event is kept and encoded later: one that refers to what is somebody else's, such as a view, is refused
     /// by the compiler.
     template <class T>
-    requires(!std::same_as<T, AnyDataEvent> && DataEventType<T>) explicit AnyDataEvent(T data) {
+    requires(!std::same_as<T, AnyDataEvent> && DataEventType<T>) CORVANE_LOCAL explicit AnyDataEvent(T data) {
         if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, T>())) {
-            box_ = std::make_shared<Box<T>>(std::move(data));
+            box_ = new Box<T>(std::move(data));
         }
+    }
+
+    AnyDataEvent(const AnyDataEvent& other) noexcept : box_(other.box_) {
+        if (box_) box_->references.fetch_add(1, std::memory_order_relaxed);
+    }
+    /// Leaves `other` good for nothing but destruction and assignment.
+    AnyDataEvent(AnyDataEvent&& other) noexcept : box_(std::exchange(other.box_, nullptr)) {}
+    AnyDataEvent& operator=(AnyDataEvent other) noexcept {
+        std::swap(box_, other.box_);
+        return *this;
+    }
+    ~AnyDataEvent() {
+        if (box_ && box_->references.fetch_sub(1, std::memory_order_acq_rel) == 1) delete box_;
     }
 
     /// The data event as a JSON object. Throws as the free function `toDict` does, each time anew.
@@ -78,7 +90,7 @@ class CORVANE_EXPORT AnyDataEvent {
 
     /// The data event as a `T`, or nullptr when it is of another type. Good as long as a copy of this object.
     template <class T>
-    [[nodiscard]] const T* as() const {
+    [[nodiscard]] CORVANE_LOCAL const T* as() const {
         return type() == DataType::of<T>() ? &static_cast<const Box<T>&>(*box_).data : nullptr;
     }
 
@@ -88,20 +100,23 @@ class CORVANE_EXPORT AnyDataEvent {
         [[nodiscard]] virtual DataType type() const = 0;
         [[nodiscard]] virtual JSON makeDict() const = 0;
 
+        mutable std::atomic<std::size_t> references = 1;
         mutable std::mutex mutex;
         mutable std::optional<JSON> dict;             // written once, under the mutex
         mutable std::atomic<bool> isEncoded = false;  // `dict` is there, and does not change any more
     };
 
     template <class T>
-    struct Box final : Base {
+    struct CORVANE_LOCAL Box final : Base {
         explicit Box(T value) : data(std::move(value)) {}
         [[nodiscard]] DataType type() const override { return DataType::of<T>(); }
         [[nodiscard]] JSON makeDict() const override { return detail::dictOf(data); }
         const T data;
     };
 
-    std::shared_ptr<const Base> box_;
+    // Counted by itself: the standard library's shared pointers would make functions of the host's types that all
+    // objects of the process share, where another one may have a type of the same name.
+    const Base* box_ = nullptr;
 };
 
 }  // namespace corvane

@@ -19,6 +19,8 @@ class CORVANE_EXPORT DataEventError : public Error {
         dataDictValueNotSerializable,   ///< a value of a dictionary cannot be converted
     };
     explicit DataEventError(Code code);
+    DataEventError(const DataEventError&) = default;
+    DataEventError& operator=(const DataEventError&) = default;
     ~DataEventError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

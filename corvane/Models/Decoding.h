@@ -9,7 +9,8 @@
 #include <utility>
 
 // The way back from JSON to host types: the counterpart of Encoding.h, for stored documents, tests and hosts that read
-// what they sent. Enumerations with text come back through `bool fromText(std::string_view, Enum&)` beside them.
+// what they sent. A type may decode itself with `static T decode(const corvane::JSON&)`. Enumerations with text come
+// back through `bool fromText(std::string_view, Enum&)` beside them.
 
 namespace corvane {
 
@@ -22,6 +23,8 @@ class CORVANE_EXPORT DecodingError : public Error {
         outOfRange,   ///< the number or date does not fit the field
     };
     DecodingError(Code code, std::string path);
+    DecodingError(const DecodingError&) = default;
+    DecodingError& operator=(const DecodingError&) = default;
     ~DecodingError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
@@ -33,8 +36,9 @@ class CORVANE_EXPORT DecodingError : public Error {
 };
 
 template <class T>
-[[nodiscard]] T decode(const JSON& json);
+[[nodiscard]] CORVANE_LOCAL T decode(const JSON& json);
 
+#pragma GCC visibility push(hidden)
 namespace detail {
 
 template <class T>
@@ -128,11 +132,16 @@ T decodeRecord(const JSON& json) {
 }
 
 }  // namespace detail
+#pragma GCC visibility pop
 
 /// Makes a `T` from the JSON that encoding one gives. Throws `DecodingError`.
 template <class T>
-T decode(const JSON& json) {
-    if constexpr (std::same_as<T, JSON>) {
+CORVANE_LOCAL T decode(const JSON& json) {
+    if constexpr (requires {
+                      { T::decode(json) } -> std::same_as<T>;
+                  }) {
+        return T::decode(json);
+    } else if constexpr (std::same_as<T, JSON>) {
         return json;
     } else if constexpr (std::same_as<T, bool>) {
         return detail::require(json.bool_());

@@ -14,6 +14,8 @@
 // Which host types can be encoded, found out by the compiler where a host hands one over. A declaration that cannot be
 // written, or would be written wrongly, stops there, with one sentence and the name of the field. Internal.
 
+#pragma GCC visibility push(hidden)  // what is made of host types belongs to the object that makes it
+
 namespace corvane::detail {
 
 /// What is wrong with a declaration. The names are part of the compiler's message.
@@ -359,3 +361,5 @@ consteval bool check(Finding<fault, Record, field>) {
 }
 
 }  // namespace corvane::detail
+
+#pragma GCC visibility pop

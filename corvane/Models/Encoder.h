@@ -26,6 +26,8 @@ class CORVANE_EXPORT EncodingError : public Error {
         outOfRange,   ///< a date whose milliseconds do not fit 64 bits
     };
     EncodingError(Code code, std::string path);
+    EncodingError(const EncodingError&) = default;
+    EncodingError& operator=(const EncodingError&) = default;
     ~EncodingError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -21,6 +21,8 @@
 // text where the host supplies `std::string_view toText(Enum)` beside it; `JSON` is taken as it is. A type may encode
 // itself with `void encode(corvane::Encoder&) const`.
 
+#pragma GCC visibility push(hidden)  // what is made of host types belongs to the object that makes it
+
 namespace corvane {
 
 namespace detail {
@@ -144,3 +146,5 @@ template <class T>
 }
 
 }  // namespace corvane
+
+#pragma GCC visibility pop

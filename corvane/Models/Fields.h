@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Export.h>
 #include <corvane/Platform/Reflection.h>
 
 #include <string_view>
@@ -55,8 +56,7 @@ concept Record = Described<std::remove_cv_t<T>> || reflection::Reflectable<std::
 
 /// Calls `visitor(name, field)` for each field of a record in declaration order.
 template <class T, class Visitor>
-requires Record<T>
-constexpr void forEachField(T& value, Visitor&& visitor) {
+requires Record<T> CORVANE_LOCAL constexpr void forEachField(T& value, Visitor&& visitor) {
     using Type = std::remove_cv_t<T>;
     if constexpr (Described<Type>) {
         std::apply([&](const auto&... field) { (visitor(field.name, value.*field.member), ...); },

@@ -38,10 +38,10 @@ class CORVANE_EXPORT HostValue {
     HostValue() : HostValue(nullptr) {}
     HostValue(std::nullptr_t) : value_(nullptr) {}  // NOLINT(google-explicit-constructor): values read as literals
     template <std::same_as<bool> B>
-    HostValue(B value) : value_(value) {}  // NOLINT(google-explicit-constructor)
+    CORVANE_LOCAL HostValue(B value) : value_(value) {}  // NOLINT(google-explicit-constructor)
     /// An integer; one beyond the signed 64-bit range is of the kind `unsignedInteger`.
     template <std::integral I>
-    requires(!std::same_as<I, bool>) HostValue(I value) {  // NOLINT(google-explicit-constructor)
+    requires(!std::same_as<I, bool>) CORVANE_LOCAL HostValue(I value) {  // NOLINT(google-explicit-constructor)
         if (std::in_range<std::int64_t>(value)) {
             value_ = static_cast<std::int64_t>(value);
         } else {
@@ -59,7 +59,7 @@ class CORVANE_EXPORT HostValue {
     /// An object of the host's; null for nullptr. Of a `T` that implements neither `BridgedDataEventType` nor
     /// `BridgedDataType` nothing is known, and no conversion takes it.
     template <class T>
-    HostValue(std::shared_ptr<T> object);  // NOLINT(google-explicit-constructor)
+    CORVANE_LOCAL HostValue(std::shared_ptr<T> object);  // NOLINT(google-explicit-constructor)
 
     [[nodiscard]] Kind kind() const { return static_cast<Kind>(value_.index()); }
 
@@ -105,7 +105,7 @@ class CORVANE_EXPORT HostValue {
 
   private:
     template <class T>
-    [[nodiscard]] std::optional<T> as() const {
+    [[nodiscard]] CORVANE_LOCAL std::optional<T> as() const {
         const T* value = std::get_if<T>(&value_);
         return value ? std::optional<T>(*value) : std::nullopt;
     }

@@ -31,6 +31,8 @@ class CORVANE_EXPORT JSONError : public Error {
         invalidTopLevelValue = 0,  ///< neither an object nor, where that is allowed, an array
     };
     explicit JSONError(Code code);
+    JSONError(const JSONError&) = default;
+    JSONError& operator=(const JSONError&) = default;
     ~JSONError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
@@ -69,7 +71,7 @@ class CORVANE_EXPORT JSON {
     [[nodiscard]] JSON operator[](std::string_view key) const;
     /// The element at `index` of an array; otherwise nothing.
     template <std::integral I>
-    [[nodiscard]] JSON operator[](I index) const {
+    [[nodiscard]] CORVANE_LOCAL JSON operator[](I index) const {
         return element(static_cast<std::int64_t>(index));
     }
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Export.h>
 #include <corvane/Models/DataEvent.h>
 
 #include <string>
@@ -13,7 +14,7 @@ struct SessionData {
     D data;
 
     /// One entry: the key with the data event's object.
-    [[nodiscard]] JSON toDict() const {
+    [[nodiscard]] CORVANE_LOCAL JSON toDict() const {
         const JSON dict = dataDict();
         Encoder encoder;
         encoder.beginObject();
@@ -24,7 +25,7 @@ struct SessionData {
     }
 
   private:
-    [[nodiscard]] JSON dataDict() const {
+    [[nodiscard]] CORVANE_LOCAL JSON dataDict() const {
         try {
             return detail::dictOf(data);
         } catch (const EncodingError& error) {

@@ -13,6 +13,8 @@
 
 // What a host type is to the encoders. Internal.
 
+#pragma GCC visibility push(hidden)  // what is made of host types belongs to the object that makes it
+
 namespace corvane::detail {
 
 template <class T>
@@ -101,3 +103,5 @@ concept TextEnumerationAbroad = requires(EnumerationAbroad<Enum, Record> value) 
 };
 
 }  // namespace corvane::detail
+
+#pragma GCC visibility pop

@@ -14,7 +14,7 @@ namespace corvane {
 class CORVANE_EXPORT DataType {
   public:
     template <class T>
-    [[nodiscard]] static DataType of() {
+    [[nodiscard]] CORVANE_LOCAL static DataType of() {
         return DataType(typeid(T), typeName<T>());
     }
 

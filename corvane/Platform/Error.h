@@ -38,6 +38,8 @@ class CORVANE_EXPORT Error : public std::exception {
 class CORVANE_EXPORT InvalidArgument : public Error {
   public:
     explicit InvalidArgument(std::string message);
+    InvalidArgument(const InvalidArgument&) = default;
+    InvalidArgument& operator=(const InvalidArgument&) = default;
     ~InvalidArgument() override;
 };
 
@@ -46,6 +48,8 @@ class CORVANE_EXPORT SystemError : public Error {
   public:
     /// @param action what was attempted, for the message: "create directory /home/me/x".
     SystemError(std::string_view action, int errorNumber);
+    SystemError(const SystemError&) = default;
+    SystemError& operator=(const SystemError&) = default;
     ~SystemError() override;
 };
 
@@ -57,7 +61,7 @@ class CORVANE_EXPORT AnyError {
     [[nodiscard]] static AnyError current();
 
     template <class E>
-    explicit AnyError(const E& error) : AnyError(std::make_exception_ptr(error)) {}
+    CORVANE_LOCAL explicit AnyError(const E& error) : AnyError(std::make_exception_ptr(error)) {}
     explicit AnyError(std::exception_ptr error);
 
     /// The message of a `std::exception`; a fixed text for anything else.
@@ -66,7 +70,7 @@ class CORVANE_EXPORT AnyError {
     /// The error as an `E`, or nullptr when it is of another type. Valid while this object or a
     /// copy lives.
     template <class E>
-    [[nodiscard]] const E* as() const noexcept {
+    [[nodiscard]] CORVANE_LOCAL const E* as() const noexcept {
         return dynamic_cast<const E*>(exception_);
     }
 

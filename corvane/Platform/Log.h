@@ -37,7 +37,7 @@ class LogArgument {
     LogArgument(const std::string& text) : text_(text) {}                  // NOLINT(google-explicit-constructor)
     LogArgument(const char* text) : text_(text) {}                         // NOLINT(google-explicit-constructor)
     template <std::integral I>
-    LogArgument(I number) : number_(static_cast<std::int64_t>(number)), isNumber_(true) {}  // NOLINT
+    CORVANE_LOCAL LogArgument(I number) : number_(static_cast<std::int64_t>(number)), isNumber_(true) {}  // NOLINT
 
     void appendTo(std::string& out) const;
 
@@ -60,8 +60,8 @@ class LogArgument {
 /// "<private>".
 class CORVANE_EXPORT Log {
   public:
-    static constexpr std::string_view subsystem = "com.veskar.corvane";
-    static constexpr std::string_view category = "Analytics";
+    CORVANE_LOCAL static constexpr std::string_view subsystem = "com.veskar.corvane";
+    CORVANE_LOCAL static constexpr std::string_view category = "Analytics";
 
     /// Receives a finished message, UTF-8, without level, time or line break at its end. Called on any library thread,
     /// on several at once; must not call back into the library and wait. What it throws is dropped.
@@ -80,15 +80,15 @@ class CORVANE_EXPORT Log {
     void setHidesPrivateArguments(bool hides) noexcept { hidesPrivate_.store(hides, std::memory_order_relaxed); }
 
     template <class... Arguments>
-    void debug(const char* format, const Arguments&... arguments) noexcept {
+    CORVANE_LOCAL void debug(const char* format, const Arguments&... arguments) noexcept {
         log(LogLevel::debug, format, arguments...);
     }
     template <class... Arguments>
-    void default_(const char* format, const Arguments&... arguments) noexcept {
+    CORVANE_LOCAL void default_(const char* format, const Arguments&... arguments) noexcept {
         log(LogLevel::default_, format, arguments...);
     }
     template <class... Arguments>
-    void error(const char* format, const Arguments&... arguments) noexcept {
+    CORVANE_LOCAL void error(const char* format, const Arguments&... arguments) noexcept {
         log(LogLevel::error, format, arguments...);
     }
 
@@ -99,7 +99,7 @@ class CORVANE_EXPORT Log {
     ~Log() = delete;
 
     template <class... Arguments>
-    void log(LogLevel level, const char* format, const Arguments&... arguments) noexcept {
+    CORVANE_LOCAL void log(LogLevel level, const char* format, const Arguments&... arguments) noexcept {
         if (isEnabled(level)) write(level, format, {LogArgument(arguments)...});
     }
     void write(LogLevel level, std::string_view format, std::initializer_list<LogArgument> arguments) noexcept;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Export.h>
 #include <corvane/Platform/TieFields.h>
 #include <corvane/Platform/TypeName.h>
 
@@ -13,6 +14,8 @@
 // Field reflection over plain aggregates, at compile time and without registration: how many fields a type has, what
 // they are called, and references to them in declaration order. Everything here is consteval or a plain template, so
 // nothing of it is left in the host's program but the names.
+
+#pragma GCC visibility push(hidden)  // what is made of host types belongs to the object that makes it
 
 namespace corvane::reflection {
 
@@ -250,7 +253,7 @@ inline constexpr std::size_t fieldCount = std::is_empty_v<T> ? 0 : detail::count
 
 /// The names of the fields, in declaration order.
 template <class T>
-inline constexpr std::array<std::string_view, fieldCount<T>> fieldNames =
+CORVANE_LOCAL inline constexpr std::array<std::string_view, fieldCount<T>> fieldNames =
     detail::collectNames<T, fieldCount<T>>(std::make_index_sequence<fieldCount<T>>());
 
 namespace detail {
@@ -271,3 +274,5 @@ constexpr void forEachField(T& value, Visitor&& visitor) {
 }
 
 }  // namespace corvane::reflection
+
+#pragma GCC visibility pop

@@ -53,7 +53,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
     /// Requires: the caller is not on this queue (it would wait for itself; the process is stopped
     /// with a message).
     template <class F>
-    auto sync(F&& function) -> std::invoke_result_t<F&> {
+    CORVANE_LOCAL auto sync(F&& function) -> std::invoke_result_t<F&> {
         using Result = std::invoke_result_t<F&>;
         if constexpr (std::is_void_v<Result>) {
             auto call = [&] { function(); };

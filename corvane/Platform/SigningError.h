@@ -16,6 +16,8 @@ class CORVANE_EXPORT SigningError : public Error {
         failed = 2,       ///< the computation failed
     };
     SigningError(Code code, const std::string& detail);
+    SigningError(const SigningError&) = default;
+    SigningError& operator=(const SigningError&) = default;
     ~SigningError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <corvane/Export.h>
+
 #include <cstddef>
 #include <new>
 #include <type_traits>
@@ -19,7 +21,7 @@ class Task {
     Task() noexcept = default;
 
     template <class F>
-    requires(!std::is_same_v<std::remove_cvref_t<F>, Task> && std::is_invocable_v<std::decay_t<F>&>)
+    requires(!std::is_same_v<std::remove_cvref_t<F>, Task> && std::is_invocable_v<std::decay_t<F>&>) CORVANE_LOCAL
         Task(F&& function) {  // NOLINT(google-explicit-constructor): any callable is a task
         using Function = std::decay_t<F>;
         if constexpr (fitsInline<Function>) {
@@ -66,7 +68,7 @@ class Task {
         sizeof(F) <= inlineSize && alignof(F) <= alignof(std::max_align_t) && std::is_nothrow_move_constructible_v<F>;
 
     template <class F>
-    static constexpr Operations inlineOperations = {
+    CORVANE_LOCAL static constexpr Operations inlineOperations = {
         [](void* storage) { (*std::launder(static_cast<F*>(storage)))(); },
         [](void* from, void* to) noexcept {
             auto* function = std::launder(static_cast<F*>(from));
@@ -76,7 +78,7 @@ class Task {
         [](void* storage) noexcept { std::launder(static_cast<F*>(storage))->~F(); }};
 
     template <class F>
-    static constexpr Operations heapOperations = {
+    CORVANE_LOCAL static constexpr Operations heapOperations = {
         [](void* storage) { (**static_cast<F**>(storage))(); },
         [](void* from, void* to) noexcept { *static_cast<F**>(to) = *static_cast<F**>(from); },
         [](void* storage) noexcept { delete *static_cast<F**>(storage); }};

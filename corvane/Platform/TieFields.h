@@ -3,6 +3,8 @@
 #include <cstddef>
 #include <tuple>
 
+#pragma GCC visibility push(hidden)  // what is made of host types belongs to the object that makes it
+
 namespace corvane::reflection {
 
 /// How many fields of an aggregate reflection can take apart; a type with more spells its fields once (see Fields.h).
@@ -82,3 +84,5 @@ constexpr auto tieFields(T& v) {
 }
 
 }  // namespace corvane::reflection
+
+#pragma GCC visibility pop

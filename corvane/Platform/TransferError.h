@@ -19,6 +19,8 @@ class CORVANE_EXPORT TransferError : public Error {
     };
 
     TransferError(Code code, std::string message);
+    TransferError(const TransferError&) = default;
+    TransferError& operator=(const TransferError&) = default;
     ~TransferError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

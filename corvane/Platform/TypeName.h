@@ -1,8 +1,12 @@
 #pragma once
 
+#include <corvane/Export.h>
+
 #include <array>
 #include <cstddef>
 #include <string_view>
+
+#pragma GCC visibility push(hidden)  // what is made of host types belongs to the object that makes it
 
 namespace corvane {
 
@@ -53,7 +57,8 @@ consteval Name<Capacity> lastComponents(std::string_view qualified) {
 }
 
 template <class T>
-inline constexpr auto reducedTypeName = lastComponents<typeText(prettyType<T>()).size() + 1>(typeText(prettyType<T>()));
+CORVANE_LOCAL inline constexpr auto reducedTypeName =
+    lastComponents<typeText(prettyType<T>()).size() + 1>(typeText(prettyType<T>()));
 
 }  // namespace detail
 
@@ -69,3 +74,5 @@ template <class T>
 }
 
 }  // namespace corvane
+
+#pragma GCC visibility pop

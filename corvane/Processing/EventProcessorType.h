@@ -39,6 +39,11 @@ class CORVANE_EXPORT EventProcessorType {
     /// Returns true when this processor owns the background transfer session `identifier` and takes the completion
     /// over, which it then calls when the session's events are delivered.
     virtual bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion);
+
+  protected:
+    EventProcessorType() = default;
+    EventProcessorType(const EventProcessorType&) = default;
+    EventProcessorType& operator=(const EventProcessorType&) = default;
 };
 
 }  // namespace corvane

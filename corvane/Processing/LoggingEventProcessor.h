@@ -12,6 +12,7 @@ class CORVANE_EXPORT LoggingEventProcessor final : public EventProcessorType {
   public:
     explicit LoggingEventProcessor(
         const LoggingEventProcessorFormat& logFormat = LoggingEventProcessorFormat::default_());
+    LoggingEventProcessor(const LoggingEventProcessor&) = default;
     ~LoggingEventProcessor() override;
 
     /// Does nothing: the processor keeps no queue.

@@ -15,6 +15,11 @@ class CORVANE_EXPORT LoggingEventProcessorFormatterType {
   public:
     virtual ~LoggingEventProcessorFormatterType();
     [[nodiscard]] virtual std::string format(const ProcessEvent& processEvent) const = 0;
+
+  protected:
+    LoggingEventProcessorFormatterType() = default;
+    LoggingEventProcessorFormatterType(const LoggingEventProcessorFormatterType&) = default;
+    LoggingEventProcessorFormatterType& operator=(const LoggingEventProcessorFormatterType&) = default;
 };
 
 /// `ScreenView -> ["screen": ["name": "home"]]`, or `ScreenView ~> nil` for an event without a value.
@@ -29,6 +34,8 @@ class CORVANE_EXPORT JSONLoggingEventProcessorFormatter final : public LoggingEv
     /// Throws `InvalidArgument` without a fallback.
     JSONLoggingEventProcessorFormatter(JSONWritingOptions writingOptions,
                                        std::shared_ptr<const LoggingEventProcessorFormatterType> fallbackFormatter);
+    JSONLoggingEventProcessorFormatter(const JSONLoggingEventProcessorFormatter&) = default;
+    JSONLoggingEventProcessorFormatter& operator=(const JSONLoggingEventProcessorFormatter&) = default;
     ~JSONLoggingEventProcessorFormatter() override;
     [[nodiscard]] std::string format(const ProcessEvent& processEvent) const override;
 

@@ -26,6 +26,8 @@ class CORVANE_EXPORT SessionProviderType {
 class CORVANE_EXPORT ProcessorManager : public std::enable_shared_from_this<ProcessorManager> {
   public:
     explicit ProcessorManager(std::shared_ptr<SerialQueue> accessQueue);
+    ProcessorManager(const ProcessorManager&) = delete;
+    ProcessorManager& operator=(const ProcessorManager&) = delete;
     ~ProcessorManager();
 
     /// Adds a processor at the end; one that is added twice is called twice. It learns of a running session as if that

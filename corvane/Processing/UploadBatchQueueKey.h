@@ -17,6 +17,8 @@ class CORVANE_EXPORT UploadBatchQueueKeyError : public Error {
         invalid = 0,  ///< no session is current: the event belongs to no batch
     };
     explicit UploadBatchQueueKeyError(Code code);
+    UploadBatchQueueKeyError(const UploadBatchQueueKeyError&) = default;
+    UploadBatchQueueKeyError& operator=(const UploadBatchQueueKeyError&) = default;
     ~UploadBatchQueueKeyError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

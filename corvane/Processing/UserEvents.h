@@ -21,6 +21,7 @@ class CORVANE_EXPORT UserEvents final : public ResourceType {
     /// @param identifier a new UUID: the document's, not its batch's
     UserEvents(JSON session, std::shared_ptr<const EncodedEvents> events, std::string identifier)
         : session_(std::move(session)), events_(std::move(events)), identifier_(std::move(identifier)) {}
+    UserEvents(const UserEvents&) = default;
     ~UserEvents() override;
 
     [[nodiscard]] std::string contentType() const override { return std::string(mediaType); }

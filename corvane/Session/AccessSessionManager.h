@@ -18,14 +18,16 @@ class SessionCore;
 class CORVANE_EXPORT AccessSessionManager {
   public:
     explicit AccessSessionManager(std::shared_ptr<SessionCore> sessionManager);
+    AccessSessionManager(const AccessSessionManager&) = default;
+    AccessSessionManager& operator=(const AccessSessionManager&) = default;
     ~AccessSessionManager();
 
     [[nodiscard]] bool isActive() const;
 
     /// As `SessionManager::push`, done when it returns.
     template <class D>
-    void push(SessionData<D> data, DataEventTraits traits = {}, bool submitEventQueues = false,
-              std::source_location where = std::source_location::current()) {
+    CORVANE_LOCAL void push(SessionData<D> data, DataEventTraits traits = {}, bool submitEventQueues = false,
+                            std::source_location where = std::source_location::current()) {
         if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
             push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
                  submitEventQueues);
@@ -36,7 +38,7 @@ class CORVANE_EXPORT AccessSessionManager {
     void push(AnyDataEventEntry entry, bool submitEventQueues);
 
   private:
-    const std::shared_ptr<SessionCore> sessionManager_;
+    std::shared_ptr<SessionCore> sessionManager_;
 };
 
 }  // namespace corvane

@@ -17,6 +17,11 @@ class CORVANE_EXPORT ActiveSessionType {
     [[nodiscard]] virtual const std::string& identifier() const = 0;
     [[nodiscard]] virtual const Session::Kind& kind() const = 0;
     [[nodiscard]] virtual Date startDate() const = 0;
+
+  protected:
+    ActiveSessionType() = default;
+    ActiveSessionType(const ActiveSessionType&) = default;
+    ActiveSessionType& operator=(const ActiveSessionType&) = default;
 };
 
 /// The session that runs, with every event handed over while it was active. Made by the session manager only, and used
@@ -24,6 +29,8 @@ class CORVANE_EXPORT ActiveSessionType {
 class CORVANE_EXPORT ActiveSession final : public ActiveSessionType {
   public:
     ActiveSession(std::string identifier, Session::Kind kind, Date startDate);
+    ActiveSession(const ActiveSession&) = delete;
+    ActiveSession& operator=(const ActiveSession&) = delete;
     ~ActiveSession() override;
 
     [[nodiscard]] const std::string& identifier() const override { return identifier_; }

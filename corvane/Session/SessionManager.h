@@ -54,8 +54,8 @@ class CORVANE_EXPORT SessionManager {
     /// Puts data into this and later sessions, under its key. Processors are told of it while a session is active;
     /// `submitEventQueues` asks them to send what they have collected so far under the data before this push.
     template <class D>
-    void push(SessionData<D> data, DataEventTraits traits = {}, bool submitEventQueues = false,
-              std::source_location where = std::source_location::current()) {
+    CORVANE_LOCAL void push(SessionData<D> data, DataEventTraits traits = {}, bool submitEventQueues = false,
+                            std::source_location where = std::source_location::current()) {
         if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
             push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
                  submitEventQueues);

@@ -84,10 +84,15 @@ class CORVANE_EXPORT SnapshotType {
     /// of the host's. `EventData` is made with an event, and none has been made: an event type that requires it is
     /// never valid here, and has it among what is missing.
     template <class E>
-    [[nodiscard]] SnapshotEvent evaluate() const {
+    [[nodiscard]] CORVANE_LOCAL SnapshotEvent evaluate() const {
         return evaluate(EventSubmit::actual<E>());
     }
     [[nodiscard]] virtual SnapshotEvent evaluate(const EventSubmit& event) const = 0;
+
+  protected:
+    SnapshotType() = default;
+    SnapshotType(const SnapshotType&) = default;
+    SnapshotType& operator=(const SnapshotType&) = default;
 };
 
 /// See SnapshotType.
@@ -97,6 +102,7 @@ class CORVANE_EXPORT Snapshot final : public SnapshotType {
 
     /// @param levels the nearest tracker first
     Snapshot(SnapshotPolicy policy, std::vector<SnapshotLevel> levels, std::shared_ptr<EventMirrorStore> mirrorStore);
+    Snapshot(const Snapshot&) = default;
     ~Snapshot() override;
 
     [[nodiscard]] SnapshotPolicy policy() const { return policy_; }

@@ -12,6 +12,8 @@ class CORVANE_EXPORT DeferredStoreError : public Error {
         noStore = 0,  ///< neither the database file nor one in memory could be had; the log says why
     };
     explicit DeferredStoreError(Code code);
+    DeferredStoreError(const DeferredStoreError&) = default;
+    DeferredStoreError& operator=(const DeferredStoreError&) = default;
     ~DeferredStoreError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -27,6 +27,8 @@ class CORVANE_EXPORT StoreError : public Error {
     [[nodiscard]] static StoreError makePrepare(std::string sql, std::string_view reason);
     [[nodiscard]] static StoreError makeExecute(std::string sql, std::string_view reason);
     [[nodiscard]] static StoreError makeMissingHandle();
+    StoreError(const StoreError&) = default;
+    StoreError& operator=(const StoreError&) = default;
     ~StoreError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

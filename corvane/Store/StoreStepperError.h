@@ -16,6 +16,8 @@ class CORVANE_EXPORT StoreStepperError : public Error {
     };
     /// @param detail which column or what about it, for the message.
     StoreStepperError(Code code, const std::string& detail);
+    StoreStepperError(const StoreStepperError&) = default;
+    StoreStepperError& operator=(const StoreStepperError&) = default;
     ~StoreStepperError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -26,35 +26,36 @@ class CORVANE_EXPORT AccessTracker {
     explicit AccessTracker(std::weak_ptr<Tracker> tracker) : tracker_(std::move(tracker)) {}
 
     template <class E>
-    void submit(EventSubmitCompletion completion = {}) const {
+    CORVANE_LOCAL void submit(EventSubmitCompletion completion = {}) const {
         submit(EventSubmit::actual<E>(), now(), {.completion = std::move(completion)});
     }
     template <class E>
-    void submit(SubmitOptions options) const {
+    CORVANE_LOCAL void submit(SubmitOptions options) const {
         submit(EventSubmit::actual<E>(), now(), std::move(options));
     }
     template <class E>
-    void explicitSubmit(Date submitTime, EventSubmitCompletion completion = {}) const {
+    CORVANE_LOCAL void explicitSubmit(Date submitTime, EventSubmitCompletion completion = {}) const {
         submit(EventSubmit::actual<E>(), submitTime, {.completion = std::move(completion)});
     }
 
     template <class E>
-    void time(bool submitAndRestartWithSession = false) const {
+    CORVANE_LOCAL void time(bool submitAndRestartWithSession = false) const {
         time(EventSubmit::actual<E>(), now(), submitAndRestartWithSession);
     }
     template <class E>
-    void explicitTime(Date startTime) const {
+    CORVANE_LOCAL void explicitTime(Date startTime) const {
         time(EventSubmit::actual<E>(), startTime, false);
     }
 
     template <class D>
-    void push(D data, DataEventTraits traits = {}, std::source_location where = std::source_location::current()) const {
+    CORVANE_LOCAL void push(D data, DataEventTraits traits = {},
+                            std::source_location where = std::source_location::current()) const {
         if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
             push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
         }
     }
     template <class D>
-    void pop() const {
+    CORVANE_LOCAL void pop() const {
         pop(typeName<D>(), DataType::of<D>());
     }
 

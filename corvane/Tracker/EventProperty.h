@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Export.h>
 #include <corvane/Models/DataEvent.h>
 #include <corvane/Tracker/EventPropertyType.h>
 
@@ -17,19 +18,22 @@ inline constexpr EventPropertyRequirement optional = EventPropertyRequirement::o
 template <class D>
 class EventProperty final : public EventPropertyType {
   public:
-    static const EventProperty required;
-    static const EventProperty optional;
+    CORVANE_LOCAL static const EventProperty required;
+    CORVANE_LOCAL static const EventProperty optional;
 
-    EventProperty(EventPropertyRequirement requirement)  // NOLINT(google-explicit-constructor): declarations read so
+    CORVANE_LOCAL EventProperty(
+        EventPropertyRequirement requirement)  // NOLINT(google-explicit-constructor): declarations read so
         : requirement_(requirement) {}
 
-    [[nodiscard]] std::string_view dataKey() const override { return typeName<D>(); }
-    [[nodiscard]] bool isOptional() const override { return requirement_ == EventPropertyRequirement::optional; }
-    [[nodiscard]] EventPropertyTrait trait() const override {
+    [[nodiscard]] CORVANE_LOCAL std::string_view dataKey() const override { return typeName<D>(); }
+    [[nodiscard]] CORVANE_LOCAL bool isOptional() const override {
+        return requirement_ == EventPropertyRequirement::optional;
+    }
+    [[nodiscard]] CORVANE_LOCAL EventPropertyTrait trait() const override {
         return DataEventType<D> ? EventPropertyTrait::data : EventPropertyTrait::basic;
     }
-    [[nodiscard]] DataType dataType() const override { return DataType::of<D>(); }
-    [[nodiscard]] bool isDataType(DataType type) const override { return type == DataType::of<D>(); }
+    [[nodiscard]] CORVANE_LOCAL DataType dataType() const override { return DataType::of<D>(); }
+    [[nodiscard]] CORVANE_LOCAL bool isDataType(DataType type) const override { return type == DataType::of<D>(); }
 
     friend bool operator==(const EventProperty& a, const EventProperty& b) { return a.requirement_ == b.requirement_; }
 

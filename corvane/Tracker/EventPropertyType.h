@@ -31,6 +31,11 @@ class CORVANE_EXPORT EventPropertyType {
     [[nodiscard]] virtual DataType dataType() const = 0;
     /// Whether the declared type is `type`.
     [[nodiscard]] virtual bool isDataType(DataType type) const = 0;
+
+  protected:
+    EventPropertyType() = default;
+    EventPropertyType(const EventPropertyType&) = default;
+    EventPropertyType& operator=(const EventPropertyType&) = default;
 };
 
 }  // namespace corvane

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Export.h>
 #include <corvane/Models/Encodable.h>
 #include <corvane/Platform/TypeName.h>
 #include <corvane/Tracker/EventMirrorStore.h>
@@ -25,6 +26,7 @@ struct EventDeclaration {
     EventMirrorProperties (*properties)(const EventDeclaration& self, EventMirrorStore& store);
 };
 
+#pragma GCC visibility push(hidden)
 namespace detail {
 
 template <class D>
@@ -40,9 +42,11 @@ struct Declaration<EventProperty<D>> {
 
 struct PropertyCollector {
     template <class T>
-    void operator()(std::string_view name, const T& field) const {
+    CORVANE_LOCAL void operator()(std::string_view name, const T& field) const {
         if constexpr (std::derived_from<T, EventPropertyType>) {
-            properties.push_back({std::string(name), std::make_shared<const T>(field)});
+            // Owned under the name of its base alone: see AnyDataEvent.
+            properties.push_back({std::string(name), std::shared_ptr<const EventPropertyType>(
+                                                         static_cast<const EventPropertyType*>(new T(field)))});
         }
     }
     std::vector<EventMirrorProperty>& properties;
@@ -62,16 +66,17 @@ EventMirrorProperties propertiesOf(const EventDeclaration& self, EventMirrorStor
 }
 
 template <class E>
-inline constexpr EventDeclaration declarationOf{typeName<E>(), &propertiesOf<E>};
+CORVANE_LOCAL inline constexpr EventDeclaration declarationOf{typeName<E>(), &propertiesOf<E>};
 
 }  // namespace detail
+#pragma GCC visibility pop
 
 /// Names the event that is submitted or timed. A value of two words; copies share the declaration.
 class EventSubmit {
   public:
     /// The event type `E`.
     template <class E>
-    [[nodiscard]] static EventSubmit actual() {
+    [[nodiscard]] CORVANE_LOCAL static EventSubmit actual() {
         if constexpr (detail::check(detail::searchEvent<E>())) {
             // The declaration is a constant of the program: nothing owns it.
             return EventSubmit({std::shared_ptr<void>(), &detail::declarationOf<E>});

@@ -65,26 +65,26 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
 
     /// Submits an event. The completion, if any, is called once on the queue.
     template <class E>
-    void submit(EventSubmitCompletion completion = {}) {
+    CORVANE_LOCAL void submit(EventSubmitCompletion completion = {}) {
         submit(EventSubmit::actual<E>(), now(), {.completion = std::move(completion)});
     }
     template <class E>
-    void submit(SubmitOptions options) {
+    CORVANE_LOCAL void submit(SubmitOptions options) {
         submit(EventSubmit::actual<E>(), now(), std::move(options));
     }
     /// Submits an event of another time than now.
     template <class E>
-    void explicitSubmit(Date submitTime, EventSubmitCompletion completion = {}) {
+    CORVANE_LOCAL void explicitSubmit(Date submitTime, EventSubmitCompletion completion = {}) {
         submit(EventSubmit::actual<E>(), submitTime, {.completion = std::move(completion)});
     }
 
     /// Prepares a submission that carries the time of this call, and that the token's `commit` makes.
     template <class E>
-    [[nodiscard]] std::shared_ptr<DelayedToken> delayedSubmit(EventSubmitCompletion completion = {}) {
+    [[nodiscard]] CORVANE_LOCAL std::shared_ptr<DelayedToken> delayedSubmit(EventSubmitCompletion completion = {}) {
         return delayedSubmit(EventSubmit::actual<E>(), {.completion = std::move(completion)});
     }
     template <class E>
-    [[nodiscard]] std::shared_ptr<DelayedToken> delayedSubmit(SubmitOptions options) {
+    [[nodiscard]] CORVANE_LOCAL std::shared_ptr<DelayedToken> delayedSubmit(SubmitOptions options) {
         return delayedSubmit(EventSubmit::actual<E>(), std::move(options));
     }
 
@@ -92,12 +92,12 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     /// while one runs. With the flag, the event is also submitted when a session is about to end, and timed anew when
     /// the next one has started.
     template <class E>
-    void time(bool submitAndRestartWithSession = false) {
+    CORVANE_LOCAL void time(bool submitAndRestartWithSession = false) {
         time(EventSubmit::actual<E>(), now(), submitAndRestartWithSession);
     }
     /// Starts a timer that has run since `startTime`.
     template <class E>
-    void explicitTime(Date startTime) {
+    CORVANE_LOCAL void explicitTime(Date startTime) {
         time(EventSubmit::actual<E>(), startTime, false);
     }
 
@@ -105,14 +105,15 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     /// that event's submission. The data is kept: a declaration that refers to what is somebody else's, such as a view,
     /// or that would not be written as it reads, is refused by the compiler with the name of the field.
     template <class D>
-    void push(D data, DataEventTraits traits = {}, std::source_location where = std::source_location::current()) {
+    CORVANE_LOCAL void push(D data, DataEventTraits traits = {},
+                            std::source_location where = std::source_location::current()) {
         if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
             push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
         }
     }
     /// Takes the newest data of a type that was pushed on this very tracker out of scope; nothing if there is none.
     template <class D>
-    void pop() {
+    CORVANE_LOCAL void pop() {
         pop(typeName<D>(), DataType::of<D>());
     }
 

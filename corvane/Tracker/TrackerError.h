@@ -27,6 +27,8 @@ class CORVANE_EXPORT TrackerError : public Error {
     /// `eventMissingData` with every missing property, in declaration order.
     [[nodiscard]] static TrackerError missing(std::vector<MissingData> missingData);
     [[nodiscard]] static TrackerError withoutSession();
+    TrackerError(const TrackerError&) = default;
+    TrackerError& operator=(const TrackerError&) = default;
     ~TrackerError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -13,6 +13,8 @@ class CORVANE_EXPORT ExternalAnalyticsUploaderError : public Error {
         invalidResponse = 0,  ///< there was no answer, or it was not HTTP, and no error either
     };
     explicit ExternalAnalyticsUploaderError(Code code);
+    ExternalAnalyticsUploaderError(const ExternalAnalyticsUploaderError&) = default;
+    ExternalAnalyticsUploaderError& operator=(const ExternalAnalyticsUploaderError&) = default;
     ~ExternalAnalyticsUploaderError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -20,6 +20,11 @@ class CORVANE_EXPORT ExternalAnalyticsUploaderType {
     /// Asks for `url` with a GET request and reports the head of the answer, whatever its status: look at the status
     /// code. Callable from any thread; never calls back inside the call. An empty completion is allowed.
     virtual void submitExternalAnalytics(std::string url, Completion completion) = 0;
+
+  protected:
+    ExternalAnalyticsUploaderType() = default;
+    ExternalAnalyticsUploaderType(const ExternalAnalyticsUploaderType&) = default;
+    ExternalAnalyticsUploaderType& operator=(const ExternalAnalyticsUploaderType&) = default;
 };
 
 }  // namespace corvane

@@ -15,6 +15,8 @@ class CORVANE_EXPORT GZIPError : public Error {
     };
     /// @param status the status code that zlib returned.
     GZIPError(Code code, std::int32_t status);
+    GZIPError(const GZIPError&) = default;
+    GZIPError& operator=(const GZIPError&) = default;
     ~GZIPError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -13,6 +13,8 @@ namespace corvane {
 class CORVANE_EXPORT OstrelSigner final : public SignerType {
   public:
     OstrelSigner();
+    OstrelSigner(const OstrelSigner&) = default;
+    OstrelSigner& operator=(const OstrelSigner&) = default;
     ~OstrelSigner() override;
 
     /// Throws what the signing service throws, after a line in the log.

@@ -22,6 +22,11 @@ class CORVANE_EXPORT ResourceType {
     [[nodiscard]] virtual std::string identifier() const = 0;
     /// The document, a JSON object. May throw; the upload is then refused with the error.
     [[nodiscard]] virtual JSON jsonObject() const = 0;
+
+  protected:
+    ResourceType() = default;
+    ResourceType(const ResourceType&) = default;
+    ResourceType& operator=(const ResourceType&) = default;
 };
 
 }  // namespace corvane

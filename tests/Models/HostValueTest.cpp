@@ -1,5 +1,6 @@
 #include <corvane/Models/BridgedDataEvent.h>
 #include <corvane/Models/BridgedDataType.h>
+#include <corvane/Models/Decoding.h>
 #include <corvane/Models/toJsonValue.h>
 
 #include <gtest/gtest.h>

@@ -10,6 +10,7 @@ namespace corvane {
 class CORVANE_EXPORT BridgedEventMirrorProperty final : public EventPropertyType {
   public:
     explicit BridgedEventMirrorProperty(BridgedEventProperty bridgedEventProperty);
+    BridgedEventMirrorProperty(const BridgedEventMirrorProperty&) = default;
     ~BridgedEventMirrorProperty() override;
 
     [[nodiscard]] std::string_view dataKey() const override;

@@ -13,6 +13,7 @@ namespace corvane {
 class CORVANE_EXPORT BridgedRawDataEvent final : public BridgedDataEventType {
   public:
     BridgedRawDataEvent(std::string name, HostValue::Dictionary dictionary);
+    BridgedRawDataEvent(const BridgedRawDataEvent&) = default;
     ~BridgedRawDataEvent() override;
 
     [[nodiscard]] const std::string& name() const { return name_; }

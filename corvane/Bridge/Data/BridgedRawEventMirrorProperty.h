@@ -11,6 +11,7 @@ namespace corvane {
 class CORVANE_EXPORT BridgedRawEventMirrorProperty final : public EventPropertyType {
   public:
     explicit BridgedRawEventMirrorProperty(BridgedRawEventProperty rawEventProperty);
+    BridgedRawEventMirrorProperty(const BridgedRawEventMirrorProperty&) = default;
     ~BridgedRawEventMirrorProperty() override;
 
     [[nodiscard]] std::string_view dataKey() const override;

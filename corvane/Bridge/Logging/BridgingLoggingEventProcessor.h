@@ -22,6 +22,7 @@ class CORVANE_EXPORT BridgingLoggingEventProcessor final : public BridgedEventPr
     explicit BridgingLoggingEventProcessor(
         BridgedLoggingEventProcessorFormat format = BridgedLoggingEventProcessorFormat::default_,
         Formatter formatter = {});
+    BridgingLoggingEventProcessor(const BridgingLoggingEventProcessor&) = default;
     ~BridgingLoggingEventProcessor() override;
 
     void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override;

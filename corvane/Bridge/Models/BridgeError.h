@@ -20,6 +20,8 @@ class CORVANE_EXPORT BridgeError : public Error {
     };
     /// @param what which argument, for the message: "the event's name"
     BridgeError(Code code, std::string what);
+    BridgeError(const BridgeError&) = default;
+    BridgeError& operator=(const BridgeError&) = default;
     ~BridgeError() override;
 
     [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }

@@ -15,6 +15,7 @@ namespace corvane {
 class CORVANE_EXPORT BridgedEventData final : public BridgedDataEventType {
   public:
     explicit BridgedEventData(EventData eventData);
+    BridgedEventData(const BridgedEventData&) = default;
     ~BridgedEventData() override;
 
     /// The class, named "EventData".

@@ -16,6 +16,7 @@ namespace corvane {
 class CORVANE_EXPORT BridgedTimedData final : public BridgedDataEventType {
   public:
     explicit BridgedTimedData(TimedData timedData);
+    BridgedTimedData(const BridgedTimedData&) = default;
     ~BridgedTimedData() override;
 
     /// The class, named "TimedData".

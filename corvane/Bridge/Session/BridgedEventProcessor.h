@@ -15,6 +15,7 @@ class CORVANE_EXPORT BridgedEventProcessor final : public EventProcessorType {
   public:
     /// Throws `BridgeError::missingObject` without a processor.
     explicit BridgedEventProcessor(std::shared_ptr<BridgedEventProcessorType> eventProcessor);
+    BridgedEventProcessor(const BridgedEventProcessor&) = default;
     ~BridgedEventProcessor() override;
 
     void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override;

@@ -42,6 +42,11 @@ class CORVANE_EXPORT BridgedEventProcessorType {
     /// overridden, it returns false.
     virtual bool resumeBackgroundProcessingForIdentifier(const std::string& identifier,
                                                          const std::function<void()>& completion);
+
+  protected:
+    BridgedEventProcessorType() = default;
+    BridgedEventProcessorType(const BridgedEventProcessorType&) = default;
+    BridgedEventProcessorType& operator=(const BridgedEventProcessorType&) = default;
 };
 
 }  // namespace corvane

@@ -17,6 +17,7 @@ class CORVANE_EXPORT BridgedUploadBatchEventProcessor final : public BridgedEven
     /// members of the host's own `endpoint` throw.
     BridgedUploadBatchEventProcessor(Client client, const EndpointType& endpoint,
                                      const UploadBatchEventConfig& config = UploadBatchEventConfig::default_());
+    BridgedUploadBatchEventProcessor(const BridgedUploadBatchEventProcessor&) = default;
     ~BridgedUploadBatchEventProcessor() override;
 
     /// The library's own processor: what `waitForDelivery` is called on before a program exits.
