@@ -6,6 +6,7 @@
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/PrivateFile.h>
+#include <corvane/Platform/TransferError.h>
 #include <corvane/Platform/TransferSubmission.h>
 
 #include <algorithm>
@@ -24,12 +25,19 @@ std::vector<std::string> wakeCommand(const TransferSessionConfiguration& configu
     return configuration.relaunchesForEvents ? options.wakeCommand : std::vector<std::string>();
 }
 
+TransferOutcome takenBack() {
+    TransferOutcome made;
+    made.errorCode = static_cast<std::int64_t>(TransferError::Code::network);
+    made.errorText = "another process has taken the transfer over";
+    return made;
+}
+
 }  // namespace
 
 BackgroundTransferCore::BackgroundTransferCore(TransferSessionConfiguration configuration,
                                                std::weak_ptr<TransferSessionDelegate> delegate,
                                                std::shared_ptr<SerialQueue> queue, TransferAgentOptions options)
-    : configuration_(std::move(configuration)),
+    : configuration_(InProcessTransferSession::resolved(std::move(configuration))),
       delegate_(std::move(delegate)),
       queue_(std::move(queue)),
       options_(std::move(options)) {}
@@ -51,6 +59,8 @@ void BackgroundTransferCore::open() {
 }
 
 std::shared_ptr<AgentLink> BackgroundTransferCore::makeLink(const std::filesystem::path& program) {
+    TransferSubmission::checkNames(configuration_.identifier, configuration_.ownerKey,
+                                   wakeCommand(configuration_, options_));
     directory_.emplace(options_.directory.empty() ? DocumentsDirectory::create() / folder : options_.directory);
     return std::make_shared<AgentLink>(*directory_, program, options_,
                                        agent::Hello{.session = configuration_.identifier,
@@ -76,10 +86,14 @@ void BackgroundTransferCore::close() {
 // An agent that is killed before it reads an acknowledgement finds the mark, so that the next session is not told
 // again.
 void BackgroundTransferCore::leave() {
+    processEnds();
+    link_->close();
+}
+
+void BackgroundTransferCore::processEnds() {
     for (const auto& token : reported_) {
         if (acknowledged().contains(token)) directory_->withdraw(token);
     }
-    link_->close();
 }
 
 std::optional<std::string> BackgroundTransferCore::description() const {
@@ -135,7 +149,9 @@ std::string BackgroundTransferCore::submission(const Task& task) const {
                               .file = task.file().string(),
                               .limits = configuration_.limits,
                               .patience = options_.patience,
-                              .wakeCommand = wakeCommand(configuration_, options_)}
+                              .wakeCommand = wakeCommand(configuration_, options_),
+                              .trustedCertificates = configuration_.trustedCertificates.string(),
+                              .proxy = TransferProxy::ofEnvironment(task.request().url)}
         .encoded();
 }
 
@@ -193,6 +209,10 @@ void BackgroundTransferCore::takeBack(const std::shared_ptr<Task>& task, const c
 }
 
 void BackgroundTransferCore::describe(std::string token, std::string description) {
+    if (description.size() > TransferSubmission::longestDescription) {
+        Log::shared().error("Description is too long for the transfer agent, which keeps the one before");
+        return;
+    }
     AgentThread::shared().post(
         [self = shared_from_this(), token = std::move(token), description = std::move(description)] {
             self->link_->send(agent::Describe{token, description}, 0);
@@ -288,10 +308,7 @@ void BackgroundTransferCore::missed(const std::vector<AgentLink::Task>& listed) 
         const bool isMissing = task->isKeptBy(Keeper::agent) && task->isAccepted() && !known.contains(task->token()) &&
                                !isReported(task->token());
         if (isMissing && task->isOfThisRun()) takeBack(task, "the agent has lost it");
-        if (isMissing && !task->isOfThisRun()) {
-            task->setCompleted();
-            remove(*task);
-        }
+        if (isMissing && !task->isOfThisRun()) endElsewhere(task, takenBack());
     }
 }
 
@@ -327,8 +344,26 @@ void BackgroundTransferCore::agentCompleted(const AgentLink::Task& completed, co
     if (!task) task = adopt(completed);
     if (!task || task->isKeptBy(Keeper::process)) return acknowledge(completed.token);  // reported by the process
     queue_->async([self = shared_from_this(), task = std::move(task), outcome] {
-        if (!self->finish(*task, outcome.error(), outcome.response)) return;  // it stays for the next session
+        // One that nobody was told of stays for the next session.
+        if (!self->finish(*task, &TransferSessionDelegate::taskDidComplete, outcome.error(), outcome.response)) return;
         AgentThread::shared().post([self, token = task->token()] { self->acknowledge(token); });
+    });
+}
+
+// The row and the payload are the business of the process that reported it; whoever waits here is to wait no longer.
+void BackgroundTransferCore::agentEndedElsewhere(const AgentLink::Task& ended,
+                                                 const std::optional<TransferOutcome>& outcome) {
+    if (isReported(ended.token)) return;
+    auto task = find(ended.token);
+    if (!task) task = adopt(ended);
+    if (task && task->isKeptBy(Keeper::agent)) endElsewhere(std::move(task), outcome.value_or(takenBack()));
+}
+
+void BackgroundTransferCore::endElsewhere(std::shared_ptr<Task> task, const TransferOutcome& outcome) {
+    queue_->async([self = shared_from_this(), task = std::move(task), outcome] {
+        if (task->state() == TransferTask::State::completed) return;
+        self->finish(*task, &TransferSessionDelegate::taskDidEndElsewhere, outcome.error(), outcome.response);
+        AgentThread::shared().post([self] { self->watch(); });
     });
 }
 
@@ -388,13 +423,13 @@ void BackgroundTransferCore::taskDidComplete(const TransferTask& inner, const st
                                              const std::optional<TransferResponse>& response) {
     const auto task = tookOver(inner);
     if (!task) return;
-    finish(*task, error, response);
+    finish(*task, &TransferSessionDelegate::taskDidComplete, error, response);
     std::lock_guard lock(mutex_);
     takenOver_.erase(inner.identifier());
 }
 
 // On the queue. Returns whether the delegate was told.
-bool BackgroundTransferCore::finish(Task& task, const std::optional<AnyError>& error,
+bool BackgroundTransferCore::finish(Task& task, Ending ending, const std::optional<AnyError>& error,
                                     const std::optional<TransferResponse>& response) {
     const auto told = listener();
     if (!told) return false;
@@ -406,7 +441,7 @@ bool BackgroundTransferCore::finish(Task& task, const std::optional<AnyError>& e
         Task& task;
         BackgroundTransferCore& core;
     } completed{task, *this};
-    callHost("transfer session delegate", [&] { told->taskDidComplete(task, error, response); });
+    callHost("transfer session delegate", [&] { (*told.*ending)(task, error, response); });
     return true;
 }
 

@@ -57,8 +57,10 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     void agentProgressed(const std::string& token, std::int64_t total, std::int64_t expected) override;
     void agentCompleted(const AgentLink::Task& task, const TransferOutcome& outcome) override;
     void agentForgot(const std::string& token) override;
+    void agentEndedElsewhere(const AgentLink::Task& task, const std::optional<TransferOutcome>& outcome) override;
     void agentFlushed() override;
     void agentFailed() override;
+    void processEnds() override;
 
     // What the session inside the process says of the tasks that it took over.
     void taskDidSendBodyData(const TransferTask& inner, std::int64_t sent, std::int64_t total,
@@ -90,7 +92,11 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     void signal();
     void acknowledge(const std::string& token);
     void watch();
-    bool finish(Task& task, const std::optional<AnyError>& error, const std::optional<TransferResponse>& response);
+    void endElsewhere(std::shared_ptr<Task> task, const TransferOutcome& outcome);
+    using Ending = void (TransferSessionDelegate::*)(const TransferTask&, const std::optional<AnyError>&,
+                                                     const std::optional<TransferResponse>&);
+    bool finish(Task& task, Ending ending, const std::optional<AnyError>& error,
+                const std::optional<TransferResponse>& response);
 
     [[nodiscard]] Tasks openTasks() const;
     [[nodiscard]] std::shared_ptr<Task> find(const std::string& token) const;

@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/HTTPTransfer.h>
+#include <corvane/Platform/TransferError.h>
 
 #include <algorithm>
 #include <chrono>
@@ -54,9 +55,14 @@ class CurlTransfer {
         void operator()(void* list) const noexcept;
     };
     void openBody(const std::filesystem::path& file, bool mustBeOwn);
-    [[nodiscard]] bool isConnected() const;
+    void setTrust(const std::filesystem::path& certificates);
+    void setProxy(const TransferProxy& proxy, const std::string& host);
+    [[nodiscard]] bool hasBegun() const;
+    [[nodiscard]] TransferError failure(int curlCode) const;
+    [[nodiscard]] bool isProxyRefusal() const;
     void setHeaders(const TransferRequest& request);
     void setOptions(const HTTPTransfer& transfer);
+    void reportSent(std::int64_t sent) const noexcept;
     void takeHeader(std::string_view line);
 
     static std::size_t readBody(char* buffer, std::size_t size, std::size_t count, void* self) noexcept;
@@ -67,6 +73,7 @@ class CurlTransfer {
     // Constant after construction.
     const TransferLimits limits_;
     const std::function<void(std::int64_t, std::int64_t)> didSend_;
+    std::string proxy_;  // empty when there is none
     Descriptor body_;
     std::int64_t bodySize_ = 0;
     std::unique_ptr<void, HeaderListDeleter> headerList_;

@@ -15,6 +15,7 @@ SignerType::~SignerType() = default;
 UploadDropboxType::~UploadDropboxType() = default;
 UploadManagerType::~UploadManagerType() = default;
 UploadServiceDelegate::~UploadServiceDelegate() = default;
+void UploadServiceDelegate::uploadEndedElsewhere(const UploadResult&) {}
 UploadServiceType::~UploadServiceType() = default;
 
 }  // namespace corvane

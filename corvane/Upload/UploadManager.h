@@ -58,6 +58,8 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
 
     /// Deletes row and file of an upload that is over, or counts a retry.
     void uploadService(UploadServiceType& service, const UploadResult& result) override;
+    /// Strikes the upload out of the ledger; its row and its file are the other process's.
+    void uploadEndedElsewhere(const UploadResult& result) override;
 
   private:
     UploadManager(std::shared_ptr<UploadServiceType> service,
@@ -76,6 +78,7 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
     void didFailForNow(const UploadResult::Retry& retry);
     /// Counts a retry in the row. Returns false when there is no row.
     bool markRetry(const UploadResult::Retry& retry);
+    [[nodiscard]] bool hasRow(const std::string& identifier);
 
     void insertRow(const SignedEntity& entity);
     void deleteRow(const std::string& identifier);

@@ -201,13 +201,19 @@ void UploadService::taskDidSendBodyData(const TransferTask& task, std::int64_t s
 void UploadService::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                                     const std::optional<TransferResponse>& response) {
     const UploadResult ending = result(task, error, response);
-    std::shared_ptr<UploadServiceDelegate> delegate;
-    {
-        std::lock_guard lock(mutex_);
-        delegate = delegate_.lock();
-        if (pendingListings_ > 0) endedMeanwhile_.insert(task.description().value_or(unknown));
-    }
-    if (delegate) delegate->uploadService(*this, ending);
+    if (const auto delegate = noteEnd(task)) delegate->uploadService(*this, ending);
+}
+
+void UploadService::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
+                                        const std::optional<TransferResponse>& response) {
+    const UploadResult ending = result(task, error, response);
+    if (const auto delegate = noteEnd(task)) delegate->uploadEndedElsewhere(ending);
+}
+
+std::shared_ptr<UploadServiceDelegate> UploadService::noteEnd(const TransferTask& task) {
+    std::lock_guard lock(mutex_);
+    if (pendingListings_ > 0) endedMeanwhile_.insert(task.description().value_or(unknown));
+    return delegate_.lock();
 }
 
 UploadResult UploadService::result(const TransferTask& task, const std::optional<AnyError>& error,

@@ -103,7 +103,8 @@ class InProcessTransferSessionTest : public testing::Test {
     }
     static std::string describe(const Recorder::Completion& completion) {
         if (const auto* error = completion.error ? completion.error->as<TransferError>() : nullptr) {
-            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut", "network", "unreachable"};
+            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut",
+                                             "network",        "unreachable",     "blocked"};
             return names[error->code()];
         }
         if (completion.error) return completion.error->what();

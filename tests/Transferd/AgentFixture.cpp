@@ -13,7 +13,8 @@ namespace {
 
 std::string describe(const std::optional<AnyError>& error, const std::optional<TransferResponse>& response) {
     if (!error) return response ? std::to_string(response->statusCode) : "nothing";
-    constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut", "network", "unreachable"};
+    constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut",
+                                     "network",        "unreachable",     "blocked"};
     const auto* known = error->as<TransferError>();
     return known ? names[known->code()] : error->what();
 }
