@@ -353,9 +353,9 @@ void BackgroundTransferCore::agentCompleted(const AgentLink::Task& completed, co
 // The row and the payload are the business of the process that reported it; whoever waits here is to wait no longer.
 void BackgroundTransferCore::agentEndedElsewhere(const AgentLink::Task& ended,
                                                  const std::optional<TransferOutcome>& outcome) {
-    if (isReported(ended.token)) return;
+    if (reported_.contains(ended.token)) return;
     auto task = find(ended.token);
-    if (!task) task = adopt(ended);
+    if (!task && !acknowledged().contains(ended.token)) task = adopt(ended);
     if (task && task->isKeptBy(Keeper::agent)) endElsewhere(std::move(task), outcome.value_or(takenBack()));
 }
 

@@ -3,6 +3,7 @@
 #include <corvane/Platform/TransferError.h>
 
 #include "tests/support/ScriptedServer.h"
+#include "tests/support/TLSServer.h"
 #include "tests/support/TemporaryDocuments.h"
 
 #include <gtest/gtest.h>
@@ -225,6 +226,86 @@ TEST_F(InProcessTransferSessionTest, FailsTheTaskAndNotTheCallWhenItCannotBeSent
         EXPECT_EQ(describe(recorder->wait(*task)), one.expected) << one.url << ' ' << one.file;
     }
     EXPECT_TRUE(server.requests().empty());
+}
+
+// A variable of the environment while it lives.
+class Variable {
+  public:
+    Variable(const char* name, const std::string& value) : name_(name) { setenv(name, value.c_str(), 1); }
+    Variable(const Variable&) = delete;
+    Variable& operator=(const Variable&) = delete;
+    ~Variable() { unsetenv(name_); }
+
+  private:
+    const char* name_;
+};
+
+TEST_F(InProcessTransferSessionTest, TellsWhetherAServerCannotBeReachedOrTheWayToItIsBlocked) {
+    const std::string proxy = "http://user:secret@" + server.url("").substr(7);
+    const std::string closed = "http://127.0.0.1:1";
+    const auto refusal = Reply::status(407, {{"Proxy-Authenticate", "Basic realm=x"}});
+    constexpr const char* plain = "http://collector.test/in";
+    constexpr const char* tunnel = "https://collector.test/in";
+    const struct {
+        const char* name;
+        std::string proxy;
+        std::string url;
+        Reply reply;
+        const char* expected;
+    } cases[] = {
+        {"through a proxy", proxy, plain, Reply::status(200), "200"},
+        {"no proxy there", closed, plain, {}, "unreachable"},
+        {"no name of the proxy", "http://nowhere.invalid:1", plain, {}, "unreachable"},
+        {"no proxy that can be used", "what://user:secret@x", plain, {}, "unreachable"},
+        {"who asks?", proxy, plain, refusal, "blocked"},
+        {"the proxy's trouble looks like the server's", proxy, plain, Reply::status(502), "502"},
+        {"who asks for a tunnel?", proxy, tunnel, refusal, "blocked"},
+        {"no tunnel", proxy, tunnel, Reply::status(502), "blocked"},
+        {"a proxy that hangs up", proxy, tunnel, Reply::raw(""), "blocked"},
+        {"a proxy that says nothing", proxy, tunnel, Reply::never(), "unreachable"},
+        {"no TLS at the other end", proxy, tunnel, Reply::raw("HTTP/1.1 200 OK\r\n\r\nhello"), "blocked"},
+    };
+    auto session = open({.timeWithoutProgress = 300ms});
+    for (const auto& one : cases) {
+        const Variable http("http_proxy", one.proxy), https("HTTPS_PROXY", one.proxy), none("no_proxy", "elsewhere");
+        if (one.expected != std::string("unreachable") || one.proxy == proxy) server.script(one.reply);
+        const auto completion = recorder->wait(*start(*session, one.url));
+        EXPECT_EQ(describe(completion), one.expected) << one.name;
+        const std::string text = completion.error ? completion.error->what() : "";
+        EXPECT_EQ(text.find("secret"), std::string::npos) << text;
+    }
+    EXPECT_EQ(server.requests().at(0).path, plain);
+    const Variable http("http_proxy", proxy), except("no_proxy", "collector.test");
+    EXPECT_EQ(describe(recorder->wait(*start(*session, "http://collector.test:1/"))), "unreachable");
+
+    // A stall on a connection that was there already: the body has gone out, so the attempt counts.
+    EXPECT_EQ(describe(recorder->wait(*start(*session, server.url()))), "200");
+    server.script(Reply::never());
+    EXPECT_EQ(describe(recorder->wait(*start(*session, server.url()))), "timedOut");
+}
+
+TEST_F(InProcessTransferSessionTest, TrustsTheAuthoritiesThatItIsGiven) {
+    const test::TLSServer trusted, other;
+    const auto authorities = documents / "authorities";
+    test::writeFile(authorities, trusted.certificate());
+    const auto outcome = [&](const std::filesystem::path& certificates, const test::TLSServer& of) {
+        const auto told = std::make_shared<Recorder>();
+        InProcessTransferSession session({.identifier = "test", .trustedCertificates = certificates}, told, queue);
+        return describe(told->wait(*start(session, of.url())));
+    };
+    EXPECT_EQ(outcome(authorities, trusted), "200");
+    EXPECT_EQ(outcome({}, trusted), "blocked") << "not on another's connection";
+    EXPECT_EQ(outcome(std::filesystem::relative(authorities), trusted), "200");
+    EXPECT_EQ(outcome(authorities, other), "blocked") << "in place of any others";
+    EXPECT_EQ(outcome(documents / "missing", trusted), "blocked");
+    EXPECT_EQ(trusted.requests(), 2);
+    EXPECT_EQ(other.requests(), 0);
+
+    const auto directory = documents / "directory";
+    std::filesystem::create_directory(directory);
+    test::writeFile(directory / "one.pem", trusted.certificate());
+    ASSERT_EQ(std::system(("openssl rehash '" + directory.string() + "'").c_str()), 0);
+    EXPECT_EQ(outcome(directory, trusted), "200");
 }
 
 TEST_F(InProcessTransferSessionTest, ABodyFileThatChangesItsSizeMeanwhileNeitherHangsNorLies) {
