@@ -1,22 +1,29 @@
 #include <corvane/Platform/InProcessTransferSession.h>
 
+#include <corvane/Platform/BackgroundTransferSession.h>
 #include <corvane/Platform/TransferError.h>
 
 #include "tests/support/ScriptedServer.h"
 #include "tests/support/TLSServer.h"
 #include "tests/support/TemporaryDocuments.h"
 
+#include <dlfcn.h>
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <chrono>
 #include <condition_variable>
 #include <cstdlib>
+#include <functional>
 #include <future>
 #include <map>
 #include <mutex>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace corvane {
@@ -437,5 +444,73 @@ TEST_F(InProcessTransferSessionDeathTest, TheProcessExitsWithTransfersPending) {
         testing::ExitedWithCode(0), "");
 }
 
+TEST_F(InProcessTransferSessionDeathTest, AProcessWithoutDescriptorsFailsItsTransfersAndRecovers) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            std::vector<int> taken;
+            for (int one = 0; (one = dup(STDIN_FILENO)) >= 0;) taken.push_back(one);
+            auto session = open();
+            const bool failed = recorder->wait(*start(*session, server.url())).error.has_value();
+            for (const int one : taken) close(one);
+            const auto after = describe(recorder->wait(*start(*session, server.url())));
+            std::filesystem::remove_all(documents.path());
+            std::exit(failed && after == "200" ? 0 : 1);
+        },
+        testing::ExitedWithCode(0), "");
+}
+
+std::atomic<int> registration = 0;  // 1: the next one waits, 2: it does, 3: it may go on
+
+// A child is forked off by one thread while another one makes a thread of the library, and is inside the registration
+// of its exit handler. Ends with whether the child could exit.
+[[noreturn]] void forkInside(const std::function<void()>& make, const test::TemporaryDocuments& documents) {
+    registration = 1;
+    std::thread maker(make);
+    while (registration != 2) std::this_thread::yield();
+    const pid_t child = fork();
+    if (child == 0) std::exit(0);
+    registration = 3;
+    maker.join();
+    int status = 1;
+    const auto deadline = std::chrono::steady_clock::now() + 10s;
+    while (waitpid(child, &status, WNOHANG) == 0) {
+        if (std::chrono::steady_clock::now() > deadline) kill(child, SIGKILL);
+        std::this_thread::yield();
+    }
+    std::filesystem::remove_all(documents.path());
+    std::_Exit(status == 0 ? 0 : 1);
+}
+
+TEST_F(InProcessTransferSessionDeathTest, AChildThatIsForkedOffWhileAThreadIsMadeCanExit) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            auto session = open();
+            forkInside([&] { start(*session, server.url()); }, documents);
+        },
+        testing::ExitedWithCode(0), "");
+    EXPECT_EXIT(forkInside(
+                    [&] {
+                        TransferAgentOptions options;
+                        options.program = "/bin/false";
+                        BackgroundTransferSession({.identifier = "test"}, recorder, queue, options);
+                    },
+                    documents),
+                testing::ExitedWithCode(0), "");
+}
+
 }  // namespace
 }  // namespace corvane
+
+// Stands in for the system's own, which it calls, in this program.
+extern "C" int __cxa_atexit(void (*function)(void*), void* argument, void* object) noexcept {
+    using Function = int (*)(void (*)(void*), void*, void*);
+    static const auto next = reinterpret_cast<Function>(dlsym(RTLD_NEXT, "__cxa_atexit"));
+    const int result = next(function, argument, object);
+    int armed = 1;
+    if (corvane::registration.compare_exchange_strong(armed, 2)) {
+        while (corvane::registration != 3) std::this_thread::yield();
+    }
+    return result;
+}
