@@ -33,6 +33,12 @@ std::string part(CURLU* url, CURLUPart which) {
     return text;
 }
 
+std::string lowerCase(std::string text) {
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+    return text;
+}
+
 // For messages: a user and a password are nobody's business.
 std::string withoutUser(const std::string& url) {
     const auto slashes = url.find("//");
@@ -51,8 +57,7 @@ URLParts parse(const std::string& text) {
     if (parts.scheme != "http" && parts.scheme != "https") {
         throw TransferError(Code::invalidRequest, "the URL is neither http nor https: " + withoutUser(text));
     }
-    std::transform(parts.host.begin(), parts.host.end(), parts.host.begin(),
-                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+    parts.host = lowerCase(std::move(parts.host));
     return parts;
 }
 
@@ -65,10 +70,6 @@ bool isToken(std::string_view text) {
         return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
                std::string_view("!#$%&'*+-.^_`|~").find(c) != std::string_view::npos;
     });
-}
-
-bool equalIgnoringCase(std::string_view a, std::string_view b) {
-    return curl_strnequal(a.data(), b.data(), std::min(a.size(), b.size())) && a.size() == b.size();
 }
 
 std::string_view trimmed(std::string_view text) {
@@ -276,8 +277,7 @@ bool CurlTransfer::hasBegun() const {
 bool CurlTransfer::isProxyRefusal() const {
     constexpr int authenticationRequired = 407;
     return !proxy_.empty() && headComplete_ && answer_.statusCode == authenticationRequired &&
-           std::any_of(answer_.headers.begin(), answer_.headers.end(),
-                       [](const auto& header) { return equalIgnoringCase(header.first, "Proxy-Authenticate"); });
+           spellings_.contains("proxy-authenticate");
 }
 
 std::optional<AnyError> CurlTransfer::timeoutError() const {
@@ -299,6 +299,7 @@ std::optional<TransferResponse> CurlTransfer::response() const {
 void CurlTransfer::takeHeader(std::string_view line) {
     if (line.starts_with("HTTP/")) {  // also after an interim answer
         answer_ = {};
+        spellings_.clear();
         headComplete_ = false;
     } else if (headComplete_) {
         return;  // a trailer
@@ -308,15 +309,13 @@ void CurlTransfer::takeHeader(std::string_view line) {
         answer_.statusCode = status;
         headComplete_ = status >= 200;
     } else if (const auto colon = line.find(':'); colon != std::string_view::npos) {
-        const auto name = line.substr(0, colon);
+        const std::string name(line.substr(0, colon));
         const auto value = trimmed(line.substr(colon + 1));
-        const auto known = std::find_if(answer_.headers.begin(), answer_.headers.end(),
-                                        [&](const auto& header) { return equalIgnoringCase(header.first, name); });
-        if (known == answer_.headers.end()) {
-            answer_.headers.emplace(name, value);
-        } else {
-            known->second.append(", ").append(value);
-        }
+        // Looked up, and not searched for: a head of many fields must not keep the thread from everything else.
+        const auto [known, isNew] = spellings_.try_emplace(lowerCase(name), name);
+        std::string& values = answer_.headers[known->second];
+        if (!isNew) values.append(", ");
+        values.append(value);
     }
 }
 

@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <functional>
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
@@ -85,6 +86,7 @@ class CurlTransfer {
     Clock::time_point answerDeadline_ = Clock::time_point::max();
     std::string bodyProblem_;
     TransferResponse answer_;
+    std::map<std::string, std::string> spellings_;  // of its header fields' names, by their lower case
     std::size_t headerBytes_ = 0;
     std::size_t answerBytes_ = 0;
     bool headComplete_ = false;

@@ -2,7 +2,10 @@
 
 #include <corvane/Platform/TransferError.h>
 
+#include <arpa/inet.h>
 #include <signal.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 #include <future>
 #include <thread>
@@ -52,6 +55,14 @@ void SessionRecorder::taskDidComplete(const TransferTask& task, const std::optio
     changed_.notify_all();
 }
 
+void SessionRecorder::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
+                                          const std::optional<TransferResponse>& response) {
+    std::lock_guard lock(mutex_);
+    elsewhere_[task.description().value_or("none")] += describe(error, response);
+    ++completed_;
+    changed_.notify_all();
+}
+
 void SessionRecorder::allEventsDelivered() {
     std::lock_guard lock(mutex_);
     EXPECT_FALSE(completedAtSignal_);
@@ -74,6 +85,11 @@ std::map<std::string, std::string> SessionRecorder::outcomes() const {
     return outcomes_;
 }
 
+std::map<std::string, std::string> SessionRecorder::elsewhere() const {
+    std::lock_guard lock(mutex_);
+    return elsewhere_;
+}
+
 std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
     std::lock_guard lock(mutex_);
     return completedAtSignal_;
@@ -82,6 +98,35 @@ std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
 std::int64_t SessionRecorder::bytesSent() const {
     std::lock_guard lock(mutex_);
     return sent_;
+}
+
+LatePort::LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t size = sizeof address;
+    EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address), size), 0);
+    getsockname(socket_, reinterpret_cast<sockaddr*>(&address), &size);
+    port_ = ntohs(address.sin_port);
+}
+
+LatePort::~LatePort() {
+    close(socket_);
+}
+
+std::string LatePort::url() const {
+    return "http://127.0.0.1:" + std::to_string(port_);
+}
+
+void LatePort::answerOne() const {
+    listen(socket_, 8);
+    const int connection = accept(socket_, nullptr, nullptr);
+    char buffer[4096];
+    EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
+    const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
+    send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
+    recv(connection, buffer, sizeof buffer, 0);
+    close(connection);
 }
 
 AgentFixture::AgentFixture() {
@@ -97,8 +142,12 @@ AgentFixture::~AgentFixture() {
 
 std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
                                                     const std::string& owner) {
-    const TransferSessionConfiguration configuration{
-        .identifier = "session", .ownerKey = owner, .relaunchesForEvents = true};
+    return open(to, TransferSessionConfiguration{.identifier = "session", .ownerKey = owner});
+}
+
+std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
+                                                    TransferSessionConfiguration configuration) {
+    configuration.relaunchesForEvents = true;
     return std::make_shared<BackgroundTransferSession>(configuration, to, nullptr, options);
 }
 

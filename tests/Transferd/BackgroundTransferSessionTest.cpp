@@ -1,8 +1,6 @@
 #include "tests/Transferd/AgentFixture.h"
 
-#include <arpa/inet.h>
 #include <signal.h>
-#include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -97,34 +95,6 @@ TEST_F(BackgroundTransferSessionTest, RefusesBodiesThatAreNoFilesOfTheUser) {
     EXPECT_TRUE(server.requests().empty());
 }
 
-// A port of the loopback address at which nobody listens until it is told to.
-class LatePort {
-  public:
-    LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-        address_.sin_family = AF_INET;
-        address_.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        socklen_t size = sizeof address_;
-        EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address_), size), 0);
-        getsockname(socket_, reinterpret_cast<sockaddr*>(&address_), &size);
-    }
-    ~LatePort() { close(socket_); }
-    [[nodiscard]] std::string url() const { return "http://127.0.0.1:" + std::to_string(ntohs(address_.sin_port)); }
-    void answerOne() const {
-        listen(socket_, 8);
-        const int connection = accept(socket_, nullptr, nullptr);
-        char buffer[4096];
-        EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
-        const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
-        send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
-        recv(connection, buffer, sizeof buffer, 0);
-        close(connection);
-    }
-
-  private:
-    int socket_;
-    sockaddr_in address_{};
-};
-
 TEST_F(BackgroundTransferSessionTest, WaitsForAServerThatIsNotThereYetUntilItsPatienceIsOver) {
     LatePort late;
     const LatePort never;
@@ -137,9 +107,13 @@ TEST_F(BackgroundTransferSessionTest, WaitsForAServerThatIsNotThereYetUntilItsPa
     ASSERT_TRUE(other->wait(3));
     EXPECT_EQ(other->outcomes(), (Outcomes{{"a", "unreachable"}, {"b", "unreachable"}, {"c", "unreachable"}}));
     EXPECT_EQ(running(*session), std::vector<std::string>{"late"});
+    auto second = open(std::make_shared<SessionRecorder>());
+    EXPECT_EQ(running(*second), std::vector<std::string>{"late"});
+    EXPECT_EQ(log.count("Uploads wait for their server"), 3) << "once for each host and session, also a later one";
     late.answerOne();
     ASSERT_TRUE(recorder->wait(1));
     EXPECT_EQ(recorder->outcomes(), (Outcomes{{"late", "200"}}));
+    EXPECT_TRUE(log.waitFor("Uploads to a server go on, server=127.0.0.1:"));
 }
 
 TEST_F(BackgroundTransferSessionTest, TransfersInsideTheProcessWhenNoAgentCanBeHad) {
