@@ -8,6 +8,7 @@
 #include <unistd.h>
 
 #include <future>
+#include <sstream>
 #include <thread>
 
 namespace corvane::test {
@@ -49,6 +50,7 @@ void SessionRecorder::taskDidSendBodyData(const TransferTask&, std::int64_t sent
 void SessionRecorder::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                                       const std::optional<TransferResponse>& response) {
     EXPECT_EQ(task.state(), TransferTask::State::running);
+    if (whenCompleted) whenCompleted();
     std::lock_guard lock(mutex_);
     outcomes_[task.description().value_or("none")] += describe(error, response);
     ++completed_;
@@ -190,6 +192,15 @@ long AgentFixture::agent(const std::filesystem::path& directory) {
     if (process <= 0) return 0;
     const auto command = readFile("/proc/" + std::to_string(process) + "/cmdline");
     return command.find(directory.string() + '\0') == std::string::npos ? 0 : process;
+}
+
+long AgentFixture::processorTime(long process) {
+    std::istringstream stat(readFile("/proc/" + std::to_string(process) + "/stat"));
+    std::string word;
+    for (int i = 0; i < 13; ++i) stat >> word;
+    long user = 0, system = 0;
+    stat >> user >> system;
+    return user + system;
 }
 
 void AgentFixture::kill(int signal) const {

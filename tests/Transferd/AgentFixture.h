@@ -33,6 +33,9 @@ class SessionRecorder final : public TransferSessionDelegate {
                              const std::optional<TransferResponse>& response) override;
     void allEventsDelivered() override;
 
+    /// Called first by every completion, where it arrives. Set before the session is opened.
+    std::function<void()> whenCompleted;
+
     /// Waits until so many completions came, also of tasks that ended elsewhere.
     [[nodiscard]] bool wait(std::size_t count) const;
     [[nodiscard]] bool waitForSignal() const;
@@ -74,6 +77,8 @@ class AgentFixture : public ::testing::Test {
     /// The agent of the directory, or 0.
     [[nodiscard]] static long agent(const std::filesystem::path& directory);
     [[nodiscard]] long agent() const { return agent(options.directory); }
+    /// Processor time that a process has used, in the system's ticks.
+    [[nodiscard]] static long processorTime(long process);
     void kill(int signal) const;
     /// Kills the agent of a directory and waits for its end.
     static void end(const std::filesystem::path& directory);
