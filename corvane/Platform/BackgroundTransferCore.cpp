@@ -359,11 +359,15 @@ void BackgroundTransferCore::agentEndedElsewhere(const AgentLink::Task& ended,
     if (task && task->isKeptBy(Keeper::agent)) endElsewhere(std::move(task), outcome.value_or(takenBack()));
 }
 
+// Reported from now on: the agent may refuse a submission that it has had, been told of and forgotten.
 void BackgroundTransferCore::endElsewhere(std::shared_ptr<Task> task, const TransferOutcome& outcome) {
+    if (!reported_.insert(task->token()).second) return;
     queue_->async([self = shared_from_this(), task = std::move(task), outcome] {
-        if (task->state() == TransferTask::State::completed) return;
         self->finish(*task, &TransferSessionDelegate::taskDidEndElsewhere, outcome.error(), outcome.response);
-        AgentThread::shared().post([self] { self->watch(); });
+        AgentThread::shared().post([self, token = task->token()] {
+            self->reported_.erase(token);
+            self->watch();
+        });
     });
 }
 

@@ -89,38 +89,44 @@ void UploadQueue::proceed(Clock::time_point now) {
 
 void UploadQueue::startOne(Host& host) {
     const Waiting next = host.waiting.front();
-    host.waiting.pop_front();
     try {
-        auto transfer = source_.transfer(next.number);
-        if (!transfer) return;
-        transfer->didSend = [this, number = next.number](std::int64_t total, std::int64_t expected) {
-            progress_.push_back({number, total, expected});
-        };
-        transfer->didComplete = [this, number = next.number](std::optional<AnyError> error,
-                                                             std::optional<TransferResponse> response) {
-            arrived_.push_back({number, std::move(error), std::move(response)});
-        };
-        host.running.emplace(next.number, next);
-        scheduler_.start(static_cast<std::uint64_t>(next.number), *std::move(transfer));
+        if (auto transfer = source_.transfer(next.number)) run(host, next, *std::move(transfer));
     } catch (...) {
         ended_.push_back({next.number, AnyError::current(), std::nullopt});
+        host.running.erase(next.number);
     }
+    host.waiting.pop_front();  // last: what there is no memory for stays
 }
 
-void UploadQueue::finished(Ended ended, Clock::time_point now) {
+void UploadQueue::run(Host& host, const Waiting& next, HTTPTransfer transfer) {
+    transfer.didSend = [this, number = next.number](std::int64_t total, std::int64_t expected) {
+        progress_.push_back({number, total, expected});
+    };
+    transfer.didComplete = [this, number = next.number](std::optional<AnyError> error,
+                                                        std::optional<TransferResponse> response) {
+        arrived_.push_back({number, std::move(error), std::move(response)});
+    };
+    host.running.emplace(next.number, next);
+    scheduler_.start(static_cast<std::uint64_t>(next.number), std::move(transfer));
+}
+
+void UploadQueue::finished(const Ended& ended, Clock::time_point now) {
     const auto found = std::find_if(hosts_.begin(), hosts_.end(),
                                     [&](const auto& host) { return host.second.running.contains(ended.number); });
     if (found == hosts_.end()) return;
     Host& host = found->second;
-    const Waiting upload = host.running.at(ended.number);
-    host.running.erase(ended.number);
-    if (!isHeldUp(ended.error)) {
-        goOn(host);
-        ended_.push_back(std::move(ended));
-        return;
+    const bool waits = isHeldUp(ended.error);
+    if (waits) {
+        host.waiting.push_back(host.running.at(ended.number));
+    } else {
+        ended_.push_back(ended);
     }
-    host.waiting.push_back(upload);
-    holdUp(host, *ended.error, now);
+    host.running.erase(ended.number);
+    if (waits) {
+        holdUp(host, *ended.error, now);
+    } else {
+        goOn(host);
+    }
 }
 
 void UploadQueue::goOn(Host& host) {

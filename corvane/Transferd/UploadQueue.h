@@ -98,7 +98,8 @@ class UploadQueue {
     };
 
     void startOne(Host& host);
-    void finished(Ended ended, Clock::time_point now);
+    void run(Host& host, const Waiting& next, HTTPTransfer transfer);
+    void finished(const Ended& ended, Clock::time_point now);
     void goOn(Host& host);
     void holdUp(Host& host, const AnyError& why, Clock::time_point now);
     void note(Host& host, const AnyError& why);

@@ -120,8 +120,13 @@ TEST_F(JournalTest, TakesOverWhatAnEarlierVersionHasLeft) {
     const auto spooled = TransferSubmission::newToken();
     writeFile(options.directory / "spool" / spooled, submission(spooled, "spooled"));
 
+    const auto abandoned = options.directory / "spool" / ("." + spooled + ".x.partial");
+    writeFile(abandoned, "half");
+    std::filesystem::last_write_time(abandoned, std::filesystem::file_time_type::clock::now() - std::chrono::hours(2));
+
     auto session = open(recorder);
     ASSERT_TRUE(recorder->wait(4));
+    EXPECT_FALSE(std::filesystem::exists(abandoned));
     EXPECT_EQ(recorder->outcomes(),
               (Outcomes{{"open", "200"}, {"over", "204"}, {"broken outcome", "network"}, {"spooled", "200"}}));
     EXPECT_TRUE(running(*session).empty());
