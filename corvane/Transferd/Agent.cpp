@@ -206,6 +206,7 @@ std::optional<HTTPTransfer> Agent::transfer(std::int64_t number) {
     }
     TransferSubmission submission = book_.submission(number);
     HTTPTransfer transfer;
+    transfer.pool = UploadQueue::pool(submission);
     transfer.request = std::move(submission.request);
     transfer.bodyFile = std::move(submission.file);
     transfer.bodyMustBeOwn = true;

@@ -32,10 +32,11 @@ bool isHeldUp(const std::optional<AnyError>& error) {
     return known && (known->value() == TransferError::Code::unreachable || isBlocked(*error));
 }
 
-HTTPTransfer asked(const TransferSubmission& submission) {
+std::string hostKey(const TransferSubmission& submission) {
     HTTPTransfer transfer;
     transfer.request.url = submission.request.url;
-    return transfer;
+    transfer.pool = UploadQueue::pool(submission);
+    return CurlTransfer::hostKey(transfer);
 }
 
 }  // namespace
@@ -53,12 +54,15 @@ bool UploadQueue::Host::mayStart(Clock::time_point now) const {
     return static_cast<int>(running.size()) < (failures > 0 ? 1 : waiting.front().perHost);
 }
 
+std::string UploadQueue::pool(const TransferSubmission& submission) {
+    return submission.trustedCertificates + '\n' + submission.proxy.url + '\n' + submission.proxy.exceptions;
+}
+
 const UploadQueue::Trouble* UploadQueue::add(std::int64_t number, const TransferSubmission& submission) {
-    std::string server = CurlTransfer::hostKey(asked(submission)).substr(1);  // of no pool
-    std::replace(server.begin(), server.end(), ' ', ':');
-    Host& host = hosts_[server + '\n' + submission.trustedCertificates + '\n' + submission.proxy.url + '\n' +
-                        submission.proxy.exceptions];
-    host.server = std::move(server);
+    const std::string key = hostKey(submission);
+    Host& host = hosts_[key];
+    host.server = key.substr(key.rfind(' ', key.rfind(' ') - 1) + 1);  // without the pool
+    std::replace(host.server.begin(), host.server.end(), ' ', ':');
     host.waiting.push_back({number, submission.limits.transfersPerHost});
     return host.trouble ? &*host.trouble : nullptr;
 }

@@ -59,6 +59,9 @@ class UploadQueue {
 
     UploadQueue(Source& source, std::chrono::milliseconds retryDelay) : source_(source), retryDelay_(retryDelay) {}
 
+    /// What tells the transfers to one host apart that do not go there in the same way.
+    [[nodiscard]] static std::string pool(const TransferSubmission& submission);
+
     /// Returns what holds it up, if it has to wait. Throws `TransferError` for a request that cannot be sent.
     const Trouble* add(std::int64_t number, const TransferSubmission& submission);
     /// Drops an upload, whether it runs or waits.
