@@ -181,7 +181,7 @@ void AgentLink::exchange(Clock::time_point now) {
             if (!message) break;
             if (const auto reply = agent::decodeReply(*message)) take(*reply, now);
         }
-    } catch (const InvalidArgument& error) {
+    } catch (const std::exception& error) {  // also without memory: the agent says everything again
         return lost(now, error.what());
     }
     if (!socket_) return;

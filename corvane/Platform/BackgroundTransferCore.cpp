@@ -339,11 +339,14 @@ void BackgroundTransferCore::agentCompleted(const AgentLink::Task& completed, co
         link_->send(agent::Acknowledge{completed.token}, 1);
         return;
     }
-    if (!reported_.insert(completed.token).second) return;  // the report waits in the queue
+    if (reported_.contains(completed.token)) return;  // the report waits in the queue
     auto task = find(completed.token);
     if (!task) task = adopt(completed);
-    if (!task || task->isKeptBy(Keeper::process)) return acknowledge(completed.token);  // reported by the process
-    queue_->async([self = shared_from_this(), task = std::move(task), outcome] {
+    if (!task || task->isKeptBy(Keeper::process)) {  // reported by the process
+        reported_.insert(completed.token);
+        return acknowledge(completed.token);
+    }
+    enqueueReport(completed.token, [self = shared_from_this(), task = std::move(task), outcome] {
         // One that nobody was told of stays for the next session.
         if (!self->finish(*task, &TransferSessionDelegate::taskDidComplete, outcome.error(), outcome.response)) return;
         AgentThread::shared().post([self, token = task->token()] { self->acknowledge(token); });
@@ -359,10 +362,22 @@ void BackgroundTransferCore::agentEndedElsewhere(const AgentLink::Task& ended,
     if (task && task->isKeptBy(Keeper::agent)) endElsewhere(std::move(task), outcome.value_or(takenBack()));
 }
 
+// Without memory for the report it is as if the agent had said nothing; it does so again on the next connection.
+void BackgroundTransferCore::enqueueReport(const std::string& token, std::function<void()> report) {
+    const auto noted = reported_.insert(token).first;
+    try {
+        queue_->async(std::move(report));
+    } catch (...) {
+        reported_.erase(noted);
+        throw;
+    }
+}
+
 // Reported from now on: the agent may refuse a submission that it has had, been told of and forgotten.
 void BackgroundTransferCore::endElsewhere(std::shared_ptr<Task> task, const TransferOutcome& outcome) {
-    if (!reported_.insert(task->token()).second) return;
-    queue_->async([self = shared_from_this(), task = std::move(task), outcome] {
+    if (reported_.contains(task->token())) return;
+    const std::string name = task->token();
+    enqueueReport(name, [self = shared_from_this(), task = std::move(task), outcome] {
         self->finish(*task, &TransferSessionDelegate::taskDidEndElsewhere, outcome.error(), outcome.response);
         AgentThread::shared().post([self, token = task->token()] {
             self->reported_.erase(token);
@@ -397,8 +412,8 @@ void BackgroundTransferCore::agentFailed() {
         agentUsable_ = false;
         restUntil_ = Clock::now() + options_.holdOff;
     }
-    for (const auto& task : openTasks()) {
-        if (!isReported(task->token())) takeBack(task, nullptr);
+    for (const auto& task : openTasks()) {  // one that there is no memory for stays the agent's
+        if (!isReported(task->token())) callHost("transfer agent link", [&] { takeBack(task, nullptr); });
     }
     for (auto& [question, listing] : listings_) answer(std::move(listing));
     listings_.clear();

@@ -9,6 +9,7 @@
 
 #include <chrono>
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -92,6 +93,7 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     void signal();
     void acknowledge(const std::string& token);
     void watch();
+    void enqueueReport(const std::string& token, std::function<void()> report);
     void endElsewhere(std::shared_ptr<Task> task, const TransferOutcome& outcome);
     using Ending = void (TransferSessionDelegate::*)(const TransferTask&, const std::optional<AnyError>&,
                                                      const std::optional<TransferResponse>&);

@@ -238,13 +238,17 @@ TEST_F(InProcessTransferSessionTest, FailsTheTaskAndNotTheCallWhenItCannotBeSent
 // A variable of the environment while it lives.
 class Variable {
   public:
-    Variable(const char* name, const std::string& value) : name_(name) { setenv(name, value.c_str(), 1); }
+    Variable(const char* name, const std::string& value) : name_(name) {
+        if (const char* before = std::getenv(name)) before_ = before;
+        setenv(name, value.c_str(), 1);
+    }
     Variable(const Variable&) = delete;
     Variable& operator=(const Variable&) = delete;
-    ~Variable() { unsetenv(name_); }
+    ~Variable() { before_ ? setenv(name_, before_->c_str(), 1) : unsetenv(name_); }
 
   private:
     const char* name_;
+    std::optional<std::string> before_;
 };
 
 TEST_F(InProcessTransferSessionTest, TellsWhetherAServerCannotBeReachedOrTheWayToItIsBlocked) {
@@ -445,12 +449,18 @@ TEST_F(InProcessTransferSessionDeathTest, TheProcessExitsWithTransfersPending) {
 }
 
 TEST_F(InProcessTransferSessionDeathTest, AProcessWithoutDescriptorsFailsItsTransfersAndRecovers) {
+#ifdef __SANITIZE_ADDRESS__
+    GTEST_SKIP() << "the sanitizer needs descriptors of its own to look at a thrown object";
+#endif
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     EXPECT_EXIT(
         {
+            auto session = open();
+            std::promise<void> ready;  // the queue's thread is there, as in a host that is at work
+            queue->async([&] { ready.set_value(); });
+            ready.get_future().wait();
             std::vector<int> taken;
             for (int one = 0; (one = dup(STDIN_FILENO)) >= 0;) taken.push_back(one);
-            auto session = open();
             const bool failed = recorder->wait(*start(*session, server.url())).error.has_value();
             for (const int one : taken) close(one);
             const auto after = describe(recorder->wait(*start(*session, server.url())));
@@ -483,6 +493,8 @@ std::atomic<int> registration = 0;  // 1: the next one waits, 2: it does, 3: it 
 }
 
 TEST_F(InProcessTransferSessionDeathTest, AChildThatIsForkedOffWhileAThreadIsMadeCanExit) {
+    // It ends in the midst of work, and what its threads hold then looks like a leak.
+    const Variable leaks("ASAN_OPTIONS", "detect_leaks=0");
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     EXPECT_EXIT(
         {
