@@ -172,8 +172,17 @@ bool BackgroundTransferCore::mayBecomeReady() const {
     return agentUsable_;
 }
 
+// The agent may have failed since the task was given to it: nobody would take the task back then. One that was taken
+// back while its submission was being written leaves that behind.
 void BackgroundTransferCore::submitted(const std::string& token) {
-    if (const auto task = find(token)) submit(*task);
+    const auto task = find(token);
+    if (task ? task->isKeptBy(Keeper::process) : acknowledged().contains(token)) {
+        directory_->withdraw(token);
+    } else if (task && mayBecomeReady()) {
+        submit(*task);
+    } else if (task) {
+        takeBack(task, nullptr);
+    }
     watch();
 }
 

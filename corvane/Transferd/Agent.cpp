@@ -172,6 +172,7 @@ void Agent::dropWithdrawn() {
             queue_.remove(*number);
             forget(*number, nullptr);
         }
+        unlink(directory_.submission(token).c_str());
         directory_.removeMark(token);
     }
 }
