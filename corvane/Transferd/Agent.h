@@ -53,6 +53,8 @@ class Agent final : private UploadQueue::Source, private ClientList::Handler {
     void acknowledge(Client& client, const std::string& token);
     void describe(const Client& client, const agent::Describe& change);
 
+    /// Since 1970.
+    [[nodiscard]] static std::int64_t milliseconds();
     void importSpool();
     std::int64_t import(const std::string& token);
     void enqueue(std::int64_t number, const TransferSubmission& submission);
