@@ -193,8 +193,19 @@ void BackgroundTransferCore::submit(const Task& task) {
     link_->send(agent::Submit{task.token()}, 1);
 }
 
+// A task that cannot be started inside the process either has failed: nobody else would end it.
 void BackgroundTransferCore::takeOver(const std::shared_ptr<Task>& task) {
     if (!task->moveTo(Keeper::process)) return;
+    try {
+        startInside(task);
+    } catch (...) {
+        queue_->async([self = shared_from_this(), task, error = AnyError::current()] {
+            self->finish(*task, &TransferSessionDelegate::taskDidComplete, error, std::nullopt);
+        });
+    }
+}
+
+void BackgroundTransferCore::startInside(const std::shared_ptr<Task>& task) {
     std::shared_ptr<TransferTask> inner;
     {
         std::lock_guard lock(mutex_);

@@ -84,6 +84,7 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     void submitted(const std::string& token);
     void submit(const Task& task);
     void takeOver(const std::shared_ptr<Task>& task);
+    void startInside(const std::shared_ptr<Task>& task);
     void takeBack(const std::shared_ptr<Task>& task, const char* why);
     void missed(const std::vector<AgentLink::Task>& listed);
     void listed(const std::vector<AgentLink::Task>& listed);
