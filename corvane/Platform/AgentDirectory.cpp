@@ -95,20 +95,20 @@ Descriptor AgentDirectory::listen() const {
     return socket;
 }
 
-void AgentDirectory::removeSocket() const noexcept {
+void AgentDirectory::removeSocket() const {
     ::unlink((path_ / socketName).c_str());
 }
 
 // The mark is there before the task starts elsewhere: an agent that reads it late finds it, and one that has taken the
 // submission from the spool meanwhile looks for it before every start.
-bool AgentDirectory::withdraw(std::string_view token) const noexcept {
+bool AgentDirectory::withdraw(std::string_view token) const {
     const auto mark = path_ / "withdrawn" / token;
     if (::rename(submission(token).c_str(), mark.c_str()) == 0) return true;
     const Descriptor made(::open(mark.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
     return false;
 }
 
-bool AgentDirectory::isWithdrawn(std::string_view token) const noexcept {
+bool AgentDirectory::isWithdrawn(std::string_view token) const {
     return ::access((path_ / "withdrawn" / token).c_str(), F_OK) == 0;
 }
 
@@ -116,7 +116,7 @@ std::vector<std::string> AgentDirectory::withdrawn() const {
     return tokensIn(path_ / "withdrawn");
 }
 
-void AgentDirectory::removeMark(std::string_view token) const noexcept {
+void AgentDirectory::removeMark(std::string_view token) const {
     ::unlink((path_ / "withdrawn" / token).c_str());
 }
 

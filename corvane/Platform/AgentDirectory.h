@@ -30,15 +30,15 @@ class AgentDirectory {
     /// A listening, non-blocking socket in the place of one that a killed agent has left. Throws `SystemError`.
     /// Requires: the caller holds the lock.
     [[nodiscard]] Descriptor listen() const;
-    void removeSocket() const noexcept;
+    void removeSocket() const;
 
     /// Takes a task back from the agent: it does not start it any more, whether it has seen it or not. True when the
     /// agent had not seen it.
-    bool withdraw(std::string_view token) const noexcept;
-    [[nodiscard]] bool isWithdrawn(std::string_view token) const noexcept;
+    bool withdraw(std::string_view token) const;
+    [[nodiscard]] bool isWithdrawn(std::string_view token) const;
     /// The marks of tasks that were taken back.
     [[nodiscard]] std::vector<std::string> withdrawn() const;
-    void removeMark(std::string_view token) const noexcept;
+    void removeMark(std::string_view token) const;
 
     /// The tokens in the spool, in the order in which they were made.
     [[nodiscard]] std::vector<std::string> spooled() const;

@@ -20,6 +20,15 @@ constexpr auto betweenAttempts = 10ms;
 // An agent that dies again and again without getting anything done is started less and less often.
 constexpr auto longestRestartDelay = 2s;
 
+// One that cannot be read is a failed transfer, and no reason to leave the agent.
+TransferOutcome readable(const std::string& bytes) {
+    try {
+        return TransferOutcome::decode(bytes);
+    } catch (const InvalidArgument&) {
+        return TransferOutcome::unreadable();
+    }
+}
+
 }  // namespace
 
 AgentLink::AgentLink(AgentDirectory directory, std::filesystem::path program, TransferAgentOptions options,
@@ -31,10 +40,14 @@ AgentLink::AgentLink(AgentDirectory directory, std::filesystem::path program, Tr
     const auto now = Clock::now();
     giveUpAt_ = now + options_.deadline;
     if (connect(now)) return;
-    starter_ = AgentProgram::start(program_, directory_.path(), options_);
+    start();
 }
 
 AgentLink::~AgentLink() = default;
+
+void AgentLink::start() {
+    starter_ = AgentProgram::start(program_, directory_.path(), options_);
+}
 
 void AgentLink::send(agent::Request message, std::size_t answers) {
     if (state_ != State::ready) return;
@@ -48,6 +61,8 @@ void AgentLink::retry(Clock::time_point now) {
     state_ = State::connecting;
     giveUpAt_ = now + options_.deadline;
     nextAttempt_ = now;
+    restartDelay_ = 0ms;
+    starterProblem_.clear();
     proceed(now);
 }
 
@@ -56,6 +71,11 @@ void AgentLink::close() {
     socket_.reset();
     forgetStarter();
     state_ = State::closed;
+}
+
+void AgentLink::endOfProcess() {
+    if (const auto listener = listener_.lock()) listener->processEnds();
+    close();
 }
 
 void AgentLink::proceed(Clock::time_point now) {
@@ -92,7 +112,7 @@ void AgentLink::attempt(Clock::time_point now) {
     try {
         static_cast<void>(AgentDirectory(directory_.path()));
         if (connect(now)) return;
-        starter_ = AgentProgram::start(program_, directory_.path(), options_);
+        start();
     } catch (const std::exception& error) {
         fail(error.what());
     }
@@ -126,17 +146,22 @@ void AgentLink::readStarter(Clock::time_point now) {
     starterEnded(now);
 }
 
-// What an agent says beside "ready" is something that somebody should look into.
+// What an agent says beside "ready" is something that somebody should look into. One that cannot start is not started
+// again at once: it would fail for the same reason.
 void AgentLink::starterEnded(Clock::time_point now) {
     std::string said = std::move(starterSaid_);
     forgetStarter();
     while (said.ends_with('\n')) said.pop_back();
-    if (!said.starts_with("ready")) {
-        problem_ = said.empty() ? "the agent did not start" : said;
-    } else if (said != "ready") {
-        Log::shared().error("Transfer agent reports a problem, problem=%{public}@", said);
-    }
-    if (!connect(now) && !said.starts_with("ready")) problem_ = said.empty() ? "the agent did not start" : said;
+    const bool isReady = said.starts_with("ready");
+    if (isReady && said != "ready") Log::shared().error("Transfer agent reports a problem, problem=%{public}@", said);
+    if (connect(now) || isReady) return;
+    starterProblem_ = said.empty() ? "the agent did not start" : said;
+    waitLonger(now);
+}
+
+void AgentLink::waitLonger(Clock::time_point now) {
+    restartDelay_ = std::clamp<std::chrono::milliseconds>(2 * restartDelay_, betweenAttempts, longestRestartDelay);
+    nextAttempt_ = now + std::min<std::chrono::milliseconds>(restartDelay_, options_.deadline / 2);
 }
 
 void AgentLink::forgetStarter() {
@@ -154,9 +179,9 @@ void AgentLink::exchange(Clock::time_point now) {
         while (socket_) {
             const auto message = socket_->next();
             if (!message) break;
-            take(agent::decodeReply(*message), now);
+            if (const auto reply = agent::decodeReply(*message)) take(*reply, now);
         }
-    } catch (const InvalidArgument& error) {
+    } catch (const std::exception& error) {  // also without memory: the agent says everything again
         return lost(now, error.what());
     }
     if (!socket_) return;
@@ -188,10 +213,17 @@ void AgentLink::take(const agent::Reply& reply, Clock::time_point now) {
                 listener->agentProgressed(one.token, one.total, one.expected);
             } else if constexpr (std::is_same_v<One, agent::Completed>) {
                 restartDelay_ = 0ms;
-                listener->agentCompleted({one.token, one.description}, TransferOutcome::decode(one.outcome));
+                listener->agentCompleted({one.token, one.description}, readable(one.outcome));
             } else if constexpr (std::is_same_v<One, agent::Forgotten>) {
                 endExchange();
                 listener->agentForgot(one.token);
+            } else if constexpr (std::is_same_v<One, agent::Elsewhere>) {
+                const auto outcome = one.outcome.empty() ? std::nullopt : std::optional(readable(one.outcome));
+                listener->agentEndedElsewhere({one.token, one.description}, outcome);
+            } else if constexpr (std::is_same_v<One, agent::Trouble>) {
+                tell(one);
+            } else if constexpr (std::is_same_v<One, agent::Unsupported>) {
+                endExchange();
             } else if constexpr (std::is_same_v<One, agent::Flushed>) {
                 listener->agentFlushed();
             } else if constexpr (std::is_same_v<One, agent::Pong>) {
@@ -207,7 +239,18 @@ void AgentLink::greeted(const agent::Welcome& welcome) {
     }
     state_ = State::ready;
     problem_.clear();
+    starterProblem_.clear();
+    complaint_.clear();
     if (const auto listener = listener_.lock()) listener->agentIsReady();
+}
+
+void AgentLink::tell(const agent::Trouble& trouble) {
+    if (trouble.lasts) {
+        Log::shared().error("Uploads wait for their server and are tried again, server=%{public}@, reason=%{public}@",
+                            trouble.server, trouble.reason);
+    } else {
+        Log::shared().default_("Uploads to a server go on, server=%{public}@", trouble.server);
+    }
 }
 
 // An answer too many is no reason to stop: an agent that found a submission by itself has answered for it already.
@@ -218,7 +261,10 @@ void AgentLink::endExchange() {
 void AgentLink::checkDeadlines(Clock::time_point now) {
     if (state_ == State::connecting || state_ == State::greeting) {
         if (now < giveUpAt_) return;
-        fail(state_ == State::greeting ? "no answer in time" : problem_.empty() ? "no start in time" : problem_);
+        fail(state_ == State::greeting  ? "no answer in time"
+             : !starterProblem_.empty() ? starterProblem_
+             : problem_.empty()         ? "no start in time"
+                                        : problem_);
     } else if (state_ == State::ready && outstanding_ > 0 && now >= lastHeard_ + options_.deadline) {
         fail("no answer in time");
     } else if (state_ == State::ready && outstanding_ == 0 && awaitsTasks_ &&
@@ -236,8 +282,7 @@ void AgentLink::lost(Clock::time_point now, const std::string& why) {
     problem_ = why;
     if (!stood) return;  // an agent that ends just now, or a start that goes on until its deadline
     Log::shared().error("Transfer agent was lost and is started again, error=%{public}@", why);
-    restartDelay_ = std::clamp<std::chrono::milliseconds>(2 * restartDelay_, betweenAttempts, longestRestartDelay);
-    nextAttempt_ = now + std::min<std::chrono::milliseconds>(restartDelay_, options_.deadline / 2);
+    waitLonger(now);
     giveUpAt_ = nextAttempt_ + options_.deadline;
 }
 
@@ -245,7 +290,11 @@ void AgentLink::fail(const std::string& why) {
     socket_.reset();
     forgetStarter();
     state_ = State::resting;
-    Log::shared().error("Transfer agent is not available, transfers go on inside the process, error=%{public}@", why);
+    // Once for each reason: an agent of another version, say, may be in the way for as long as it has work.
+    if (std::exchange(complaint_, why) != why) {
+        Log::shared().error("Transfer agent is not available, transfers go on inside the process, error=%{public}@",
+                            why);
+    }
     if (const auto listener = listener_.lock()) listener->agentFailed();
 }
 

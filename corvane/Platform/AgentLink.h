@@ -45,9 +45,13 @@ class AgentLink {
         virtual void agentProgressed(const std::string& token, std::int64_t total, std::int64_t expected) = 0;
         virtual void agentCompleted(const Task& task, const TransferOutcome& outcome) = 0;
         virtual void agentForgot(const std::string& token) = 0;
+        /// A task was reported by another process of the same owner; without an outcome it was taken back there.
+        virtual void agentEndedElsewhere(const Task& task, const std::optional<TransferOutcome>& outcome) = 0;
         virtual void agentFlushed() = 0;
         /// There is no agent to be had; `isUsable` says no from before this call on.
         virtual void agentFailed() = 0;
+        /// The process exits: what the agent may not have heard is to be left where it finds it.
+        virtual void processEnds() = 0;
     };
 
     /// Connects, or starts an agent, at once: one that was started goes on if the process is killed at this moment.
@@ -68,6 +72,8 @@ class AgentLink {
     /// Lets a resting link connect again.
     void retry(Clock::time_point now);
     void close();
+    /// The last call, at the exit of the process.
+    void endOfProcess();
 
     [[nodiscard]] bool isReady() const { return state_ == State::ready; }
     [[nodiscard]] bool isClosed() const { return state_ == State::closed; }
@@ -84,12 +90,15 @@ class AgentLink {
 
     void attempt(Clock::time_point now);
     bool connect(Clock::time_point now);
+    void start();
+    void waitLonger(Clock::time_point now);
     void readStarter(Clock::time_point now);
     void starterEnded(Clock::time_point now);
     void forgetStarter();
     void exchange(Clock::time_point now);
     void take(const agent::Reply& reply, Clock::time_point now);
     void greeted(const agent::Welcome& welcome);
+    static void tell(const agent::Trouble& trouble);
     void checkDeadlines(Clock::time_point now);
     void lost(Clock::time_point now, const std::string& why);
     void fail(const std::string& why);
@@ -106,11 +115,13 @@ class AgentLink {
     std::optional<FrameSocket> socket_;
     AgentProgram::Started starter_;
     std::string starterSaid_;
+    std::string starterProblem_;     // in the words of the last program that was started, if it had any
     std::string problem_;            // what the last attempt to connect came to
     Clock::time_point giveUpAt_;     // while there is no connection
     Clock::time_point nextAttempt_;  // while there is neither a connection nor a starter
     Clock::time_point lastHeard_;
     std::chrono::milliseconds restartDelay_{0};
+    std::string complaint_;        // what the log was told of an agent that is not to be had, until there is one
     std::size_t outstanding_ = 0;  // answers that the agent owes
     std::vector<Task> listing_;
     bool awaitsTasks_ = false;

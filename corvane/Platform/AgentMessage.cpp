@@ -27,13 +27,12 @@ bool decodeAs(std::uint8_t kind, std::string_view bytes, std::optional<Message>&
     One made;
     WireReader read(bytes);
     made.visit(read);
-    read.finish();
     decoded = std::move(made);
     return true;
 }
 
 template <class Message>
-Message decodeAny(std::string_view bytes) {
+std::optional<Message> decodeAny(std::string_view bytes) {
     if (bytes.empty()) throw InvalidArgument("the message is empty");
     const auto kind = static_cast<std::uint8_t>(bytes.front());
     bytes.remove_prefix(1);
@@ -41,8 +40,7 @@ Message decodeAny(std::string_view bytes) {
     [&]<class... Each>(std::type_identity<std::variant<Each...>>) {
         static_cast<void>((decodeAs<Each>(kind, bytes, decoded) || ...));
     }(std::type_identity<Message>{});
-    if (!decoded) throw InvalidArgument("the message is of an unknown kind");
-    return *std::move(decoded);
+    return decoded;
 }
 
 }  // namespace
@@ -53,10 +51,10 @@ std::string encode(Request message) {
 std::string encode(Reply message) {
     return encodeAny(message);
 }
-Request decodeRequest(std::string_view bytes) {
+std::optional<Request> decodeRequest(std::string_view bytes) {
     return decodeAny<Request>(bytes);
 }
-Reply decodeReply(std::string_view bytes) {
+std::optional<Reply> decodeReply(std::string_view bytes) {
     return decodeAny<Reply>(bytes);
 }
 

@@ -11,13 +11,14 @@
 namespace corvane {
 
 /// What the library and the transfer agent say to each other; docs/formats/transfer-protocol.md has the bytes and the
-/// order. Values, which are neither renumbered nor changed without a new protocol version. Internal.
+/// order. Values, which are neither renumbered nor changed without a new protocol version; values behind the known
+/// ones, and further kinds, may come with any later library or agent. Internal.
 namespace agent {
 
 /// The version that both must speak.
-constexpr std::int64_t protocolVersion = 1;
+constexpr std::int64_t protocolVersion = 2;
 
-/// The library's first message.
+/// The library's first message, the same in every version: an agent of another one still has to tell its own.
 struct Hello {
     static constexpr std::uint8_t kind = 1;
     std::int64_t version = protocolVersion;
@@ -125,8 +126,33 @@ struct Forgotten {
     void visit(auto&& with) { with(token); }
 };
 
+/// A task that this connection has not reported was acknowledged by another one of its owner, or taken back by the
+/// process that made it, and is forgotten.
+struct Elsewhere {
+    static constexpr std::uint8_t kind = 75;
+    std::string token;
+    std::optional<std::string> description;
+    std::string outcome;  ///< the bytes of a `TransferOutcome`; empty when it was taken back
+    void visit(auto&& with) { with(token, description, outcome); }
+};
+/// Uploads of the owner to a server are held up, or go on.
+struct Trouble {
+    static constexpr std::uint8_t kind = 76;
+    std::string server;
+    bool lasts = true;
+    std::string reason;  ///< in words; nothing when it is over
+    void visit(auto&& with) { with(server, lasts, reason); }
+};
+/// The agent does not know such a request.
+struct Unsupported {
+    static constexpr std::uint8_t kind = 77;
+    std::int64_t request = 0;
+    void visit(auto&& with) { with(request); }
+};
+
 using Request = std::variant<Hello, Submit, List, Acknowledge, Describe, Flush, Ping>;
-using Reply = std::variant<Welcome, Accepted, Refused, Known, Listed, Progress, Completed, Flushed, Pong, Forgotten>;
+using Reply = std::variant<Welcome, Accepted, Refused, Known, Listed, Progress, Completed, Flushed, Pong, Forgotten,
+                           Elsewhere, Trouble, Unsupported>;
 
 /// The longest message there may be, without its length: an answer's head of 256 KiB fits.
 constexpr std::size_t longestMessage = std::size_t{512} * 1024;
@@ -134,9 +160,9 @@ constexpr std::size_t longestMessage = std::size_t{512} * 1024;
 /// The bytes of a message, without its length.
 [[nodiscard]] std::string encode(Request message);
 [[nodiscard]] std::string encode(Reply message);
-/// Throw `InvalidArgument` for bytes that are no such message.
-[[nodiscard]] Request decodeRequest(std::string_view bytes);
-[[nodiscard]] Reply decodeReply(std::string_view bytes);
+/// Nothing for a message of a kind that is not known here. Throw `InvalidArgument` for one that is broken.
+[[nodiscard]] std::optional<Request> decodeRequest(std::string_view bytes);
+[[nodiscard]] std::optional<Reply> decodeReply(std::string_view bytes);
 
 }  // namespace agent
 }  // namespace corvane

@@ -102,7 +102,9 @@ AgentProgram::Started AgentProgram::start(const std::filesystem::path& program, 
                                "--idle-ms",
                                std::to_string(options.idleTime.count()),
                                "--retry-ms",
-                               std::to_string(options.retryDelay.count())};
+                               std::to_string(options.retryDelay.count()),
+                               "--alone-ms",
+                               std::to_string(options.patienceWithoutHost.count())};
     char* argv[std::size(arguments) + 1] = {};
     for (std::size_t i = 0; i < std::size(arguments); ++i) argv[i] = arguments[i].data();
     pid_t process = -1;

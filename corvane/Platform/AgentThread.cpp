@@ -14,12 +14,16 @@
 #include <cerrno>
 #include <chrono>
 #include <cstdlib>
+#include <exception>
 #include <limits>
 #include <utility>
 
 namespace corvane {
 
+constinit std::atomic<AgentThread*> AgentThread::instance_ = nullptr;
+
 AgentThread& AgentThread::shared() {
+    if (AgentThread* made = instance_.load()) return *made;
     static auto& instance = *new AgentThread;
     return instance;
 }
@@ -34,7 +38,8 @@ AgentThread::AgentThread() : wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
         prepareThread("com.veskar.corvane.agent-link", false);
         run();
     });
-    std::atexit([] { shared().stop(); });
+    instance_ = this;
+    std::atexit([] { instance_.load()->stop(); });
 }
 
 void AgentThread::stop() {
@@ -76,6 +81,7 @@ void AgentThread::run() {
         reapEnded();
         if (goesOn) wait();
     }
+    for (const auto& link : links_) callHost("transfer agent link", [&] { link->endOfProcess(); });
 }
 
 // The last round, at the exit, still sends what was handed over: an acknowledgement spares the next run a report.
@@ -99,12 +105,29 @@ void AgentThread::reapEnded() {
     });
 }
 
+// Without memory for the descriptors there is still the wake-up to wait for, and the links are looked after again soon.
 void AgentThread::wait() {
+    constexpr int untilNextAttempt = 50;
+    pollfd wakeUp{wakeUp_.get(), POLLIN, 0};
+    try {
+        const int milliseconds = prepareWait();
+        poll(polled_.data(), polled_.size(), milliseconds);
+        wakeUp = polled_.front();
+    } catch (const std::exception&) {
+        poll(&wakeUp, 1, untilNextAttempt);
+    }
+    if (wakeUp.revents != 0) {
+        eventfd_t ignored = 0;
+        eventfd_read(wakeUp_.get(), &ignored);
+    }
+}
+
+int AgentThread::prepareWait() {
     constexpr int untilReaped = 5;
-    std::vector<pollfd> polled{{wakeUp_.get(), POLLIN, 0}};
+    polled_.assign(1, {wakeUp_.get(), POLLIN, 0});
     auto next = AgentLink::Clock::time_point::max();
     for (const auto& link : links_) {
-        if (const auto wanted = link->polled(); wanted.fd >= 0) polled.push_back(wanted);
+        if (const auto wanted = link->polled(); wanted.fd >= 0) polled_.push_back(wanted);
         next = std::min(next, link->nextDeadline());
     }
     int milliseconds = -1;
@@ -112,12 +135,8 @@ void AgentThread::wait() {
         const auto left = std::chrono::ceil<std::chrono::milliseconds>(next - AgentLink::Clock::now()).count();
         milliseconds = static_cast<int>(std::clamp<std::int64_t>(left, 0, std::numeric_limits<int>::max()));
     }
-    if (!unreaped_.empty()) milliseconds = milliseconds < 0 ? untilReaped : std::min(milliseconds, untilReaped);
-    poll(polled.data(), polled.size(), milliseconds);
-    if (polled.front().revents != 0) {
-        eventfd_t ignored = 0;
-        eventfd_read(wakeUp_.get(), &ignored);
-    }
+    if (unreaped_.empty()) return milliseconds;
+    return milliseconds < 0 ? untilReaped : std::min(milliseconds, untilReaped);
 }
 
 }  // namespace corvane

@@ -3,8 +3,10 @@
 #include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/ForkMark.h>
 
+#include <poll.h>
 #include <sys/types.h>
 
+#include <atomic>
 #include <functional>
 #include <memory>
 #include <mutex>
@@ -48,6 +50,11 @@ class AgentThread {
     bool takeInbox();
     void reapEnded();
     void wait();
+    int prepareWait();
+
+    // For the exit handler. A child may be forked off while shared() makes the thread; its handler would wait there for
+    // a thread that only the parent has.
+    static std::atomic<AgentThread*> instance_;
 
     const ForkMark made_;
     Descriptor wakeUp_;
@@ -59,6 +66,7 @@ class AgentThread {
 
     // The thread's own.
     std::vector<std::shared_ptr<AgentLink>> links_;
+    std::vector<pollfd> polled_;
     std::vector<pid_t> unreaped_;
     std::set<std::string> acknowledged_;
 };

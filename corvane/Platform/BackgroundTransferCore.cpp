@@ -6,6 +6,7 @@
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/PrivateFile.h>
+#include <corvane/Platform/TransferError.h>
 #include <corvane/Platform/TransferSubmission.h>
 
 #include <algorithm>
@@ -24,12 +25,19 @@ std::vector<std::string> wakeCommand(const TransferSessionConfiguration& configu
     return configuration.relaunchesForEvents ? options.wakeCommand : std::vector<std::string>();
 }
 
+TransferOutcome takenBack() {
+    TransferOutcome made;
+    made.errorCode = static_cast<std::int64_t>(TransferError::Code::network);
+    made.errorText = "another process has taken the transfer over";
+    return made;
+}
+
 }  // namespace
 
 BackgroundTransferCore::BackgroundTransferCore(TransferSessionConfiguration configuration,
                                                std::weak_ptr<TransferSessionDelegate> delegate,
                                                std::shared_ptr<SerialQueue> queue, TransferAgentOptions options)
-    : configuration_(std::move(configuration)),
+    : configuration_(InProcessTransferSession::resolved(std::move(configuration))),
       delegate_(std::move(delegate)),
       queue_(std::move(queue)),
       options_(std::move(options)) {}
@@ -51,6 +59,8 @@ void BackgroundTransferCore::open() {
 }
 
 std::shared_ptr<AgentLink> BackgroundTransferCore::makeLink(const std::filesystem::path& program) {
+    TransferSubmission::checkNames(configuration_.identifier, configuration_.ownerKey,
+                                   wakeCommand(configuration_, options_));
     directory_.emplace(options_.directory.empty() ? DocumentsDirectory::create() / folder : options_.directory);
     return std::make_shared<AgentLink>(*directory_, program, options_,
                                        agent::Hello{.session = configuration_.identifier,
@@ -76,10 +86,14 @@ void BackgroundTransferCore::close() {
 // An agent that is killed before it reads an acknowledgement finds the mark, so that the next session is not told
 // again.
 void BackgroundTransferCore::leave() {
+    processEnds();
+    link_->close();
+}
+
+void BackgroundTransferCore::processEnds() {
     for (const auto& token : reported_) {
         if (acknowledged().contains(token)) directory_->withdraw(token);
     }
-    link_->close();
 }
 
 std::optional<std::string> BackgroundTransferCore::description() const {
@@ -135,7 +149,9 @@ std::string BackgroundTransferCore::submission(const Task& task) const {
                               .file = task.file().string(),
                               .limits = configuration_.limits,
                               .patience = options_.patience,
-                              .wakeCommand = wakeCommand(configuration_, options_)}
+                              .wakeCommand = wakeCommand(configuration_, options_),
+                              .trustedCertificates = configuration_.trustedCertificates.string(),
+                              .proxy = TransferProxy::ofEnvironment(task.request().url)}
         .encoded();
 }
 
@@ -156,8 +172,17 @@ bool BackgroundTransferCore::mayBecomeReady() const {
     return agentUsable_;
 }
 
+// The agent may have failed since the task was given to it: nobody would take the task back then. One that was taken
+// back while its submission was being written leaves that behind.
 void BackgroundTransferCore::submitted(const std::string& token) {
-    if (const auto task = find(token)) submit(*task);
+    const auto task = find(token);
+    if (task ? task->isKeptBy(Keeper::process) : acknowledged().contains(token)) {
+        directory_->withdraw(token);
+    } else if (task && mayBecomeReady()) {
+        submit(*task);
+    } else if (task) {
+        takeBack(task, nullptr);
+    }
     watch();
 }
 
@@ -168,8 +193,19 @@ void BackgroundTransferCore::submit(const Task& task) {
     link_->send(agent::Submit{task.token()}, 1);
 }
 
+// A task that cannot be started inside the process either has failed: nobody else would end it.
 void BackgroundTransferCore::takeOver(const std::shared_ptr<Task>& task) {
     if (!task->moveTo(Keeper::process)) return;
+    try {
+        startInside(task);
+    } catch (...) {
+        queue_->async([self = shared_from_this(), task, error = AnyError::current()] {
+            self->finish(*task, &TransferSessionDelegate::taskDidComplete, error, std::nullopt);
+        });
+    }
+}
+
+void BackgroundTransferCore::startInside(const std::shared_ptr<Task>& task) {
     std::shared_ptr<TransferTask> inner;
     {
         std::lock_guard lock(mutex_);
@@ -193,6 +229,10 @@ void BackgroundTransferCore::takeBack(const std::shared_ptr<Task>& task, const c
 }
 
 void BackgroundTransferCore::describe(std::string token, std::string description) {
+    if (description.size() > TransferSubmission::longestDescription) {
+        Log::shared().error("Description is too long for the transfer agent, which keeps the one before");
+        return;
+    }
     AgentThread::shared().post(
         [self = shared_from_this(), token = std::move(token), description = std::move(description)] {
             self->link_->send(agent::Describe{token, description}, 0);
@@ -288,10 +328,7 @@ void BackgroundTransferCore::missed(const std::vector<AgentLink::Task>& listed) 
         const bool isMissing = task->isKeptBy(Keeper::agent) && task->isAccepted() && !known.contains(task->token()) &&
                                !isReported(task->token());
         if (isMissing && task->isOfThisRun()) takeBack(task, "the agent has lost it");
-        if (isMissing && !task->isOfThisRun()) {
-            task->setCompleted();
-            remove(*task);
-        }
+        if (isMissing && !task->isOfThisRun()) endElsewhere(task, takenBack());
     }
 }
 
@@ -322,13 +359,50 @@ void BackgroundTransferCore::agentCompleted(const AgentLink::Task& completed, co
         link_->send(agent::Acknowledge{completed.token}, 1);
         return;
     }
-    if (!reported_.insert(completed.token).second) return;  // the report waits in the queue
+    if (reported_.contains(completed.token)) return;  // the report waits in the queue
     auto task = find(completed.token);
     if (!task) task = adopt(completed);
-    if (!task || task->isKeptBy(Keeper::process)) return acknowledge(completed.token);  // reported by the process
-    queue_->async([self = shared_from_this(), task = std::move(task), outcome] {
-        if (!self->finish(*task, outcome.error(), outcome.response)) return;  // it stays for the next session
+    if (!task || task->isKeptBy(Keeper::process)) {  // reported by the process
+        reported_.insert(completed.token);
+        return acknowledge(completed.token);
+    }
+    enqueueReport(completed.token, [self = shared_from_this(), task = std::move(task), outcome] {
+        // One that nobody was told of stays for the next session.
+        if (!self->finish(*task, &TransferSessionDelegate::taskDidComplete, outcome.error(), outcome.response)) return;
         AgentThread::shared().post([self, token = task->token()] { self->acknowledge(token); });
+    });
+}
+
+// The row and the payload are the business of the process that reported it; whoever waits here is to wait no longer.
+void BackgroundTransferCore::agentEndedElsewhere(const AgentLink::Task& ended,
+                                                 const std::optional<TransferOutcome>& outcome) {
+    if (reported_.contains(ended.token)) return;
+    auto task = find(ended.token);
+    if (!task && !acknowledged().contains(ended.token)) task = adopt(ended);
+    if (task && task->isKeptBy(Keeper::agent)) endElsewhere(std::move(task), outcome.value_or(takenBack()));
+}
+
+// Without memory for the report it is as if the agent had said nothing; it does so again on the next connection.
+void BackgroundTransferCore::enqueueReport(const std::string& token, std::function<void()> report) {
+    const auto noted = reported_.insert(token).first;
+    try {
+        queue_->async(std::move(report));
+    } catch (...) {
+        reported_.erase(noted);
+        throw;
+    }
+}
+
+// Reported from now on: the agent may refuse a submission that it has had, been told of and forgotten.
+void BackgroundTransferCore::endElsewhere(std::shared_ptr<Task> task, const TransferOutcome& outcome) {
+    if (reported_.contains(task->token())) return;
+    const std::string name = task->token();
+    enqueueReport(name, [self = shared_from_this(), task = std::move(task), outcome] {
+        self->finish(*task, &TransferSessionDelegate::taskDidEndElsewhere, outcome.error(), outcome.response);
+        AgentThread::shared().post([self, token = task->token()] {
+            self->reported_.erase(token);
+            self->watch();
+        });
     });
 }
 
@@ -358,8 +432,8 @@ void BackgroundTransferCore::agentFailed() {
         agentUsable_ = false;
         restUntil_ = Clock::now() + options_.holdOff;
     }
-    for (const auto& task : openTasks()) {
-        if (!isReported(task->token())) takeBack(task, nullptr);
+    for (const auto& task : openTasks()) {  // one that there is no memory for stays the agent's
+        if (!isReported(task->token())) callHost("transfer agent link", [&] { takeBack(task, nullptr); });
     }
     for (auto& [question, listing] : listings_) answer(std::move(listing));
     listings_.clear();
@@ -388,13 +462,13 @@ void BackgroundTransferCore::taskDidComplete(const TransferTask& inner, const st
                                              const std::optional<TransferResponse>& response) {
     const auto task = tookOver(inner);
     if (!task) return;
-    finish(*task, error, response);
+    finish(*task, &TransferSessionDelegate::taskDidComplete, error, response);
     std::lock_guard lock(mutex_);
     takenOver_.erase(inner.identifier());
 }
 
 // On the queue. Returns whether the delegate was told.
-bool BackgroundTransferCore::finish(Task& task, const std::optional<AnyError>& error,
+bool BackgroundTransferCore::finish(Task& task, Ending ending, const std::optional<AnyError>& error,
                                     const std::optional<TransferResponse>& response) {
     const auto told = listener();
     if (!told) return false;
@@ -406,7 +480,7 @@ bool BackgroundTransferCore::finish(Task& task, const std::optional<AnyError>& e
         Task& task;
         BackgroundTransferCore& core;
     } completed{task, *this};
-    callHost("transfer session delegate", [&] { told->taskDidComplete(task, error, response); });
+    callHost("transfer session delegate", [&] { (*told.*ending)(task, error, response); });
     return true;
 }
 

@@ -9,6 +9,7 @@
 
 #include <chrono>
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -57,8 +58,10 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     void agentProgressed(const std::string& token, std::int64_t total, std::int64_t expected) override;
     void agentCompleted(const AgentLink::Task& task, const TransferOutcome& outcome) override;
     void agentForgot(const std::string& token) override;
+    void agentEndedElsewhere(const AgentLink::Task& task, const std::optional<TransferOutcome>& outcome) override;
     void agentFlushed() override;
     void agentFailed() override;
+    void processEnds() override;
 
     // What the session inside the process says of the tasks that it took over.
     void taskDidSendBodyData(const TransferTask& inner, std::int64_t sent, std::int64_t total,
@@ -81,6 +84,7 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     void submitted(const std::string& token);
     void submit(const Task& task);
     void takeOver(const std::shared_ptr<Task>& task);
+    void startInside(const std::shared_ptr<Task>& task);
     void takeBack(const std::shared_ptr<Task>& task, const char* why);
     void missed(const std::vector<AgentLink::Task>& listed);
     void listed(const std::vector<AgentLink::Task>& listed);
@@ -90,7 +94,12 @@ class BackgroundTransferCore final : public AgentLink::Listener,
     void signal();
     void acknowledge(const std::string& token);
     void watch();
-    bool finish(Task& task, const std::optional<AnyError>& error, const std::optional<TransferResponse>& response);
+    void enqueueReport(const std::string& token, std::function<void()> report);
+    void endElsewhere(std::shared_ptr<Task> task, const TransferOutcome& outcome);
+    using Ending = void (TransferSessionDelegate::*)(const TransferTask&, const std::optional<AnyError>&,
+                                                     const std::optional<TransferResponse>&);
+    bool finish(Task& task, Ending ending, const std::optional<AnyError>& error,
+                const std::optional<TransferResponse>& response);
 
     [[nodiscard]] Tasks openTasks() const;
     [[nodiscard]] std::shared_ptr<Task> find(const std::string& token) const;

@@ -21,9 +21,12 @@ namespace corvane {
 /// and the tasks of this session go on inside the process; the agent is told to leave them alone, so that only one that
 /// it had started sending already can arrive twice. Tasks of earlier runs stay the agent's.
 ///
-/// A server that cannot be reached does not fail a task at once: the agent tries again with growing delays, for as
-/// long as the options' patience. Other failures and answers are reported as they come. Otherwise see
-/// `TransferSession`, and `InProcessTransferSession` for redirects, certificates and proxies.
+/// A server that cannot be reached, or that the way to is blocked (see `TransferError`), does not fail a task at once:
+/// an error is logged when that begins, and the agent tries again with growing delays, for as long as the options'
+/// patience. Other failures and answers are reported as they come. Of several sessions of one identifier and owner key,
+/// in several processes, one is told of a task's end as its completion, and the others by `taskDidEndElsewhere`. What
+/// is handed over (URL, headers, proxy) lies in the agent's directory, readable by the user alone, until it is through.
+/// Otherwise see `TransferSession`, and `InProcessTransferSession` for redirects, certificates and proxies.
 ///
 ///     TransferSession::setFactory(BackgroundTransferSession::factory({.wakeCommand = {"/usr/bin/player",
 ///     "--woken"}}));

@@ -1,7 +1,5 @@
 #include <corvane/Platform/CurlTransfer.h>
 
-#include <corvane/Platform/TransferError.h>
-
 #include <curl/curl.h>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -35,18 +33,31 @@ std::string part(CURLU* url, CURLUPart which) {
     return text;
 }
 
+std::string lowerCase(std::string text) {
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+    return text;
+}
+
+// For messages: a user and a password are nobody's business.
+std::string withoutUser(const std::string& url) {
+    const auto slashes = url.find("//");
+    const auto start = slashes == std::string::npos ? 0 : slashes + 2;
+    const auto at = url.rfind('@', url.find_first_of("/?#", start));
+    return at == std::string::npos || at < start ? url : url.substr(0, start) + url.substr(at + 1);
+}
+
 URLParts parse(const std::string& text) {
     const std::unique_ptr<CURLU, decltype(&curl_url_cleanup)> url(curl_url(), curl_url_cleanup);
     if (!url) throw std::bad_alloc();
     if (text.find('\0') != std::string::npos || curl_url_set(url.get(), CURLUPART_URL, text.c_str(), 0) != CURLUE_OK) {
-        throw TransferError(Code::invalidRequest, "the URL cannot be used: " + text);
+        throw TransferError(Code::invalidRequest, "the URL cannot be used: " + withoutUser(text));
     }
     URLParts parts{part(url.get(), CURLUPART_SCHEME), part(url.get(), CURLUPART_HOST), part(url.get(), CURLUPART_PORT)};
     if (parts.scheme != "http" && parts.scheme != "https") {
-        throw TransferError(Code::invalidRequest, "the URL is neither http nor https: " + text);
+        throw TransferError(Code::invalidRequest, "the URL is neither http nor https: " + withoutUser(text));
     }
-    std::transform(parts.host.begin(), parts.host.end(), parts.host.begin(),
-                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+    parts.host = lowerCase(std::move(parts.host));
     return parts;
 }
 
@@ -59,10 +70,6 @@ bool isToken(std::string_view text) {
         return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
                std::string_view("!#$%&'*+-.^_`|~").find(c) != std::string_view::npos;
     });
-}
-
-bool equalIgnoringCase(std::string_view a, std::string_view b) {
-    return curl_strnequal(a.data(), b.data(), std::min(a.size(), b.size())) && a.size() == b.size();
 }
 
 std::string_view trimmed(std::string_view text) {
@@ -148,7 +155,8 @@ void CurlTransfer::setOptions(const HTTPTransfer& transfer) {
     curl_easy_setopt(easy, CURLOPT_CONNECTTIMEOUT_MS, static_cast<long>(limits_.timeWithoutProgress.count()));
     curl_easy_setopt(easy, CURLOPT_ERRORBUFFER, errorText_);
     curl_easy_setopt(easy, CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
-    if (isLoopback(url.host)) curl_easy_setopt(easy, CURLOPT_PROXY, "");
+    setTrust(transfer.trustedCertificates);
+    setProxy(transfer.proxy, url.host);
 
     curl_easy_setopt(easy, CURLOPT_HTTPHEADER, static_cast<curl_slist*>(headerList_.get()));
     curl_easy_setopt(easy, CURLOPT_HEADERFUNCTION, &headerArrived);
@@ -165,6 +173,25 @@ void CurlTransfer::setOptions(const HTTPTransfer& transfer) {
     curl_easy_setopt(easy, CURLOPT_READDATA, this);
     curl_easy_setopt(easy, CURLOPT_SEEKFUNCTION, &seekBody);
     curl_easy_setopt(easy, CURLOPT_SEEKDATA, this);
+}
+
+// libcurl looks at both places, so the one that is not meant is cleared.
+void CurlTransfer::setTrust(const std::filesystem::path& certificates) {
+    if (certificates.empty()) return;
+    std::error_code failed;
+    const bool isDirectory = std::filesystem::is_directory(certificates, failed);
+    const char* file = isDirectory ? nullptr : certificates.c_str();
+    const char* directory = isDirectory ? certificates.c_str() : nullptr;
+    for (const auto option : {CURLOPT_CAINFO, CURLOPT_PROXY_CAINFO}) curl_easy_setopt(easy_.get(), option, file);
+    for (const auto option : {CURLOPT_CAPATH, CURLOPT_PROXY_CAPATH}) curl_easy_setopt(easy_.get(), option, directory);
+    curl_easy_setopt(easy_.get(), CURLOPT_CA_CACHE_TIMEOUT, 0L);  // a file that is replaced counts from then on
+}
+
+// Both are set in any case: what is left out libcurl would look for in the environment.
+void CurlTransfer::setProxy(const TransferProxy& proxy, const std::string& host) {
+    if (!isLoopback(host)) proxy_ = proxy.url;
+    curl_easy_setopt(easy_.get(), CURLOPT_PROXY, proxy_.c_str());
+    curl_easy_setopt(easy_.get(), CURLOPT_NOPROXY, proxy.exceptions.c_str());
 }
 
 void CurlTransfer::update(Clock::time_point now) {
@@ -191,23 +218,66 @@ void CurlTransfer::update(Clock::time_point now) {
     }
     if (sent > reported_) {
         reported_ = sent;
+        reportSent(sent);
+    }
+}
+
+// Without memory for the report the transfer goes on; a later one says all.
+void CurlTransfer::reportSent(std::int64_t sent) const noexcept {
+    try {
         if (didSend_) didSend_(sent, bodySize_);
+    } catch (...) {
     }
 }
 
 std::optional<AnyError> CurlTransfer::error(int curlCode) const {
+    if (curlCode == CURLE_OK && isProxyRefusal()) {
+        return AnyError(TransferError(Code::blocked, "the proxy wants to know who asks (407)"));
+    }
     if (curlCode == CURLE_OK || capReached_) return std::nullopt;
     if (!bodyProblem_.empty()) return AnyError(TransferError(Code::bodyUnavailable, bodyProblem_));
     if (curlCode == CURLE_OPERATION_TIMEDOUT) return timeoutError();
-    std::string text = curl_easy_strerror(static_cast<CURLcode>(curlCode));
-    if (errorText_[0]) text += std::string(": ") + errorText_;
-    return AnyError(TransferError(isConnected() ? Code::network : Code::unreachable, std::move(text)));
+    return AnyError(failure(curlCode));
 }
 
-bool CurlTransfer::isConnected() const {
+// What libcurl calls the failure decides, and not how long connecting took: that is 0 on a connection that is used
+// again.
+TransferError CurlTransfer::failure(int curlCode) const {
+    std::string text = curl_easy_strerror(static_cast<CURLcode>(curlCode));
+    if (errorText_[0]) text += std::string(": ") + errorText_;
+    for (auto at = std::string::npos; !proxy_.empty() && (at = text.find(proxy_)) != std::string::npos;) {
+        text.replace(at, proxy_.size(), "(hidden)");  // it may hold a password
+    }
+    switch (curlCode) {
+        case CURLE_COULDNT_RESOLVE_HOST:
+        case CURLE_COULDNT_RESOLVE_PROXY:
+        case CURLE_COULDNT_CONNECT:
+            return {Code::unreachable, std::move(text)};
+        case CURLE_PEER_FAILED_VERIFICATION:
+        case CURLE_SSL_CONNECT_ERROR:
+        case CURLE_SSL_CACERT_BADFILE:
+        case CURLE_SSL_ISSUER_ERROR:
+        case CURLE_SSL_INVALIDCERTSTATUS:
+        case CURLE_PROXY:
+            return {Code::blocked, std::move(text)};
+        default:
+            // Between the connection and the request there is the proxy's word, where there is a proxy.
+            return {proxy_.empty() || hasBegun() ? Code::network : Code::blocked, std::move(text)};
+    }
+}
+
+// The document's own exchange, behind name, connection, handshake and the way through a proxy.
+bool CurlTransfer::hasBegun() const {
     curl_off_t reached = 0;
-    curl_easy_getinfo(easy_.get(), CURLINFO_CONNECT_TIME_T, &reached);
+    curl_easy_getinfo(easy_.get(), CURLINFO_PRETRANSFER_TIME_T, &reached);
     return reached > 0;
+}
+
+// Through a proxy without a tunnel its answer looks like the server's, but for this one, which no server gives.
+bool CurlTransfer::isProxyRefusal() const {
+    constexpr int authenticationRequired = 407;
+    return !proxy_.empty() && headComplete_ && answer_.statusCode == authenticationRequired &&
+           spellings_.contains("proxy-authenticate");
 }
 
 std::optional<AnyError> CurlTransfer::timeoutError() const {
@@ -217,7 +287,7 @@ std::optional<AnyError> CurlTransfer::timeoutError() const {
             TransferError(Code::timedOut, "no answer came within " + std::to_string(limits_.answer.count()) + " ms"));
     }
     const std::string time = std::to_string(limits_.timeWithoutProgress.count()) + " ms";
-    if (!isConnected()) return AnyError(TransferError(Code::unreachable, "no connection was made for " + time));
+    if (!hasBegun()) return AnyError(TransferError(Code::unreachable, "no connection was made for " + time));
     return AnyError(TransferError(Code::timedOut, "nothing was sent or received for " + time));
 }
 
@@ -229,6 +299,7 @@ std::optional<TransferResponse> CurlTransfer::response() const {
 void CurlTransfer::takeHeader(std::string_view line) {
     if (line.starts_with("HTTP/")) {  // also after an interim answer
         answer_ = {};
+        spellings_.clear();
         headComplete_ = false;
     } else if (headComplete_) {
         return;  // a trailer
@@ -238,15 +309,13 @@ void CurlTransfer::takeHeader(std::string_view line) {
         answer_.statusCode = status;
         headComplete_ = status >= 200;
     } else if (const auto colon = line.find(':'); colon != std::string_view::npos) {
-        const auto name = line.substr(0, colon);
+        const std::string name(line.substr(0, colon));
         const auto value = trimmed(line.substr(colon + 1));
-        const auto known = std::find_if(answer_.headers.begin(), answer_.headers.end(),
-                                        [&](const auto& header) { return equalIgnoringCase(header.first, name); });
-        if (known == answer_.headers.end()) {
-            answer_.headers.emplace(name, value);
-        } else {
-            known->second.append(", ").append(value);
-        }
+        // Looked up, and not searched for: a head of many fields must not keep the thread from everything else.
+        const auto [known, isNew] = spellings_.try_emplace(lowerCase(name), name);
+        std::string& values = answer_.headers[known->second];
+        if (!isNew) values.append(", ");
+        values.append(value);
     }
 }
 

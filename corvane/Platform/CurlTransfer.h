@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/HTTPTransfer.h>
+#include <corvane/Platform/TransferError.h>
 
 #include <algorithm>
 #include <chrono>
@@ -9,6 +10,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <functional>
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
@@ -54,9 +56,14 @@ class CurlTransfer {
         void operator()(void* list) const noexcept;
     };
     void openBody(const std::filesystem::path& file, bool mustBeOwn);
-    [[nodiscard]] bool isConnected() const;
+    void setTrust(const std::filesystem::path& certificates);
+    void setProxy(const TransferProxy& proxy, const std::string& host);
+    [[nodiscard]] bool hasBegun() const;
+    [[nodiscard]] TransferError failure(int curlCode) const;
+    [[nodiscard]] bool isProxyRefusal() const;
     void setHeaders(const TransferRequest& request);
     void setOptions(const HTTPTransfer& transfer);
+    void reportSent(std::int64_t sent) const noexcept;
     void takeHeader(std::string_view line);
 
     static std::size_t readBody(char* buffer, std::size_t size, std::size_t count, void* self) noexcept;
@@ -67,6 +74,7 @@ class CurlTransfer {
     // Constant after construction.
     const TransferLimits limits_;
     const std::function<void(std::int64_t, std::int64_t)> didSend_;
+    std::string proxy_;  // empty when there is none
     Descriptor body_;
     std::int64_t bodySize_ = 0;
     std::unique_ptr<void, HeaderListDeleter> headerList_;
@@ -78,6 +86,7 @@ class CurlTransfer {
     Clock::time_point answerDeadline_ = Clock::time_point::max();
     std::string bodyProblem_;
     TransferResponse answer_;
+    std::map<std::string, std::string> spellings_;  // of its header fields' names, by their lower case
     std::size_t headerBytes_ = 0;
     std::size_t answerBytes_ = 0;
     bool headComplete_ = false;

@@ -16,6 +16,9 @@ class ForkMark {
     /// Whether this process was forked off after the mark was made.
     [[nodiscard]] bool isInChild() const noexcept { return generation_ != current_.load(std::memory_order_relaxed); }
 
+    /// For the system: called in every child.
+    static void countChild() noexcept;
+
   private:
     static std::atomic<unsigned> current_;
     unsigned generation_;

@@ -49,6 +49,7 @@ void HTTPSession::get(std::string url, Completion completion) {
     transfer.request.url = std::move(url);
     transfer.request.method = "GET";
     transfer.limits = limits_;
+    transfer.proxy = TransferProxy::ofEnvironment(transfer.request.url);
     transfer.pool = pool_;
     transfer.didComplete = [queue = queue_, completion = std::move(completion)](
                                std::optional<AnyError> error, std::optional<TransferResponse> response) {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Platform/Error.h>
+#include <corvane/Platform/TransferProxy.h>
 #include <corvane/Platform/TransferRequest.h>
 #include <corvane/Platform/TransferResponse.h>
 #include <corvane/Platform/TransferSessionConfiguration.h>
@@ -22,6 +23,9 @@ struct HTTPTransfer {
     /// Whether the body is sent only from a file of the process's own user that is no symbolic link.
     bool bodyMustBeOwn = false;
     TransferLimits limits;
+    TransferProxy proxy;
+    /// As in `TransferSessionConfiguration`; empty for the system's certificates.
+    std::filesystem::path trustedCertificates;
     /// Transfers of one pool share the limit per host.
     std::string pool;
     /// The bytes of the body that have gone out so far and its size, whenever the first has grown. May be empty.

@@ -14,9 +14,9 @@ namespace corvane {
 // has them and a task that nobody else holds goes on. Nothing is ever called with the mutex held.
 class InProcessTransferSession::Core final : public std::enable_shared_from_this<Core> {
   public:
-    Core(const TransferLimits& transferLimits, std::weak_ptr<TransferSessionDelegate> delegate,
+    Core(TransferSessionConfiguration opened, std::weak_ptr<TransferSessionDelegate> delegate,
          std::shared_ptr<SerialQueue> callbackQueue)
-        : limits(transferLimits), queue(std::move(callbackQueue)), delegate_(std::move(delegate)) {}
+        : configuration(std::move(opened)), queue(std::move(callbackQueue)), delegate_(std::move(delegate)) {}
 
     std::shared_ptr<UploadTask> add(TransferRequest request, std::filesystem::path file);
     void remove(std::int64_t identifier);
@@ -34,7 +34,7 @@ class InProcessTransferSession::Core final : public std::enable_shared_from_this
         description_ = std::move(description);
     }
 
-    const TransferLimits limits;
+    const TransferSessionConfiguration configuration;
     const std::shared_ptr<SerialQueue> queue;
 
   private:
@@ -108,7 +108,9 @@ HTTPTransfer InProcessTransferSession::UploadTask::transfer(const std::shared_pt
     HTTPTransfer transfer;
     transfer.request = std::move(request_);
     transfer.bodyFile = std::move(file_);
-    transfer.limits = core->limits;
+    transfer.limits = core->configuration.limits;
+    transfer.proxy = TransferProxy::ofEnvironment(transfer.request.url);
+    transfer.trustedCertificates = core->configuration.trustedCertificates;
     transfer.pool = "upload";
     transfer.didSend = [self = weak_from_this(), weakCore = core_](std::int64_t total, std::int64_t expected) {
         const auto task = self.lock();
@@ -222,11 +224,18 @@ TransferSession::Factory InProcessTransferSession::factory() {
     };
 }
 
+TransferSessionConfiguration InProcessTransferSession::resolved(TransferSessionConfiguration configuration) {
+    std::error_code failed;
+    auto absolute = std::filesystem::absolute(configuration.trustedCertificates, failed);
+    if (!configuration.trustedCertificates.empty() && !failed) configuration.trustedCertificates = std::move(absolute);
+    return configuration;
+}
+
 InProcessTransferSession::InProcessTransferSession(const TransferSessionConfiguration& configuration,
                                                    std::weak_ptr<TransferSessionDelegate> delegate,
                                                    std::shared_ptr<SerialQueue> queue)
     : core_(std::make_shared<Core>(
-          configuration.limits, std::move(delegate),
+          resolved(configuration), std::move(delegate),
           queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session"))) {}
 
 InProcessTransferSession::~InProcessTransferSession() {

@@ -14,12 +14,15 @@ namespace corvane {
 ///
 /// What the configuration says of sharing, relaunching and discretion has no meaning here, and no task of an earlier
 /// run is ever listed: a transfer ends with its session or its process, and its owner sends the file again. Redirects
-/// are not followed, certificates are verified, and proxies are those of the environment except for loopback addresses.
-/// Otherwise see `TransferSession`.
+/// are not followed, certificates are verified, and proxies are those of the environment when a task is resumed, except
+/// for loopback addresses. Otherwise see `TransferSession`.
 class CORVANE_EXPORT InProcessTransferSession final : public TransferSession {
   public:
     /// Opens sessions of this kind, for `TransferSession::setFactory`.
     [[nodiscard]] static Factory factory();
+
+    /// The configuration with its paths made absolute: the host's working directory may change.
+    [[nodiscard]] static TransferSessionConfiguration resolved(TransferSessionConfiguration configuration);
 
     /// An empty `queue` means one of the session's own.
     InProcessTransferSession(const TransferSessionConfiguration& configuration,

@@ -35,8 +35,14 @@ struct TransferAgentOptions {
     /// delay doubles with every failure, up to 5 minutes.
     std::chrono::milliseconds retryDelay = std::chrono::seconds(1);
 
-    /// How long a task may wait for a server that cannot be reached before it fails with `TransferError` unreachable.
+    /// How long a task may wait for a server that cannot be reached, or that the way to is blocked, before it fails
+    /// with `TransferError` unreachable or blocked.
     std::chrono::milliseconds patience = std::chrono::hours(24);
+
+    /// How long an agent that this process starts goes on trying with no host connected, when no server that it has
+    /// uploads for can be reached. It then ends; its tasks stay in its journal, and the next host that starts it goes
+    /// on with them.
+    std::chrono::milliseconds patienceWithoutHost = std::chrono::hours(1);
 };
 
 }  // namespace corvane

@@ -14,8 +14,10 @@ class CORVANE_EXPORT TransferError : public Error {
         invalidRequest,   ///< the URL or a header cannot be sent; another attempt ends the same way
         bodyUnavailable,  ///< the body file is missing, not readable, or changed its size while it was sent
         timedOut,         ///< no byte went either way for as long as the limits allow
-        network,          ///< no trust, or the connection broke
+        network,          ///< the connection broke
         unreachable,      ///< no name or no connection: nothing was sent
+        blocked,          ///< no trusted connection: a certificate that does not verify, a TLS handshake that fails, or
+                          ///< a proxy that refuses; nothing of the body reached the server
     };
 
     TransferError(Code code, std::string message);

@@ -10,7 +10,15 @@ namespace corvane {
 
 namespace {
 using Code = TransferError::Code;
-constexpr auto lastCode = static_cast<std::int64_t>(Code::unreachable);
+constexpr auto lastCode = static_cast<std::int64_t>(Code::blocked);
+// Fits into a message with the longest description that a submission can have.
+constexpr std::size_t longestHeaders = std::size_t{192} * 1024;
+
+std::size_t encodedSize(const std::map<std::string, std::string>& headers) {
+    std::size_t size = 0;
+    for (const auto& [name, value] : headers) size += name.size() + value.size() + 8;
+    return size;
+}
 }  // namespace
 
 TransferOutcome TransferOutcome::of(const std::optional<AnyError>& error, std::optional<TransferResponse> response) {
@@ -21,12 +29,15 @@ TransferOutcome TransferOutcome::of(const std::optional<AnyError>& error, std::o
         made.errorText = error->what();
     }
     made.response = std::move(response);
+    // A head of many short fields takes more room than it came in; the status is what counts.
+    if (made.response && encodedSize(made.response->headers) > longestHeaders) made.response->headers.clear();
     return made;
 }
 
 std::optional<AnyError> TransferOutcome::error() const {
     if (!errorCode) return std::nullopt;
-    return AnyError(TransferError(static_cast<Code>(*errorCode), errorText));
+    const bool isKnown = *errorCode >= 0 && *errorCode <= lastCode;  // or else of a later agent's
+    return AnyError(TransferError(isKnown ? static_cast<Code>(*errorCode) : Code::network, errorText));
 }
 
 std::string TransferOutcome::encoded() const {
@@ -34,6 +45,13 @@ std::string TransferOutcome::encoded() const {
     write(errorCode, errorText, response.has_value());
     if (response) write(response->isHTTP, response->statusCode, response->headers);
     return write.take();
+}
+
+TransferOutcome TransferOutcome::unreadable() {
+    TransferOutcome made;
+    made.errorCode = static_cast<std::int64_t>(Code::network);
+    made.errorText = "how the transfer ended can no longer be read";
+    return made;
 }
 
 TransferOutcome TransferOutcome::decode(std::string_view bytes) {
@@ -44,10 +62,6 @@ TransferOutcome TransferOutcome::decode(std::string_view bytes) {
     if (answered) {
         auto& response = made.response.emplace();
         read(response.isHTTP, response.statusCode, response.headers);
-    }
-    read.finish();
-    if (made.errorCode && (*made.errorCode < 0 || *made.errorCode > lastCode)) {
-        throw InvalidArgument("the error of the outcome is unknown");
     }
     return made;
 }

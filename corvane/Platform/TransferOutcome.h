@@ -23,8 +23,10 @@ struct TransferOutcome {
     [[nodiscard]] std::optional<AnyError> error() const;
 
     [[nodiscard]] std::string encoded() const;
-    /// Throws `InvalidArgument` for bytes that are no outcome.
+    /// Throws `InvalidArgument` for bytes that are no outcome; what a later version has appended is left alone.
     [[nodiscard]] static TransferOutcome decode(std::string_view bytes);
+    /// In place of one that cannot be decoded: a failure, so that its task is tried again.
+    [[nodiscard]] static TransferOutcome unreadable();
 };
 
 }  // namespace corvane

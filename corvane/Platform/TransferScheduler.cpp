@@ -1,13 +1,15 @@
 #include <corvane/Platform/TransferScheduler.h>
 
-#include <corvane/Platform/Log.h>
+#include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/OpenSSLUse.h>
 
 #include <curl/curl.h>
 #include <openssl/crypto.h>
 #include <poll.h>
+#include <sys/eventfd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <chrono>
 #include <limits>
 #include <new>
@@ -17,12 +19,20 @@ namespace corvane {
 
 namespace {
 
-void report(const HTTPTransfer& transfer, std::optional<AnyError> error, std::optional<TransferResponse> response) {
-    try {
-        transfer.didComplete(std::move(error), std::move(response));
-    } catch (...) {
-        Log::shared().error("Transfer could not be reported, error=%{public}@", AnyError::current().what());
-    }
+void report(const HTTPTransfer& transfer, const std::optional<AnyError>& error,
+            const std::optional<TransferResponse>& response) {
+    transfer.didComplete(error, response);
+}
+
+// A transfer that never ends would be worse than one whose ending there is no memory for.
+void reportFailure(const HTTPTransfer& transfer) noexcept {
+    callHost("transfer completion", [&] { report(transfer, AnyError::current(), std::nullopt); });
+}
+
+// A wait that the system refuses (no memory, a lowered limit of descriptors) must not become a spin.
+void rest(int milliseconds) {
+    constexpr int longest = 50;
+    poll(nullptr, 0, std::clamp(milliseconds, 0, longest));
 }
 
 }  // namespace
@@ -31,7 +41,8 @@ void TransferScheduler::MultiDeleter::operator()(void* multi) const noexcept {
     curl_multi_cleanup(multi);
 }
 
-TransferScheduler::TransferScheduler() {
+TransferScheduler::TransferScheduler() : wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
+    if (!wakeUp_) throw SystemError("make an event descriptor", errno);
     // Whatever registers handlers of its own for the exit comes first, so that those of the scheduler's owner run
     // before them.
     OpenSSLUse::initialize();
@@ -53,7 +64,7 @@ void TransferScheduler::start(Ticket ticket, HTTPTransfer transfer) {
         hosts_[host].waiting.push_back(std::move(arrived));
         startWaiting(host);
     } catch (...) {
-        report(arrived.transfer, AnyError::current(), std::nullopt);
+        reportFailure(arrived.transfer);
     }
 }
 
@@ -66,13 +77,17 @@ void TransferScheduler::perform() {
 
 void TransferScheduler::wait(std::span<pollfd> others, int milliseconds) {
     std::vector<curl_waitfd> extra;
-    extra.reserve(others.size());
+    extra.reserve(others.size() + 1);
     for (const auto& one : others) {
         const short events = static_cast<short>((one.events & POLLIN ? CURL_WAIT_POLLIN : 0) |
                                                 (one.events & POLLOUT ? CURL_WAIT_POLLOUT : 0));
         extra.push_back({one.fd, events, 0});
     }
-    curl_multi_poll(multi_.get(), extra.data(), static_cast<unsigned>(extra.size()), milliseconds, nullptr);
+    extra.push_back({wakeUp_.get(), CURL_WAIT_POLLIN, 0});
+    const auto count = static_cast<unsigned>(extra.size());
+    if (curl_multi_poll(multi_.get(), extra.data(), count, milliseconds, nullptr) != CURLM_OK) rest(milliseconds);
+    eventfd_t ignored = 0;
+    eventfd_read(wakeUp_.get(), &ignored);
     for (std::size_t i = 0; i < others.size(); ++i) {
         const short ready = extra[i].revents;
         others[i].revents =
@@ -81,19 +96,17 @@ void TransferScheduler::wait(std::span<pollfd> others, int milliseconds) {
 }
 
 void TransferScheduler::wakeUp() noexcept {
-    curl_multi_wakeup(multi_.get());
+    eventfd_write(wakeUp_.get(), 1);
 }
 
 // Those that wait go first, so that none of them gets the place of one that runs.
 void TransferScheduler::cancel(const std::set<Ticket>& tickets) {
     const auto dropped = [&tickets](const auto& one) { return tickets.contains(one.ticket); };
     for (auto& [name, host] : hosts_) std::erase_if(host.waiting, dropped);
-    std::set<std::string> freed;
     for (auto found = running_.end();
          (found = std::find_if(running_.begin(), running_.end(), dropped)) != running_.end();) {
-        freed.insert(takeOut(found).host);
+        startWaiting(takeOut(found).host);
     }
-    for (const auto& host : freed) startWaiting(host);
     std::erase_if(hosts_, [](const auto& host) { return !host.second.running && host.second.waiting.empty(); });
 }
 
@@ -110,12 +123,19 @@ void TransferScheduler::startWaiting(const std::string& name) {
 void TransferScheduler::startOne(const std::string& host, Waiting next) {
     try {
         auto curl = std::make_unique<CurlTransfer>(next.transfer);
+        makeRoom();
         if (curl_multi_add_handle(multi_.get(), curl->handle()) != CURLM_OK) throw std::bad_alloc();
         running_.push_back({next.ticket, host, std::move(next.transfer), std::move(curl)});
         ++hosts_[host].running;
     } catch (...) {
-        report(next.transfer, AnyError::current(), std::nullopt);
+        reportFailure(next.transfer);
     }
+}
+
+// So that nothing can fail once curl has the handle.
+void TransferScheduler::makeRoom() {
+    constexpr std::size_t least = 8;
+    if (running_.size() == running_.capacity()) running_.reserve(std::max(least, 2 * running_.size()));
 }
 
 // Takes a running transfer away from curl; the caller looks after those that waited for its place.
@@ -125,6 +145,14 @@ TransferScheduler::Running TransferScheduler::takeOut(std::vector<Running>::iter
     curl_multi_remove_handle(multi_.get(), ended.curl->handle());
     --hosts_[ended.host].running;
     return ended;
+}
+
+void TransferScheduler::finish(const Running& ended, const auto& error) noexcept {
+    try {
+        report(ended.transfer, error(), ended.curl->response());
+    } catch (...) {
+        reportFailure(ended.transfer);
+    }
 }
 
 void TransferScheduler::finishEnded() {
@@ -137,22 +165,19 @@ void TransferScheduler::finishEnded() {
         });
         if (found == running_.end()) continue;
         const Running ended = takeOut(found);
-        report(ended.transfer, ended.curl->error(code), ended.curl->response());
+        finish(ended, [&] { return ended.curl->error(code); });
         startWaiting(ended.host);
     }
 }
 
 void TransferScheduler::checkProgress() {
     const auto now = Clock::now();
-    std::vector<Ticket> late;
-    for (auto& one : running_) {
-        one.curl->update(now);
-        if (one.curl->deadline() <= now) late.push_back(one.ticket);
-    }
-    for (const Ticket ticket : late) {
-        const Running ended = takeOut(std::find_if(running_.begin(), running_.end(),
-                                                   [ticket](const Running& one) { return one.ticket == ticket; }));
-        report(ended.transfer, ended.curl->timeoutError(), ended.curl->response());
+    for (auto& one : running_) one.curl->update(now);
+    const auto isLate = [now](const Running& one) { return one.curl->deadline() <= now; };
+    for (auto late = running_.end();
+         (late = std::find_if(running_.begin(), running_.end(), isLate)) != running_.end();) {
+        const Running ended = takeOut(late);
+        finish(ended, [&] { return ended.curl->timeoutError(); });
         startWaiting(ended.host);
     }
 }

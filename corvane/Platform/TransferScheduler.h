@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Platform/CurlTransfer.h>
+#include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/HTTPTransfer.h>
 
 #include <cstdint>
@@ -32,7 +33,8 @@ class TransferScheduler {
     using Ticket = std::uint64_t;
     using Clock = CurlTransfer::Clock;
 
-    /// Sets libcurl up for the process. Throws `std::bad_alloc`.
+    /// Sets libcurl up for the process. Throws `std::bad_alloc`, and `SystemError` when there is no descriptor to be
+    /// had.
     TransferScheduler();
     TransferScheduler(const TransferScheduler&) = delete;
     TransferScheduler& operator=(const TransferScheduler&) = delete;
@@ -80,11 +82,14 @@ class TransferScheduler {
     };
 
     void startWaiting(const std::string& host);
+    void makeRoom();
     void startOne(const std::string& host, Waiting next);
+    static void finish(const Running& ended, const auto& error) noexcept;
     void finishEnded();
     void checkProgress();
     Running takeOut(std::vector<Running>::iterator position);
 
+    Descriptor wakeUp_;  // libcurl goes on without one of its own when the process has none left
     std::unique_ptr<void, MultiDeleter> multi_;
     std::map<std::string, Host> hosts_;
     std::vector<Running> running_;

@@ -23,6 +23,8 @@ Registry& registry() {
 
 TransferTask::~TransferTask() = default;
 TransferSessionDelegate::~TransferSessionDelegate() = default;
+void TransferSessionDelegate::taskDidEndElsewhere(const TransferTask&, const std::optional<AnyError>&,
+                                                  const std::optional<TransferResponse>&) {}
 TransferSession::~TransferSession() = default;
 
 void TransferSession::setFactory(Factory factory) {

@@ -36,8 +36,10 @@ struct TransferSessionConfiguration {
     /// Whether the host is to be started again, or woken, for the session's events.
     bool relaunchesForEvents = false;
     TransferLimits limits = {};
-    /// The authorities that a server's certificate may come from, in place of the system's: a file in PEM, or a
-    /// directory as OpenSSL's `rehash` makes one. Empty: the system's.
+    /// The authorities that a server's certificate may come from, in place of the system's: a file in PEM form, or a
+    /// directory as OpenSSL's c_rehash makes it. It is read when a connection is made, outside the process too, so it
+    /// must stay where it is; a relative path is made absolute when the session is opened. One that cannot be read
+    /// fails transfers as `TransferError` blocked. Empty: the system's authorities.
     std::filesystem::path trustedCertificates = {};
 };
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Platform/TransferProxy.h>
 #include <corvane/Platform/TransferRequest.h>
 #include <corvane/Platform/TransferSessionConfiguration.h>
 
@@ -8,6 +9,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace corvane {
@@ -30,9 +32,16 @@ struct TransferSubmission {
     std::chrono::milliseconds patience{};
     /// The program, with its arguments, that is run when events wait for a host that is not running; may be empty.
     std::vector<std::string> wakeCommand;
+    /// As in `TransferSessionConfiguration`, an absolute path; empty for the system's certificates.
+    std::string trustedCertificates = {};
+    /// Of the environment of the process that handed the upload over.
+    TransferProxy proxy = {};
+    /// Whatever else a later library has to say, by name. What an agent does not know it leaves alone.
+    std::vector<std::pair<std::string, std::string>> extras = {};
 
     [[nodiscard]] std::string encoded() const;
-    /// Throws `InvalidArgument` for bytes that are no submission, and for values that cannot be right.
+    /// Reads what version 1 wrote, too. Throws `InvalidArgument` for bytes that are no submission, and for values that
+    /// cannot be right.
     [[nodiscard]] static TransferSubmission decode(std::string_view bytes);
 
     /// A name that nobody has had: the time in 16 hexadecimal digits, so that names sort by age, and 66 random bits.
@@ -42,6 +51,14 @@ struct TransferSubmission {
 
     /// More than any request needs; longer submissions are not taken.
     static constexpr std::size_t longest = std::size_t{256} * 1024;
+
+    // What the agent keeps of every owner, beyond its tasks, has a bound.
+    static constexpr std::size_t longestName = std::size_t{8} * 1024;
+    static constexpr std::size_t longestCommand = std::size_t{32} * 1024;
+    static constexpr std::size_t longestDescription = std::size_t{64} * 1024;
+    /// Throws `InvalidArgument`, and says which, when one is beyond its bound.
+    static void checkNames(std::string_view session, std::string_view owner,
+                           const std::vector<std::string>& wakeCommand);
 };
 
 }  // namespace corvane

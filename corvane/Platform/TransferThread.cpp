@@ -1,12 +1,14 @@
 #include <corvane/Platform/TransferThread.h>
 
+#include <corvane/Platform/ForkMark.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/Thread.h>
 #include <corvane/Platform/TransferScheduler.h>
 
-#include <unistd.h>
-
+#include <atomic>
+#include <chrono>
 #include <cstdlib>
+#include <exception>
 #include <mutex>
 #include <set>
 #include <thread>
@@ -18,12 +20,15 @@ namespace {
 
 using Ticket = TransferThread::Ticket;
 
+constexpr auto betweenAttempts = std::chrono::milliseconds(50);
+
 class Engine {
   public:
     // Never destroyed: the exit handler stops the thread, and what it held is left to the system.
     static Engine& shared() {
-        static auto& instance = *new Engine;
-        return instance;
+        if (Engine* made = instance_.load()) return *made;
+        static auto& engine = *new Engine;
+        return engine;
     }
 
     Ticket start(HTTPTransfer transfer);
@@ -41,7 +46,11 @@ class Engine {
     void run();
     bool takeInbox();
 
-    const pid_t process_ = getpid();
+    // For the exit handler. A child may be forked off while shared() makes the engine; its handler would wait there for
+    // a thread that only the parent has.
+    static inline std::atomic<Engine*> instance_ = nullptr;
+
+    const ForkMark made_;
     TransferScheduler scheduler_;  // the thread's own, but for waking it up
     std::thread thread_;
 
@@ -58,11 +67,12 @@ Engine::Engine() {
         prepareThread("com.veskar.corvane.transfers", true);
         run();
     });
-    std::atexit([] { shared().stop(); });
+    instance_ = this;
+    std::atexit([] { instance_.load()->stop(); });
 }
 
 void Engine::stop() {
-    if (getpid() != process_) return;  // a child made by fork has no such thread
+    if (made_.isInChild()) return;  // it has no such thread
     {
         std::lock_guard lock(mutex_);
         stopping_ = true;
@@ -72,6 +82,7 @@ void Engine::stop() {
 }
 
 Ticket Engine::start(HTTPTransfer transfer) {
+    if (made_.isInChild()) return 0;  // a thread of the parent may have held the lock
     Ticket ticket = 0;
     {
         std::lock_guard lock(mutex_);
@@ -83,7 +94,7 @@ Ticket Engine::start(HTTPTransfer transfer) {
 }
 
 void Engine::cancel(const std::vector<Ticket>& tickets) {
-    if (getpid() != process_) return;  // as for stop(); the transfers are the parent's
+    if (made_.isInChild()) return;  // as for stop(); the transfers are the parent's
     {
         std::lock_guard lock(mutex_);
         if (stopping_) return;
@@ -94,8 +105,12 @@ void Engine::cancel(const std::vector<Ticket>& tickets) {
 
 void Engine::run() {
     while (takeInbox()) {
-        scheduler_.perform();
-        scheduler_.wait({}, scheduler_.millisecondsToDeadline());
+        try {
+            scheduler_.perform();
+            scheduler_.wait({}, scheduler_.millisecondsToDeadline());
+        } catch (const std::exception&) {  // no memory: it is tried again, and not in a spin
+            std::this_thread::sleep_for(betweenAttempts);
+        }
     }
 }
 

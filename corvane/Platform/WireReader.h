@@ -58,7 +58,7 @@ class WireReader {
         (*this)(second, more...);
     }
 
-    /// Throws when something is left over.
+    /// Throws when something is left over, where nothing may be.
     void finish() const {
         if (!bytes_.empty()) throw InvalidArgument("there are bytes behind the last value");
     }

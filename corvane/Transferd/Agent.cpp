@@ -1,17 +1,19 @@
 #include <corvane/Transferd/Agent.h>
 
 #include <corvane/Platform/Error.h>
+#include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/TransferError.h>
 #include <corvane/Platform/TransferOutcome.h>
 #include <corvane/Transferd/WakeUp.h>
 
 #include <fcntl.h>
+#include <poll.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <exception>
 #include <limits>
-#include <type_traits>
 #include <utility>
 
 namespace corvane::transferd {
@@ -20,16 +22,12 @@ namespace {
 
 using namespace std::chrono_literals;
 
-// Completions that a client may leave unacknowledged, and bytes that it may leave unread, before it gets more.
-constexpr std::size_t mostTold = 32;
-constexpr std::size_t mostUnreadForMore = std::size_t{64} * 1024;
 // A host that has started the agent, or lost it, is about to connect.
 constexpr auto beforeWaking = 500ms;
-
-std::int64_t milliseconds() {
-    return std::chrono::duration_cast<std::chrono::milliseconds>(std::chrono::system_clock::now().time_since_epoch())
-        .count();
-}
+// What the system refuses now it may grant later.
+constexpr auto beforeAcceptingAgain = 100ms;
+constexpr auto beforeSettlingAgain = 100ms;
+constexpr auto longestSettleDelay = std::chrono::milliseconds(10s);
 
 // A submission as a host has left it. Throws for anything that no host of this user can have put there.
 TransferSubmission readSubmission(const std::filesystem::path& file) {
@@ -54,43 +52,69 @@ Agent::Agent(const AgentDirectory& directory, Journal& journal, const Options& o
       clients_(*this),
       listener_(directory.listen()),
       watch_(directory) {
+    removeAbandonedPartialFiles(directory_.spool());
     book_.load([this](std::int64_t number, const TransferSubmission& submission) { enqueue(number, submission); });
 }
 
+std::int64_t Agent::milliseconds() {
+    return std::chrono::duration_cast<std::chrono::milliseconds>(std::chrono::system_clock::now().time_since_epoch())
+        .count();
+}
+
+// An agent that has no memory, or no descriptor, for a moment goes on with the next round; what it could not finish is
+// still there.
 void Agent::run() {
-    while (!isRemoved_) {
-        if (std::exchange(spoolChanged_, false)) {
-            dropWithdrawn();
-            importSpool();
+    while (!isRemoved_ && !book_.isDamaged()) {
+        try {
+            round();
+            const auto now = Clock::now();
+            if ((isIdle(now) || isAlone(now)) && endsNow()) break;
+            waitForNews();
+        } catch (const std::exception&) {
+            poll(nullptr, 0, static_cast<int>(std::chrono::milliseconds(beforeAcceptingAgain).count()));
         }
-        const auto now = Clock::now();
-        queue_.proceed(now);
-        reportProgress();
-        settleEnded();
-        deliver();
-        answerFlushes();
-        wakeHosts(now);
-        clients_.flush();
-        if (isIdle(now) && endsNow()) break;
-        waitForNews();
     }
+    book_.settle();
     directory_.removeSocket();
 }
 
-void Agent::waitForNews() {
+void Agent::round() {
+    if (std::exchange(spoolChanged_, false)) {
+        dropWithdrawn();
+        importSpool();
+    }
     const auto now = Clock::now();
-    std::vector<pollfd> polled{{listener_.get(), POLLIN, 0}, {watch_.descriptor(), POLLIN, 0}};
-    if (watch_.descriptor() < 0) polled.pop_back();
+    queue_.proceed(now);
+    reportProgress();
+    settleEnded();
+    settleJournal(now);
+    deliver();
+    answerFlushes();
+    wakeHosts(now);
+    clients_.dismissStrangers(now);
+    clients_.flush();
+    if (std::exchange(ownersChanged_, false)) {
+        book_.dropOwners([this](const Owner& owner) { return hasClient(owner); });
+    }
+}
+
+void Agent::waitForNews() {
+    if (!listener_) listener_ = directory_.listen();
+    const auto now = Clock::now();
+    if (acceptsAgainAt_ && now >= *acceptsAgainAt_) acceptsAgainAt_.reset();
+    std::vector<pollfd> polled{{acceptsAgainAt_ ? -1 : listener_.get(), POLLIN, 0}, {watch_.descriptor(), POLLIN, 0}};
     const std::size_t own = polled.size();
     clients_.appendTo(polled);
     const bool isAwaited = spoolChanged_;
     queue_.wait(polled, isAwaited ? 0 : std::min(queue_.millisecondsToDeadline(now), millisecondsToTimer(now)));
-    if (own > 1 && polled[1].revents != 0) {
+    if (polled[1].revents != 0) {
         isRemoved_ = !watch_.take();
         spoolChanged_ = true;
     }
     clients_.proceed(std::span(polled).subspan(own));
-    if (polled[0].revents != 0) clients_.accept(listener_.get());
+    if (polled[0].revents != 0 && !clients_.accept(listener_.get())) {
+        acceptsAgainAt_ = Clock::now() + beforeAcceptingAgain;
+    }
 }
 
 // --- Submissions. ----------------------------------------------------------------------------------------------------
@@ -116,20 +140,21 @@ std::int64_t Agent::import(const std::string& token) {
     try {
         submission = readSubmission(file);
         if (submission.token != token) throw InvalidArgument("the submission is another task's");
+        TransferSubmission::checkNames(submission.session, submission.owner, submission.wakeCommand);
     } catch (const InvalidArgument&) {
         unlink(file.c_str());
         throw;
     }
     const auto number = book_.add(submission, milliseconds());
     if (unlink(file.c_str()) != 0) spoolChanged_ = true;  // taken back in this moment
-    book_.setWakeCommand(*book_.task(number).owner, submission.wakeCommand);
+    book_.setWakeCommand(*book_.task(number).owner, submission.wakeCommand, milliseconds());
     enqueue(number, submission);
     return number;
 }
 
 void Agent::enqueue(std::int64_t number, const TransferSubmission& submission) {
     try {
-        queue_.add(number, UploadQueue::hostKey(submission.request), submission.limits.transfersPerHost);
+        if (const auto* trouble = queue_.add(number, submission)) tell(*book_.task(number).owner, *trouble);
     } catch (const TransferError&) {
         book_.finish(number, TransferOutcome::of(AnyError::current(), std::nullopt));
     }
@@ -140,10 +165,34 @@ void Agent::dropWithdrawn() {
     for (const auto& token : directory_.withdrawn()) {
         if (const auto number = book_.find(token)) {
             queue_.remove(*number);
-            book_.forget(*number);
+            forget(*number, nullptr);
         }
+        unlink(directory_.submission(token).c_str());
         directory_.removeMark(token);
     }
+}
+
+// Whoever else waits for the task hears how it ended, or that its host has taken it back.
+void Agent::forget(std::int64_t number, const Client* reporter) {
+    const Owner* owner = book_.task(number).owner;
+    for (auto& client : clients_.all()) {
+        client.told.erase(number);
+        if (&client != reporter && client.owner == owner) client.send(elsewhere(number));
+    }
+    book_.forget(number);
+    ownersChanged_ = true;
+}
+
+agent::Elsewhere Agent::elsewhere(std::int64_t number) {
+    agent::Elsewhere message{book_.task(number).token, std::nullopt, {}};
+    const bool isOver = book_.task(number).owner->over.contains(number);
+    try {
+        message.description = book_.description(number);
+        if (isOver) message.outcome = book_.outcome(number);
+    } catch (const InvalidArgument&) {  // the journal cannot be read
+        if (isOver) message.outcome = TransferOutcome::unreadable().encoded();
+    }
+    return message;
 }
 
 std::optional<HTTPTransfer> Agent::transfer(std::int64_t number) {
@@ -153,10 +202,13 @@ std::optional<HTTPTransfer> Agent::transfer(std::int64_t number) {
     }
     TransferSubmission submission = book_.submission(number);
     HTTPTransfer transfer;
+    transfer.pool = UploadQueue::pool(submission);
     transfer.request = std::move(submission.request);
     transfer.bodyFile = std::move(submission.file);
     transfer.bodyMustBeOwn = true;
     transfer.limits = submission.limits;
+    transfer.proxy = std::move(submission.proxy);
+    transfer.trustedCertificates = std::move(submission.trustedCertificates);
     return transfer;
 }
 
@@ -164,155 +216,26 @@ bool Agent::mayWait(std::int64_t number) {
     return milliseconds() < book_.task(number).expires;
 }
 
-// --- Clients. --------------------------------------------------------------------------------------------------------
-
-void Agent::request(Client& client, const agent::Request& request) {
-    const auto* hello = std::get_if<agent::Hello>(&request);
-    if ((hello != nullptr) == (client.owner != nullptr))
-        throw InvalidArgument("a greeting is expected once, and first");
-    if (hello) return greet(client, *hello);
-    std::visit(
-        [&](const auto& one) {
-            using One = std::remove_cvref_t<decltype(one)>;
-            if constexpr (std::is_same_v<One, agent::Submit>) {
-                submit(client, one.token);
-            } else if constexpr (std::is_same_v<One, agent::List>) {
-                list(client);
-            } else if constexpr (std::is_same_v<One, agent::Acknowledge>) {
-                acknowledge(client, one.token);
-            } else if constexpr (std::is_same_v<One, agent::Describe>) {
-                describe(client, one);
-            } else if constexpr (std::is_same_v<One, agent::Flush>) {
-                client.isFlushing = true;
-            } else if constexpr (std::is_same_v<One, agent::Ping>) {
-                client.send(agent::Pong{});
-            }
-        },
-        request);
-}
-
-// One that speaks another version learns which this one is, and goes.
-void Agent::greet(Client& client, const agent::Hello& hello) {
-    client.send(agent::Welcome{});
-    if (hello.version != agent::protocolVersion) {
-        client.isLeaving = true;
-        return;
-    }
-    client.owner = &book_.owner(hello.session, hello.owner);
-    client.owner->isWoken = false;
-    book_.setWakeCommand(*client.owner, hello.wakeCommand);
-}
-
-void Agent::submit(Client& client, const std::string& token) {
-    if (!TransferSubmission::isToken(token)) throw InvalidArgument("not a token");
-    try {
-        const auto number = import(token);
-        if (book_.task(number).owner != client.owner) throw InvalidArgument("the task is another owner's");
-        book_.task(number).submitter = client.id;
-        client.send(agent::Accepted{token});
-    } catch (const std::exception& error) {
-        client.send(agent::Refused{token, error.what()});
-    }
-}
-
-void Agent::list(Client& client) {
-    importSpool();  // what another host of this owner has left there is under way, too
-    std::set<std::int64_t> numbers = client.owner->open;
-    for (const auto& [number, told] : client.owner->over) numbers.insert(number);
-    for (const auto number : numbers) client.send(agent::Known{book_.task(number).token, book_.description(number)});
-    client.send(agent::Listed{});
-}
-
-void Agent::acknowledge(Client& client, const std::string& token) {
-    const auto number = book_.find(token);
-    if (number && book_.task(*number).owner == client.owner) {
-        if (!client.owner->over.contains(*number)) throw InvalidArgument("the task is not over");
-        book_.forget(*number);
-        client.told.erase(*number);
-    }
-    client.send(agent::Forgotten{token});
-}
-
-void Agent::describe(const Client& client, const agent::Describe& change) {
-    const auto number = book_.find(change.token);
-    if (number && book_.task(*number).owner == client.owner) book_.describe(*number, change.description);
-}
-
-// What it was told and has not acknowledged is for the next one. Its last submission may still be in the spool.
-void Agent::left(Client& client) {
-    spoolChanged_ = true;
-    if (!client.owner) return;
-    for (const auto number : client.told) {
-        if (const auto found = client.owner->over.find(number); found != client.owner->over.end()) found->second = 0;
-    }
-}
-
-// --- Completions. ----------------------------------------------------------------------------------------------------
+// --- Waking, and the end. -------------------------------------------------------------------------------------------
 
 void Agent::settleEnded() {
-    for (auto& ended : queue_.takeEnded()) {
-        if (!book_.contains(ended.number)) continue;
-        book_.finish(ended.number, TransferOutcome::of(ended.error, std::move(ended.response)));
+    for (auto& all = queue_.ended(); !all.empty(); all.pop_front()) {
+        const auto& ended = all.front();
+        if (book_.contains(ended.number)) book_.finish(ended.number, TransferOutcome::of(ended.error, ended.response));
     }
 }
 
-void Agent::reportProgress() {
-    for (const auto& progress : queue_.takeProgress()) {
-        if (!book_.contains(progress.number)) continue;
-        const auto& task = book_.task(progress.number);
-        Client* client = addressee(*task.owner, progress.number);
-        if (client && client->socket.unsent() < mostUnreadForMore) {
-            client->send(agent::Progress{task.token, progress.total, progress.expected});
-        }
-    }
-}
-
-void Agent::deliver() {
-    for (auto& [key, owner] : book_.owners()) {
-        if (!owner.over.empty() && hasClient(owner)) deliver(owner);
-    }
-}
-
-void Agent::deliver(Owner& owner) {
-    for (auto& [number, told] : owner.over) {
-        if (told == 0) deliver(owner, number);
-    }
-}
-
-void Agent::deliver(Owner& owner, std::int64_t number) {
-    Client* client = addressee(owner, number);
-    if (!client || client->told.size() >= mostTold || client->socket.unsent() >= mostUnreadForMore) return;
-    try {
-        client->send(agent::Completed{book_.task(number).token, book_.description(number), book_.outcome(number)});
-    } catch (const InvalidArgument&) {  // the journal cannot be read: it is tried again when something happens
+// A full disk has room again some time, and nobody says when.
+void Agent::settleJournal(Clock::time_point now) {
+    if (book_.isSettled() || (settlesAgainAt_ && now < *settlesAgainAt_)) return;
+    if (book_.settle()) {
+        settlesAgainAt_.reset();
+        settleDelay_ = 0ms;
         return;
     }
-    client->told.insert(number);
-    owner.over[number] = client->id;
+    settleDelay_ = std::clamp<std::chrono::milliseconds>(2 * settleDelay_, beforeSettlingAgain, longestSettleDelay);
+    settlesAgainAt_ = now + settleDelay_;
 }
-
-// The host that submitted a task hears of it while it is there, and then the first of the same owner.
-ClientList::Client* Agent::addressee(const Owner& owner, std::int64_t number) {
-    if (Client* submitter = clients_.find(book_.task(number).submitter)) return submitter;
-    const auto found = std::find_if(clients_.all().begin(), clients_.all().end(),
-                                    [&](const Client& client) { return client.owner == &owner; });
-    return found == clients_.all().end() ? nullptr : &*found;
-}
-
-void Agent::answerFlushes() {
-    for (auto& client : clients_.all()) {
-        if (!client.isFlushing || !client.told.empty()) continue;
-        const auto& over = client.owner->over;
-        const bool isWaitedFor = std::any_of(over.begin(), over.end(), [&](const auto& one) {
-            return one.second == 0 && addressee(*client.owner, one.first) == &client;
-        });
-        if (isWaitedFor) continue;
-        client.isFlushing = false;
-        client.send(agent::Flushed{});
-    }
-}
-
-// --- Waking, and the end. --------------------------------------------------------------------------------------------
 
 bool Agent::hasClient(const Owner& owner) const {
     return std::any_of(clients_.all().begin(), clients_.all().end(),
@@ -334,23 +257,26 @@ void Agent::wakeHosts(Clock::time_point now) {
         if (!isDueToWake(owner, now)) continue;
         auto command = owner.wakeCommand;
         command.push_back(owner.session);
-        owner.isWoken = true;
-        runDetached(command, options_.mask);
+        runDetached(command, options_.inherited);
+        owner.isWoken = true;  // also when it could not be started: it would not be started the next moment either
     }
     wakesFrom_.reset();
 }
 
 int Agent::millisecondsToTimer(Clock::time_point now) {
-    auto next = Clock::time_point::max();
+    auto next = clients_.nextDismissal();
     if (idleSince_) next = std::min(next, *idleSince_ + options_.idleTime);
-    if (wakesFrom_) next = std::min(next, *wakesFrom_);
+    if (aloneSince_) next = std::min(next, *aloneSince_ + options_.patienceWithoutHost);
+    for (const auto& timer : {wakesFrom_, acceptsAgainAt_, settlesAgainAt_}) {
+        if (timer) next = std::min(next, *timer);
+    }
     if (next == Clock::time_point::max()) return std::numeric_limits<int>::max();
     const auto left = std::chrono::ceil<std::chrono::milliseconds>(next - now).count();
     return static_cast<int>(std::clamp<std::int64_t>(left, 0, std::numeric_limits<int>::max()));
 }
 
 bool Agent::isIdle(Clock::time_point now) {
-    if (!queue_.isEmpty() || clients_.hasGuests() || wakesFrom_) {
+    if (!queue_.isEmpty() || clients_.hasGuests() || wakesFrom_ || !book_.isSettled()) {
         idleSince_.reset();
         return false;
     }
@@ -358,16 +284,28 @@ bool Agent::isIdle(Clock::time_point now) {
     return now >= *idleSince_ + options_.idleTime;
 }
 
+// Also while the journal takes nothing: then nothing that this one does is of use to the next.
+bool Agent::isAlone(Clock::time_point now) {
+    const bool isStuck = queue_.isHopeless() || (queue_.isEmpty() && !book_.isSettled());
+    if (clients_.hasGuests() || !isStuck) {
+        aloneSince_.reset();
+        return false;
+    }
+    if (!aloneSince_) aloneSince_ = now;
+    return now >= *aloneSince_ + options_.patienceWithoutHost;
+}
+
 // A host that comes in this moment finds no socket, and starts an agent that waits for this one's lock; a submission
 // that it left before is still seen here.
 bool Agent::endsNow() {
+    const std::size_t before = book_.size();
     directory_.removeSocket();
     listener_ = Descriptor();
     dropWithdrawn();
     importSpool();
-    if (queue_.isEmpty()) return true;
-    listener_ = directory_.listen();
+    if (queue_.isEmpty() || (aloneSince_ && book_.size() <= before)) return true;
     idleSince_.reset();
+    aloneSince_.reset();
     return false;
 }
 

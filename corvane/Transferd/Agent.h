@@ -2,12 +2,11 @@
 
 #include <corvane/Platform/AgentDirectory.h>
 #include <corvane/Platform/Descriptor.h>
+#include <corvane/Transferd/AgentProcess.h>
 #include <corvane/Transferd/ClientList.h>
 #include <corvane/Transferd/DirectoryWatch.h>
 #include <corvane/Transferd/TaskBook.h>
 #include <corvane/Transferd/UploadQueue.h>
-
-#include <sys/types.h>
 
 #include <chrono>
 #include <cstdint>
@@ -24,13 +23,15 @@ class Agent final : private UploadQueue::Source, private ClientList::Handler {
     struct Options {
         std::chrono::milliseconds idleTime{};
         std::chrono::milliseconds retryDelay{};
-        mode_t mask = 022;  ///< of the programs that it runs
+        std::chrono::milliseconds patienceWithoutHost{};
+        process::Inherited inherited = {};  ///< what the programs that it runs get back
     };
 
     /// Goes on with what the journal and the spool hold. Requires: the caller holds the directory's lock.
     Agent(const AgentDirectory& directory, Journal& journal, const Options& options);
 
-    /// Returns when there has been nothing to do for the idle time, or the directory was removed.
+    /// Returns when there has been nothing to do for the idle time, no server to be reached and no host for the
+    /// patience without one, or there is no going on: the directory was removed, the journal is damaged.
     void run();
 
   private:
@@ -41,6 +42,7 @@ class Agent final : private UploadQueue::Source, private ClientList::Handler {
     // For the upload queue.
     std::optional<HTTPTransfer> transfer(std::int64_t number) override;
     bool mayWait(std::int64_t number) override;
+    void troubleChanged(const UploadQueue::Trouble& trouble, const std::vector<std::int64_t>& uploads) override;
 
     // For the clients.
     void request(Client& client, const agent::Request& request) override;
@@ -51,11 +53,19 @@ class Agent final : private UploadQueue::Source, private ClientList::Handler {
     void acknowledge(Client& client, const std::string& token);
     void describe(const Client& client, const agent::Describe& change);
 
+    /// Since 1970.
+    [[nodiscard]] static std::int64_t milliseconds();
     void importSpool();
     std::int64_t import(const std::string& token);
     void enqueue(std::int64_t number, const TransferSubmission& submission);
     void dropWithdrawn();
+    void forget(std::int64_t number, const Client* reporter);
+    [[nodiscard]] agent::Elsewhere elsewhere(std::int64_t number);
+    void tell(Owner& owner, const UploadQueue::Trouble& trouble);
+    void tellOfTroubles(Client& client);
+    void round();
     void settleEnded();
+    void settleJournal(Clock::time_point now);
     void reportProgress();
     void deliver();
     void deliver(Owner& owner);
@@ -68,6 +78,7 @@ class Agent final : private UploadQueue::Source, private ClientList::Handler {
     void waitForNews();
     [[nodiscard]] int millisecondsToTimer(Clock::time_point now);
     bool isIdle(Clock::time_point now);
+    bool isAlone(Clock::time_point now);
     bool endsNow();
 
     const AgentDirectory& directory_;
@@ -79,7 +90,12 @@ class Agent final : private UploadQueue::Source, private ClientList::Handler {
     DirectoryWatch watch_;
     bool spoolChanged_ = true;
     bool isRemoved_ = false;
+    bool ownersChanged_ = false;
     std::optional<Clock::time_point> idleSince_;
+    std::optional<Clock::time_point> aloneSince_;      // since when there is neither a host nor a server
+    std::optional<Clock::time_point> acceptsAgainAt_;  // while the system has no descriptor for a connection
+    std::optional<Clock::time_point> settlesAgainAt_;  // while the journal does not take what it is told
+    std::chrono::milliseconds settleDelay_{0};
     std::optional<Clock::time_point> wakesFrom_;  // since when completions wait without a host
 };
 

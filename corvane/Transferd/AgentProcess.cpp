@@ -6,6 +6,7 @@
 #include <poll.h>
 #include <signal.h>
 #include <sys/file.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -28,21 +29,31 @@ void replaceWithNull(int descriptor, int flags) noexcept {
     if (null != descriptor) close(null);
 }
 
+rlimit raiseDescriptorLimit() noexcept {
+    rlimit before{};
+    if (getrlimit(RLIMIT_NOFILE, &before) != 0) return before;
+    const rlimit raised{before.rlim_max, before.rlim_max};
+    setrlimit(RLIMIT_NOFILE, &raised);
+    return before;
+}
+
 }  // namespace
 
-mode_t leaveEverything() noexcept {
+Inherited leaveEverything() noexcept {
     for (int number = 1; number < NSIG; ++number) signal(number, SIG_DFL);
     signal(SIGPIPE, SIG_IGN);
     signal(SIGCHLD, SIG_IGN);  // the programs that it runs are nobody's zombies
     signal(SIGHUP, SIG_IGN);
+    signal(SIGXFSZ, SIG_IGN);  // a limit on a file's size is a disk that is full
     sigset_t none;
     sigemptyset(&none);
     sigprocmask(SIG_SETMASK, &none, nullptr);
     closefrom(STDERR_FILENO + 1);
     replaceWithNull(STDIN_FILENO, O_RDONLY);
     replaceWithNull(STDERR_FILENO, O_WRONLY);
-    if (chdir("/") != 0) return umask(077);  // there is always a root
-    return umask(077);
+    const int ignored = chdir("/");  // there is always a root
+    static_cast<void>(ignored);
+    return {umask(077), raiseDescriptorLimit()};
 }
 
 void becomeDaemon() noexcept {

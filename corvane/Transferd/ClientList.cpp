@@ -3,6 +3,7 @@
 #include <sys/socket.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <exception>
 #include <utility>
 
@@ -13,14 +14,37 @@ namespace {
 constexpr std::size_t mostUnsent = std::size_t{8} * 1024 * 1024;
 }  // namespace
 
-void ClientList::accept(int listener) {
-    while (true) {
+// A few at a time, which are read before there is another one: an honest client's greeting comes with its connection.
+bool ClientList::accept(int listener) {
+    for (std::size_t taken = 0; taken < mostStrangers / 2; ++taken) {
         Descriptor connected(accept4(listener, nullptr, nullptr, SOCK_CLOEXEC | SOCK_NONBLOCK));
-        if (!connected) return;
+        if (!connected && errno == ECONNABORTED) continue;
+        if (!connected) return errno == EAGAIN || errno == EWOULDBLOCK || errno == EINTR;
         FrameSocket socket(std::move(connected));
-        if (clients_.size() >= mostClients || !socket.peerIsOwnUser()) continue;
+        if (!socket.peerIsOwnUser()) continue;
+        makeRoom();
         clients_.emplace_back(++lastID_, std::move(socket));
     }
+    return true;
+}
+
+void ClientList::makeRoom() {
+    const auto isStranger = [](const Client& client) { return !client.owner; };
+    const auto strangers = std::count_if(clients_.begin(), clients_.end(), isStranger);
+    if (static_cast<std::size_t>(strangers) < mostStrangers) return;
+    clients_.erase(std::find_if(clients_.begin(), clients_.end(), isStranger));
+}
+
+void ClientList::dismissStrangers(Clock::time_point now) {
+    std::erase_if(clients_, [now](const Client& client) { return !client.owner && client.greetsUntil <= now; });
+}
+
+ClientList::Clock::time_point ClientList::nextDismissal() const {
+    auto next = Clock::time_point::max();
+    for (const auto& client : clients_) {
+        if (!client.owner) next = std::min(next, client.greetsUntil);
+    }
+    return next;
 }
 
 void ClientList::appendTo(std::vector<pollfd>& polled) const {
@@ -43,7 +67,17 @@ void ClientList::proceed(std::span<const pollfd> polled) {
 void ClientList::read(Client& client) {
     const bool alive = client.socket.receive();
     try {
-        while (const auto message = client.socket.next()) handler_.request(client, agent::decodeRequest(*message));
+        while (const auto message = client.socket.next()) {
+            const auto request = agent::decodeRequest(*message);
+            if (request) {
+                handler_.request(client, *request);
+            } else if (!client.owner) {
+                client.isLeaving = true;
+                break;
+            } else {
+                client.send(agent::Unsupported{static_cast<unsigned char>(message->front())});
+            }
+        }
     } catch (const std::exception&) {
         client.isLeaving = true;
     }

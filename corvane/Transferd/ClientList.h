@@ -6,6 +6,7 @@
 
 #include <poll.h>
 
+#include <chrono>
 #include <cstdint>
 #include <list>
 #include <set>
@@ -18,7 +19,11 @@ namespace corvane::transferd {
 /// sent is closed, and no other notices.
 class ClientList {
   public:
-    static constexpr std::size_t mostClients = 64;
+    /// Connections that have not greeted: the oldest goes when there is another one, and each when its time is over.
+    static constexpr std::size_t mostStrangers = 64;
+    static constexpr auto timeToGreet = std::chrono::seconds(5);
+
+    using Clock = std::chrono::steady_clock;
 
     struct Client {
         Client(std::uint64_t number, FrameSocket connected) : id(number), socket(std::move(connected)) {}
@@ -27,6 +32,8 @@ class ClientList {
         FrameSocket socket;
         TaskBook::Owner* owner = nullptr;  ///< from its greeting on
         std::set<std::int64_t> told;       ///< completions that it has not acknowledged
+        std::set<std::uint64_t> troubles;  ///< that it was told of
+        Clock::time_point greetsUntil = Clock::now() + timeToGreet;
         bool isFlushing = false;
         bool isLeaving = false;  ///< closed at the next opportunity
 
@@ -43,8 +50,13 @@ class ClientList {
 
     explicit ClientList(Handler& handler) : handler_(handler) {}
 
-    /// Takes connections that wait at a listening socket.
-    void accept(int listener);
+    /// Takes connections that wait at a listening socket. False when the system has no descriptor or no memory for one:
+    /// then not to be called again at once.
+    [[nodiscard]] bool accept(int listener);
+    /// Closes the connections that have not greeted in time.
+    void dismissStrangers(Clock::time_point now);
+    /// When the next one's time is over; the greatest time when there is none.
+    [[nodiscard]] Clock::time_point nextDismissal() const;
     void appendTo(std::vector<pollfd>& polled) const;
     /// Reads, handles and sends, and lets go of those that left. `polled` are the entries that `appendTo` appended.
     void proceed(std::span<const pollfd> polled);
@@ -56,6 +68,7 @@ class ClientList {
     [[nodiscard]] bool hasGuests() const;
 
   private:
+    void makeRoom();
     void read(Client& client);
     void removeLeaving();
 

@@ -14,24 +14,23 @@ namespace {
 
 // These values are in files: they do not change. A new layout has a new version.
 constexpr int applicationID = 0x43565441;
-constexpr int version = 1;
+constexpr int version = 2;
 constexpr const char* layout =
     "CREATE TABLE tasks ("
     "number INTEGER PRIMARY KEY AUTOINCREMENT, token TEXT NOT NULL UNIQUE, accepted INTEGER NOT NULL, "
-    "description TEXT, submission BLOB NOT NULL, outcome BLOB);"
+    "description TEXT, submission BLOB NOT NULL, outcome BLOB, "
+    "session TEXT NOT NULL DEFAULT '', owner TEXT NOT NULL DEFAULT '');"
     "CREATE TABLE wakes ("
-    "session TEXT NOT NULL, owner TEXT NOT NULL, command BLOB NOT NULL, PRIMARY KEY (session, owner));";
-
-class Damaged : public InvalidArgument {
-  public:
-    using InvalidArgument::InvalidArgument;
-};
-
-[[noreturn]] void fail(sqlite3* database, int code) {
-    const std::string text = std::string("the journal cannot be used: ") + sqlite3_errmsg(database);
-    if ((code & 0xFF) == SQLITE_CORRUPT || (code & 0xFF) == SQLITE_NOTADB) throw Damaged(text);
-    throw InvalidArgument(text);
-}
+    "session TEXT NOT NULL, owner TEXT NOT NULL, command BLOB NOT NULL, used INTEGER NOT NULL DEFAULT 0, "
+    "PRIMARY KEY (session, owner));";
+// Version 1 had no date, so what it has left counts as heard of at the take-over; its tasks' owners are in their
+// submissions only.
+constexpr const char* fromVersion1 =
+    "ALTER TABLE tasks ADD COLUMN session TEXT NOT NULL DEFAULT '';"
+    "ALTER TABLE tasks ADD COLUMN owner TEXT NOT NULL DEFAULT '';"
+    "ALTER TABLE wakes ADD COLUMN used INTEGER NOT NULL DEFAULT 0;"
+    "UPDATE wakes SET used = CAST(strftime('%s', 'now') AS INTEGER) * 1000;";
+constexpr std::int64_t wakesAreKept = std::int64_t{1000} * 60 * 60 * 24 * 30;
 
 }  // namespace
 
@@ -39,12 +38,17 @@ void Journal::Close::operator()(sqlite3* database) const noexcept {
     sqlite3_close_v2(database);
 }
 
+void Journal::fail(int code) {
+    isDamaged_ = isDamaged_ || (code & 0xFF) == SQLITE_CORRUPT || (code & 0xFF) == SQLITE_NOTADB;
+    throw InvalidArgument(std::string("the journal cannot be used: ") + sqlite3_errmsg(database_.get()));
+}
+
 /// A statement with its arguments, for one use.
 class Journal::Statement {
   public:
-    Statement(Journal& journal, const char* sql) : database_(journal.database_.get()) {
-        const int result = sqlite3_prepare_v2(database_, sql, -1, &statement_, nullptr);
-        if (result != SQLITE_OK) fail(database_, result);
+    Statement(Journal& journal, const char* sql) : journal_(journal) {
+        const int result = sqlite3_prepare_v2(journal.database_.get(), sql, -1, &statement_, nullptr);
+        if (result != SQLITE_OK) journal.fail(result);
     }
     Statement(const Statement&) = delete;
     Statement& operator=(const Statement&) = delete;
@@ -66,7 +70,7 @@ class Journal::Statement {
     /// Whether there is a row, or another one.
     bool step() {
         const int result = sqlite3_step(statement_);
-        if (result != SQLITE_ROW && result != SQLITE_DONE) fail(database_, result);
+        if (result != SQLITE_ROW && result != SQLITE_DONE) journal_.fail(result);
         return result == SQLITE_ROW;
     }
     [[nodiscard]] bool isNull(int column) { return sqlite3_column_type(statement_, column) == SQLITE_NULL; }
@@ -78,7 +82,7 @@ class Journal::Statement {
     }
 
   private:
-    sqlite3* database_;
+    Journal& journal_;
     sqlite3_stmt* statement_ = nullptr;
     int bound_ = 0;
 };
@@ -86,7 +90,9 @@ class Journal::Statement {
 Journal::Journal(const std::filesystem::path& file, std::string& problem) {
     try {
         open(file);
-    } catch (const Damaged& damaged) {
+    } catch (const InvalidArgument& damaged) {
+        if (!isDamaged_) throw;
+        isDamaged_ = false;
         database_.reset();
         auto aside = file;
         aside += ".damaged";
@@ -108,45 +114,70 @@ void Journal::open(const std::filesystem::path& file) {
     const int result = sqlite3_open_v2(file.c_str(), &opened,
                                        SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOFOLLOW, nullptr);
     database_.reset(opened);
-    if (result != SQLITE_OK) fail(opened, result);
+    if (result != SQLITE_OK) fail(result);
     sqlite3_extended_result_codes(opened, 1);
     sqlite3_busy_timeout(opened, 2000);  // for somebody who looks into it
     run("PRAGMA cache_size=-256;");
     run("PRAGMA journal_mode=WAL;");
     run("PRAGMA synchronous=NORMAL;");
-    Statement stored(*this, "PRAGMA user_version;");
-    stored.step();
-    if (stored.integer(0) == 0) {
-        run("BEGIN IMMEDIATE;");
-        run(layout);
-        run(("PRAGMA application_id=" + std::to_string(applicationID) + ";").c_str());
-        run(("PRAGMA user_version=" + std::to_string(version) + "; COMMIT;").c_str());
-    } else if (stored.integer(0) != version) {
-        throw InvalidArgument("the journal is of version " + std::to_string(stored.integer(0)));
+    std::int64_t found = 0;
+    {
+        Statement stored(*this, "PRAGMA user_version;");
+        stored.step();
+        found = stored.integer(0);
+    }
+    if (found < 0 || found > version) throw InvalidArgument("the journal is of version " + std::to_string(found));
+    check();
+    if (found != version) adopt(found);
+}
+
+// Makes a new file's tables, or an earlier version's into this one's.
+void Journal::adopt(std::int64_t found) {
+    run("BEGIN IMMEDIATE;");
+    run(found == 0 ? layout : fromVersion1);
+    run(("PRAGMA application_id=" + std::to_string(applicationID) + ";").c_str());
+    run(("PRAGMA user_version=" + std::to_string(version) + "; COMMIT;").c_str());
+}
+
+// Every page is looked at, not only those that a start happens to need: a journal that cannot be written to would send
+// every host back to itself for good.
+void Journal::check() {
+    Statement checked(*this, "PRAGMA quick_check(1);");
+    if (checked.step() && checked.contents(0) != "ok") {
+        isDamaged_ = true;
+        throw InvalidArgument("the journal cannot be used: " + checked.contents(0));
     }
 }
 
 void Journal::run(const char* sql) {
     const int result = sqlite3_exec(database_.get(), sql, nullptr, nullptr, nullptr);
-    if (result != SQLITE_OK) fail(database_.get(), result);
+    if (result != SQLITE_OK) fail(result);
 }
 
 void Journal::forEach(const std::function<void(Task)>& visit) {
-    std::vector<std::int64_t> unreadable;
-    Statement all(*this, "SELECT number, accepted, submission, outcome IS NOT NULL FROM tasks ORDER BY number;");
+    Statement all(*this,
+                  "SELECT number, accepted, submission, outcome IS NOT NULL, token, session, owner FROM tasks "
+                  "ORDER BY number;");
     while (all.step()) {
+        Task task{all.integer(0), all.integer(1), {}, true, all.integer(3) != 0};
         try {
-            visit({all.integer(0), all.integer(1), TransferSubmission::decode(all.contents(2)), all.integer(3) != 0});
+            task.submission = TransferSubmission::decode(all.contents(2));
         } catch (const InvalidArgument&) {
-            unreadable.push_back(all.integer(0));
+            task.isReadable = false;
+            task.submission.token = all.contents(4);
+            task.submission.session = all.contents(5);
+            task.submission.owner = all.contents(6);
         }
+        visit(std::move(task));
     }
-    for (const auto number : unreadable) forget(number);
 }
 
 std::int64_t Journal::add(const TransferSubmission& submission, std::int64_t accepted) {
-    Statement insert(*this, "INSERT INTO tasks (token, accepted, submission, description) VALUES (?, ?, ?, ?);");
+    Statement insert(*this,
+                     "INSERT INTO tasks (token, accepted, submission, session, owner, description) "
+                     "VALUES (?, ?, ?, ?, ?, ?);");
     insert.text(submission.token).number(accepted).bytes(submission.encoded());
+    insert.text(submission.session).text(submission.owner);
     if (submission.description) insert.text(*submission.description);
     insert.step();
     return sqlite3_last_insert_rowid(database_.get());
@@ -182,27 +213,36 @@ std::string Journal::outcome(std::int64_t number) {
     return find.contents(0);
 }
 
-void Journal::setWake(const Wake& wake) {
+void Journal::setWake(const std::string& session, const std::string& owner, const std::vector<std::string>& command,
+                      std::int64_t now) {
     WireWriter write;
-    write(wake.command);
-    Statement(*this, "INSERT OR REPLACE INTO wakes (session, owner, command) VALUES (?, ?, ?);")
-        .text(wake.session)
-        .text(wake.owner)
+    write(command);
+    Statement(*this, "INSERT OR REPLACE INTO wakes (session, owner, command, used) VALUES (?, ?, ?, ?);")
+        .text(session)
+        .text(owner)
         .bytes(write.take())
+        .number(now)
+        .step();
+    Statement(*this,
+              "DELETE FROM wakes WHERE used < ? OR "
+              "rowid NOT IN (SELECT rowid FROM wakes ORDER BY used DESC LIMIT ?);")
+        .number(now - wakesAreKept)
+        .number(mostWakes)
         .step();
 }
 
-std::vector<Journal::Wake> Journal::wakes() {
-    std::vector<Wake> found;
-    Statement all(*this, "SELECT session, owner, command FROM wakes;");
-    while (all.step()) {
-        Wake wake{all.contents(0), all.contents(1), {}};
-        const std::string bytes = all.contents(2);
+std::vector<std::string> Journal::wake(const std::string& session, const std::string& owner) {
+    Statement find(*this, "SELECT command FROM wakes WHERE session = ? AND owner = ?;");
+    if (!find.text(session).text(owner).step()) return {};
+    const std::string bytes = find.contents(0);
+    std::vector<std::string> command;
+    try {
         WireReader read(bytes);
-        read(wake.command);
-        found.push_back(std::move(wake));
+        read(command);
+    } catch (const InvalidArgument&) {  // the host says it again
+        command.clear();
     }
-    return found;
+    return command;
 }
 
 }  // namespace corvane::transferd

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Platform/Error.h>
 #include <corvane/Platform/TransferSubmission.h>
 
 #include <cstdint>
@@ -26,21 +27,24 @@ class Journal {
         std::int64_t number = 0;
         /// In milliseconds since 1970.
         std::int64_t accepted = 0;
+        /// Nothing but the names of the task, the session and the owner when the rest cannot be read.
         TransferSubmission submission;
+        bool isReadable = true;
         bool isOver = false;
     };
-    struct Wake {
-        std::string session;
-        std::string owner;
-        std::vector<std::string> command;
-    };
 
-    /// Opens or creates the file. One that is damaged is moved aside, which `problem` then tells of. Throws for one
-    /// that another version has written, too.
+    /// Beyond this many owners, those that have not been heard of for the longest are not woken any more.
+    static constexpr int mostWakes = 1000;
+
+    /// Opens or creates the file, and takes over one of an earlier version. One that is damaged, anywhere, is moved
+    /// aside, which `problem` then tells of. Throws for one that a later version has written, too.
     Journal(const std::filesystem::path& file, std::string& problem);
     ~Journal();
 
-    /// Every task, in the order in which they were accepted. A row that cannot be read is removed.
+    /// Whether an operation has found damage: there is no going on with the file, and the next agent moves it aside.
+    [[nodiscard]] bool isDamaged() const { return isDamaged_; }
+
+    /// Every task, in the order in which they were accepted.
     void forEach(const std::function<void(Task)>& visit);
     /// Keeps a task, and gives it its number.
     std::int64_t add(const TransferSubmission& submission, std::int64_t accepted);
@@ -53,8 +57,11 @@ class Journal {
     /// The bytes that `finish` was given.
     [[nodiscard]] std::string outcome(std::int64_t number);
 
-    void setWake(const Wake& wake);
-    [[nodiscard]] std::vector<Wake> wakes();
+    /// Keeps the command for a month, from `now` on (in milliseconds since 1970), and lets go of older ones.
+    void setWake(const std::string& session, const std::string& owner, const std::vector<std::string>& command,
+                 std::int64_t now);
+    /// Empty when there is none, or none that can be read.
+    [[nodiscard]] std::vector<std::string> wake(const std::string& session, const std::string& owner);
 
   private:
     class Statement;
@@ -63,9 +70,13 @@ class Journal {
     };
 
     void open(const std::filesystem::path& file);
+    void adopt(std::int64_t found);
+    void check();
     void run(const char* sql);
+    [[noreturn]] void fail(int code);
 
     std::unique_ptr<sqlite3, Close> database_;
+    bool isDamaged_ = false;
 };
 
 }  // namespace corvane::transferd

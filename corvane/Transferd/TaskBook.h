@@ -31,6 +31,7 @@ class TaskBook {
         std::set<std::int64_t> open;                 ///< tasks that are not over
         std::map<std::int64_t, std::uint64_t> over;  ///< tasks that are; with the client that was told, or 0
         bool isWoken = false;                        ///< the command was run, and no host has connected since
+        std::int64_t lastHeard = 0;                  ///< when the journal was told of it, in milliseconds since 1970
     };
     struct Task {
         std::string token;
@@ -41,18 +42,24 @@ class TaskBook {
 
     explicit TaskBook(Journal& journal) : journal_(journal) {}
 
-    /// Reads the journal; `visit` gets every task that is not over.
+    /// Reads the journal; `visit` gets every task that is not over. One that cannot be read has failed.
     void load(const std::function<void(std::int64_t number, const TransferSubmission&)>& visit);
 
-    /// The owner, made when it is not known yet.
+    /// The owner, made when it is not known yet, with what the journal knows of it.
     Owner& owner(const std::string& session, const std::string& key);
-    void setWakeCommand(Owner& owner, const std::vector<std::string>& command);
+    void setWakeCommand(Owner& owner, const std::vector<std::string>& command, std::int64_t now);
+    /// Lets go of owners without a task that nothing else refers to.
+    void dropOwners(const std::function<bool(const Owner&)>& isReferredTo);
 
     std::int64_t add(const TransferSubmission& submission, std::int64_t now);
-    /// A task that the journal cannot be told of any more counts as over until the agent ends.
+    /// A task whose end the journal cannot be told of is over all the same; see `settle`.
     void finish(std::int64_t number, const TransferOutcome& outcome);
-    /// A row that the journal cannot remove goes with a later one, or is reported again by the next agent.
+    /// A row that the journal cannot remove goes later; see `settle`.
     void forget(std::int64_t number);
+    /// Tells the journal what it could not take, when its disk was full, say. Returns whether nothing is left to tell.
+    bool settle();
+    [[nodiscard]] bool isSettled() const { return unwritten_.empty() && unforgotten_.empty(); }
+    [[nodiscard]] bool isDamaged() const { return journal_.isDamaged(); }
     void describe(std::int64_t number, const std::string& description) { journal_.describe(number, description); }
 
     [[nodiscard]] std::optional<std::int64_t> find(std::string_view token) const;
@@ -62,9 +69,11 @@ class TaskBook {
     [[nodiscard]] std::map<std::pair<std::string, std::string>, Owner>& owners() { return owners_; }
     [[nodiscard]] TransferSubmission submission(std::int64_t number) { return journal_.submission(number); }
     [[nodiscard]] std::optional<std::string> description(std::int64_t number) { return journal_.description(number); }
+    /// The bytes of an outcome; that of a failure when the journal's cannot be read.
     [[nodiscard]] std::string outcome(std::int64_t number);
 
   private:
+    void failUnreadable(std::int64_t number);
     void index(std::int64_t number, std::int64_t accepted, const TransferSubmission& submission, bool isOver);
 
     Journal& journal_;

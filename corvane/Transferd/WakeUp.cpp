@@ -3,13 +3,14 @@
 #include <fcntl.h>
 #include <signal.h>
 #include <spawn.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 namespace corvane::transferd {
 
 // The agent ignores the end of its children, so the system forgets them by itself.
-bool runDetached(const std::vector<std::string>& command, mode_t mask) noexcept {
+bool runDetached(const std::vector<std::string>& command, const process::Inherited& inherited) {
     std::vector<char*> argv;
     argv.reserve(command.size() + 1);
     for (const auto& argument : command) argv.push_back(const_cast<char*>(argument.c_str()));
@@ -26,10 +27,13 @@ bool runDetached(const std::vector<std::string>& command, mode_t mask) noexcept 
     posix_spawnattr_setsigmask(&how, &none);
     posix_spawnattr_setsigdefault(&how, &all);
 
-    const mode_t own = umask(mask);
+    const mode_t mask = umask(inherited.mask);
+    rlimit own{};
+    if (getrlimit(RLIMIT_NOFILE, &own) == 0) setrlimit(RLIMIT_NOFILE, &inherited.descriptors);
     pid_t process = -1;
     const bool started = posix_spawn(&process, argv.front(), &files, &how, argv.data(), environ) == 0;
-    umask(own);
+    setrlimit(RLIMIT_NOFILE, &own);
+    umask(mask);
     posix_spawnattr_destroy(&how);
     posix_spawn_file_actions_destroy(&files);
     return started;

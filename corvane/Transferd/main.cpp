@@ -1,7 +1,7 @@
 // corvane-transferd: uploads what the hosts of one user have submitted, also when they have gone. The library starts
 // it.
 //
-//     corvane-transferd --directory PATH [--idle-ms N] [--retry-ms N]
+//     corvane-transferd --directory PATH [--idle-ms N] [--retry-ms N] [--alone-ms N]
 //
 // Writes "ready", or what is wrong, to standard output and goes on in the background.
 
@@ -24,7 +24,9 @@ using namespace corvane::transferd;
 
 struct Arguments {
     std::string directory;
-    Agent::Options options{.idleTime = std::chrono::seconds(10), .retryDelay = std::chrono::seconds(1)};
+    Agent::Options options{.idleTime = std::chrono::seconds(10),
+                           .retryDelay = std::chrono::seconds(1),
+                           .patienceWithoutHost = std::chrono::hours(1)};
 };
 
 std::chrono::milliseconds milliseconds(std::string_view text) {
@@ -46,12 +48,16 @@ Arguments parse(int argc, char** argv) {
             parsed.options.idleTime = milliseconds(argv[i + 1]);
         } else if (name == "--retry-ms") {
             parsed.options.retryDelay = milliseconds(argv[i + 1]);
+        } else if (name == "--alone-ms") {
+            parsed.options.patienceWithoutHost = milliseconds(argv[i + 1]);
         } else {
             throw InvalidArgument("unknown argument: " + std::string(name));
         }
     }
     if (argc % 2 == 0 || !parsed.directory.starts_with('/')) {
-        throw InvalidArgument("usage: corvane-transferd --directory /PATH [--idle-ms N] [--retry-ms N]");
+        throw InvalidArgument(
+            "usage: corvane-transferd --directory /PATH [--idle-ms N] [--retry-ms N] "
+            "[--alone-ms N]");
     }
     return parsed;
 }
@@ -79,11 +85,11 @@ int run(const Arguments& arguments) {
 }  // namespace
 
 int main(int argc, char** argv) {
-    const mode_t mask = process::leaveEverything();
+    const process::Inherited inherited = process::leaveEverything();
     mallopt(M_ARENA_MAX, 1);  // the threads that look up names need no memory of their own
     try {
         Arguments arguments = parse(argc, argv);
-        arguments.options.mask = mask;
+        arguments.options.inherited = inherited;
         process::becomeDaemon();
         return run(arguments);
     } catch (const std::exception& error) {

@@ -21,6 +21,7 @@ SignerType::~SignerType() = default;
 UploadDropboxType::~UploadDropboxType() = default;
 UploadManagerType::~UploadManagerType() = default;
 UploadServiceDelegate::~UploadServiceDelegate() = default;
+void UploadServiceDelegate::uploadEndedElsewhere(const UploadResult&) {}
 UploadServiceType::~UploadServiceType() = default;
 
 std::vector<std::string> UploadDropboxType::abandonedPayloads(const std::set<std::string>&) {

@@ -270,6 +270,24 @@ bool UploadManager::markRetry(const UploadResult::Retry& retry) {
     });
 }
 
+void UploadManager::uploadEndedElsewhere(const UploadResult& result) {
+    const auto& identifier = result.identifier();
+    forgetUnrecorded(identifier);
+    if (std::holds_alternative<UploadResult::Success>(result.value)) return settle(identifier, Outcome::delivered);
+    const bool goesOutAgain = std::holds_alternative<UploadResult::Retry>(result.value) && hasRow(identifier);
+    settle(identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp);
+}
+
+bool UploadManager::hasRow(const std::string& identifier) {
+    try {
+        return deferredStore_->perform([&](Rows& rows) { return !rows.fetchWhere("identifier", identifier).empty(); });
+    } catch (...) {
+        Log::shared().error("Failed to look for an upload, identifier=%{public}@, error=%{public}@", identifier,
+                            AnyError::current().what());
+        return true;  // it is there as far as anybody knows
+    }
+}
+
 void UploadManager::deleteRow(const std::string& identifier) {
     deferredStore_->perform([&](Rows& rows) { rows.deleteWhere("identifier", identifier); });
 }

@@ -60,6 +60,8 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
 
     /// Deletes row and file of an upload that is over, or counts a retry.
     void uploadService(UploadServiceType& service, const UploadResult& result) override;
+    /// Strikes the upload out of the ledger; its row and its file are the other process's.
+    void uploadEndedElsewhere(const UploadResult& result) override;
 
   private:
     UploadManager(std::shared_ptr<UploadServiceType> service,
@@ -86,6 +88,7 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
     /// killed between payload and row, and the events went out, or will, from their batch's backup.
     void removeOrphans();
     void removeOrphans(const std::vector<std::string>& orphans, const std::set<std::string>& inFlight);
+    [[nodiscard]] bool hasRow(const std::string& identifier);
 
     void deleteRow(const std::string& identifier);
     void settle(const std::string& identifier, DeliveryLedger::Outcome outcome);

@@ -9,6 +9,7 @@
 #include <corvane/Platform/MainQueue.h>
 #include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/Require.h>
+#include <corvane/Platform/TransferError.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 
@@ -63,6 +64,12 @@ std::set<std::string> identifiersOfRunning(const std::vector<std::shared_ptr<Tra
         if (auto identifier = task->description()) identifiers.insert(*std::move(identifier));
     }
     return identifiers;
+}
+
+// A captive portal in the way would use up a document's attempts in a few starts, and nothing of it was sent.
+bool isBlocked(const AnyError& error) {
+    const auto* known = error.as<TransferError>();
+    return known && known->value() == TransferError::Code::blocked;
 }
 
 bool isGone(const std::filesystem::path& file) {
@@ -254,13 +261,19 @@ void UploadService::taskDidSendBodyData(const TransferTask& task, std::int64_t s
 void UploadService::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                                     const std::optional<TransferResponse>& response) {
     const UploadResult ending = result(task, error, response);
-    std::shared_ptr<UploadServiceDelegate> delegate;
-    {
-        std::lock_guard lock(mutex_);
-        delegate = delegate_.lock();
-        if (pendingListings_ > 0) endedMeanwhile_.insert(task.description().value_or(unknown));
-    }
-    if (delegate) delegate->uploadService(*this, ending);
+    if (const auto delegate = noteEnd(task)) delegate->uploadService(*this, ending);
+}
+
+void UploadService::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
+                                        const std::optional<TransferResponse>& response) {
+    const UploadResult ending = result(task, error, response);
+    if (const auto delegate = noteEnd(task)) delegate->uploadEndedElsewhere(ending);
+}
+
+std::shared_ptr<UploadServiceDelegate> UploadService::noteEnd(const TransferTask& task) {
+    std::lock_guard lock(mutex_);
+    if (pendingListings_ > 0) endedMeanwhile_.insert(task.description().value_or(unknown));
+    return delegate_.lock();
 }
 
 UploadResult UploadService::result(const TransferTask& task, const std::optional<AnyError>& error,
@@ -270,7 +283,7 @@ UploadResult UploadService::result(const TransferTask& task, const std::optional
     if (error) {
         Log::shared().error("Upload failed, identifier=%{public}@, urlSessionTaskID=%{public}@, error=%{public}@",
                             identifier, taskID, error->what());
-        return UploadResult::retry(identifier, now());
+        return UploadResult::retry(identifier, now(), !isBlocked(*error));
     }
     if (!response || !response->isHTTP) {
         Log::shared().default_("Upload unknown state, identifier=%{public}@, urlSessionTaskID=%{public}@", identifier,

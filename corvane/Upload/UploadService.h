@@ -77,6 +77,8 @@ class CORVANE_EXPORT UploadService final : public UploadServiceType,
                              std::int64_t expected) override;
     void taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                          const std::optional<TransferResponse>& response) override;
+    void taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
+                             const std::optional<TransferResponse>& response) override;
     void allEventsDelivered() override;
 
   private:
@@ -89,6 +91,7 @@ class CORVANE_EXPORT UploadService final : public UploadServiceType,
                   const std::vector<std::shared_ptr<TransferTask>>& tasks);
     std::string signature(const std::filesystem::path& file);
     void appendHostHeaders(HTTPHeaders& headers) const;
+    std::shared_ptr<UploadServiceDelegate> noteEnd(const TransferTask& task);
     UploadResult result(const TransferTask& task, const std::optional<AnyError>& error,
                         const std::optional<TransferResponse>& response);
     UploadResult result(const std::string& identifier, const std::string& taskID, UploadResponse response);

@@ -15,6 +15,10 @@ class CORVANE_EXPORT UploadServiceDelegate {
     /// Called once for every upload that ended, on the queue that was registered with the service. It runs its database
     /// work where it is called, and reports failures to the log; it does not throw.
     virtual void uploadService(UploadServiceType& service, const UploadResult& result) = 0;
+
+    /// Called, on the same queue, for an upload whose end the delegate of another process was told of, which keeps the
+    /// books of it. Does nothing by default.
+    virtual void uploadEndedElsewhere(const UploadResult& result);
 };
 
 }  // namespace corvane

@@ -1,21 +1,29 @@
 #include <corvane/Platform/InProcessTransferSession.h>
 
+#include <corvane/Platform/BackgroundTransferSession.h>
 #include <corvane/Platform/TransferError.h>
 
 #include "tests/support/ScriptedServer.h"
+#include "tests/support/TLSServer.h"
 #include "tests/support/TemporaryDocuments.h"
 
+#include <dlfcn.h>
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <chrono>
 #include <condition_variable>
 #include <cstdlib>
+#include <functional>
 #include <future>
 #include <map>
 #include <mutex>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace corvane {
@@ -103,7 +111,8 @@ class InProcessTransferSessionTest : public testing::Test {
     }
     static std::string describe(const Recorder::Completion& completion) {
         if (const auto* error = completion.error ? completion.error->as<TransferError>() : nullptr) {
-            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut", "network", "unreachable"};
+            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut",
+                                             "network",        "unreachable",     "blocked"};
             return names[error->code()];
         }
         if (completion.error) return completion.error->what();
@@ -224,6 +233,90 @@ TEST_F(InProcessTransferSessionTest, FailsTheTaskAndNotTheCallWhenItCannotBeSent
         EXPECT_EQ(describe(recorder->wait(*task)), one.expected) << one.url << ' ' << one.file;
     }
     EXPECT_TRUE(server.requests().empty());
+}
+
+// A variable of the environment while it lives.
+class Variable {
+  public:
+    Variable(const char* name, const std::string& value) : name_(name) {
+        if (const char* before = std::getenv(name)) before_ = before;
+        setenv(name, value.c_str(), 1);
+    }
+    Variable(const Variable&) = delete;
+    Variable& operator=(const Variable&) = delete;
+    ~Variable() { before_ ? setenv(name_, before_->c_str(), 1) : unsetenv(name_); }
+
+  private:
+    const char* name_;
+    std::optional<std::string> before_;
+};
+
+TEST_F(InProcessTransferSessionTest, TellsWhetherAServerCannotBeReachedOrTheWayToItIsBlocked) {
+    const std::string proxy = "http://user:secret@" + server.url("").substr(7);
+    const std::string closed = "http://127.0.0.1:1";
+    const auto refusal = Reply::status(407, {{"Proxy-Authenticate", "Basic realm=x"}});
+    constexpr const char* plain = "http://collector.test/in";
+    constexpr const char* tunnel = "https://collector.test/in";
+    const struct {
+        const char* name;
+        std::string proxy;
+        std::string url;
+        Reply reply;
+        const char* expected;
+    } cases[] = {
+        {"through a proxy", proxy, plain, Reply::status(200), "200"},
+        {"no proxy there", closed, plain, {}, "unreachable"},
+        {"no name of the proxy", "http://nowhere.invalid:1", plain, {}, "unreachable"},
+        {"no proxy that can be used", "what://user:secret@x", plain, {}, "unreachable"},
+        {"who asks?", proxy, plain, refusal, "blocked"},
+        {"the proxy's trouble looks like the server's", proxy, plain, Reply::status(502), "502"},
+        {"who asks for a tunnel?", proxy, tunnel, refusal, "blocked"},
+        {"no tunnel", proxy, tunnel, Reply::status(502), "blocked"},
+        {"a proxy that hangs up", proxy, tunnel, Reply::raw(""), "blocked"},
+        {"a proxy that says nothing", proxy, tunnel, Reply::never(), "unreachable"},
+        {"no TLS at the other end", proxy, tunnel, Reply::raw("HTTP/1.1 200 OK\r\n\r\nhello"), "blocked"},
+    };
+    auto session = open({.timeWithoutProgress = 300ms});
+    for (const auto& one : cases) {
+        const Variable http("http_proxy", one.proxy), https("HTTPS_PROXY", one.proxy), none("no_proxy", "elsewhere");
+        if (one.expected != std::string("unreachable") || one.proxy == proxy) server.script(one.reply);
+        const auto completion = recorder->wait(*start(*session, one.url));
+        EXPECT_EQ(describe(completion), one.expected) << one.name;
+        const std::string text = completion.error ? completion.error->what() : "";
+        EXPECT_EQ(text.find("secret"), std::string::npos) << text;
+    }
+    EXPECT_EQ(server.requests().at(0).path, plain);
+    const Variable http("http_proxy", proxy), except("no_proxy", "collector.test");
+    EXPECT_EQ(describe(recorder->wait(*start(*session, "http://collector.test:1/"))), "unreachable");
+
+    // A stall on a connection that was there already: the body has gone out, so the attempt counts.
+    EXPECT_EQ(describe(recorder->wait(*start(*session, server.url()))), "200");
+    server.script(Reply::never());
+    EXPECT_EQ(describe(recorder->wait(*start(*session, server.url()))), "timedOut");
+}
+
+TEST_F(InProcessTransferSessionTest, TrustsTheAuthoritiesThatItIsGiven) {
+    const test::TLSServer trusted, other;
+    const auto authorities = documents / "authorities";
+    test::writeFile(authorities, trusted.certificate());
+    const auto outcome = [&](const std::filesystem::path& certificates, const test::TLSServer& of) {
+        const auto told = std::make_shared<Recorder>();
+        InProcessTransferSession session({.identifier = "test", .trustedCertificates = certificates}, told, queue);
+        return describe(told->wait(*start(session, of.url())));
+    };
+    EXPECT_EQ(outcome(authorities, trusted), "200");
+    EXPECT_EQ(outcome({}, trusted), "blocked") << "not on another's connection";
+    EXPECT_EQ(outcome(std::filesystem::relative(authorities), trusted), "200");
+    EXPECT_EQ(outcome(authorities, other), "blocked") << "in place of any others";
+    EXPECT_EQ(outcome(documents / "missing", trusted), "blocked");
+    EXPECT_EQ(trusted.requests(), 2);
+    EXPECT_EQ(other.requests(), 0);
+
+    const auto directory = documents / "directory";
+    std::filesystem::create_directory(directory);
+    test::writeFile(directory / "one.pem", trusted.certificate());
+    ASSERT_EQ(std::system(("openssl rehash '" + directory.string() + "'").c_str()), 0);
+    EXPECT_EQ(outcome(directory, trusted), "200");
 }
 
 TEST_F(InProcessTransferSessionTest, ABodyFileThatChangesItsSizeMeanwhileNeitherHangsNorLies) {
@@ -355,5 +448,81 @@ TEST_F(InProcessTransferSessionDeathTest, TheProcessExitsWithTransfersPending) {
         testing::ExitedWithCode(0), "");
 }
 
+TEST_F(InProcessTransferSessionDeathTest, AProcessWithoutDescriptorsFailsItsTransfersAndRecovers) {
+#ifdef __SANITIZE_ADDRESS__
+    GTEST_SKIP() << "the sanitizer needs descriptors of its own to look at a thrown object";
+#endif
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            auto session = open();
+            std::promise<void> ready;  // the queue's thread is there, as in a host that is at work
+            queue->async([&] { ready.set_value(); });
+            ready.get_future().wait();
+            std::vector<int> taken;
+            for (int one = 0; (one = dup(STDIN_FILENO)) >= 0;) taken.push_back(one);
+            const bool failed = recorder->wait(*start(*session, server.url())).error.has_value();
+            for (const int one : taken) close(one);
+            const auto after = describe(recorder->wait(*start(*session, server.url())));
+            std::filesystem::remove_all(documents.path());
+            std::exit(failed && after == "200" ? 0 : 1);
+        },
+        testing::ExitedWithCode(0), "");
+}
+
+std::atomic<int> registration = 0;  // 1: the next one waits, 2: it does, 3: it may go on
+
+// A child is forked off by one thread while another one makes a thread of the library, and is inside the registration
+// of its exit handler. Ends with whether the child could exit.
+[[noreturn]] void forkInside(const std::function<void()>& make, const test::TemporaryDocuments& documents) {
+    registration = 1;
+    std::thread maker(make);
+    while (registration != 2) std::this_thread::yield();
+    const pid_t child = fork();
+    if (child == 0) std::exit(0);
+    registration = 3;
+    maker.join();
+    int status = 1;
+    const auto deadline = std::chrono::steady_clock::now() + 10s;
+    while (waitpid(child, &status, WNOHANG) == 0) {
+        if (std::chrono::steady_clock::now() > deadline) kill(child, SIGKILL);
+        std::this_thread::yield();
+    }
+    std::filesystem::remove_all(documents.path());
+    std::_Exit(status == 0 ? 0 : 1);
+}
+
+TEST_F(InProcessTransferSessionDeathTest, AChildThatIsForkedOffWhileAThreadIsMadeCanExit) {
+    // It ends in the midst of work, and what its threads hold then looks like a leak.
+    const Variable leaks("ASAN_OPTIONS", "detect_leaks=0");
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            auto session = open();
+            forkInside([&] { start(*session, server.url()); }, documents);
+        },
+        testing::ExitedWithCode(0), "");
+    EXPECT_EXIT(forkInside(
+                    [&] {
+                        TransferAgentOptions options;
+                        options.program = "/bin/false";
+                        BackgroundTransferSession({.identifier = "test"}, recorder, queue, options);
+                    },
+                    documents),
+                testing::ExitedWithCode(0), "");
+}
+
 }  // namespace
 }  // namespace corvane
+
+// Stands in for the system's own, which it calls, in this program.
+extern "C" int __cxa_atexit(void (*function)(void*), void* argument, void* object) noexcept {
+    using Function = int (*)(void (*)(void*), void*, void*);
+    static const auto next = reinterpret_cast<Function>(dlsym(RTLD_NEXT, "__cxa_atexit"));
+    const int result = next(function, argument, object);
+    int armed = 1;
+    if (corvane::registration.compare_exchange_strong(armed, 2)) {
+        while (corvane::registration != 3) std::this_thread::yield();
+    }
+    return result;
+}

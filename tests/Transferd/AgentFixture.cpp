@@ -2,9 +2,13 @@
 
 #include <corvane/Platform/TransferError.h>
 
+#include <arpa/inet.h>
 #include <signal.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 #include <future>
+#include <sstream>
 #include <thread>
 
 namespace corvane::test {
@@ -13,7 +17,8 @@ namespace {
 
 std::string describe(const std::optional<AnyError>& error, const std::optional<TransferResponse>& response) {
     if (!error) return response ? std::to_string(response->statusCode) : "nothing";
-    constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut", "network", "unreachable"};
+    constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut",
+                                     "network",        "unreachable",     "blocked"};
     const auto* known = error->as<TransferError>();
     return known ? names[known->code()] : error->what();
 }
@@ -45,8 +50,17 @@ void SessionRecorder::taskDidSendBodyData(const TransferTask&, std::int64_t sent
 void SessionRecorder::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                                       const std::optional<TransferResponse>& response) {
     EXPECT_EQ(task.state(), TransferTask::State::running);
+    if (whenCompleted) whenCompleted();
     std::lock_guard lock(mutex_);
     outcomes_[task.description().value_or("none")] += describe(error, response);
+    ++completed_;
+    changed_.notify_all();
+}
+
+void SessionRecorder::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
+                                          const std::optional<TransferResponse>& response) {
+    std::lock_guard lock(mutex_);
+    elsewhere_[task.description().value_or("none")] += describe(error, response);
     ++completed_;
     changed_.notify_all();
 }
@@ -73,6 +87,11 @@ std::map<std::string, std::string> SessionRecorder::outcomes() const {
     return outcomes_;
 }
 
+std::map<std::string, std::string> SessionRecorder::elsewhere() const {
+    std::lock_guard lock(mutex_);
+    return elsewhere_;
+}
+
 std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
     std::lock_guard lock(mutex_);
     return completedAtSignal_;
@@ -81,6 +100,35 @@ std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
 std::int64_t SessionRecorder::bytesSent() const {
     std::lock_guard lock(mutex_);
     return sent_;
+}
+
+LatePort::LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t size = sizeof address;
+    EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address), size), 0);
+    getsockname(socket_, reinterpret_cast<sockaddr*>(&address), &size);
+    port_ = ntohs(address.sin_port);
+}
+
+LatePort::~LatePort() {
+    close(socket_);
+}
+
+std::string LatePort::url() const {
+    return "http://127.0.0.1:" + std::to_string(port_);
+}
+
+void LatePort::answerOne() const {
+    listen(socket_, 8);
+    const int connection = accept(socket_, nullptr, nullptr);
+    char buffer[4096];
+    EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
+    const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
+    send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
+    recv(connection, buffer, sizeof buffer, 0);
+    close(connection);
 }
 
 AgentFixture::AgentFixture() {
@@ -96,8 +144,12 @@ AgentFixture::~AgentFixture() {
 
 std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
                                                     const std::string& owner) {
-    const TransferSessionConfiguration configuration{
-        .identifier = "session", .ownerKey = owner, .relaunchesForEvents = true};
+    return open(to, TransferSessionConfiguration{.identifier = "session", .ownerKey = owner});
+}
+
+std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
+                                                    TransferSessionConfiguration configuration) {
+    configuration.relaunchesForEvents = true;
     return std::make_shared<BackgroundTransferSession>(configuration, to, nullptr, options);
 }
 
@@ -140,6 +192,15 @@ long AgentFixture::agent(const std::filesystem::path& directory) {
     if (process <= 0) return 0;
     const auto command = readFile("/proc/" + std::to_string(process) + "/cmdline");
     return command.find(directory.string() + '\0') == std::string::npos ? 0 : process;
+}
+
+long AgentFixture::processorTime(long process) {
+    std::istringstream stat(readFile("/proc/" + std::to_string(process) + "/stat"));
+    std::string word;
+    for (int i = 0; i < 13; ++i) stat >> word;
+    long user = 0, system = 0;
+    stat >> user >> system;
+    return user + system;
 }
 
 void AgentFixture::kill(int signal) const {

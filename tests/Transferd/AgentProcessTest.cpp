@@ -45,15 +45,6 @@ class AgentProcessTest : public AgentFixture {
     [[nodiscard]] std::string proc(const std::string& name) const {
         return "/proc/" + std::to_string(agent()) + "/" + name;
     }
-    /// Processor time that the agent has used, in the system's ticks.
-    [[nodiscard]] long processorTime() const {
-        std::istringstream stat(readFile(proc("stat")));
-        std::string word;
-        for (int i = 0; i < 13; ++i) stat >> word;
-        long user = 0, system = 0;
-        stat >> user >> system;
-        return user + system;
-    }
 };
 
 TEST_F(AgentProcessTest, InheritsNothingFromItsHostAndLeavesNothingWithIt) {
@@ -165,7 +156,7 @@ TEST_F(AgentProcessTest, AThousandWaitingTasksCostLittleMemoryAndNoProcessorTime
 #endif
     // Once what it was asked has been done, it does not come back to the system by itself.
     const auto activity = [&] {
-        return std::pair(field("\n" + readFile(proc("status")), "voluntary_ctxt_switches"), processorTime());
+        return std::pair(field("\n" + readFile(proc("status")), "voluntary_ctxt_switches"), processorTime(agent()));
     };
     const auto rests = [&] {
         const auto before = activity();

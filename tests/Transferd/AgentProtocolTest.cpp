@@ -6,6 +6,7 @@
 #include "tests/Transferd/AgentFixture.h"
 
 #include <poll.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
@@ -28,6 +29,10 @@ class RawClient {
     void send(agent::Request request) {
         socket_.send(agent::encode(std::move(request)));
         EXPECT_TRUE(socket_.flush());
+    }
+    void greet(const std::string& owner = "o") {
+        send(agent::Hello{.session = "s", .owner = owner, .wakeCommand = {}});
+        EXPECT_TRUE(gets<agent::Welcome>());
     }
     void endSending() const { shutdown(socket_.descriptor(), SHUT_WR); }
     /// The next reply; nothing when the agent has closed the connection.
@@ -84,8 +89,11 @@ TEST_F(AgentProtocolTest, ClosesTheConnectionOfWhoeverBreaksTheRulesAndNoOther) 
         {"a request before the greeting", frame(agent::encode(agent::List{}))},
         {"a second greeting", hello + hello},
         {"a greeting that is cut off", frame(cut.substr(0, cut.size() - 2))},
-        {"bytes behind the greeting", frame(cut + "x")},
         {"a list that is longer than its message", frame(cut.substr(0, cut.size() - 4) + "\xff\xff\xff\xff")},
+        {"a session with too long a name",
+         frame(agent::encode(agent::Hello{.session = std::string(9000, 's'), .owner = "o", .wakeCommand = {}}))},
+        {"too long a wake command",
+         frame(agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {std::string(40'000, 'w')}}))},
         {"a name that leaves the directory", hello + frame(agent::encode(agent::Submit{"../agent.lock"}))},
     };
     for (const auto& [name, bytes] : cases) {
@@ -100,6 +108,46 @@ TEST_F(AgentProtocolTest, ClosesTheConnectionOfWhoeverBreaksTheRulesAndNoOther) 
     other.send(agent::Hello{.version = 99, .session = "s", .owner = "o", .wakeCommand = {}});
     EXPECT_TRUE(other.gets<agent::Welcome>()) << "it is told the version";
     EXPECT_FALSE(other.reply());
+    // What a later library has to say beyond what this agent knows.
+    RawClient later(options.directory);
+    later.sendBytes(frame(cut + "more") + frame("\x7fmore") + frame(agent::encode(agent::Ping{}) + "more"));
+    EXPECT_TRUE(later.gets<agent::Welcome>());
+    EXPECT_TRUE(later.gets<agent::Unsupported>());
+    EXPECT_TRUE(later.gets<agent::Pong>());
+    expectAgentWorks();
+}
+
+TEST_F(AgentProtocolTest, StrangersLockNobodyOutAndHostsAreNotCounted) {
+    std::vector<std::unique_ptr<RawClient>> hosts, strangers;
+    for (int i = 0; i < 100; ++i) {
+        hosts.push_back(std::make_unique<RawClient>(options.directory));
+        hosts.back()->greet(std::to_string(i % 3));
+    }
+    for (int i = 0; i < 100; ++i) strangers.push_back(std::make_unique<RawClient>(options.directory));
+    expectAgentWorks();
+    for (const auto& host : hosts) {
+        host->send(agent::Ping{});
+        EXPECT_TRUE(host->gets<agent::Pong>());
+    }
+    EXPECT_FALSE(strangers.front()->reply()) << "it makes room";
+    EXPECT_FALSE(strangers.back()->reply()) << "its time is over";
+}
+
+TEST_F(AgentProtocolTest, WaitsForDescriptorsWhenThereAreNone) {
+    rlimit before{};
+    const auto process = static_cast<pid_t>(agent());
+    ASSERT_EQ(prlimit(process, RLIMIT_NOFILE, nullptr, &before), 0);
+    EXPECT_EQ(before.rlim_cur, before.rlim_max) << "it takes what it can have";
+    rlimit few{0, before.rlim_max};  // as many as it has
+    while (access(("/proc/" + std::to_string(process) + "/fd/" + std::to_string(few.rlim_cur)).c_str(), F_OK) == 0) {
+        ++few.rlim_cur;
+    }
+    ASSERT_EQ(prlimit(process, RLIMIT_NOFILE, &few, nullptr), 0);
+    RawClient client(options.directory);
+    client.send(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {}});
+    EXPECT_FALSE(eventually([&] { return processorTime(process) > 20; }, 500ms)) << "it does not spin";
+    ASSERT_EQ(prlimit(process, RLIMIT_NOFILE, &before, nullptr), 0);
+    EXPECT_TRUE(client.gets<agent::Welcome>());
     expectAgentWorks();
 }
 

@@ -1,10 +1,18 @@
 #include "tests/Transferd/AgentFixture.h"
 
-#include <arpa/inet.h>
+#include <corvane/Platform/AgentDirectory.h>
+#include <corvane/Platform/AgentMessage.h>
+#include <corvane/Platform/FrameSocket.h>
+
+#include <poll.h>
 #include <signal.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <thread>
 
 namespace corvane::test {
 namespace {
@@ -97,34 +105,6 @@ TEST_F(BackgroundTransferSessionTest, RefusesBodiesThatAreNoFilesOfTheUser) {
     EXPECT_TRUE(server.requests().empty());
 }
 
-// A port of the loopback address at which nobody listens until it is told to.
-class LatePort {
-  public:
-    LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-        address_.sin_family = AF_INET;
-        address_.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        socklen_t size = sizeof address_;
-        EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address_), size), 0);
-        getsockname(socket_, reinterpret_cast<sockaddr*>(&address_), &size);
-    }
-    ~LatePort() { close(socket_); }
-    [[nodiscard]] std::string url() const { return "http://127.0.0.1:" + std::to_string(ntohs(address_.sin_port)); }
-    void answerOne() const {
-        listen(socket_, 8);
-        const int connection = accept(socket_, nullptr, nullptr);
-        char buffer[4096];
-        EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
-        const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
-        send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
-        recv(connection, buffer, sizeof buffer, 0);
-        close(connection);
-    }
-
-  private:
-    int socket_;
-    sockaddr_in address_{};
-};
-
 TEST_F(BackgroundTransferSessionTest, WaitsForAServerThatIsNotThereYetUntilItsPatienceIsOver) {
     LatePort late;
     const LatePort never;
@@ -137,9 +117,13 @@ TEST_F(BackgroundTransferSessionTest, WaitsForAServerThatIsNotThereYetUntilItsPa
     ASSERT_TRUE(other->wait(3));
     EXPECT_EQ(other->outcomes(), (Outcomes{{"a", "unreachable"}, {"b", "unreachable"}, {"c", "unreachable"}}));
     EXPECT_EQ(running(*session), std::vector<std::string>{"late"});
+    auto second = open(std::make_shared<SessionRecorder>());
+    EXPECT_EQ(running(*second), std::vector<std::string>{"late"});
+    EXPECT_EQ(log.count("Uploads wait for their server"), 3) << "once for each host and session, also a later one";
     late.answerOne();
     ASSERT_TRUE(recorder->wait(1));
     EXPECT_EQ(recorder->outcomes(), (Outcomes{{"late", "200"}}));
+    EXPECT_TRUE(log.waitFor("Uploads to a server go on, server=127.0.0.1:"));
 }
 
 TEST_F(BackgroundTransferSessionTest, TransfersInsideTheProcessWhenNoAgentCanBeHad) {
@@ -162,6 +146,70 @@ TEST_F(BackgroundTransferSessionTest, TransfersInsideTheProcessWhenNoAgentCanBeH
         EXPECT_EQ(files("spool"), 0u) << "no agent will send it again";
     }
     EXPECT_EQ(server.requests().size(), 4u);
+    auto session = open(recorder, std::string(9000, 'o'));
+    upload(*session, server.url(), "too long a name");
+    EXPECT_TRUE(recorder->wait(1));
+    EXPECT_EQ(log.count("the owner key is longer than 8192 bytes"), 1);
+}
+
+TEST_F(BackgroundTransferSessionTest, GoesBackToTheAgentOnceOneOfAnEarlierVersionHasGone) {
+    const AgentDirectory directory(options.directory);
+    Descriptor listener = directory.listen();
+    std::atomic<bool> stops = false;
+    std::thread earlier([&] {  // says which version it speaks, and hangs up
+        while (!stops) {
+            pollfd polled{listener.get(), POLLIN, 0};
+            poll(&polled, 1, 10);
+            Descriptor connected(accept(listener.get(), nullptr, nullptr));
+            if (!connected) continue;
+            FrameSocket socket(std::move(connected));
+            socket.send(agent::encode(agent::Welcome{.version = 1}));
+            EXPECT_TRUE(socket.flush());
+        }
+    });
+    options.holdOff = 0ms;
+    auto session = open(recorder);
+    for (std::size_t i = 0; i < 5; ++i) {
+        upload(*session, server.url(), std::to_string(i));
+        ASSERT_TRUE(recorder->wait(i + 1));
+    }
+    EXPECT_EQ(log.count("the agent speaks version 1 of the protocol"), 1) << "not once for each task";
+    stops = true;
+    earlier.join();
+    listener = Descriptor();
+    directory.removeSocket();
+    upload(*session, server.url(), "5");
+    ASSERT_TRUE(recorder->wait(6));
+    EXPECT_TRUE(running(*session).empty());
+    EXPECT_GT(agent(), 0);
+    EXPECT_EQ(server.requests().size(), 6u);
+}
+
+TEST_F(BackgroundTransferSessionTest, LeavesAMarkForTheAgentThatItCannotTellBeforeItsProcessExits) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    if (const char* shared = std::getenv("CORVANE_TEST_DIRECTORY")) options.directory = shared;
+    setenv("CORVANE_TEST_DIRECTORY", options.directory.c_str(), 1);
+    EXPECT_EXIT(
+        {
+            // The agent is killed while the delegate is told, and none can be started: the journal has the end, and
+            // nobody hears that it was reported.
+            options.program = documents / "program";
+            std::filesystem::create_symlink(CORVANE_AGENT, options.program);
+            recorder->whenCompleted = [this] {
+                std::filesystem::remove(options.program);
+                end(options.directory);
+            };
+            static auto& session = *new auto(open(recorder));
+            upload(*session, server.url(), "a");
+            const bool completed = recorder->wait(1) && running(*session).empty();
+            std::filesystem::remove_all(documents.path());
+            std::exit(completed ? 0 : 1);
+        },
+        testing::ExitedWithCode(0), "");
+    unsetenv("CORVANE_TEST_DIRECTORY");
+    auto session = open(recorder);
+    EXPECT_TRUE(running(*session).empty());
+    EXPECT_TRUE(recorder->outcomes().empty()) << "it was reported";
 }
 
 TEST_F(BackgroundTransferSessionTest, TakesOverFromAnAgentThatHangsWhichThenLeavesTheTasksAlone) {

@@ -103,8 +103,10 @@ TEST_F(HostTest, WhatAKilledHostHandedOverArrivesOnceAndItsNextRunLearnsOfIt) {
 }
 
 TEST_F(HostTest, DocumentsArriveWithNoHostAliveAndAreReportedLater) {
+    server.script(ScriptedServer::Reply::status(200).hold(), 200);
     const Outcome killed = run("main", 200, "kill");
     ASSERT_TRUE(wasKilled(killed));
+    server.release(200);
     ASSERT_TRUE(eventually([&] { return server.requests().size() == 200; }, 30s));
     EXPECT_EQ(payloads("main"), 200u) << "nobody has told the host";
     EXPECT_TRUE(succeeded(run("main", 1, "wait")));

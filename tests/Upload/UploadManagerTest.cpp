@@ -84,6 +84,25 @@ TEST(UploadManager, TakesADocumentOverAndForgetsItOnceTheCollectorHasAnswered) {
     EXPECT_EQ(log.count("Failed"), 0);
 }
 
+TEST(UploadManager, WhatEndedElsewhereIsWaitedForNoLongerAndLeftToWhoeverWasTold) {
+    const TemporaryDocuments documents;
+    ProcessRun run;
+    run.manager->open();
+    for (const auto* identifier : {"delivered", "refused", "to be sent again"}) run.upload(identifier);
+    run.ledger->add("without a row", 10);
+    run.manager->uploadEndedElsewhere(UploadResult::success("delivered", {200}));
+    run.manager->uploadEndedElsewhere(UploadResult::failed("refused", {404}));
+    run.manager->uploadEndedElsewhere(UploadResult::retry("to be sent again", now()));
+    run.manager->uploadEndedElsewhere(UploadResult::retry("without a row", now()));
+    EXPECT_EQ(run.ledger->wait(std::chrono::steady_clock::now()),
+              (DeliveryReport{.delivered = {10, 1}, .pending = {10, 1}, .givenUp = {20, 2}}));
+    EXPECT_EQ(run.rows().size(), 3u);
+    for (const auto& stored : run.rows()) {
+        EXPECT_EQ(stored.retries, 0) << "it is counted there";
+        EXPECT_TRUE(run.dropbox->existingFile(stored.identifier));
+    }
+}
+
 TEST(UploadManager, ARetrysWholeLife) {
     const TemporaryDocuments documents;
     const Date later = now() + std::chrono::hours(1);

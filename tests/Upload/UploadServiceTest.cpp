@@ -58,7 +58,7 @@ class Books final : public UploadServiceDelegate {
         }
         const auto& retry = std::get<UploadResult::Retry>(result.value);
         EXPECT_LT(std::chrono::abs(now() - retry.after), std::chrono::seconds(10));
-        return "retry " + retry.identifier;
+        return (retry.isCounted ? "retry " : "uncounted ") + retry.identifier;
     }
 
     std::mutex mutex_;
@@ -173,6 +173,7 @@ TEST_F(UploadServiceTest, ReportsEveryEndingAndLogsIt) {
     const auto session = shelf.only();
     session->progress(1, 2, 3, 4);
     session->complete(1, AnyError(TransferError(TransferError::Code::network, "no luck")), std::nullopt);
+    session->complete(1, AnyError(TransferError(TransferError::Code::blocked, "portal")), std::nullopt);
     session->complete(1, std::nullopt, std::nullopt);
     session->complete(1, std::nullopt, TransferResponse{.isHTTP = false, .statusCode = 200, .headers = {}});
     session->complete(1, 204, {{"A", "b"}});
@@ -183,6 +184,7 @@ TEST_F(UploadServiceTest, ReportsEveryEndingAndLogsIt) {
     session->complete(1, 302);
     queue->sync([] {});
     const std::vector<std::string> expected{"retry A",
+                                            "uncounted A",
                                             "retry A",
                                             "retry A",
                                             "success A " + UploadResponse{204, {{"A", "b"}}}.description(),
