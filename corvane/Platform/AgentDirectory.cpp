@@ -72,6 +72,8 @@ AgentDirectory::AgentDirectory(const std::filesystem::path& directory) : path_(s
         createPrivateDirectories(one);
         requireOwn(one);
     }
+    // The journal is not opened through a symbolic link, and homes often lie behind one.
+    path_ = std::filesystem::canonical(path_);
 }
 
 Descriptor AgentDirectory::connect() const {

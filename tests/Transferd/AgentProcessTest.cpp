@@ -93,7 +93,10 @@ TEST_F(AgentProcessTest, InheritsNothingFromItsHostAndLeavesNothingWithIt) {
 }
 
 TEST_F(AgentProcessTest, ItsFilesArePrivateAndItsDirectoryMayHaveAnyLength) {
-    std::filesystem::path deep = documents.path();
+    // A home may lie behind a symbolic link.
+    std::filesystem::create_directories(documents / "home");
+    std::filesystem::create_directory_symlink(documents / "home", documents / "link");
+    std::filesystem::path deep = documents / "link";
     for (int i = 0; i < 6; ++i) deep /= std::string(60, 'x');
     options.directory = deep;
     auto session = open(recorder);
