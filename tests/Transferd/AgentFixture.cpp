@@ -191,7 +191,9 @@ long AgentFixture::agent(const std::filesystem::path& directory) {
     const long process = std::atol(readFile(directory / "agent.lock").c_str());
     if (process <= 0) return 0;
     const auto command = readFile("/proc/" + std::to_string(process) + "/cmdline");
-    return command.find(directory.string() + '\0') == std::string::npos ? 0 : process;
+    std::error_code gone;
+    const auto real = std::filesystem::weakly_canonical(directory, gone).string();
+    return command.find(real + '\0') == std::string::npos ? 0 : process;
 }
 
 long AgentFixture::processorTime(long process) {
