@@ -265,12 +265,20 @@ consteval auto searchValue() {
     }
 }
 
+/// What a data event of the library's that wraps another one is judged by.
+template <class T>
+struct Contents {
+    using Type = T;
+};
+
 /// The first fault in a data event.
 template <Use use, class T>
 consteval auto searchDataEvent() {
-    if constexpr (requires(const T& data) {
-                      { data.toDict() } -> std::same_as<JSON>;
-                  }) {
+    if constexpr (!std::same_as<typename Contents<T>::Type, T>) {
+        return searchDataEvent<use, typename Contents<T>::Type>();
+    } else if constexpr (requires(const T& data) {
+                             { data.toDict() } -> std::same_as<JSON>;
+                         }) {
         return NoFinding();
     } else if constexpr (requires(T & data) { data.toDict(); }) {
         return Finding<Fault::toDictIsNotJSON, T, noName>();

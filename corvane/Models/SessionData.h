@@ -37,4 +37,9 @@ struct SessionData {
 template <class D>
 SessionData(std::string, D) -> SessionData<D>;
 
+template <class D>
+struct detail::Contents<SessionData<D>> {
+    using Type = D;
+};
+
 }  // namespace corvane
