@@ -70,7 +70,8 @@ std::string StoreTable::keysSQL() const {
     const auto key =
         std::find_if(columns_.begin(), columns_.end(), [](const StoreColumn& column) { return column.primary; });
     CORVANE_REQUIRE(key != columns_.end(), "the table " + name_ + " has no key");
-    // The sign keeps the database from walking through the table, whose rows may be large: the key's index has all of it.
+    // The sign keeps the database from walking through the table, whose rows may be large: the key's index has all of
+    // it.
     return "SELECT " + key->name + " FROM " + name_ + " ORDER BY +rowid;";
 }
 

@@ -1,16 +1,9 @@
 #include "tests/Integration/FaultFixture.h"
 #include "tests/support/ProcessSettings.h"
+#include "tests/support/TLSServer.h"
 
 #include <corvane/Platform/InProcessTransferSession.h>
 
-#include <fcntl.h>
-#include <signal.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cstdio>
-#include <cstdlib>
-#include <functional>
 #include <future>
 #include <memory>
 #include <mutex>
@@ -130,74 +123,19 @@ TEST(ServerFaults, OneFaultCostsOneDocumentAtMostAndTheOthersArrive) {
     }
 }
 
-/// A TLS server on a loopback port whose certificate nobody has signed.
-class UntrustedServer {
-  public:
-    explicit UntrustedServer(const std::filesystem::path& directory) {
-        const std::string key = directory / "key.pem", certificate = directory / "certificate.pem";
-        run({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256", "-nodes", "-keyout",
-             key, "-out", certificate, "-subj", "/CN=localhost", "-addext", "subjectAltName=IP:127.0.0.1"},
-            -1);
-        int output[2];
-        if (pipe2(output, O_CLOEXEC) != 0) throw std::runtime_error("pipe");
-        server_ = start({"openssl", "s_server", "-www", "-accept", "127.0.0.1:0", "-key", key, "-cert", certificate},
-                        output[1]);
-        close(output[1]);
-        output_ = fdopen(output[0], "r");
-        char line[256];
-        while (url_.empty() && fgets(line, sizeof line, output_)) {
-            const std::string_view text = line;
-            constexpr std::string_view prefix = "ACCEPT ";
-            if (text.starts_with(prefix)) url_ = "https://" + std::string(text.substr(prefix.size(), text.size() - 8));
-        }
-    }
-    UntrustedServer(const UntrustedServer&) = delete;
-    UntrustedServer& operator=(const UntrustedServer&) = delete;
-    ~UntrustedServer() {
-        kill(server_, SIGKILL);
-        waitpid(server_, nullptr, 0);
-        fclose(output_);
-    }
-    [[nodiscard]] const std::string& url() const { return url_; }
-
-  private:
-    static pid_t start(const std::vector<std::string>& command, int output) {
-        std::vector<char*> arguments;
-        for (const auto& argument : command) arguments.push_back(const_cast<char*>(argument.c_str()));
-        arguments.push_back(nullptr);
-        const pid_t child = fork();
-        if (child == 0) {
-            const int null = open("/dev/null", O_RDWR);
-            dup2(null, STDIN_FILENO);
-            dup2(output < 0 ? null : output, STDOUT_FILENO);
-            dup2(null, STDERR_FILENO);
-            execvp(arguments[0], arguments.data());
-            _exit(127);
-        }
-        return child;
-    }
-    static void run(const std::vector<std::string>& command, int output) {
-        int status = 0;
-        waitpid(start(command, output), &status, 0);
-        if (status != 0) throw std::runtime_error("openssl failed");
-    }
-
-    pid_t server_ = -1;
-    FILE* output_ = nullptr;
-    std::string url_;
-};
-
 TEST(ServerFaults, AServerThatIsNotThereOrCannotBeTrustedGetsNothingAndCostsNothing) {
-    const TemporaryDocuments certificates;
-    const UntrustedServer untrusted(certificates.path());
+    const TLSServer untrusted;
     std::string nobody;
     {
         const ScriptedServer gone;
         nobody = gone.url();
     }
-    const std::pair<std::string, const char*> cases[] = {{nobody, "Couldn't connect to server"},
-                                                         {untrusted.url(), "self-signed certificate"}};
-    for (const auto& [url, reason] : cases) {
+    const struct {
+        std::string url;
+        const char* reason;
+        std::int64_t counted;  // attempts behind a captive portal must not use a document up
+    } cases[] = {{nobody, "Couldn't connect to server", 1}, {untrusted.url(), "self-signed certificate", 0}};
+    for (const auto& [url, reason, counted] : cases) {
         SCOPED_TRACE(url);
         FaultFixture disk;
         {
@@ -208,6 +146,7 @@ TEST(ServerFaults, AServerThatIsNotThereOrCannotBeTrustedGetsNothingAndCostsNoth
         EXPECT_EQ(disk.log.count(reason), 5);
         EXPECT_EQ(endings(disk.log), 5);
         EXPECT_EQ(FaultFixture::rows().size(), 5u);
+        for (const auto& row : FaultFixture::rows()) EXPECT_EQ(row.retries, counted);
         EXPECT_EQ(disk.runAgain().delivered.documents, 5);
         EXPECT_EQ(disk.distinctEvents(), 5u);
     }
