@@ -11,7 +11,7 @@
 #include <deque>
 #include <exception>
 #include <mutex>
-#include <system_error>
+#include <utility>
 
 namespace corvane {
 
@@ -80,7 +80,8 @@ struct SerialQueue::State {
     bool running = false;  // somebody, the worker or an inline sync(), is running tasks
     bool asleep = false;   // the worker waits for `wake`
     bool workerStarted = false;
-    bool closed = false;  // the last reference is gone; the worker ends when nothing is left
+    bool startFailed = false;  // there was no thread to be had, which has been logged
+    bool closed = false;       // the last reference is gone; the worker ends when nothing is left
     // Written under the mutex; the worker reads it without between two tasks.
     std::atomic<int> suspensions = 0;
 
@@ -99,16 +100,22 @@ void SerialQueue::State::startWorker(const std::shared_ptr<State>& state) {
         startDetachedThread(state->label, state->qualityOfService == QualityOfService::background,
                             [state] { state->work(); });
     } catch (const std::exception& error) {  // no thread, or no memory for one
+        bool isNews = false;
+        {
+            std::lock_guard lock(state->mutex);
+            isNews = !std::exchange(state->startFailed, true);
+            state->workerStarted = false;  // what waits stays; the next call tries again
+            state->syncDone.notify_all();  // whoever waits for the queue sees to it now
+        }
+        if (!isNews) return;
         Log::shared().error("Failed to start thread, queue=%{public}@, error=%{public}@", state->label, error.what());
-        std::lock_guard lock(state->mutex);
-        state->workerStarted = false;  // what waits stays; the next call tries again
-        state->syncDone.notify_all();  // whoever waits for the queue sees to it now
     }
 }
 
 void SerialQueue::State::work() {
     TaskList taken;
     std::unique_lock lock(mutex);
+    startFailed = false;
     for (;;) {
         while (running || waiting.empty() || suspended()) {
             if (closed && waiting.empty()) return;

@@ -76,6 +76,15 @@ TEST(Log, ShowsErrorsUnlessToldOtherwiseAndPrintsNothingThatSteersATerminal) {
     EXPECT_EQ(log.lines()[1].message, "a\\x1b[31m\\x0d\n\\x7f\\xff\\xc2\\x9b\xe2\x82\xac\\xc3");
 }
 
+TEST(TransferSession, AFactoryThatGoesMaySetAnother) {
+    struct SetsAnother {
+        ~SetsAnother() { TransferSession::setFactory(nullptr); }
+    };
+    ProcessSettings settings;
+    settings.setTransfers([held = std::make_shared<SetsAnother>()](auto&&...) { return nullptr; });
+    settings.setTransfers(nullptr);
+}
+
 TEST(Lazy, LoadsOnceAndAgainOnlyAfterAFailure) {
     int loads = 0;
     const Lazy<int> lazy([&] {
