@@ -40,6 +40,10 @@ JSON detail::requireHostObject(JSON json) {
 
 AnyDataEvent::Base::~Base() = default;
 
+void AnyDataEvent::destroy(const Base* box) noexcept {
+    delete box;
+}
+
 JSON AnyDataEvent::toDict() const {
     const AnyDataEvent held(*this);  // the host's code, which is not called under the lock, may replace this object
     const Base* const box = held.box_;

@@ -80,7 +80,7 @@ class CORVANE_EXPORT AnyDataEvent {
         return *this;
     }
     ~AnyDataEvent() {
-        if (box_ && box_->references.fetch_sub(1, std::memory_order_acq_rel) == 1) delete box_;
+        if (box_ && box_->references.fetch_sub(1, std::memory_order_acq_rel) == 1) destroy(box_);
     }
 
     /// The data event as a JSON object. Throws as the free function `toDict` does, each time anew.
@@ -105,6 +105,7 @@ class CORVANE_EXPORT AnyDataEvent {
         mutable std::optional<JSON> dict;             // written once, under the mutex
         mutable std::atomic<bool> isEncoded = false;  // `dict` is there, and does not change any more
     };
+    static void destroy(const Base* box) noexcept;
 
     template <class T>
     struct CORVANE_LOCAL Box final : Base {
