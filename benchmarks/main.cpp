@@ -7,8 +7,8 @@
 #include "benchmarks/Table.h"
 #include "tests/support/TemporaryDocuments.h"
 
-#include <corvane/Platform/InProcessTransferSession.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <cstring>
 #include <string>

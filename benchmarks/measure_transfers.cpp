@@ -9,8 +9,8 @@
 #include "tests/support/ScriptedServer.h"
 #include "tests/support/TemporaryDocuments.h"
 
-#include <corvane/Platform/BackgroundTransferSession.h>
-#include <corvane/Platform/InProcessTransferSession.h>
+#include <corvane/Agent/Host/BackgroundTransferSession.h>
+#include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <signal.h>
 

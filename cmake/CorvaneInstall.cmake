@@ -10,31 +10,31 @@ set(internal_headers
     corvane/Models/JSONShape.h
     corvane/Models/JSONTree.h
     corvane/Models/OwnJSON.h
-    corvane/Platform/AgentDirectory.h
-    corvane/Platform/AgentLink.h
-    corvane/Platform/AgentMessage.h
-    corvane/Platform/AgentProgram.h
-    corvane/Platform/AgentThread.h
-    corvane/Platform/BackgroundTransferCore.h
-    corvane/Platform/BackgroundTransferTask.h
-    corvane/Platform/CurlTransfer.h
+    corvane/Agent/AgentDirectory.h
+    corvane/Agent/Host/AgentLink.h
+    corvane/Agent/AgentMessage.h
+    corvane/Agent/Host/AgentProgram.h
+    corvane/Agent/Host/AgentThread.h
+    corvane/Agent/Host/BackgroundTransferCore.h
+    corvane/Agent/Host/BackgroundTransferTask.h
+    corvane/Transfer/CurlTransfer.h
     corvane/Platform/Descriptor.h
-    corvane/Platform/FrameSocket.h
+    corvane/Agent/FrameSocket.h
     corvane/Platform/HostCall.h
-    corvane/Platform/HTTPTransfer.h
-    corvane/Platform/OpenSSLUse.h
+    corvane/Transfer/HTTPTransfer.h
+    corvane/Signing/OpenSSLUse.h
     corvane/Platform/PrivateFile.h
     corvane/Platform/TaskList.h
     corvane/Platform/Thread.h
-    corvane/Platform/TransferOutcome.h
-    corvane/Platform/TransferScheduler.h
-    corvane/Platform/TransferSubmission.h
-    corvane/Platform/TransferThread.h
-    corvane/Platform/WireReader.h
-    corvane/Platform/WireWriter.h
+    corvane/Agent/TransferOutcome.h
+    corvane/Transfer/TransferScheduler.h
+    corvane/Agent/TransferSubmission.h
+    corvane/Transfer/TransferThread.h
+    corvane/Agent/WireReader.h
+    corvane/Agent/WireWriter.h
     corvane/Session/SessionCore.h)
 list(REMOVE_ITEM headers ${internal_headers})
-list(FILTER headers EXCLUDE REGEX "^corvane/Transferd/")  # the agent's own
+list(FILTER headers EXCLUDE REGEX "^corvane/Agent/Daemon/")  # the agent's own
 foreach(header IN LISTS headers)
     get_filename_component(folder ${header} DIRECTORY)
     install(FILES ${PROJECT_SOURCE_DIR}/${header} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/${folder})

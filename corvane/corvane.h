@@ -6,6 +6,7 @@
 
 #ifndef CORVANE_CANNOT_BE_COMPILED  // it has said why, in one sentence
 
+#include <corvane/Agent/Host/BackgroundTransferSession.h>
 #include <corvane/Models/Client.h>
 #include <corvane/Models/DataEvent.h>
 #include <corvane/Models/Decoding.h>
@@ -14,21 +15,20 @@
 #include <corvane/Models/Session.h>
 #include <corvane/Models/SessionData.h>
 #include <corvane/Models/TimedData.h>
-#include <corvane/Platform/BackgroundTransferSession.h>
 #include <corvane/Platform/DocumentsDirectory.h>
-#include <corvane/Platform/InProcessTransferSession.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/MainQueue.h>
-#include <corvane/Platform/SigningServiceType.h>
-#include <corvane/Platform/TransferError.h>
 #include <corvane/Processing/LoggingEventProcessor.h>
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 #include <corvane/Session/SessionManager.h>
-#include <corvane/Session/SessionObserver.h>
+#include <corvane/Signing/SigningServiceType.h>
 #include <corvane/Snapshot/Snapshot.h>
 #include <corvane/Tracker/AccessTracker.h>
+#include <corvane/Tracker/SessionObserver.h>
 #include <corvane/Tracker/Tracker.h>
+#include <corvane/Transfer/InProcessTransferSession.h>
+#include <corvane/Transfer/TransferError.h>
 #include <corvane/Upload/Endpoint.h>
 #include <corvane/Upload/ExternalAnalyticsUploader.h>
 

@@ -16,13 +16,13 @@
 #include <corvane/Bridge/Data/BridgedTracker.h>
 #include <corvane/Bridge/Logging/BridgingLoggingEventProcessor.h>
 #include <corvane/Bridge/Models/BridgeError.h>
+#include <corvane/Bridge/Models/BridgedDataEvent.h>
+#include <corvane/Bridge/Models/BridgedDataType.h>
 #include <corvane/Bridge/Models/BridgedEventData.h>
 #include <corvane/Bridge/Models/BridgedTimedData.h>
+#include <corvane/Bridge/Models/toJsonValue.h>
 #include <corvane/Bridge/Session/BridgedSessionManager.h>
 #include <corvane/Bridge/Upload/BridgedUploadBatchEventProcessor.h>
-#include <corvane/Models/BridgedDataEvent.h>
-#include <corvane/Models/BridgedDataType.h>
-#include <corvane/Models/toJsonValue.h>
 
 namespace corvane {
 

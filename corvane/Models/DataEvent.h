@@ -3,7 +3,7 @@
 #include <corvane/Export.h>
 #include <corvane/Models/DataEventError.h>
 #include <corvane/Models/Encoding.h>
-#include <corvane/Platform/DataType.h>
+#include <corvane/Reflection/DataType.h>
 
 #include <atomic>
 #include <concepts>

@@ -1,7 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Platform/Reflection.h>
+#include <corvane/Reflection/Reflection.h>
 
 #include <string_view>
 #include <tuple>

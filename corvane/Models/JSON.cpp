@@ -1,6 +1,5 @@
 #include <corvane/Models/JSON.h>
 
-#include <corvane/Models/BridgedError.h>
 #include <corvane/Models/JSONTree.h>
 #include <corvane/Models/OwnJSON.h>
 #include <corvane/Platform/Require.h>
@@ -211,15 +210,6 @@ std::string JSON::toData(JSONWritingOptions options) const {
     const auto* value = storage_->value();
     if (!value || !value->is_structured()) throw JSONError(JSONError::invalidTopLevelValue);
     return isCompact ? text() : jsontree::write(*value, options);
-}
-
-std::optional<std::string> JSON::toDataWithOptions(JSONWritingOptions options, BridgedError* error) const {
-    try {
-        return toData(options);
-    } catch (...) {
-        if (error) *error = BridgedError::of(AnyError::current());
-        return std::nullopt;
-    }
 }
 
 JSON JSON::payload() const {

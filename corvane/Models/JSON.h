@@ -15,7 +15,6 @@
 
 namespace corvane {
 
-class BridgedError;
 struct OwnJSON;
 
 /// How JSON text is laid out. The default is compact, keys in the order in which they were written.
@@ -95,9 +94,6 @@ class CORVANE_EXPORT JSON {
 
     /// Serialises an object or an array. Throws `JSONError` for anything else.
     [[nodiscard]] std::string toData(JSONWritingOptions options = {}) const;
-
-    /// The same for object-facing callers: a failure returns nothing and fills `error`, unless that is nullptr.
-    [[nodiscard]] std::optional<std::string> toDataWithOptions(JSONWritingOptions options, BridgedError* error) const;
 
     /// This value if it is an object. Throws `JSONError` otherwise.
     [[nodiscard]] JSON payload() const;

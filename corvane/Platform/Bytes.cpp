@@ -1,8 +1,5 @@
 #include <corvane/Platform/Bytes.h>
 
-#include <corvane/Platform/OpenSSLUse.h>
-#include <corvane/Platform/SigningError.h>
-
 #include <openssl/evp.h>
 
 #include <algorithm>
@@ -53,16 +50,6 @@ std::string base64String(std::string_view bytes) {
                         reinterpret_cast<const unsigned char*>(bytes.data()), static_cast<int>(bytes.size()));
     text.resize(static_cast<std::size_t>(length));
     return text;
-}
-
-std::string sha1Digest(std::string_view bytes) {
-    const OpenSSLUse use;
-    unsigned char digest[EVP_MAX_MD_SIZE];
-    unsigned length = 0;
-    if (EVP_Digest(bytes.data(), bytes.size(), digest, &length, EVP_sha1(), nullptr) != 1) {
-        throw SigningError(SigningError::failed, "SHA-1 is not available");
-    }
-    return {reinterpret_cast<const char*>(digest), length};
 }
 
 bool holdsControlCharacter(std::string_view text) {

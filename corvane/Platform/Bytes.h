@@ -15,9 +15,6 @@ CORVANE_EXPORT void appendHexDigits(std::string& out, std::string_view bytes);
 /// Standard base64 with padding and without line breaks.
 [[nodiscard]] CORVANE_EXPORT std::string base64String(std::string_view bytes);
 
-/// The SHA-1 digest, 20 bytes. Throws `SigningError` unavailable while the process exits.
-[[nodiscard]] CORVANE_EXPORT std::string sha1Digest(std::string_view bytes);
-
 /// Whether `text` holds a character that would end a header or hide in one: a C0 control or DEL.
 [[nodiscard]] CORVANE_EXPORT bool holdsControlCharacter(std::string_view text);
 

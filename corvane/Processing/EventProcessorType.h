@@ -1,9 +1,9 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Models/Group.h>
 #include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/Session.h>
-#include <corvane/Tracker/Group.h>
 
 #include <functional>
 #include <memory>
@@ -19,26 +19,29 @@ class SerialQueue;
 /// must not wait for that queue; what it throws is logged and the next processor is called.
 class CORVANE_EXPORT EventProcessorType {
   public:
-    virtual ~EventProcessorType();
+    virtual ~EventProcessorType() = default;
 
     /// The queue on which all later callbacks run. Called once per addition, on the thread that adds the processor.
     virtual void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) = 0;
     virtual void process(const ProcessEvent& processEvent) = 0;
 
-    virtual void didEnterGroup(const Group& group);
-    virtual void didLeaveGroup(const Group& group);
+    virtual void didEnterGroup(const Group& /*group*/) {}
+    virtual void didLeaveGroup(const Group& /*group*/) {}
     /// A session started, or was running when the processor was added.
-    virtual void didStartSession(const Session& session);
+    virtual void didStartSession(const Session& /*session*/) {}
     /// The session's data changed. `submitQueues` asks the processor to send what it has queued now.
-    virtual void didUpdateSession(const Session& session, bool submitQueues);
-    virtual void didEndSession(const Session& session, Date endDate);
+    virtual void didUpdateSession(const Session& /*session*/, bool /*submitQueues*/) {}
+    virtual void didEndSession(const Session& /*session*/, Date /*endDate*/) {}
 
     /// What tells this processor apart from others: itself, or what it stands for.
     [[nodiscard]] virtual const void* identity() const { return this; }
 
     /// Returns true when this processor owns the background transfer session `identifier` and takes the completion
     /// over, which it then calls when the session's events are delivered.
-    virtual bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion);
+    virtual bool resumeBackgroundProcessing(const std::string& /*identifier*/,
+                                            const std::function<void()>& /*completion*/) {
+        return false;
+    }
 
   protected:
     EventProcessorType() = default;

@@ -4,8 +4,6 @@
 
 namespace corvane {
 
-LoggingEventProcessorFormatterType::~LoggingEventProcessorFormatterType() = default;
-
 std::string DefaultLoggingEventProcessorFormatter::format(const ProcessEvent& processEvent) const {
     if (!processEvent.json().exists()) return processEvent.name() + " ~> nil";
     return processEvent.name() + " -> " + processEvent.json().description();

@@ -13,7 +13,7 @@ namespace corvane {
 /// Turns an event into the line that is logged for it. Called on the access queue.
 class CORVANE_EXPORT LoggingEventProcessorFormatterType {
   public:
-    virtual ~LoggingEventProcessorFormatterType();
+    virtual ~LoggingEventProcessorFormatterType() = default;
     [[nodiscard]] virtual std::string format(const ProcessEvent& processEvent) const = 0;
 
   protected:

@@ -6,18 +6,6 @@
 
 namespace corvane {
 
-SessionProviderType::~SessionProviderType() = default;
-
-EventProcessorType::~EventProcessorType() = default;
-void EventProcessorType::didEnterGroup(const Group&) {}
-void EventProcessorType::didLeaveGroup(const Group&) {}
-void EventProcessorType::didStartSession(const Session&) {}
-void EventProcessorType::didUpdateSession(const Session&, bool) {}
-void EventProcessorType::didEndSession(const Session&, Date) {}
-bool EventProcessorType::resumeBackgroundProcessing(const std::string&, const std::function<void()>&) {
-    return false;
-}
-
 ProcessorManager::ProcessorManager(std::shared_ptr<SerialQueue> accessQueue) : accessQueue_(std::move(accessQueue)) {}
 ProcessorManager::~ProcessorManager() = default;
 

@@ -15,7 +15,7 @@ namespace corvane {
 /// Reports the session that runs. Called on the access queue.
 class CORVANE_EXPORT SessionProviderType {
   public:
-    virtual ~SessionProviderType();
+    virtual ~SessionProviderType() = default;
     [[nodiscard]] virtual std::optional<Session> currentSession() const = 0;
 };
 

@@ -4,8 +4,6 @@
 
 namespace corvane {
 
-ActiveSessionType::~ActiveSessionType() = default;
-
 ActiveSession::ActiveSession(std::string identifier, Session::Kind kind, Date startDate)
     : identifier_(std::move(identifier)), kind_(std::move(kind)), startDate_(startDate) {}
 ActiveSession::~ActiveSession() = default;

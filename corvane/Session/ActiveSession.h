@@ -3,26 +3,12 @@
 #include <corvane/Export.h>
 #include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/Session.h>
+#include <corvane/Tracker/ActiveSessionType.h>
 
 #include <deque>
 #include <string>
 
 namespace corvane {
-
-/// What trackers see of the session that runs.
-class CORVANE_EXPORT ActiveSessionType {
-  public:
-    virtual ~ActiveSessionType();
-
-    [[nodiscard]] virtual const std::string& identifier() const = 0;
-    [[nodiscard]] virtual const Session::Kind& kind() const = 0;
-    [[nodiscard]] virtual Date startDate() const = 0;
-
-  protected:
-    ActiveSessionType() = default;
-    ActiveSessionType(const ActiveSessionType&) = default;
-    ActiveSessionType& operator=(const ActiveSessionType&) = default;
-};
 
 /// The session that runs, with every event handed over while it was active. Made by the session manager only, and used
 /// on its queue.

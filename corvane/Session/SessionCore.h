@@ -5,8 +5,8 @@
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Session/ActiveSession.h>
-#include <corvane/Session/SessionObserver.h>
 #include <corvane/Tracker/DataEventStacks.h>
+#include <corvane/Tracker/SessionObserver.h>
 #include <corvane/Tracker/Tracker.h>
 #include <corvane/Tracker/TrackerDelegate.h>
 

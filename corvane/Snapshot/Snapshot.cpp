@@ -15,8 +15,6 @@ AnyDataEventEntry spanEntry(std::string_view property, const TimedData& span) {
 
 }  // namespace
 
-SnapshotType::~SnapshotType() = default;
-
 Snapshot::Snapshot(SnapshotPolicy policy, std::vector<SnapshotLevel> levels,
                    std::shared_ptr<EventMirrorStore> mirrorStore)
     : policy_(policy), levels_(std::move(levels)), eventMirrorStore_(std::move(mirrorStore)) {}

@@ -1,9 +1,9 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Tracker/DataEventStack.h>
-#include <corvane/Tracker/EventSubmit.h>
-#include <corvane/Tracker/TrackerTimer.h>
+#include <corvane/Models/AnyDataEventEntry.h>
+#include <corvane/Models/EventSubmit.h>
+#include <corvane/Models/TrackerTimer.h>
 
 #include <map>
 #include <memory>
@@ -77,7 +77,7 @@ struct SnapshotEvent {
 ///     }
 class CORVANE_EXPORT SnapshotType {
   public:
-    virtual ~SnapshotType();
+    virtual ~SnapshotType() = default;
 
     /// Checks an event type against the copied data. Consumes nothing; runs on the caller's thread. A required
     /// `TimedData` is answered by the timer that ran on the nearest tracker, up to now, in an entry that names no place

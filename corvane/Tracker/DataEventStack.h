@@ -1,25 +1,14 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Models/DataEvent.h>
-#include <corvane/Tracker/DataEventTrait.h>
+#include <corvane/Models/AnyDataEventEntry.h>
 
-#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
 namespace corvane {
-
-/// One entry of a stack, with the key it is filed under and where in the host's code it was pushed.
-struct AnyDataEventEntry {
-    std::string_view key;  ///< lives as long as the program, or as `data`
-    AnyDataEvent data;
-    DataEventTraits traits;
-    const char* file;  ///< lives as long as the program, or as `data`
-    std::uint_least32_t line;
-};
 
 /// The data events of one type under one key, newest last. Belongs to a tracker or to the session manager and is used
 /// on their queue.

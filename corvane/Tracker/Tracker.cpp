@@ -4,9 +4,9 @@
 #include <corvane/Models/TimedData.h>
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/UUID.h>
-#include <corvane/Session/ActiveSession.h>
-#include <corvane/Session/SessionObserver.h>
 #include <corvane/Tracker/AccessTracker.h>
+#include <corvane/Tracker/ActiveSessionType.h>
+#include <corvane/Tracker/SessionObserver.h>
 #include <corvane/Tracker/TrackerDelegate.h>
 
 #include <algorithm>
@@ -14,8 +14,6 @@
 #include <utility>
 
 namespace corvane {
-
-TrackerDelegate::~TrackerDelegate() = default;
 
 Tracker::Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue,
                  std::shared_ptr<EventMirrorStore> mirrorStore, std::shared_ptr<Tracker> parent,

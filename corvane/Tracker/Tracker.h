@@ -1,18 +1,18 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Models/EventProperty.h>
+#include <corvane/Models/EventSubmit.h>
+#include <corvane/Models/Group.h>
+#include <corvane/Models/SessionChange.h>
 #include <corvane/Platform/Date.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Platform/StringMap.h>
 #include <corvane/Platform/ThreadAnnotations.h>
-#include <corvane/Session/SessionChange.h>
 #include <corvane/Snapshot/Snapshot.h>
 #include <corvane/Tracker/DataEventStacks.h>
 #include <corvane/Tracker/DelayedToken.h>
-#include <corvane/Tracker/EventProperty.h>
-#include <corvane/Tracker/EventSubmit.h>
 #include <corvane/Tracker/EventSubmitResult.h>
-#include <corvane/Tracker/Group.h>
 #include <corvane/Tracker/Sequence.h>
 #include <corvane/Tracker/TrackerError.h>
 

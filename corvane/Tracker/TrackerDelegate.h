@@ -1,8 +1,8 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Models/Group.h>
 #include <corvane/Models/ProcessEvent.h>
-#include <corvane/Tracker/Group.h>
 
 #include <memory>
 
@@ -14,7 +14,7 @@ class SessionObserver;
 /// Who receives what trackers make: the session manager. Unless said otherwise, called on the trackers' queue.
 class CORVANE_EXPORT TrackerDelegate {
   public:
-    virtual ~TrackerDelegate();
+    virtual ~TrackerDelegate() = default;
 
     /// The active session, or nullptr. Good until the queue's task ends.
     [[nodiscard]] virtual const ActiveSessionType* activeSession() const = 0;

@@ -1,8 +1,8 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Platform/DataType.h>
 #include <corvane/Platform/Error.h>
+#include <corvane/Reflection/DataType.h>
 
 #include <string>
 #include <vector>

@@ -17,7 +17,7 @@ namespace corvane {
 /// gets the error.
 class CORVANE_EXPORT EndpointType {
   public:
-    virtual ~EndpointType();
+    virtual ~EndpointType() = default;
 
     /// The absolute URL, http or https, that documents are PUT to.
     [[nodiscard]] virtual std::string url() const = 0;
@@ -28,8 +28,8 @@ class CORVANE_EXPORT EndpointType {
     /// The storage that an application shares with its extensions, or nothing.
     [[nodiscard]] virtual std::optional<std::string> sharedContainerIdentifier() const = 0;
     /// See `EndpointOptions`; nothing unless it is overridden.
-    [[nodiscard]] virtual std::filesystem::path trustedCertificates() const;
-    [[nodiscard]] virtual std::function<HTTPHeaders()> headers() const;
+    [[nodiscard]] virtual std::filesystem::path trustedCertificates() const { return {}; }
+    [[nodiscard]] virtual std::function<HTTPHeaders()> headers() const { return {}; }
 
   protected:
     EndpointType() = default;

@@ -18,8 +18,6 @@ ExternalAnalyticsUploaderError::ExternalAnalyticsUploaderError(Code code)
     : Error("Corvane.ExternalAnalyticsUploader.Errors", code, "the server did not answer in HTTP") {}
 ExternalAnalyticsUploaderError::~ExternalAnalyticsUploaderError() = default;
 
-ExternalAnalyticsUploaderType::~ExternalAnalyticsUploaderType() = default;
-
 ExternalAnalyticsUploader::ExternalAnalyticsUploader() : session_(limitsOfThisMachine()) {}
 
 void ExternalAnalyticsUploader::submitExternalAnalytics(std::string url, Completion completion) {

@@ -1,7 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Platform/HTTPSession.h>
+#include <corvane/Transfer/HTTPSession.h>
 #include <corvane/Upload/ExternalAnalyticsUploaderError.h>
 #include <corvane/Upload/ExternalAnalyticsUploaderType.h>
 

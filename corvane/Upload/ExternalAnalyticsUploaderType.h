@@ -1,7 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Platform/TransferResponse.h>
+#include <corvane/Transfer/TransferResponse.h>
 #include <corvane/Upload/ExternalResult.h>
 
 #include <functional>
@@ -15,7 +15,7 @@ class CORVANE_EXPORT ExternalAnalyticsUploaderType {
     /// Called once, on a queue of the uploader's; what it throws is logged.
     using Completion = std::function<void(const ExternalResult<TransferResponse>&)>;
 
-    virtual ~ExternalAnalyticsUploaderType();
+    virtual ~ExternalAnalyticsUploaderType() = default;
 
     /// Asks for `url` with a GET request and reports the head of the answer, whatever its status: look at the status
     /// code. Callable from any thread; never calls back inside the call. An empty completion is allowed.

@@ -3,7 +3,8 @@
 #include <corvane/Platform/Bytes.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/Log.h>
-#include <corvane/Platform/SigningServiceType.h>
+#include <corvane/Signing/SHA1.h>
+#include <corvane/Signing/SigningServiceType.h>
 
 namespace corvane {
 

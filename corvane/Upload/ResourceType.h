@@ -11,7 +11,7 @@ namespace corvane {
 /// thread.
 class CORVANE_EXPORT ResourceType {
   public:
-    virtual ~ResourceType();
+    virtual ~ResourceType() = default;
 
     /// The base media type, without parameters.
     [[nodiscard]] virtual std::string contentType() const = 0;

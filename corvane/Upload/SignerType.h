@@ -10,7 +10,7 @@ namespace corvane {
 /// Turns the body of an upload into the text of its signature header.
 class CORVANE_EXPORT SignerType {
   public:
-    virtual ~SignerType();
+    virtual ~SignerType() = default;
 
     /// The signature of `body` as text that a header can hold. Throws what the signing failed with; the upload then
     /// goes out with the error in the header's place. May be called from several threads at once.

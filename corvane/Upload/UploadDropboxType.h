@@ -18,7 +18,7 @@ struct UploadResponse;
 /// so all operations may be called from any thread.
 class CORVANE_EXPORT UploadDropboxType {
   public:
-    virtual ~UploadDropboxType();
+    virtual ~UploadDropboxType() = default;
 
     /// Keeps `data` as the payload of the upload `identifier`, in place of an earlier one, and returns its file.
     /// `resource` is what the data was made from. Throws when the file cannot be written.
@@ -31,7 +31,9 @@ class CORVANE_EXPORT UploadDropboxType {
 
     /// The identifiers of the payloads that are older than an hour and not among `recorded`: what a process that was
     /// killed may have left. A dropbox that cannot tell names none, which is what happens here.
-    [[nodiscard]] virtual std::vector<std::string> abandonedPayloads(const std::set<std::string>& recorded);
+    [[nodiscard]] virtual std::vector<std::string> abandonedPayloads(const std::set<std::string>& /*recorded*/) {
+        return {};
+    }
 
     /// The payload file of an upload, if there is one.
     [[nodiscard]] virtual std::optional<std::filesystem::path> existingFile(std::string_view identifier) = 0;

@@ -24,7 +24,7 @@ enum class UploadTaken {
 /// Owned by the batching processor, which calls everything here on the access queue, one call at a time.
 class CORVANE_EXPORT UploadManagerType {
   public:
-    virtual ~UploadManagerType();
+    virtual ~UploadManagerType() = default;
 
     /// Gets ready for uploads, and the first time sends again what earlier runs left unfinished. Failures are logged.
     virtual void open() = 0;

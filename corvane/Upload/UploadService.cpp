@@ -1,5 +1,6 @@
 #include <corvane/Upload/UploadService.h>
 
+#include <corvane/Agent/Host/DefaultTransferSession.h>
 #include <corvane/Platform/Bundle.h>
 #include <corvane/Platform/Bytes.h>
 #include <corvane/Platform/DocumentsDirectory.h>
@@ -9,7 +10,7 @@
 #include <corvane/Platform/MainQueue.h>
 #include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/Require.h>
-#include <corvane/Platform/TransferError.h>
+#include <corvane/Transfer/TransferError.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 
@@ -109,7 +110,7 @@ std::string UploadService::ownerKey(const Endpoint& endpoint) {
 UploadService::UploadService(Endpoint endpoint, std::shared_ptr<SignerType> signer, TransferSession::Factory factory)
     : endpoint_(endpoint),
       signer_(std::move(signer)),
-      factory_(factory ? std::move(factory) : &TransferSession::make),
+      factory_(factory ? std::move(factory) : &makeDefaultTransferSession),
       lazyURLSession_([this] { return openSession(); }) {
     if (!signer_) throw InvalidArgument("an upload service needs a signer");
 }

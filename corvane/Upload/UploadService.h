@@ -2,7 +2,7 @@
 
 #include <corvane/Export.h>
 #include <corvane/Platform/Lazy.h>
-#include <corvane/Platform/TransferSession.h>
+#include <corvane/Transfer/TransferSession.h>
 #include <corvane/Upload/Endpoint.h>
 #include <corvane/Upload/SignerType.h>
 #include <corvane/Upload/UploadResult.h>
@@ -57,8 +57,8 @@ class CORVANE_EXPORT UploadService final : public UploadServiceType,
     [[nodiscard]] static std::string ownerKey(const Endpoint& endpoint);
 
     /// Requires: the service is made with `std::make_shared`.
-    /// @param factory opens the session; an empty one means the process's (`TransferSession::make`). When it throws,
-    /// the
+    /// @param factory opens the session; an empty one means the process's (`makeDefaultTransferSession`). When it
+    /// throws, the
     ///        error is logged, nothing is sent, and the next call tries again.
     UploadService(Endpoint endpoint, std::shared_ptr<SignerType> signer, TransferSession::Factory factory = {});
     UploadService(const UploadService&) = delete;

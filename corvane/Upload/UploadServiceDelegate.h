@@ -10,7 +10,7 @@ struct UploadResult;
 /// Whoever keeps the books of an upload service's uploads: the upload manager. The service holds it weakly.
 class CORVANE_EXPORT UploadServiceDelegate {
   public:
-    virtual ~UploadServiceDelegate();
+    virtual ~UploadServiceDelegate() = default;
 
     /// Called once for every upload that ended, on the queue that was registered with the service. It runs its database
     /// work where it is called, and reports failures to the log; it does not throw.
@@ -18,7 +18,7 @@ class CORVANE_EXPORT UploadServiceDelegate {
 
     /// Called, on the same queue, for an upload whose end the delegate of another process was told of, which keeps the
     /// books of it. Does nothing by default.
-    virtual void uploadEndedElsewhere(const UploadResult& result);
+    virtual void uploadEndedElsewhere(const UploadResult& /*result*/) {}
 };
 
 }  // namespace corvane

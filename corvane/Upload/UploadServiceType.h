@@ -21,7 +21,7 @@ struct PreparedUploadRequest;
 /// another; results arrive at the delegate asynchronously, on the registered queue, never inside a call.
 class CORVANE_EXPORT UploadServiceType {
   public:
-    virtual ~UploadServiceType();
+    virtual ~UploadServiceType() = default;
 
     /// Sets the object that receives results, in place of an earlier one. Results that find it gone are dropped.
     virtual void setDelegate(std::weak_ptr<UploadServiceDelegate> delegate) = 0;
@@ -40,7 +40,7 @@ class CORVANE_EXPORT UploadServiceType {
     /// Tells, later and on the registered queue, the identifiers of the uploads that are running, also those of earlier
     /// runs and other processes where transfers outlive them. A service that cannot tell never answers, which is what
     /// happens here.
-    virtual void inFlight(std::function<void(const std::set<std::string>&)> answer);
+    virtual void inFlight(std::function<void(const std::set<std::string>&)> /*answer*/) {}
 
     /// Whether `identifier` names this service's transfer session. If so, `completion` is kept and called once, on the
     /// main queue, when all events of the session have been delivered; otherwise it is dropped. Callable from any

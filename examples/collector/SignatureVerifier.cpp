@@ -3,6 +3,7 @@
 #include "Refusal.h"
 
 #include <corvane/Platform/Bytes.h>
+#include <corvane/Signing/SHA1.h>
 
 #include <openssl/evp.h>
 #include <openssl/pem.h>

@@ -2,7 +2,8 @@
 #include "tests/support/ProcessSettings.h"
 
 #include <corvane/Platform/Bytes.h>
-#include <corvane/Platform/SigningServiceType.h>
+#include <corvane/Signing/SHA1.h>
+#include <corvane/Signing/SigningServiceType.h>
 #include <corvane/Upload/UploadService.h>
 
 #include "tests/support/CapturedLog.h"

@@ -2,7 +2,7 @@
 #include "tests/support/ProcessSettings.h"
 #include "tests/support/TLSServer.h"
 
-#include <corvane/Platform/InProcessTransferSession.h>
+#include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <future>
 #include <memory>

@@ -10,7 +10,7 @@
 
 #include "tests/Integration/Application.h"
 
-#include <corvane/Platform/InProcessTransferSession.h>
+#include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <signal.h>
 #include <sys/wait.h>

@@ -1,4 +1,4 @@
-#include <corvane/Session/SessionObserver.h>
+#include <corvane/Tracker/SessionObserver.h>
 
 #include "tests/support/TrackingFixture.h"
 

@@ -1,4 +1,4 @@
-#include <corvane/Session/SessionObserver.h>
+#include <corvane/Tracker/SessionObserver.h>
 
 #include <corvane/Processing/LoggingEventProcessor.h>
 

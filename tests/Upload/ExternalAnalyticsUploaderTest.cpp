@@ -1,6 +1,6 @@
 #include <corvane/Upload/ExternalAnalyticsUploader.h>
 
-#include <corvane/Platform/TransferError.h>
+#include <corvane/Transfer/TransferError.h>
 
 #include "tests/support/ScriptedServer.h"
 

@@ -1,6 +1,7 @@
 #include <corvane/Platform/Bytes.h>
-#include <corvane/Platform/FileSigningService.h>
-#include <corvane/Platform/SigningError.h>
+#include <corvane/Signing/FileSigningService.h>
+#include <corvane/Signing/SHA1.h>
+#include <corvane/Signing/SigningError.h>
 #include <corvane/Upload/OstrelSigner.h>
 
 #include <gtest/gtest.h>

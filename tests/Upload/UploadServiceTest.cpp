@@ -1,7 +1,7 @@
 #include <corvane/Upload/UploadService.h>
 
 #include <corvane/Platform/MainQueue.h>
-#include <corvane/Platform/TransferError.h>
+#include <corvane/Transfer/TransferError.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 

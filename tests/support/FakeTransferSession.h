@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Platform/TransferSession.h>
+#include <corvane/Transfer/TransferSession.h>
 
 #include <cstdint>
 #include <map>

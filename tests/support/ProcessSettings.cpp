@@ -1,9 +1,9 @@
 #include "tests/support/ProcessSettings.h"
 
 #include <corvane/Platform/DocumentsDirectory.h>
-#include <corvane/Platform/InProcessTransferSession.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Store/StoreConnection.h>
+#include <corvane/Transfer/InProcessTransferSession.h>
 
 namespace corvane::test {
 

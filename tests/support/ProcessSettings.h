@@ -1,8 +1,8 @@
 #pragma once
 
 #include <corvane/Platform/MainQueue.h>
-#include <corvane/Platform/SigningServiceType.h>
-#include <corvane/Platform/TransferSession.h>
+#include <corvane/Signing/SigningServiceType.h>
+#include <corvane/Transfer/TransferSession.h>
 
 #include <chrono>
 #include <memory>

@@ -5,8 +5,8 @@
 #include <corvane/Bridge/Data/BridgedEventMirrorStore.h>
 #include <corvane/Bridge/Data/BridgedRawEvent.h>
 #include <corvane/Bridge/Data/BridgedSubmitCompletion.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
 #include <corvane/Export.h>
-#include <corvane/Models/BridgedDataEventType.h>
 #include <corvane/Tracker/AccessTracker.h>
 
 #include <cstdint>

@@ -1,6 +1,6 @@
 #include <corvane/Bridge/Data/BridgedDataEventClass.h>
 
-#include <corvane/Models/BridgedDataEvent.h>
+#include <corvane/Bridge/Models/BridgedDataEvent.h>
 
 #include <utility>
 

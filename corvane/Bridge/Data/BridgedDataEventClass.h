@@ -1,7 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Platform/DataType.h>
+#include <corvane/Reflection/DataType.h>
 
 #include <string>
 

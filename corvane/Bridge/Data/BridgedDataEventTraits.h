@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Tracker/DataEventTrait.h>
+#include <corvane/Models/DataEventTrait.h>
 
 namespace corvane {
 

@@ -6,8 +6,6 @@
 
 namespace corvane {
 
-BridgedEventType::~BridgedEventType() = default;
-
 BridgedEventClass::BridgedEventClass(std::string eventName, Init init)
     : content_(std::make_shared<const Content>(Content{std::move(eventName), std::move(init)})) {}
 

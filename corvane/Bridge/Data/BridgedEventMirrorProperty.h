@@ -2,7 +2,7 @@
 
 #include <corvane/Bridge/Data/BridgedEventProperty.h>
 #include <corvane/Export.h>
-#include <corvane/Tracker/EventPropertyType.h>
+#include <corvane/Models/EventPropertyType.h>
 
 namespace corvane {
 

@@ -2,9 +2,9 @@
 
 #include <corvane/Bridge/Data/BridgedEventClass.h>
 #include <corvane/Export.h>
+#include <corvane/Models/EventMirrorStore.h>
+#include <corvane/Models/EventSubmit.h>
 #include <corvane/Platform/StringMap.h>
-#include <corvane/Tracker/EventMirrorStore.h>
-#include <corvane/Tracker/EventSubmit.h>
 
 #include <memory>
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Tracker/EventPropertyType.h>
+#include <corvane/Models/EventPropertyType.h>
 
 namespace corvane {
 

@@ -11,7 +11,7 @@ namespace corvane {
 /// `BridgedEventClass` on the tracker's queue, asked once, and released.
 class CORVANE_EXPORT BridgedEventType {
   public:
-    virtual ~BridgedEventType();
+    virtual ~BridgedEventType() = default;
 
     /// The properties in the order in which they stand in the event's JSON. What it throws fails the submission, and
     /// the next one asks again.

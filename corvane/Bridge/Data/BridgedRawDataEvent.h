@@ -1,7 +1,7 @@
 #pragma once
 
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
 #include <corvane/Export.h>
-#include <corvane/Models/BridgedDataEventType.h>
 
 #include <string>
 

@@ -2,7 +2,7 @@
 
 #include <corvane/Bridge/Data/BridgedRawEventProperty.h>
 #include <corvane/Export.h>
-#include <corvane/Tracker/EventSubmit.h>
+#include <corvane/Models/EventSubmit.h>
 
 #include <string>
 #include <utility>

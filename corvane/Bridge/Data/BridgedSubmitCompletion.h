@@ -1,7 +1,7 @@
 #pragma once
 
+#include <corvane/Bridge/Models/BridgedError.h>
 #include <corvane/Bridge/Models/BridgedProcessEvent.h>
-#include <corvane/Models/BridgedError.h>
 
 #include <functional>
 

@@ -8,7 +8,7 @@
 #include <corvane/Bridge/Data/BridgedSubmitCompletion.h>
 #include <corvane/Bridge/Session/BridgedSessionObserver.h>
 #include <corvane/Export.h>
-#include <corvane/Session/SessionChange.h>
+#include <corvane/Models/SessionChange.h>
 #include <corvane/Tracker/Tracker.h>
 
 #include <cstdint>

@@ -4,7 +4,7 @@
 
 #include <corvane/Bridge/Data/BridgedEventPropertyRequirement.h>
 #include <corvane/Bridge/Models/Refusal.h>
-#include <corvane/Tracker/EventMirrorStore.h>
+#include <corvane/Models/EventMirrorStore.h>
 
 #include <memory>
 #include <set>

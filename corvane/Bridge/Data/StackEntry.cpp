@@ -1,7 +1,7 @@
 #include <corvane/Bridge/Data/StackEntry.h>
 
+#include <corvane/Bridge/Models/BridgedDataEvent.h>
 #include <corvane/Bridge/Models/Refusal.h>
-#include <corvane/Models/BridgedDataEvent.h>
 #include <corvane/Models/SessionData.h>
 
 #include <utility>

@@ -4,8 +4,8 @@
 
 #include <corvane/Bridge/Data/BridgedDataEventTraits.h>
 #include <corvane/Bridge/Data/BridgedSubmitCompletion.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
 #include <corvane/Bridge/Models/BridgedSessionData.h>
-#include <corvane/Models/BridgedDataEventType.h>
 #include <corvane/Tracker/DataEventStack.h>
 #include <corvane/Tracker/EventSubmitResult.h>
 

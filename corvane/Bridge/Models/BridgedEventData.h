@@ -1,8 +1,8 @@
 #pragma once
 
 #include <corvane/Bridge/Data/BridgedDataEventClass.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
 #include <corvane/Export.h>
-#include <corvane/Models/BridgedDataEventType.h>
 #include <corvane/Models/EventData.h>
 
 #include <string>

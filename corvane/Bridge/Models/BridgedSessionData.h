@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Models/BridgedDataEventType.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
 
 #include <memory>
 #include <string>

@@ -1,9 +1,9 @@
 #pragma once
 
 #include <corvane/Bridge/Data/BridgedDataEventTraits.h>
+#include <corvane/Bridge/Models/BridgedError.h>
 #include <corvane/Bridge/Models/BridgedSessionData.h>
 #include <corvane/Export.h>
-#include <corvane/Models/BridgedError.h>
 #include <corvane/Session/AccessSessionManager.h>
 
 #include <thread>

@@ -6,17 +6,6 @@
 
 namespace corvane {
 
-BridgedEventProcessorType::~BridgedEventProcessorType() = default;
-void BridgedEventProcessorType::didEnterGroup(const Group&) {}
-void BridgedEventProcessorType::didLeaveGroup(const Group&) {}
-void BridgedEventProcessorType::didStartSession(const BridgedSession&) {}
-void BridgedEventProcessorType::didUpdateSession(const BridgedSession&, bool) {}
-void BridgedEventProcessorType::didEndSession(const BridgedSession&, Date) {}
-bool BridgedEventProcessorType::resumeBackgroundProcessingForIdentifier(const std::string&,
-                                                                        const std::function<void()>&) {
-    return false;
-}
-
 BridgedEventProcessor::BridgedEventProcessor(std::shared_ptr<BridgedEventProcessorType> eventProcessor)
     : eventProcessor_(bridge::present(std::move(eventProcessor), "the event processor")) {}
 BridgedEventProcessor::~BridgedEventProcessor() = default;

@@ -3,8 +3,8 @@
 #include <corvane/Bridge/Models/BridgedProcessEvent.h>
 #include <corvane/Bridge/Models/BridgedSession.h>
 #include <corvane/Export.h>
+#include <corvane/Models/Group.h>
 #include <corvane/Platform/Date.h>
-#include <corvane/Tracker/Group.h>
 
 #include <functional>
 #include <memory>
@@ -22,26 +22,28 @@ class SerialQueue;
 /// the first two and overrides those of the others that it wants to hear of.
 class CORVANE_EXPORT BridgedEventProcessorType {
   public:
-    virtual ~BridgedEventProcessorType();
+    virtual ~BridgedEventProcessorType() = default;
 
     /// The queue on which all later callbacks run. Called once per addition, on the thread that adds the processor;
     /// what it throws refuses the addition.
     virtual void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) = 0;
     virtual void processEvent(const BridgedProcessEvent& event) = 0;
 
-    virtual void didEnterGroup(const Group& group);
-    virtual void didLeaveGroup(const Group& group);
+    virtual void didEnterGroup(const Group& /*group*/) {}
+    virtual void didLeaveGroup(const Group& /*group*/) {}
     /// A session started, or was running when the processor was added.
-    virtual void didStartSession(const BridgedSession& session);
+    virtual void didStartSession(const BridgedSession& /*session*/) {}
     /// The session's data changed. `submitEventQueues` asks the processor to send what it has queued now.
-    virtual void didUpdateSession(const BridgedSession& session, bool submitEventQueues);
-    virtual void didEndSession(const BridgedSession& session, Date endDate);
+    virtual void didUpdateSession(const BridgedSession& /*session*/, bool /*submitEventQueues*/) {}
+    virtual void didEndSession(const BridgedSession& /*session*/, Date /*endDate*/) {}
 
     /// Returns true when this processor owns the background transfer session `identifier` and takes the completion
     /// over, which it calls when the session's events are delivered; nobody in the process waits for that. Not
     /// overridden, it returns false.
-    virtual bool resumeBackgroundProcessingForIdentifier(const std::string& identifier,
-                                                         const std::function<void()>& completion);
+    virtual bool resumeBackgroundProcessingForIdentifier(const std::string& /*identifier*/,
+                                                         const std::function<void()>& /*completion*/) {
+        return false;
+    }
 
   protected:
     BridgedEventProcessorType() = default;

@@ -1,8 +1,8 @@
 #pragma once
 
+#include <corvane/Bridge/Models/BridgedError.h>
 #include <corvane/Bridge/Session/BridgedEventProcessorType.h>
 #include <corvane/Export.h>
-#include <corvane/Models/BridgedError.h>
 #include <corvane/Processing/ProcessorManager.h>
 
 #include <functional>

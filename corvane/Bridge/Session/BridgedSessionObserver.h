@@ -1,7 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Session/SessionObserver.h>
+#include <corvane/Tracker/SessionObserver.h>
 
 #include <memory>
 

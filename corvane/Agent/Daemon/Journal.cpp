@@ -1,0 +1,248 @@
+#include <corvane/Agent/Daemon/Journal.h>
+
+#include <corvane/Agent/WireReader.h>
+#include <corvane/Agent/WireWriter.h>
+#include <corvane/Platform/Error.h>
+
+#include <sqlite3.h>
+
+#include <system_error>
+
+namespace corvane::transferd {
+
+namespace {
+
+// These values are in files: they do not change. A new layout has a new version.
+constexpr int applicationID = 0x43565441;
+constexpr int version = 2;
+constexpr const char* layout =
+    "CREATE TABLE tasks ("
+    "number INTEGER PRIMARY KEY AUTOINCREMENT, token TEXT NOT NULL UNIQUE, accepted INTEGER NOT NULL, "
+    "description TEXT, submission BLOB NOT NULL, outcome BLOB, "
+    "session TEXT NOT NULL DEFAULT '', owner TEXT NOT NULL DEFAULT '');"
+    "CREATE TABLE wakes ("
+    "session TEXT NOT NULL, owner TEXT NOT NULL, command BLOB NOT NULL, used INTEGER NOT NULL DEFAULT 0, "
+    "PRIMARY KEY (session, owner));";
+// Version 1 had no date, so what it has left counts as heard of at the take-over; its tasks' owners are in their
+// submissions only.
+constexpr const char* fromVersion1 =
+    "ALTER TABLE tasks ADD COLUMN session TEXT NOT NULL DEFAULT '';"
+    "ALTER TABLE tasks ADD COLUMN owner TEXT NOT NULL DEFAULT '';"
+    "ALTER TABLE wakes ADD COLUMN used INTEGER NOT NULL DEFAULT 0;"
+    "UPDATE wakes SET used = CAST(strftime('%s', 'now') AS INTEGER) * 1000;";
+constexpr std::int64_t wakesAreKept = std::int64_t{1000} * 60 * 60 * 24 * 30;
+
+}  // namespace
+
+void Journal::Close::operator()(sqlite3* database) const noexcept {
+    sqlite3_close_v2(database);
+}
+
+void Journal::fail(int code) {
+    isDamaged_ = isDamaged_ || (code & 0xFF) == SQLITE_CORRUPT || (code & 0xFF) == SQLITE_NOTADB;
+    throw InvalidArgument(std::string("the journal cannot be used: ") + sqlite3_errmsg(database_.get()));
+}
+
+/// A statement with its arguments, for one use.
+class Journal::Statement {
+  public:
+    Statement(Journal& journal, const char* sql) : journal_(journal) {
+        const int result = sqlite3_prepare_v2(journal.database_.get(), sql, -1, &statement_, nullptr);
+        if (result != SQLITE_OK) journal.fail(result);
+    }
+    Statement(const Statement&) = delete;
+    Statement& operator=(const Statement&) = delete;
+    ~Statement() { sqlite3_finalize(statement_); }
+
+    Statement& number(std::int64_t value) {
+        sqlite3_bind_int64(statement_, ++bound_, value);
+        return *this;
+    }
+    Statement& text(std::string_view value) {
+        sqlite3_bind_text(statement_, ++bound_, value.data(), static_cast<int>(value.size()), SQLITE_TRANSIENT);
+        return *this;
+    }
+    Statement& bytes(std::string_view value) {
+        sqlite3_bind_blob(statement_, ++bound_, value.data(), static_cast<int>(value.size()), SQLITE_TRANSIENT);
+        return *this;
+    }
+
+    /// Whether there is a row, or another one.
+    bool step() {
+        const int result = sqlite3_step(statement_);
+        if (result != SQLITE_ROW && result != SQLITE_DONE) journal_.fail(result);
+        return result == SQLITE_ROW;
+    }
+    [[nodiscard]] bool isNull(int column) { return sqlite3_column_type(statement_, column) == SQLITE_NULL; }
+    [[nodiscard]] std::int64_t integer(int column) { return sqlite3_column_int64(statement_, column); }
+    [[nodiscard]] std::string contents(int column) {
+        const auto* start = static_cast<const char*>(sqlite3_column_blob(statement_, column));
+        return start ? std::string(start, static_cast<std::size_t>(sqlite3_column_bytes(statement_, column)))
+                     : std::string();
+    }
+
+  private:
+    Journal& journal_;
+    sqlite3_stmt* statement_ = nullptr;
+    int bound_ = 0;
+};
+
+Journal::Journal(const std::filesystem::path& file, std::string& problem) {
+    try {
+        open(file);
+    } catch (const InvalidArgument& damaged) {
+        if (!isDamaged_) throw;
+        isDamaged_ = false;
+        database_.reset();
+        auto aside = file;
+        aside += ".damaged";
+        std::filesystem::rename(file, aside);
+        for (const char* side : {"-wal", "-shm"}) {
+            auto path = file;
+            std::error_code none;
+            std::filesystem::remove(path += side, none);
+        }
+        open(file);
+        problem = std::string(damaged.what()) + "; it was moved to " + aside.string();
+    }
+}
+
+Journal::~Journal() = default;
+
+void Journal::open(const std::filesystem::path& file) {
+    sqlite3* opened = nullptr;
+    const int result = sqlite3_open_v2(file.c_str(), &opened,
+                                       SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOFOLLOW, nullptr);
+    database_.reset(opened);
+    if (result != SQLITE_OK) fail(result);
+    sqlite3_extended_result_codes(opened, 1);
+    sqlite3_busy_timeout(opened, 2000);  // for somebody who looks into it
+    run("PRAGMA cache_size=-256;");
+    run("PRAGMA journal_mode=WAL;");
+    run("PRAGMA synchronous=NORMAL;");
+    std::int64_t found = 0;
+    {
+        Statement stored(*this, "PRAGMA user_version;");
+        stored.step();
+        found = stored.integer(0);
+    }
+    if (found < 0 || found > version) throw InvalidArgument("the journal is of version " + std::to_string(found));
+    check();
+    if (found != version) adopt(found);
+}
+
+// Makes a new file's tables, or an earlier version's into this one's.
+void Journal::adopt(std::int64_t found) {
+    run("BEGIN IMMEDIATE;");
+    run(found == 0 ? layout : fromVersion1);
+    run(("PRAGMA application_id=" + std::to_string(applicationID) + ";").c_str());
+    run(("PRAGMA user_version=" + std::to_string(version) + "; COMMIT;").c_str());
+}
+
+// Every page is looked at, not only those that a start happens to need: a journal that cannot be written to would send
+// every host back to itself for good.
+void Journal::check() {
+    Statement checked(*this, "PRAGMA quick_check(1);");
+    if (checked.step() && checked.contents(0) != "ok") {
+        isDamaged_ = true;
+        throw InvalidArgument("the journal cannot be used: " + checked.contents(0));
+    }
+}
+
+void Journal::run(const char* sql) {
+    const int result = sqlite3_exec(database_.get(), sql, nullptr, nullptr, nullptr);
+    if (result != SQLITE_OK) fail(result);
+}
+
+void Journal::forEach(const std::function<void(Task)>& visit) {
+    Statement all(*this,
+                  "SELECT number, accepted, submission, outcome IS NOT NULL, token, session, owner FROM tasks "
+                  "ORDER BY number;");
+    while (all.step()) {
+        Task task{all.integer(0), all.integer(1), {}, true, all.integer(3) != 0};
+        try {
+            task.submission = TransferSubmission::decode(all.contents(2));
+        } catch (const InvalidArgument&) {
+            task.isReadable = false;
+            task.submission.token = all.contents(4);
+            task.submission.session = all.contents(5);
+            task.submission.owner = all.contents(6);
+        }
+        visit(std::move(task));
+    }
+}
+
+std::int64_t Journal::add(const TransferSubmission& submission, std::int64_t accepted) {
+    Statement insert(*this,
+                     "INSERT INTO tasks (token, accepted, submission, session, owner, description) "
+                     "VALUES (?, ?, ?, ?, ?, ?);");
+    insert.text(submission.token).number(accepted).bytes(submission.encoded());
+    insert.text(submission.session).text(submission.owner);
+    if (submission.description) insert.text(*submission.description);
+    insert.step();
+    return sqlite3_last_insert_rowid(database_.get());
+}
+
+void Journal::finish(std::int64_t number, std::string_view outcome) {
+    Statement(*this, "UPDATE tasks SET outcome = ? WHERE number = ?;").bytes(outcome).number(number).step();
+}
+
+void Journal::forget(std::int64_t number) {
+    Statement(*this, "DELETE FROM tasks WHERE number = ?;").number(number).step();
+}
+
+void Journal::describe(std::int64_t number, const std::string& description) {
+    Statement(*this, "UPDATE tasks SET description = ? WHERE number = ?;").text(description).number(number).step();
+}
+
+TransferSubmission Journal::submission(std::int64_t number) {
+    Statement find(*this, "SELECT submission FROM tasks WHERE number = ?;");
+    if (!find.number(number).step()) throw InvalidArgument("the task is not in the journal");
+    return TransferSubmission::decode(find.contents(0));
+}
+
+std::optional<std::string> Journal::description(std::int64_t number) {
+    Statement find(*this, "SELECT description FROM tasks WHERE number = ?;");
+    if (!find.number(number).step() || find.isNull(0)) return std::nullopt;
+    return find.contents(0);
+}
+
+std::string Journal::outcome(std::int64_t number) {
+    Statement find(*this, "SELECT outcome FROM tasks WHERE number = ?;");
+    if (!find.number(number).step()) throw InvalidArgument("the task is not in the journal");
+    return find.contents(0);
+}
+
+void Journal::setWake(const std::string& session, const std::string& owner, const std::vector<std::string>& command,
+                      std::int64_t now) {
+    WireWriter write;
+    write(command);
+    Statement(*this, "INSERT OR REPLACE INTO wakes (session, owner, command, used) VALUES (?, ?, ?, ?);")
+        .text(session)
+        .text(owner)
+        .bytes(write.take())
+        .number(now)
+        .step();
+    Statement(*this,
+              "DELETE FROM wakes WHERE used < ? OR "
+              "rowid NOT IN (SELECT rowid FROM wakes ORDER BY used DESC LIMIT ?);")
+        .number(now - wakesAreKept)
+        .number(mostWakes)
+        .step();
+}
+
+std::vector<std::string> Journal::wake(const std::string& session, const std::string& owner) {
+    Statement find(*this, "SELECT command FROM wakes WHERE session = ? AND owner = ?;");
+    if (!find.text(session).text(owner).step()) return {};
+    const std::string bytes = find.contents(0);
+    std::vector<std::string> command;
+    try {
+        WireReader read(bytes);
+        read(command);
+    } catch (const InvalidArgument&) {  // the host says it again
+        command.clear();
+    }
+    return command;
+}
+
+}  // namespace corvane::transferd

@@ -1,0 +1,82 @@
+#pragma once
+
+#include <corvane/Agent/TransferSubmission.h>
+#include <corvane/Platform/Error.h>
+
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+struct sqlite3;
+
+namespace corvane::transferd {
+
+/// What the agent must not forget when it is killed: its tasks, how they ended, and whom to wake. A SQLite database;
+/// its page in docs/formats has the tables.
+///
+/// A change is safe from a kill of the process when the call returns. All operations throw `InvalidArgument` with the
+/// database's words when it cannot be read or written.
+class Journal {
+  public:
+    struct Task {
+        std::int64_t number = 0;
+        /// In milliseconds since 1970.
+        std::int64_t accepted = 0;
+        /// Nothing but the names of the task, the session and the owner when the rest cannot be read.
+        TransferSubmission submission;
+        bool isReadable = true;
+        bool isOver = false;
+    };
+
+    /// Beyond this many owners, those that have not been heard of for the longest are not woken any more.
+    static constexpr int mostWakes = 1000;
+
+    /// Opens or creates the file, and takes over one of an earlier version. One that is damaged, anywhere, is moved
+    /// aside, which `problem` then tells of. Throws for one that a later version has written, too.
+    Journal(const std::filesystem::path& file, std::string& problem);
+    ~Journal();
+
+    /// Whether an operation has found damage: there is no going on with the file, and the next agent moves it aside.
+    [[nodiscard]] bool isDamaged() const { return isDamaged_; }
+
+    /// Every task, in the order in which they were accepted.
+    void forEach(const std::function<void(Task)>& visit);
+    /// Keeps a task, and gives it its number.
+    std::int64_t add(const TransferSubmission& submission, std::int64_t accepted);
+    void finish(std::int64_t number, std::string_view outcome);
+    void forget(std::int64_t number);
+    void describe(std::int64_t number, const std::string& description);
+
+    [[nodiscard]] TransferSubmission submission(std::int64_t number);
+    [[nodiscard]] std::optional<std::string> description(std::int64_t number);
+    /// The bytes that `finish` was given.
+    [[nodiscard]] std::string outcome(std::int64_t number);
+
+    /// Keeps the command for a month, from `now` on (in milliseconds since 1970), and lets go of older ones.
+    void setWake(const std::string& session, const std::string& owner, const std::vector<std::string>& command,
+                 std::int64_t now);
+    /// Empty when there is none, or none that can be read.
+    [[nodiscard]] std::vector<std::string> wake(const std::string& session, const std::string& owner);
+
+  private:
+    class Statement;
+    struct Close {
+        void operator()(sqlite3* database) const noexcept;
+    };
+
+    void open(const std::filesystem::path& file);
+    void adopt(std::int64_t found);
+    void check();
+    void run(const char* sql);
+    [[noreturn]] void fail(int code);
+
+    std::unique_ptr<sqlite3, Close> database_;
+    bool isDamaged_ = false;
+};
+
+}  // namespace corvane::transferd

@@ -1,0 +1,129 @@
+#include <corvane/Agent/Daemon/TaskBook.h>
+
+#include <corvane/Platform/Error.h>
+
+namespace corvane::transferd {
+
+void TaskBook::load(const std::function<void(std::int64_t number, const TransferSubmission&)>& visit) {
+    std::vector<std::int64_t> unreadable;
+    journal_.forEach([&](const Journal::Task& task) {
+        const bool isSomebodys = TransferSubmission::isToken(task.submission.token) && !task.submission.session.empty();
+        if (!task.isReadable) unreadable.push_back(task.number);
+        if (!task.isReadable && !isSomebodys) return;
+        index(task.number, task.accepted, task.submission, task.isOver);
+        if (task.isReadable && !task.isOver) visit(task.number, task.submission);
+    });
+    for (const auto number : unreadable) failUnreadable(number);
+}
+
+// Its host sends it again. Nobody can be told of one that is nobody's; the host misses it in the list.
+void TaskBook::failUnreadable(std::int64_t number) {
+    if (!tasks_.contains(number)) {
+        unforgotten_.push_back(number);
+        settle();
+    } else if (tasks_.at(number).owner->open.contains(number)) {
+        finish(number, TransferOutcome::unreadable());
+    }
+}
+
+TaskBook::Owner& TaskBook::owner(const std::string& session, const std::string& key) {
+    const auto [found, isNew] = owners_.try_emplace({session, key});
+    if (!isNew) return found->second;
+    found->second.session = session;
+    found->second.key = key;
+    try {
+        found->second.wakeCommand = journal_.wake(session, key);
+    } catch (const InvalidArgument&) {  // said again with every submission and every connection
+    }
+    return found->second;
+}
+
+void TaskBook::setWakeCommand(Owner& owner, const std::vector<std::string>& command, std::int64_t now) {
+    constexpr std::int64_t isRecent = std::int64_t{1000} * 60 * 60 * 24;
+    if (command.empty() || (command == owner.wakeCommand && now - owner.lastHeard < isRecent)) return;
+    owner.wakeCommand = command;
+    try {
+        journal_.setWake(owner.session, owner.key, command, now);
+        owner.lastHeard = now;
+    } catch (const InvalidArgument&) {  // said again with every submission and every connection
+    }
+}
+
+void TaskBook::dropOwners(const std::function<bool(const Owner&)>& isReferredTo) {
+    std::erase_if(owners_, [&](const auto& one) {
+        const Owner& owner = one.second;
+        return owner.open.empty() && owner.over.empty() && !isReferredTo(owner);
+    });
+}
+
+std::int64_t TaskBook::add(const TransferSubmission& submission, std::int64_t now) {
+    if (tasks_.size() >= mostTasks) throw InvalidArgument("the agent has too many tasks");
+    const auto number = journal_.add(submission, now);
+    index(number, now, submission, false);
+    return number;
+}
+
+void TaskBook::index(std::int64_t number, std::int64_t accepted, const TransferSubmission& submission, bool isOver) {
+    Owner& by = owner(submission.session, submission.owner);
+    tasks_.emplace(number, Task{submission.token, &by, accepted + submission.patience.count()});
+    numbers_.emplace(submission.token, number);
+    if (isOver) {
+        by.over.emplace(number, 0);
+    } else {
+        by.open.insert(number);
+    }
+}
+
+void TaskBook::finish(std::int64_t number, const TransferOutcome& outcome) {
+    try {
+        journal_.finish(number, outcome.encoded());
+    } catch (const InvalidArgument&) {
+        unwritten_[number] = outcome.encoded();
+    }
+    Owner& by = *tasks_.at(number).owner;
+    by.open.erase(number);
+    by.over.emplace(number, 0);
+}
+
+void TaskBook::forget(std::int64_t number) {
+    unforgotten_.push_back(number);
+    unwritten_.erase(number);
+    const auto found = tasks_.find(number);
+    found->second.owner->open.erase(number);
+    found->second.owner->over.erase(number);
+    numbers_.erase(found->second.token);
+    tasks_.erase(found);
+    settle();
+}
+
+// What was reported goes first: its room is what the rest may need.
+bool TaskBook::settle() {
+    try {
+        for (; !unforgotten_.empty(); unforgotten_.pop_back()) journal_.forget(unforgotten_.back());
+        for (; !unwritten_.empty(); unwritten_.erase(unwritten_.begin())) {
+            journal_.finish(unwritten_.begin()->first, unwritten_.begin()->second);
+        }
+        return true;
+    } catch (const InvalidArgument&) {  // tried again later
+        return false;
+    }
+}
+
+std::optional<std::int64_t> TaskBook::find(std::string_view token) const {
+    const auto found = numbers_.find(std::string(token));
+    if (found == numbers_.end()) return std::nullopt;
+    return found->second;
+}
+
+std::string TaskBook::outcome(std::int64_t number) {
+    if (const auto found = unwritten_.find(number); found != unwritten_.end()) return found->second;
+    std::string bytes = journal_.outcome(number);
+    try {
+        static_cast<void>(TransferOutcome::decode(bytes));
+    } catch (const InvalidArgument&) {
+        bytes = TransferOutcome::unreadable().encoded();
+    }
+    return bytes;
+}
+
+}  // namespace corvane::transferd

@@ -1,0 +1,61 @@
+#pragma once
+
+#include <corvane/Agent/Host/TransferAgentOptions.h>
+#include <corvane/Export.h>
+#include <corvane/Transfer/TransferSession.h>
+
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <string>
+
+namespace corvane {
+
+/// The transfer session whose transfers run in the transfer agent, a process of its own: they go on when this process
+/// exits or is killed, and what ended meanwhile is reported to the next session of the same identifier and owner key.
+///
+/// A resumed task is on disk when `resume` returns, and from then on the agent's affair. A task whose completion
+/// callback has returned is not reported again; one whose host was killed inside the callback is. The agent is started
+/// with the session, answers are waited for on a thread of the library's own, and no call waits for the agent. When it
+/// cannot be started, does not answer within the deadline or cannot be started again after it died, an error is logged
+/// and the tasks of this session go on inside the process; the agent is told to leave them alone, so that only one that
+/// it had started sending already can arrive twice. Tasks of earlier runs stay the agent's.
+///
+/// A server that cannot be reached, or that the way to is blocked (see `TransferError`), does not fail a task at once:
+/// an error is logged when that begins, and the agent tries again with growing delays, for as long as the options'
+/// patience. Other failures and answers are reported as they come. Of several sessions of one identifier and owner key,
+/// in several processes, one is told of a task's end as its completion, and the others by `taskDidEndElsewhere`. What
+/// is handed over (URL, headers, proxy) lies in the agent's directory, readable by the user alone, until it is through.
+/// Otherwise see `TransferSession`, and `InProcessTransferSession` for redirects, certificates and proxies.
+///
+///     TransferSession::setFactory(BackgroundTransferSession::factory({.wakeCommand = {"/usr/bin/player",
+///     "--woken"}}));
+class CORVANE_EXPORT BackgroundTransferSession final : public TransferSession {
+  public:
+    /// Whether the agent's program is installed, or was built, with the library. Looks at the disk.
+    [[nodiscard]] static bool isAvailable();
+
+    /// Opens background sessions with these options.
+    [[nodiscard]] static Factory factory(TransferAgentOptions options = {});
+
+    /// An empty `queue` means one of the session's own. Throws `std::system_error` or `SystemError` when the process
+    /// has no thread or descriptor left for the library; an agent that is not to be had is no error.
+    BackgroundTransferSession(const TransferSessionConfiguration& configuration,
+                              std::weak_ptr<TransferSessionDelegate> delegate,
+                              std::shared_ptr<SerialQueue> queue = nullptr, const TransferAgentOptions& options = {});
+    BackgroundTransferSession(const BackgroundTransferSession&) = delete;
+    BackgroundTransferSession& operator=(const BackgroundTransferSession&) = delete;
+    /// The agent's tasks go on; those that run inside the process are cancelled.
+    ~BackgroundTransferSession() override;
+
+    [[nodiscard]] std::optional<std::string> description() const override;
+    void setDescription(std::string description) override;
+    std::shared_ptr<TransferTask> uploadTask(TransferRequest request, std::filesystem::path file) override;
+    void tasks(Listing listing) override;
+    void deliverPendingEvents() override;
+
+  private:
+    const std::shared_ptr<class BackgroundTransferCore> core_;
+};
+
+}  // namespace corvane

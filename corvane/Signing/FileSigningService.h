@@ -1,0 +1,41 @@
+#pragma once
+
+#include <corvane/Export.h>
+#include <corvane/Signing/SigningServiceType.h>
+
+#include <filesystem>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace corvane {
+
+/// Signs with an Ed25519 key of this installation, kept in a file.
+///
+/// The key is made on first use and belongs to whoever made it first: processes that share the directory agree on one.
+/// Its file is 0600; beside it lies the public key, which a collector needs to verify signatures. Safe from any thread.
+class CORVANE_EXPORT FileSigningService final : public SigningServiceType {
+  public:
+    /// The private key, PKCS #8 in PEM.
+    static constexpr std::string_view keyFileName = "com.veskar.corvane.signing-key.pem";
+    /// The public key in PEM.
+    static constexpr std::string_view publicKeyFileName = "com.veskar.corvane.signing-key.pub.pem";
+
+    /// @param directory where the key is kept; nothing for the documents directory as it is at the first signature.
+    explicit FileSigningService(std::optional<std::filesystem::path> directory = std::nullopt);
+    ~FileSigningService() override;
+
+    /// A signature of 64 bytes. Throws `SigningError`, `SystemError` when the key file cannot be read or made, and
+    /// `InvalidArgument` when there is no documents directory. After an error the next call tries again.
+    [[nodiscard]] std::string sign(std::string_view digest) override;
+
+  private:
+    [[nodiscard]] std::string rawKey();
+
+    std::mutex mutex_;
+    std::optional<std::filesystem::path> directory_;
+    std::string rawKey_;  // 32 bytes, or empty until the first use; guarded by mutex_
+};
+
+}  // namespace corvane

@@ -1,0 +1,220 @@
+#include "tests/Agent/AgentFixture.h"
+
+#include <corvane/Transfer/TransferError.h>
+
+#include <arpa/inet.h>
+#include <signal.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <future>
+#include <sstream>
+#include <thread>
+
+namespace corvane::test {
+
+namespace {
+
+std::string describe(const std::optional<AnyError>& error, const std::optional<TransferResponse>& response) {
+    if (!error) return response ? std::to_string(response->statusCode) : "nothing";
+    constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut",
+                                     "network",        "unreachable",     "blocked"};
+    const auto* known = error->as<TransferError>();
+    return known ? names[known->code()] : error->what();
+}
+
+}  // namespace
+
+bool eventually(const std::function<bool()>& condition, std::chrono::milliseconds time) {
+    const auto deadline = std::chrono::steady_clock::now() + time;
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() >= deadline) return false;
+        std::this_thread::sleep_for(2ms);
+    }
+    return true;
+}
+
+std::map<std::string, int> bodies(const ScriptedServer& server) {
+    std::map<std::string, int> counts;
+    for (const auto& request : server.requests()) ++counts[request.body];
+    return counts;
+}
+
+void SessionRecorder::taskDidSendBodyData(const TransferTask&, std::int64_t sent, std::int64_t total,
+                                          std::int64_t expected) {
+    std::lock_guard lock(mutex_);
+    sent_ += sent;
+    EXPECT_LE(total, expected);
+}
+
+void SessionRecorder::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
+                                      const std::optional<TransferResponse>& response) {
+    EXPECT_EQ(task.state(), TransferTask::State::running);
+    if (whenCompleted) whenCompleted();
+    std::lock_guard lock(mutex_);
+    outcomes_[task.description().value_or("none")] += describe(error, response);
+    ++completed_;
+    changed_.notify_all();
+}
+
+void SessionRecorder::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
+                                          const std::optional<TransferResponse>& response) {
+    std::lock_guard lock(mutex_);
+    elsewhere_[task.description().value_or("none")] += describe(error, response);
+    ++completed_;
+    changed_.notify_all();
+}
+
+void SessionRecorder::allEventsDelivered() {
+    std::lock_guard lock(mutex_);
+    EXPECT_FALSE(completedAtSignal_);
+    completedAtSignal_ = completed_;
+    changed_.notify_all();
+}
+
+bool SessionRecorder::wait(std::size_t count) const {
+    std::unique_lock lock(mutex_);
+    return changed_.wait_for(lock, 20s, [&] { return completed_ >= count; });
+}
+
+bool SessionRecorder::waitForSignal() const {
+    std::unique_lock lock(mutex_);
+    return changed_.wait_for(lock, 20s, [&] { return completedAtSignal_.has_value(); });
+}
+
+std::map<std::string, std::string> SessionRecorder::outcomes() const {
+    std::lock_guard lock(mutex_);
+    return outcomes_;
+}
+
+std::map<std::string, std::string> SessionRecorder::elsewhere() const {
+    std::lock_guard lock(mutex_);
+    return elsewhere_;
+}
+
+std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
+    std::lock_guard lock(mutex_);
+    return completedAtSignal_;
+}
+
+std::int64_t SessionRecorder::bytesSent() const {
+    std::lock_guard lock(mutex_);
+    return sent_;
+}
+
+LatePort::LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t size = sizeof address;
+    EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address), size), 0);
+    getsockname(socket_, reinterpret_cast<sockaddr*>(&address), &size);
+    port_ = ntohs(address.sin_port);
+}
+
+LatePort::~LatePort() {
+    close(socket_);
+}
+
+std::string LatePort::url() const {
+    return "http://127.0.0.1:" + std::to_string(port_);
+}
+
+void LatePort::answerOne() const {
+    listen(socket_, 8);
+    const int connection = accept(socket_, nullptr, nullptr);
+    char buffer[4096];
+    EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
+    const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
+    send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
+    recv(connection, buffer, sizeof buffer, 0);
+    close(connection);
+}
+
+AgentFixture::AgentFixture() {
+    options.program = CORVANE_AGENT;
+    options.directory = documents / "agent";
+    options.idleTime = 20s;  // a test that stalls does not lose its agent, and one that is killed does not leave it
+    options.retryDelay = 20ms;
+}
+
+AgentFixture::~AgentFixture() {
+    end(options.directory);
+}
+
+std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
+                                                    const std::string& owner) {
+    return open(to, TransferSessionConfiguration{.identifier = "session", .ownerKey = owner});
+}
+
+std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
+                                                    TransferSessionConfiguration configuration) {
+    configuration.relaunchesForEvents = true;
+    return std::make_shared<BackgroundTransferSession>(configuration, to, nullptr, options);
+}
+
+std::shared_ptr<TransferTask> AgentFixture::upload(TransferSession& session, const std::string& url,
+                                                   const std::string& description) {
+    auto task = session.uploadTask({.url = url, .method = "PUT", .headers = {{"X-Task", description}}},
+                                   body("body " + description, description));
+    task->setDescription(description);
+    task->resume();
+    return task;
+}
+
+std::vector<std::string> AgentFixture::running(TransferSession& session) {
+    auto answer = std::make_shared<std::promise<std::vector<std::string>>>();
+    session.tasks([answer](const auto& tasks) {
+        std::vector<std::string> found;
+        for (const auto& task : tasks) {
+            if (task->state() == TransferTask::State::running) found.push_back(task->description().value_or("none"));
+        }
+        answer->set_value(found);
+    });
+    auto listed = answer->get_future();
+    if (listed.wait_for(20s) != std::future_status::ready) return {"no answer"};
+    return listed.get();
+}
+
+std::filesystem::path AgentFixture::body(const std::string& name, const std::string& contents) {
+    writeFile(documents / name, contents);
+    return documents / name;
+}
+
+std::size_t AgentFixture::files(const std::string& folder) const {
+    std::error_code none;
+    const std::filesystem::directory_iterator found(options.directory / folder, none);
+    return none ? 0 : static_cast<std::size_t>(std::distance(found, std::filesystem::directory_iterator()));
+}
+
+long AgentFixture::agent(const std::filesystem::path& directory) {
+    const long process = std::atol(readFile(directory / "agent.lock").c_str());
+    if (process <= 0) return 0;
+    const auto command = readFile("/proc/" + std::to_string(process) + "/cmdline");
+    std::error_code gone;
+    const auto real = std::filesystem::weakly_canonical(directory, gone).string();
+    return command.find(real + '\0') == std::string::npos ? 0 : process;
+}
+
+long AgentFixture::processorTime(long process) {
+    std::istringstream stat(readFile("/proc/" + std::to_string(process) + "/stat"));
+    std::string word;
+    for (int i = 0; i < 13; ++i) stat >> word;
+    long user = 0, system = 0;
+    stat >> user >> system;
+    return user + system;
+}
+
+void AgentFixture::kill(int signal) const {
+    if (const long process = agent()) ::kill(static_cast<pid_t>(process), signal);
+}
+
+void AgentFixture::end(const std::filesystem::path& directory) {
+    EXPECT_TRUE(eventually([&] {
+        const long process = agent(directory);
+        if (process > 0) ::kill(static_cast<pid_t>(process), SIGKILL);
+        return process == 0;
+    }));
+}
+
+}  // namespace corvane::test

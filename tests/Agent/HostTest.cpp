@@ -1,0 +1,175 @@
+#include "tests/Agent/AgentFixture.h"
+#include "tests/support/Documents.h"
+
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <future>
+#include <random>
+#include <set>
+#include <sstream>
+#include <thread>
+
+namespace corvane::test {
+namespace {
+
+struct Outcome {
+    int status = 0;  ///< as waitpid gives it
+    std::set<std::string> acknowledged;
+};
+
+class HostTest : public AgentFixture {
+  protected:
+    Outcome run(const std::string& endpoint, int events, const std::string& mode,
+                const std::vector<std::string>& wake = {}) {
+        int channel[2];
+        EXPECT_EQ(pipe2(channel, O_CLOEXEC), 0);
+        std::vector<std::string> arguments{
+            CORVANE_BACKGROUND_HOST, CORVANE_AGENT, server.url("/" + endpoint), documents.path(), endpoint,
+            std::to_string(events),  mode};
+        arguments.insert(arguments.end(), wake.begin(), wake.end());
+        std::vector<char*> argv;
+        for (auto& argument : arguments) argv.push_back(argument.data());
+        argv.push_back(nullptr);
+        const pid_t child = fork();
+        if (child == 0) {
+            setenv("ASAN_OPTIONS", "detect_leaks=0", 1);  // it ends while its threads work, and they hold memory then
+            dup2(channel[1], STDOUT_FILENO);
+            execv(argv[0], argv.data());
+            _exit(127);
+        }
+        close(channel[1]);
+        std::string output;
+        std::array<char, 4096> buffer;
+        for (ssize_t n = 0; (n = read(channel[0], buffer.data(), buffer.size())) > 0;) output.append(buffer.data(), n);
+        close(channel[0]);
+        Outcome result;
+        waitpid(child, &result.status, 0);
+        std::istringstream lines(output);
+        for (std::string line; std::getline(lines, line);) result.acknowledged.insert(line);
+        return result;
+    }
+
+    [[nodiscard]] static bool wasKilled(const Outcome& outcome) {
+        return WIFSIGNALED(outcome.status) && WTERMSIG(outcome.status) == SIGKILL;
+    }
+    [[nodiscard]] static bool succeeded(const Outcome& outcome) {
+        return WIFEXITED(outcome.status) && WEXITSTATUS(outcome.status) == 0;
+    }
+    /// The events that arrived, by the path of their endpoint.
+    [[nodiscard]] std::multiset<std::string> arrived(const std::string& endpoint) const {
+        std::multiset<std::string> found;
+        for (const auto& request : server.requests()) {
+            if (request.path != "/" + endpoint ||
+                std::to_string(request.body.size()) != request.header("Content-Length"))
+                continue;
+            found.merge(eventIDs({JSON(gunzip(request.body))}));
+        }
+        return found;
+    }
+    [[nodiscard]] std::size_t payloads(const std::string& endpoint) const {
+        std::error_code none;
+        const std::filesystem::directory_iterator found(
+            documents / ("com.veskar.corvane." + endpoint + ".upload-dropbox"), none);
+        return none ? 0 : static_cast<std::size_t>(std::distance(found, std::filesystem::directory_iterator()));
+    }
+};
+
+std::multiset<std::string> each(const std::set<std::string>& once) {
+    return {once.begin(), once.end()};
+}
+
+TEST_F(HostTest, WhatAKilledHostHandedOverArrivesOnceAndItsNextRunLearnsOfIt) {
+    constexpr int count = 200;
+    server.script(ScriptedServer::Reply::status(200).hold(), count);
+    const Outcome killed = run("main", count, "kill");
+    ASSERT_TRUE(wasKilled(killed));
+    ASSERT_EQ(killed.acknowledged.size(), static_cast<std::size_t>(count));
+    ASSERT_TRUE(server.waitForRequests(4)) << "the agent sends, though nobody is there";
+    // The next run's retry pass comes while most documents have not gone out yet, and leaves them alone.
+    auto next = std::async(std::launch::async, [&] { return run("main", 1, "wait"); });
+    server.release(count);
+    const Outcome collected = next.get();
+    EXPECT_TRUE(succeeded(collected));
+    auto expected = each(killed.acknowledged);
+    expected.insert(collected.acknowledged.begin(), collected.acknowledged.end());
+    EXPECT_EQ(arrived("main"), expected) << "each once";
+    EXPECT_EQ(payloads("main"), 0u);
+}
+
+TEST_F(HostTest, DocumentsArriveWithNoHostAliveAndAreReportedLater) {
+    server.script(ScriptedServer::Reply::status(200).hold(), 200);
+    const Outcome killed = run("main", 200, "kill");
+    ASSERT_TRUE(wasKilled(killed));
+    server.release(200);
+    ASSERT_TRUE(eventually([&] { return server.requests().size() == 200; }, 30s));
+    EXPECT_EQ(payloads("main"), 200u) << "nobody has told the host";
+    EXPECT_TRUE(succeeded(run("main", 1, "wait")));
+    EXPECT_EQ(payloads("main"), 0u);
+    EXPECT_EQ(server.requests().size(), 201u) << "each once";
+}
+
+TEST_F(HostTest, TwoHostsAndTwoEndpointsAtOnceSeeTheirOwn) {
+    std::map<std::string, std::set<std::string>> acknowledged;
+    for (const std::string mode : {"kill", "wait"}) {
+        auto other = std::async(std::launch::async, [&] { return run("second", 40, mode); });
+        Outcome first = run("first", 60, mode);
+        Outcome second = other.get();
+        EXPECT_TRUE(mode == "kill" ? wasKilled(first) && wasKilled(second) : succeeded(first) && succeeded(second));
+        acknowledged["first"].merge(first.acknowledged);
+        acknowledged["second"].merge(second.acknowledged);
+    }
+    for (const std::string endpoint : {"first", "second"}) {
+        EXPECT_EQ(arrived(endpoint), each(acknowledged[endpoint])) << "each once";
+        EXPECT_EQ(payloads(endpoint), 0u);
+    }
+}
+
+TEST_F(HostTest, RunsACommandForAHostThatIsNotThereOnce) {
+    const auto woken = documents / "woken";
+    const Outcome killed =
+        run("main", 5, "kill", {"/bin/sh", "-c", "echo \"$0\" $(umask) $(pwd) >> '" + woken.string() + "'"});
+    ASSERT_TRUE(wasKilled(killed));
+    ASSERT_TRUE(eventually([&] { return std::filesystem::exists(woken) && !readFile(woken).empty(); }));
+    EXPECT_TRUE(succeeded(run("main", 1, "wait"))) << "a host that is there is told, not woken";
+    const auto mask = umask(022);
+    umask(mask);
+    char text[8];
+    std::snprintf(text, sizeof text, "%04o", mask);
+    EXPECT_EQ(readFile(woken), std::string("com.veskar.corvane.upload-session ") + text + " /\n");
+}
+
+// The fifty rounds: the host's process is the test's, so that it can tell what it was told of.
+TEST_F(HostTest, AnAgentThatIsKilledAtAnyMomentLosesNothingAndReportsNothingTwice) {
+    std::mt19937 random(7);
+    auto session = open(recorder);
+    std::size_t submitted = 0;
+    for (int round = 0; round < 50; ++round) {
+        for (int i = 0; i < 6; ++i) upload(*session, server.url(), std::to_string(submitted++));
+        ASSERT_TRUE(eventually([&] { return agent() > 0; }));
+        // Not to wait for anything: the kill is to come wherever the agent happens to be.
+        std::this_thread::sleep_for(std::chrono::microseconds(random() % 20'000));
+        kill(SIGKILL);
+        if (round % 10 == 9) {  // the host, too, has a new run now and then
+            ASSERT_TRUE(recorder->wait(submitted)) << recorder->outcomes().size() << " of " << submitted;
+            EXPECT_TRUE(running(*session).empty());
+            session.reset();
+            session = open(recorder);
+        }
+    }
+    ASSERT_TRUE(recorder->wait(submitted));
+    const auto outcomes = recorder->outcomes();
+    EXPECT_EQ(outcomes.size(), submitted);
+    for (const auto& [name, outcome] : outcomes) EXPECT_EQ(outcome, "200") << name << ", reported once";
+    const auto arrived = bodies(server);
+    for (const auto& [name, outcome] : outcomes) EXPECT_TRUE(arrived.contains(name)) << name;
+    EXPECT_TRUE(eventually([&] { return running(*session).empty(); }));
+}
+
+}  // namespace
+}  // namespace corvane::test

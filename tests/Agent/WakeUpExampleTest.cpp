@@ -1,0 +1,42 @@
+#include "tests/Agent/AgentFixture.h"
+
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+namespace corvane::test {
+namespace {
+
+class WakeUpExample : public AgentFixture {
+  protected:
+    // Where the example's agent is: in its documents directory, like any host's that does not say otherwise.
+    WakeUpExample() { options.directory = documents / "com.veskar.corvane.transfer-agent"; }
+};
+
+TEST_F(WakeUpExample, EndsAtOnceAndIsWokenWhenItsDocumentIsThrough) {
+    server.script(ScriptedServer::Reply::status(200).hold());
+    std::string program = CORVANE_EXAMPLE, url = server.url("/events"), directory = documents.path().string();
+    char* argv[] = {program.data(), url.data(), directory.data(), nullptr};
+    pid_t process = -1;
+    ASSERT_EQ(posix_spawn(&process, argv[0], nullptr, nullptr, argv, environ), 0);
+    int status = 0;
+    ASSERT_EQ(waitpid(process, &status, 0), process);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+    ASSERT_TRUE(server.waitForRequests(1));
+    server.release();
+    const auto written = documents / "woken.txt";
+    ASSERT_TRUE(eventually([&] { return readFile(written).ends_with("\n"); }, 20s));
+    EXPECT_EQ(readFile(written),
+              "com.veskar.corvane.upload-session: all events delivered, 1 documents delivered, 0 pending\n");
+    EXPECT_EQ(server.requests().size(), 1u);
+    // The woken one is nobody's child here; it must not meet the end of the agent.
+    EXPECT_TRUE(eventually([&] {
+        for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
+            if (readFile(entry.path() / "cmdline").find(url + '\0' + directory) != std::string::npos) return false;
+        }
+        return true;
+    }));
+}
+
+}  // namespace
+}  // namespace corvane::test

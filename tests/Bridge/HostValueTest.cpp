@@ -1,0 +1,168 @@
+#include <corvane/Bridge/Models/BridgedDataEvent.h>
+#include <corvane/Bridge/Models/BridgedDataType.h>
+#include <corvane/Bridge/Models/toJsonValue.h>
+#include <corvane/Models/Decoding.h>
+
+#include <gtest/gtest.h>
+
+#include <limits>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace corvane {
+namespace {
+
+using namespace std::chrono_literals;
+using Array = HostValue::Array;
+using Dictionary = HostValue::Dictionary;
+
+class Track final : public BridgedDataEventType {
+  public:
+    explicit Track(Dictionary dictionary) : dictionary_(std::move(dictionary)) {}
+    std::string dataName() const override { return "Track"; }
+    Dictionary toDict() const override { return dictionary_; }
+
+  private:
+    Dictionary dictionary_;
+};
+
+/// Answers with a value, or refuses.
+class Convertible final : public BridgedDataType {
+  public:
+    explicit Convertible(std::optional<HostValue> value) : value_(std::move(value)) {}
+    std::optional<HostValue> toJsonValueAndReturnError(BridgedError* error) const override {
+        if (!value_ && error) *error = BridgedError("Host", 7, "refused");
+        return value_;
+    }
+
+  private:
+    std::optional<HostValue> value_;
+};
+
+class AnswersWithItself final : public BridgedDataType, public std::enable_shared_from_this<AnswersWithItself> {
+  public:
+    std::optional<HostValue> toJsonValueAndReturnError(BridgedError*) const override { return shared_from_this(); }
+};
+
+class HoldsItself final : public BridgedDataEventType, public std::enable_shared_from_this<HoldsItself> {
+  public:
+    std::string dataName() const override { return "HoldsItself"; }
+    Dictionary toDict() const override { return {{"list", Array{shared_from_this()}}}; }
+};
+
+std::shared_ptr<Track> track(Dictionary dictionary) {
+    return std::make_shared<Track>(std::move(dictionary));
+}
+
+/// The JSON text of a value, or of a data event with these properties; or domain, code and message after "! ".
+template <class Conversion>
+std::string outcome(Conversion conversion) {
+    try {
+        return conversion().text();
+    } catch (...) {
+        const BridgedError error = BridgedError::of(AnyError::current());
+        return "! " + error.domain() + " " + std::to_string(error.code()) + " " + error.what();
+    }
+}
+std::string asValue(const HostValue& value) {
+    return outcome([&] { return toJsonValue(value); });
+}
+std::string asDataEvent(Dictionary dictionary) {
+    return outcome([&] { return toDict(BridgedDataEvent(track(std::move(dictionary)))); });
+}
+
+TEST(HostValue, BecomesJSONByItsKind) {
+    const struct {
+        HostValue value;
+        const char* json;
+    } cases[] = {
+        {nullptr, "null"},
+        {HostValue(), "null"},
+        {static_cast<const char*>(nullptr), "null"},
+        {std::shared_ptr<int>(), "null"},
+        {true, "true"},
+        {7, "7"},
+        {std::numeric_limits<std::int64_t>::min(), "-9223372036854775808"},
+        {std::numeric_limits<std::uint64_t>::max(), "18446744073709551615"},
+        {3.0, "3.0"},
+        {"a\"b", R"("a\"b")"},
+        {Date(1500ms), "1500"},
+        {Date(-500us), "0"},
+        {Array{}, "[]"},
+        {Dictionary{}, "{}"},
+        {Array{1, "two", Array{nullptr}, Dictionary{{"k", false}}}, R"([1,"two",[null],{"k":false}])"},
+        {Dictionary{{"b", 1}, {"a", 2}, {"b", 3}}, R"({"a":2,"b":3})"},
+        {Array{track({{"title", "x"}}), std::make_shared<Convertible>(Date(9ms))}, R"([{"title":"x"},9])"},
+        {std::make_shared<Convertible>(Array{1}), "[1]"},
+    };
+    for (const auto& [value, json] : cases) EXPECT_EQ(asValue(value), json);
+
+    std::vector<HostValue::Entry> many;
+    for (int i = 0; i < 100; ++i) many.push_back({"k" + std::to_string(i % 20), i});
+    EXPECT_EQ(toJsonValue(Dictionary(many)).object()->size(), 20u);
+    EXPECT_EQ(toJsonValue(Dictionary(many))["k3"].integer(), 83);
+}
+
+TEST(HostValue, SaysWhyItCannotBecomeJSON) {
+    const auto opaque = std::make_shared<int>(1);
+    const std::string inDataEvent = "! Corvane.DataEventError 2 a value of the data event cannot become JSON";
+    const std::string inArray = "! Corvane.DataEventError 3 an element of an array cannot become JSON";
+    const std::string key = "! Corvane.DataEventError 4 a key of a dictionary is not a string";
+    const std::string inDictionary = "! Corvane.DataEventError 5 a value of a dictionary cannot become JSON";
+    const std::string tooDeep = "! Corvane.EncodingError 2 objects and arrays nest too deep";
+
+    EXPECT_EQ(asValue(opaque), inDataEvent);
+    EXPECT_EQ(asValue(Array{opaque}), inArray);
+    EXPECT_EQ(asValue(Dictionary{{"k", opaque}}), inDictionary);
+    EXPECT_EQ(asDataEvent({{"k", opaque}}), inDataEvent);
+    EXPECT_EQ(asDataEvent({{"k", track({})}}), inDataEvent)
+        << "a data event is converted inside lists and dictionaries";
+    EXPECT_EQ(asDataEvent({{"k", Array{track({{"k", opaque}})}}}), inDictionary);
+    EXPECT_EQ(asDataEvent({{1, "x"}}), key);
+    EXPECT_EQ(asValue(Dictionary{{"k", std::make_shared<Convertible>(std::nullopt)}, {7, 1}}), key)
+        << "keys are looked at before values";
+    EXPECT_EQ(asValue(Array{std::make_shared<Convertible>(std::nullopt)}), "! Host 7 refused");
+    EXPECT_EQ(asDataEvent({{"a", Dictionary{{"b", "\xff"}}}}), "! Corvane.EncodingError 0 a.b: the text is not UTF-8");
+    EXPECT_EQ(asDataEvent({{"\xff", 1}}), "! Corvane.EncodingError 0 (key): the text is not UTF-8");
+    EXPECT_EQ(asDataEvent({{"a", 0.0 / 0.0}}), "! Corvane.EncodingError 1 a: the number is infinite or not a number");
+    EXPECT_EQ(asValue(std::make_shared<AnswersWithItself>()), tooDeep);
+    EXPECT_TRUE(asValue(Array{std::make_shared<HoldsItself>()}).starts_with("! Corvane.EncodingError 2"));
+}
+
+TEST(HostValue, NestsWithoutTheStack) {
+    HostValue dictionaries = 1;
+    HostValue arrays = 1;
+    for (int i = 0; i < 200000; ++i) {
+        dictionaries = Dictionary{{"k", std::move(dictionaries)}};
+        arrays = Array{std::move(arrays)};
+    }
+    EXPECT_TRUE(asValue(dictionaries).starts_with("! Corvane.EncodingError 2"));
+    EXPECT_TRUE(asDataEvent({{"k", arrays}}).starts_with("! Corvane.EncodingError 2"));
+}
+
+TEST(BridgedDataEvent, HasNoStructuredEncoding) {
+    const BridgedDataEvent event(track({{"title", "x"}}));
+    EXPECT_EQ(event.toDict().text(), R"({"title":"x"})");
+    EXPECT_EQ(outcome([&] { return encoded(event); }).substr(0, 26), "! Corvane.DataEventError 1");
+    EXPECT_EQ(outcome([&] { return decode<BridgedDataEvent>(event.toDict()).toDict(); }).substr(0, 26),
+              "! Corvane.DataEventError 1");
+    EXPECT_THROW(BridgedDataEvent(nullptr), InvalidArgument);
+}
+
+TEST(HostValue, IsConvertedAndWrittenWithAnErrorToFill) {
+    BridgedError error;
+    EXPECT_EQ(toJsonValueAndReturnError(Array{1}, &error)->text(), "[1]");
+    EXPECT_FALSE(toJsonValueAndReturnError("\xff", &error));
+    EXPECT_EQ(error.domain(), "Corvane.EncodingError");
+    EXPECT_FALSE(toJsonValueAndReturnError("\xff", nullptr));
+    error = BridgedError();
+    EXPECT_EQ(toDataWithOptions(JSON(R"({"b":1,"a":2})"), {.sortedKeys = true}, &error), R"({"a":2,"b":1})");
+    EXPECT_EQ(error.domain(), "");
+    EXPECT_EQ(toDataWithOptions(JSON("42"), {}, &error), std::nullopt);
+    EXPECT_EQ(error.domain(), "Corvane.JSONError");
+    EXPECT_EQ(toDataWithOptions(JSON("42"), {}, nullptr), std::nullopt);
+}
+
+}  // namespace
+}  // namespace corvane
