@@ -5,6 +5,8 @@
 #include "tests/support/Documents.h"
 #include "tests/support/TemporaryDocuments.h"
 
+#include <corvane/Processing/UploadBatchEntity.h>
+#include <corvane/Store/DeferredStore.h>
 #include <corvane/Upload/SignedEntity.h>
 
 #include <gtest/gtest.h>

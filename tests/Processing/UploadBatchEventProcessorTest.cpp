@@ -1,4 +1,4 @@
-#include <corvane/Processing/UploadBatchEventProcessor.h>
+#include <corvane/Processing/UploadBatches.h>
 
 #include <corvane/Processing/UserEvents.h>
 #include <corvane/Upload/UploadRequest.h>
@@ -66,8 +66,9 @@ class UploadBatch : public ::testing::Test {
         manager = std::make_shared<FakeUploadManager>();
         ledger = manager->ledger = std::make_shared<DeliveryLedger>();
         store = std::make_shared<DeferredStore<UploadBatchEntity>>("main");
-        batching = std::make_shared<UploadBatchEventProcessor>(Client{"com.example.app", "App", "1.0", 1}, manager,
-                                                               store, UploadBatchEventConfig(batchSize, false), ledger);
+        batching = std::make_shared<UploadBatchEventProcessor>(
+            std::make_shared<UploadBatches>(Client{"com.example.app", "App", "1.0", 1}, manager, store,
+                                            UploadBatchEventConfig(batchSize, false), ledger));
         sessions = std::make_unique<SessionManager>();
         sessions->processorManager()->add(batching);
         root = sessions->tracker();

@@ -1,5 +1,7 @@
+#include <corvane/Processing/UploadBatchEntity.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 #include <corvane/Session/SessionCore.h>
+#include <corvane/Store/DeferredStore.h>
 #include <corvane/Store/DeferredStoreCore.h>
 
 #include "tests/support/TemporaryDocuments.h"

@@ -1,0 +1,67 @@
+#include <corvane/Processing/DocumentHandOver.h>
+
+#include <corvane/Platform/UUID.h>
+#include <corvane/Processing/UserEvents.h>
+#include <corvane/Upload/UploadRequest.h>
+
+#include <cstdint>
+#include <utility>
+
+namespace corvane {
+
+DocumentHandOver::DocumentHandOver(Client client, std::shared_ptr<UploadManagerType> uploadManager,
+                                   std::shared_ptr<DeferredStore<UploadBatchEntity>> deferredStore,
+                                   std::shared_ptr<DeliveryLedger> ledger)
+    : client_(std::move(client)),
+      uploadManager_(std::move(uploadManager)),
+      deferredStore_(std::move(deferredStore)),
+      ledger_(std::move(ledger)) {}
+
+DocumentHandOver::Removal DocumentHandOver::upload(const UploadBatchEntity& batch, const MayDelete& mayDelete) {
+    const auto document = std::make_shared<UserEvents>(batch.session, batch.events, newUUID());
+    Removal removal;
+    ledger_->add(document->identifier(), static_cast<std::int64_t>(batch.events->count()));
+    try {
+        UploadRequest request{client_, document};
+        request.removeBackup = [&](const std::shared_ptr<StoreConnection>& connection) {
+            removeBackup(connection, batch.identifier, mayDelete, removal);
+        };
+        removal.taken = uploadManager_->upload(request);
+    } catch (...) {
+        ledger_->remove(document->identifier());
+        throw;
+    }
+    removal.document = document->identifier();
+    if (removal.taken == UploadTaken::underWay) {  // what the transaction did is undone
+        return {.document = std::move(removal.document), .error = std::nullopt};
+    }
+    if (removal.isKept || removal.isDone || removal.error) return removal;
+    try {
+        deferredStore_->perform(
+            [&](Rows& rows) { rows.transaction([&] { deleteRow(rows, batch.identifier, mayDelete); }); });
+    } catch (...) {
+        removal.error = AnyError::current();
+    }
+    return removal;
+}
+
+// Only where both tables are in one file; otherwise the row is deleted afterwards, and a kill in between sends it
+// again.
+void DocumentHandOver::removeBackup(const std::shared_ptr<StoreConnection>& connection, const std::string& identifier,
+                                    const MayDelete& mayDelete, Removal& removal) {
+    removal.isKept = connection->location().isMemory() && !deferredStore_->isInMemory();
+    if (!deferredStore_->sharesFileWith(*connection)) return;
+    try {
+        Rows rows(connection);
+        deleteRow(rows, identifier, mayDelete);
+        removal.isDone = true;
+    } catch (...) {
+        removal.error = AnyError::current();
+    }
+}
+
+void DocumentHandOver::deleteRow(Rows& rows, const std::string& identifier, const MayDelete& mayDelete) {
+    if (!mayDelete || mayDelete(rows)) rows.deleteWhere("identifier", identifier);
+}
+
+}  // namespace corvane

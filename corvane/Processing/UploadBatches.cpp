@@ -1,0 +1,343 @@
+#include <corvane/Processing/UploadBatches.h>
+
+#include <corvane/Platform/Log.h>
+#include <corvane/Platform/Require.h>
+#include <corvane/Platform/UUID.h>
+#include <corvane/Upload/OstrelSigner.h>
+#include <corvane/Upload/UploadDropbox.h>
+#include <corvane/Upload/UploadManager.h>
+#include <corvane/Upload/UploadService.h>
+
+#include <algorithm>
+#include <condition_variable>
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+/// Waits until the queue has run everything enqueued before, or until the deadline.
+void waitForQueue(SerialQueue& queue, std::chrono::steady_clock::time_point deadline) {
+    struct Mark {
+        Mutex mutex;
+        std::condition_variable reached;
+        bool isReached CORVANE_GUARDED_BY(mutex) = false;
+    };
+    const auto mark = std::make_shared<Mark>();
+    queue.async([mark] {
+        const Lock lock(mark->mutex);
+        mark->isReached = true;
+        mark->reached.notify_all();
+    });
+    Lock lock(mark->mutex);
+    while (!mark->isReached && lock.waitUntil(mark->reached, deadline)) continue;
+}
+
+}  // namespace
+
+UploadBatches::UploadBatches(Client client, std::shared_ptr<UploadManagerType> uploadManager,
+                             const std::shared_ptr<DeferredStore<UploadBatchEntity>>& deferredStore,
+                             const UploadBatchEventConfig& config, std::shared_ptr<DeliveryLedger> ledger,
+                             std::shared_ptr<const EndpointUse> endpointUse)
+    : ledger_(std::move(ledger)),
+      uploadManager_(std::move(uploadManager)),
+      deferredStore_(deferredStore),
+      config_(config),
+      endpointUse_(std::move(endpointUse)),
+      handOver_(std::move(client), uploadManager_, deferredStore, ledger_),
+      terminated_(deferredStore, ledger_) {}
+
+std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint& endpoint,
+                                                   const UploadBatchEventConfig& config) {
+    auto ledger = std::make_shared<DeliveryLedger>();
+    auto manager =
+        UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
+                              std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
+                              std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()), ledger);
+    return std::make_shared<UploadBatches>(std::move(client), std::move(manager),
+                                           std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name()), config,
+                                           std::move(ledger), std::make_shared<const EndpointUse>(endpoint));
+}
+
+DeliveryReport UploadBatches::waitForDelivery(std::chrono::steady_clock::time_point deadline) const {
+    if (born_.isInChild()) return {};
+    DeferredStoreCore::queue().assertNotCurrent("UploadBatchEventProcessor::waitForDelivery");
+    const auto queue = registeredQueue();
+    if (queue) {
+        queue->assertNotCurrent("UploadBatchEventProcessor::waitForDelivery");
+        waitForQueue(*queue, deadline);
+    }
+    const auto report = ledger_->wait(deadline);
+    // What is settled inside a callback is acknowledged behind it: a host that exits now must not be told again.
+    if (queue) waitForQueue(*queue, deadline);
+    return report;
+}
+
+std::shared_ptr<SerialQueue> UploadBatches::registeredQueue() const {
+    const Lock lock(registrationMutex_);
+    return accessQueue_;
+}
+
+void UploadBatches::registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) {
+    {
+        const Lock lock(registrationMutex_);
+        if (accessQueue_ == accessQueue) return;
+        if (accessQueue_) throw InvalidArgument("the upload processor belongs to another session manager already");
+        accessQueue_ = accessQueue;
+    }
+    uploadManager_->registerAccessQueue(std::move(accessQueue));
+}
+
+void UploadBatches::assertOnQueue(const char* operation) const {
+    CORVANE_REQUIRE(accessQueue_ != nullptr, std::string(operation) + " of an upload processor that was never added");
+    accessQueue_->assertCurrent(operation);
+}
+
+UploadBatchQueueKey UploadBatches::keyOf(const ProcessEvent& processEvent) const {
+    if (!currentSession_) throw UploadBatchQueueKeyError(UploadBatchQueueKeyError::invalid);
+    const std::string& sessionID = currentSession_->identifier;
+    return processEvent.groupName() ? UploadBatchQueueKey::group(sessionID, *processEvent.groupName())
+                                    : UploadBatchQueueKey::session(sessionID);
+}
+
+void UploadBatches::process(const ProcessEvent& processEvent) {
+    assertOnQueue("UploadBatchEventProcessor::process");
+    try {
+        const UploadBatchQueueKey key = keyOf(processEvent);
+        add(key, processEvent.payload());
+        if (!key.isGroup()) submit(key, false);
+    } catch (...) {
+        Log::shared().error("Failed to process event for batching, error=%{public}@", AnyError::current().what());
+    }
+}
+
+void UploadBatches::add(const UploadBatchQueueKey& key, const JSON& payload) {
+    auto found = batchQueues_.find(key);
+    if (found == batchQueues_.end()) {
+        found = batchQueues_
+                    .emplace(key, UploadBatchQueue{.identifier = newUUID(),
+                                                   .session = currentSession_->sessionData,
+                                                   .events = std::make_shared<EncodedEvents>()})
+                    .first;
+    }
+    UploadBatchQueue& queue = found->second;
+    queue.events->append(payload);
+    queue.session = currentSession_->sessionData;
+    if (!backUp(queue)) {
+        backupsAreBehind_ = true;
+    } else if (backupsAreBehind_) {
+        backUpAll();
+    }
+}
+
+bool UploadBatches::backUp(UploadBatchQueue& queue) {
+    queue.isBackedUp = false;
+    try {
+        const UploadBatchEntity backup{queue.identifier, queue.session, queue.events};
+        deferredStore_->perform([&](Rows& rows) { rows.insert(backup); });
+        queue.isBackedUp = true;
+    } catch (...) {
+        Log::shared().error("Failed to write queue to disk for backup uploads, identifier=%{public}@, error=%{public}@",
+                            queue.identifier, AnyError::current().what());
+    }
+    return queue.isBackedUp;
+}
+
+void UploadBatches::backUpAll() {
+    backupsAreBehind_ = false;
+    dropDelivered();
+    for (auto one = unsaved_.begin(); one != unsaved_.end();) {
+        const bool isSaved = backUp(one->second);
+        if (isSaved) ledger_->unfollow(one->first);
+        one = isSaved ? unsaved_.erase(one) : std::next(one);
+    }
+    for (auto& [key, queue] : batchQueues_) {
+        if (!backUp(queue)) backupsAreBehind_ = true;
+    }
+    if (!unsaved_.empty()) backupsAreBehind_ = true;
+}
+
+void UploadBatches::submit(const UploadBatchQueueKey& key, bool force) {
+    const auto found = batchQueues_.find(key);
+    if (found == batchQueues_.end()) return;
+    if (!currentSession_) {
+        Log::shared().error("Attempting to perform upload without a session");
+        return;
+    }
+    if (key.sessionID() != currentSession_->identifier) {
+        Log::shared().error(
+            "Attempting to perform upload with session/queue key mismatch, session=%{public}@, queueKey=%{public}@",
+            currentSession_->identifier, key.description());
+        return;
+    }
+    if (found->second.events->count() < config_.batchSize() && !force) return;
+    // A manager of the host's may submit events from inside its call: they go into a batch of their own.
+    auto handedOver = batchQueues_.extract(found);
+    try {
+        handOver(handedOver.mapped());
+    } catch (...) {
+        Log::shared().error("Failed to submit request for upload, error=%{public}@", AnyError::current().what());
+        putBack(std::move(handedOver));
+    }
+}
+
+void UploadBatches::handOver(UploadBatchQueue& queue) {
+    const auto removal = handOver_.upload({queue.identifier, currentSession_->sessionData, queue.events}, {});
+    if (removal.error) {
+        Log::shared().error("Failed to clean up request after submission, error=%{public}@", removal.error->what());
+    }
+    if (removal.taken == UploadTaken::underWay) keep(queue, removal.document);
+}
+
+void UploadBatches::keep(UploadBatchQueue& queue, const std::string& document) {
+    if (queue.isBackedUp || backUp(queue)) return;
+    dropDelivered();
+    if (!ledger_->follow(document)) return;
+    unsaved_.emplace(document, std::move(queue));
+    backupsAreBehind_ = true;
+}
+
+void UploadBatches::dropDelivered() {
+    std::erase_if(unsaved_, [this](const auto& one) {
+        const auto outcome = ledger_->takeOutcome(one.first);
+        return outcome && *outcome != DeliveryLedger::Outcome::pending;
+    });
+}
+
+void UploadBatches::putBack(Queues::node_type refused) {
+    const auto back = batchQueues_.insert(std::move(refused));
+    if (back.inserted) return;
+    UploadBatchQueue& successor = back.position->second;
+    UploadBatchQueue& queue = back.node.mapped();
+    queue.events->append(*successor.events);
+    std::swap(queue.identifier, successor.identifier);
+    std::swap(queue.events, successor.events);
+    if (!backUp(successor)) {
+        backupsAreBehind_ = true;
+        return;
+    }
+    try {
+        deferredStore_->perform([&](Rows& rows) { rows.deleteWhere("identifier", queue.identifier); });
+    } catch (...) {
+        Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
+                            queue.identifier, AnyError::current().what());
+    }
+}
+
+void UploadBatches::didLeaveGroup(const Group& group) {
+    assertOnQueue("UploadBatchEventProcessor::didLeaveGroup");
+    if (!currentSession_) {
+        Log::shared().error("Attempt to leave group and perform upload without a current session");
+        return;
+    }
+    submit(UploadBatchQueueKey::group(currentSession_->identifier, group.name), true);
+}
+
+void UploadBatches::didStartSession(const Session& session) {
+    assertOnQueue("UploadBatchEventProcessor::didStartSession");
+    try {
+        deferredStore_->perform([](Rows& rows) {
+            rows.open();
+            rows.createTable();
+        });
+    } catch (...) {
+        Log::shared().error("Failed to open handle to the store, error=%{public}@", AnyError::current().what());
+    }
+    uploadManager_->open();
+    setSession(session);
+    // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
+    // rest.
+    backUpAll();
+    terminated_.list();
+    resubmitTerminated();
+}
+
+void UploadBatches::resubmitTerminated() {
+    constexpr std::size_t atOnce = std::size_t{256} * 1024;
+    const auto self = weak_from_this();
+    for (std::size_t bytes = 0; !terminated_.isEmpty() && (bytes < atOnce || self.expired());) {
+        bytes += terminated_.sendNext([this](UploadBatchEntity batch) {
+            assertOnQueue("UploadBatchEventProcessor::resubmitTerminated");
+            resubmit(std::move(batch));
+        });
+    }
+    if (terminated_.isEmpty()) return;
+    accessQueue_->async([self] {
+        const auto batches = self.lock();
+        if (!batches) return;
+        batches->assertOnQueue("UploadBatchEventProcessor::resubmitTerminated");
+        batches->resubmitTerminated();
+    });
+}
+
+void UploadBatches::resubmit(UploadBatchEntity batch) {
+    Log::shared().default_("Attempting to resubmit terminated batch, identifier=%{public}@", batch.identifier);
+    // A batch of this run that could not be handed over at its session's end. Its row may be behind: then the batch
+    // itself goes out.
+    const std::size_t stored = batch.events->count();
+    const auto isThis = [&](const auto& one) { return one.second.identifier == batch.identifier; };
+    auto open = std::find_if(batchQueues_.begin(), batchQueues_.end(), isThis);
+    if (open != batchQueues_.end() && open->second.events->count() > stored) {
+        batch.session = open->second.session;
+        batch.events = open->second.events;
+    }
+    // A row that has grown since it was read belongs to a processor that is at work, in this process or another: the
+    // row is the only backup of the events that were added, and its owner will send and delete it.
+    const auto hasNotGrown = [&](Rows& rows) {
+        const auto now = rows.fetchWhere("identifier", batch.identifier);
+        return now.empty() || now.front().events->count() <= batch.events->count();
+    };
+    DocumentHandOver::Removal removal;
+    try {
+        removal = handOver_.upload(batch, hasNotGrown);
+        if (removal.error) {
+            Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
+                                batch.identifier, removal.error->what());
+        }
+    } catch (...) {
+        Log::shared().error("Failed to submit rehydrated request for upload, error=%{public}@",
+                            AnyError::current().what());
+        return;
+    }
+    open = std::find_if(batchQueues_.begin(), batchQueues_.end(), isThis);
+    if (open == batchQueues_.end()) return;
+    auto handedOver = batchQueues_.extract(open);
+    if (removal.taken == UploadTaken::underWay) keep(handedOver.mapped(), removal.document);
+}
+
+void UploadBatches::didUpdateSession(const Session& session, bool submitQueues) {
+    assertOnQueue("UploadBatchEventProcessor::didUpdateSession");
+    if (currentSession_ && submitQueues) submit(UploadBatchQueueKey::session(currentSession_->identifier), true);
+    setSession(session);
+}
+
+// What is no object, which only a caller of the host's own can hand over, would make every document of the session
+// unreadable.
+void UploadBatches::setSession(const Session& session) {
+    assertOnQueue("UploadBatchEventProcessor::setSession");
+    currentSession_ = session;
+    if (session.sessionData.isObject()) return;
+    Log::shared().error("Session data is not a JSON object and is left out, identifier=%{public}@", session.identifier);
+    currentSession_->sessionData = JSON("{}");
+}
+
+void UploadBatches::didEndSession() {
+    assertOnQueue("UploadBatchEventProcessor::didEndSession");
+    std::vector<UploadBatchQueueKey> keys;
+    keys.reserve(batchQueues_.size());
+    for (const auto& [key, queue] : batchQueues_) keys.push_back(key);
+    for (const auto& key : keys) submit(key, true);
+    currentSession_.reset();
+    try {
+        deferredStore_->perform([](Rows& rows) { rows.close(); });
+    } catch (...) {
+        Log::shared().error("Failed to close handle to the store, error=%{public}@", AnyError::current().what());
+    }
+    uploadManager_->close();
+}
+
+bool UploadBatches::resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion) {
+    return uploadManager_->shouldResume(identifier, completion);
+}
+
+}  // namespace corvane

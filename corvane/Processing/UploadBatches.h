@@ -1,0 +1,121 @@
+#pragma once
+
+#include <corvane/Models/Client.h>
+#include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/Session.h>
+#include <corvane/Platform/ForkMark.h>
+#include <corvane/Platform/Mutex.h>
+#include <corvane/Platform/SerialQueue.h>
+#include <corvane/Processing/DocumentHandOver.h>
+#include <corvane/Processing/TerminatedBatches.h>
+#include <corvane/Processing/UploadBatchEntity.h>
+#include <corvane/Processing/UploadBatchEventProcessor.h>
+#include <corvane/Processing/UploadBatchQueueKey.h>
+#include <corvane/Store/DeferredStore.h>
+#include <corvane/Upload/DeliveryLedger.h>
+#include <corvane/Upload/EndpointUse.h>
+#include <corvane/Upload/UploadManagerType.h>
+
+#include <chrono>
+#include <functional>
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+
+namespace corvane {
+
+/// The open batches of an `UploadBatchEventProcessor`, which owns them: what it says of itself holds for them.
+///
+/// A batch is open (in `batchQueues_`, with a row that holds all its events unless `backupsAreBehind_`), then handed
+/// over, and its row goes in the transaction that writes the document's row. Refused, it is open again. Where neither
+/// row can be written while the document is under way, it stays in `unsaved_` until one can be, or until the document
+/// has got through. Rows of an earlier run are in `terminated_` until they are handed over in their turn. Internal.
+class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
+  public:
+    /// Works with an upload manager and a store of the caller's. `ledger` is the one that the manager keeps.
+    UploadBatches(Client client, std::shared_ptr<UploadManagerType> uploadManager,
+                  const std::shared_ptr<DeferredStore<UploadBatchEntity>>& deferredStore,
+                  const UploadBatchEventConfig& config, std::shared_ptr<DeliveryLedger> ledger,
+                  std::shared_ptr<const EndpointUse> endpointUse = nullptr);
+
+    /// The library's own set-up for an endpoint.
+    [[nodiscard]] static std::shared_ptr<UploadBatches> make(Client client, const Endpoint& endpoint,
+                                                             const UploadBatchEventConfig& config);
+
+    DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline) const;
+    void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue);
+    bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion);
+
+    // On the access queue (the process is stopped with a message).
+    void process(const ProcessEvent& processEvent);
+    void didLeaveGroup(const Group& group);
+    void didStartSession(const Session& session);
+    void didUpdateSession(const Session& session, bool submitQueues);
+    void didEndSession();
+
+  private:
+    using Rows = Store<UploadBatchEntity>;
+
+    /// An open batch. The identifier names its backup row.
+    struct UploadBatchQueue {
+        std::string identifier;
+        JSON session;  // the session's JSON form as of the last event
+        std::shared_ptr<EncodedEvents> events;
+        bool isBackedUp = false;  // the row holds all events
+    };
+    using Queues = std::map<UploadBatchQueueKey, UploadBatchQueue>;
+
+    void assertOnQueue(const char* operation) const CORVANE_ASSERT_CAPABILITY(*accessQueue_);
+    /// The queue that was registered, from any thread; nullptr before.
+    [[nodiscard]] std::shared_ptr<SerialQueue> registeredQueue() const;
+    void setSession(const Session& session) CORVANE_REQUIRES(*accessQueue_);
+    [[nodiscard]] UploadBatchQueueKey keyOf(const ProcessEvent& processEvent) const CORVANE_REQUIRES(*accessQueue_);
+
+    /// Appends an event to its batch, which is made if need be, and writes the batch's row.
+    void add(const UploadBatchQueueKey& key, const JSON& payload) CORVANE_REQUIRES(*accessQueue_);
+    /// Writes the batch's row. Returns whether it is written; if not, that has been logged.
+    bool backUp(UploadBatchQueue& queue);
+    /// Writes the rows of all batches, after one could not be written.
+    void backUpAll() CORVANE_REQUIRES(*accessQueue_);
+    /// Lets go of unsaved batches whose documents need no second attempt.
+    void dropDelivered() CORVANE_REQUIRES(*accessQueue_);
+
+    /// Hands a batch over when it is full, or in any case; one that is refused is open again.
+    void submit(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
+    /// Hands a batch over that is in no list any more, with the session's data as it is now.
+    /// Throws what the manager throws; the batch is then as it was.
+    void handOver(UploadBatchQueue& queue) CORVANE_REQUIRES(*accessQueue_);
+    /// Sees to it that a batch whose document is under way without a row of its own stays in its backup.
+    void keep(UploadBatchQueue& queue, const std::string& document) CORVANE_REQUIRES(*accessQueue_);
+    /// Puts a batch back that was refused, before what was added to its successor meanwhile.
+    void putBack(Queues::node_type refused) CORVANE_REQUIRES(*accessQueue_);
+
+    /// Sends some of the terminated batches, and goes on later, behind what waits on the queue.
+    void resubmitTerminated() CORVANE_REQUIRES(*accessQueue_);
+    /// Sends one as its row holds it, or as it is open here if that has more.
+    void resubmit(UploadBatchEntity batch) CORVANE_REQUIRES(*accessQueue_);
+
+    // Constant after construction.
+    const std::shared_ptr<DeliveryLedger> ledger_;
+    const std::shared_ptr<UploadManagerType> uploadManager_;
+    const std::shared_ptr<DeferredStore<UploadBatchEntity>> deferredStore_;
+    const UploadBatchEventConfig config_;
+    const std::shared_ptr<const EndpointUse> endpointUse_;  // nothing with a manager of the caller's
+    const ForkMark born_;
+
+    // Set once, before the first callback: the queue's own tasks read it without the mutex.
+    mutable Mutex registrationMutex_;
+    std::shared_ptr<SerialQueue> accessQueue_;
+
+    DocumentHandOver handOver_ CORVANE_GUARDED_BY(*accessQueue_);
+    Queues batchQueues_ CORVANE_GUARDED_BY(*accessQueue_);
+    // By document.
+    std::map<std::string, UploadBatchQueue> unsaved_ CORVANE_GUARDED_BY(*accessQueue_);
+    TerminatedBatches terminated_ CORVANE_GUARDED_BY(*accessQueue_);
+    std::optional<Session> currentSession_ CORVANE_GUARDED_BY(*accessQueue_);
+    // A row could not be written; once one can, all are.
+    bool backupsAreBehind_ CORVANE_GUARDED_BY(*accessQueue_) = false;
+};
+
+}  // namespace corvane
