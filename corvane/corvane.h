@@ -14,7 +14,6 @@
 #include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/Session.h>
 #include <corvane/Models/SessionData.h>
-#include <corvane/Models/TimedData.h>
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/MainQueue.h>
@@ -23,7 +22,7 @@
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 #include <corvane/Session/SessionManager.h>
 #include <corvane/Signing/SigningServiceType.h>
-#include <corvane/Snapshot/Snapshot.h>
+#include <corvane/Snapshot/SnapshotType.h>
 #include <corvane/Tracker/AccessTracker.h>
 #include <corvane/Tracker/SessionObserver.h>
 #include <corvane/Tracker/Tracker.h>

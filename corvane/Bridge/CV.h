@@ -10,17 +10,15 @@
 #ifndef CORVANE_CANNOT_BE_COMPILED  // it has said why, in one sentence
 
 #include <corvane/Bridge/Data/BridgedAccessTracker.h>
+#include <corvane/Bridge/Data/BridgedDataEventClass.h>
 #include <corvane/Bridge/Data/BridgedEventClass.h>
-#include <corvane/Bridge/Data/BridgedRawDataEvent.h>
 #include <corvane/Bridge/Data/BridgedRawEvent.h>
 #include <corvane/Bridge/Data/BridgedTracker.h>
 #include <corvane/Bridge/Logging/BridgingLoggingEventProcessor.h>
-#include <corvane/Bridge/Models/BridgeError.h>
-#include <corvane/Bridge/Models/BridgedDataEvent.h>
-#include <corvane/Bridge/Models/BridgedDataType.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
+#include <corvane/Bridge/Models/BridgedError.h>
 #include <corvane/Bridge/Models/BridgedEventData.h>
-#include <corvane/Bridge/Models/BridgedTimedData.h>
-#include <corvane/Bridge/Models/toJsonValue.h>
+#include <corvane/Bridge/Models/HostValue.h>
 #include <corvane/Bridge/Session/BridgedSessionManager.h>
 #include <corvane/Bridge/Upload/BridgedUploadBatchEventProcessor.h>
 

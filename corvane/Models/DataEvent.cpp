@@ -1,5 +1,7 @@
 #include <corvane/Models/DataEvent.h>
 
+#include <memory>
+
 namespace corvane {
 
 namespace {
@@ -38,21 +40,22 @@ JSON detail::requireHostObject(JSON json) {
     return json;
 }
 
-AnyDataEvent::Base::~Base() = default;
+AnyDataEvent::Base::~Base() {
+    delete dict.load(std::memory_order_acquire);
+}
 
 void AnyDataEvent::destroy(const Base* box) noexcept {
     delete box;
 }
 
 JSON AnyDataEvent::toDict() const {
-    const AnyDataEvent held(*this);  // the host's code, which is not called under the lock, may replace this object
+    const AnyDataEvent held(*this);  // the host's code may replace this object
     const Base* const box = held.box_;
-    if (box->isEncoded.load(std::memory_order_acquire)) return *box->dict;
-    JSON dict = box->makeDict();
-    std::lock_guard lock(box->mutex);
-    if (!box->dict) box->dict = std::move(dict);
-    box->isEncoded.store(true, std::memory_order_release);
-    return *box->dict;
+    if (const JSON* dict = box->dict.load(std::memory_order_acquire)) return *dict;
+    auto made = std::make_unique<const JSON>(box->makeDict());
+    const JSON* first = nullptr;
+    if (!box->dict.compare_exchange_strong(first, made.get(), std::memory_order_acq_rel)) return *first;
+    return *made.release();
 }
 
 }  // namespace corvane

@@ -1,17 +1,35 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Models/DataEventError.h>
 #include <corvane/Models/Encoding.h>
+#include <corvane/Platform/Error.h>
 #include <corvane/Reflection/DataType.h>
 
 #include <atomic>
 #include <concepts>
-#include <mutex>
-#include <optional>
 #include <utility>
 
 namespace corvane {
+
+/// A data event that cannot become a JSON object. Domain "Corvane.DataEventError".
+class CORVANE_EXPORT DataEventError : public Error {
+  public:
+    enum Code {
+        invalidTopLevelJson = 0,        ///< its encoding is not an object
+        internalError,                  ///< an object-facing data event was put through the structured encoder
+        dataNotSerializable,            ///< a value in an object-facing data event's dictionary cannot be converted
+        dataArrayValueNotSerializable,  ///< an element of an array cannot be converted
+        dataDictKeyNotSerializable,     ///< a key of a dictionary is not a string
+        dataDictValueNotSerializable,   ///< a value of a dictionary cannot be converted
+    };
+    explicit DataEventError(Code code);
+    DataEventError(const DataEventError&) = default;
+    DataEventError& operator=(const DataEventError&) = default;
+    ~DataEventError() override;
+
+    [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
+    friend bool operator==(const DataEventError& a, const DataEventError& b) noexcept { return a.code() == b.code(); }
+};
 
 /// A typed piece of context data: a plain aggregate, a record with a descriptor, or a type that encodes itself. Every
 /// field becomes a key of a JSON object, named exactly like the field.
@@ -101,9 +119,7 @@ class CORVANE_EXPORT AnyDataEvent {
         [[nodiscard]] virtual JSON makeDict() const = 0;
 
         mutable std::atomic<std::size_t> references = 1;
-        mutable std::mutex mutex;
-        mutable std::optional<JSON> dict;             // written once, under the mutex
-        mutable std::atomic<bool> isEncoded = false;  // `dict` is there, and does not change any more
+        mutable std::atomic<const JSON*> dict = nullptr;  // its own; set once
     };
     static void destroy(const Base* box) noexcept;
 

@@ -1,22 +1,25 @@
 #include <corvane/Models/EventMirrorStore.h>
 
-#include <mutex>
-
 namespace corvane {
 
 EventMirrorProperties EventMirrorStore::properties(std::string_view eventName,
                                                    std::vector<EventMirrorProperty> (*mirror)()) {
     {
-        std::shared_lock lock(mutex_);
+        const ReadLock lock(mutex_);
         if (const auto found = cache_.find(eventName); found != cache_.end()) return found->second;
     }
     auto properties = std::make_shared<const std::vector<EventMirrorProperty>>(mirror());
-    std::unique_lock lock(mutex_);
+    const WriteLock lock(mutex_);
     return cache_.try_emplace(std::string(eventName), std::move(properties)).first->second;
 }
 
+EventMirrorProperties detail::storedProperties(EventMirrorStore& store, std::string_view eventName,
+                                               std::vector<EventMirrorProperty> (*mirror)()) {
+    return store.properties(eventName, mirror);
+}
+
 bool EventMirrorStore::isNews(DataType declared, DataType found) {
-    std::unique_lock lock(mutex_);
+    const WriteLock lock(mutex_);
     return otherTypes_.emplace(declared.qualifiedName(), found.qualifiedName()).second;
 }
 

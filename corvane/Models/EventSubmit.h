@@ -2,18 +2,29 @@
 
 #include <corvane/Export.h>
 #include <corvane/Models/Encodable.h>
-#include <corvane/Models/EventMirrorStore.h>
 #include <corvane/Models/EventProperty.h>
 #include <corvane/Reflection/TypeName.h>
 
 #include <concepts>
 #include <memory>
+#include <string>
 #include <string_view>
 #include <type_traits>
 #include <utility>
 #include <vector>
 
 namespace corvane {
+
+/// A declared property: its name and its declaration.
+struct EventMirrorProperty {
+    std::string name;
+    std::shared_ptr<const EventPropertyType> eventProperty;
+};
+
+/// The properties of an event type in declaration order.
+using EventMirrorProperties = std::shared_ptr<const std::vector<EventMirrorProperty>>;
+
+class EventMirrorStore;
 
 /// An event type: a record that can be made without arguments. Its fields that are property declarations are its
 /// properties; fields of any other kind are ignored. Its name is its `typeName`.
@@ -25,6 +36,12 @@ struct EventDeclaration {
     std::string_view name;
     EventMirrorProperties (*properties)(const EventDeclaration& self, EventMirrorStore& store);
 };
+
+namespace detail {
+/// The properties under a name, read once for a store and then kept there.
+CORVANE_EXPORT EventMirrorProperties storedProperties(EventMirrorStore& store, std::string_view eventName,
+                                                      std::vector<EventMirrorProperty> (*mirror)());
+}  // namespace detail
 
 #pragma GCC visibility push(hidden)
 namespace detail {
@@ -62,7 +79,7 @@ std::vector<EventMirrorProperty> mirrorOf() {
 
 template <class E>
 EventMirrorProperties propertiesOf(const EventDeclaration& self, EventMirrorStore& store) {
-    return store.properties(self.name, &mirrorOf<E>);
+    return storedProperties(store, self.name, &mirrorOf<E>);
 }
 
 template <class E>

@@ -4,10 +4,31 @@
 #include <corvane/Models/JSON.h>
 #include <corvane/Platform/Date.h>
 
+#include <optional>
 #include <string>
 #include <utility>
 
 namespace corvane {
+
+/// A step of a session's life, as observers are told. The codes may not change.
+enum class SessionChange : int {
+    willStart = 0,  ///< before a session is created: none is active
+    didStart = 1,   ///< the session is active and every processor knows of it
+    willEnd = 2,    ///< before the session ends: it is still active
+    didEnd = 3,     ///< no session is active and every processor knows; once-only session data is still there
+};
+
+/// The change of an integer code, or nothing.
+[[nodiscard]] constexpr std::optional<SessionChange> sessionChangeFromCode(int code) {
+    if (code < 0 || code > 3) return std::nullopt;
+    return static_cast<SessionChange>(code);
+}
+
+/// A stretch of activity, such as a flow through several screens. A value.
+struct Group {
+    std::string name;
+    Date startDate;  ///< when the host called enterGroup
+};
 
 /// The record of a session as processors receive it. A value: it does not change after it was made.
 struct Session {

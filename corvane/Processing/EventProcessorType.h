@@ -1,7 +1,6 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Models/Group.h>
 #include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/Session.h>
 

@@ -1,8 +1,8 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Models/AnyDataEventEntry.h>
 #include <corvane/Models/SessionData.h>
-#include <corvane/Tracker/DataEventStack.h>
 
 #include <memory>
 #include <source_location>

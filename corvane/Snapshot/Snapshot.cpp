@@ -1,6 +1,6 @@
 #include <corvane/Snapshot/Snapshot.h>
 
-#include <corvane/Models/TimedData.h>
+#include <corvane/Models/EventData.h>
 
 #include <utility>
 

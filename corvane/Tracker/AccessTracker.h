@@ -1,9 +1,9 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Models/AnyDataEventEntry.h>
 #include <corvane/Models/EventSubmit.h>
 #include <corvane/Platform/Date.h>
-#include <corvane/Tracker/DataEventStack.h>
 #include <corvane/Tracker/EventSubmitResult.h>
 
 #include <memory>

@@ -1,7 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Models/SessionChange.h>
+#include <corvane/Models/Session.h>
 #include <corvane/Tracker/AccessTracker.h>
 
 #include <functional>

@@ -1,11 +1,15 @@
 #include <corvane/Tracker/Tracker.h>
 
 #include <corvane/Models/EventData.h>
-#include <corvane/Models/TimedData.h>
+#include <corvane/Models/EventMirrorStore.h>
 #include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/StringMap.h>
 #include <corvane/Platform/UUID.h>
+#include <corvane/Snapshot/Snapshot.h>
 #include <corvane/Tracker/AccessTracker.h>
 #include <corvane/Tracker/ActiveSessionType.h>
+#include <corvane/Tracker/DataEventStacks.h>
+#include <corvane/Tracker/Sequence.h>
 #include <corvane/Tracker/SessionObserver.h>
 #include <corvane/Tracker/TrackerDelegate.h>
 
@@ -15,6 +19,14 @@
 
 namespace corvane {
 
+struct Tracker::Scope {
+    TrackerTimers timers;
+    StringMap<EventSubmit> restartTimers;
+    DataEventStacks dataStacks;
+    std::vector<Group> groupStack;
+    std::string eventPath;  // made with the first event
+};
+
 Tracker::Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue,
                  std::shared_ptr<EventMirrorStore> mirrorStore, std::shared_ptr<Tracker> parent,
                  std::weak_ptr<TrackerDelegate> delegate)
@@ -22,7 +34,8 @@ Tracker::Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue,
       accessQueue_(std::move(accessQueue)),
       eventMirrorStore_(std::move(mirrorStore)),
       parentTracker_(std::move(parent)),
-      delegate_(std::move(delegate)) {}
+      delegate_(std::move(delegate)),
+      scope_(std::make_unique<Scope>()) {}
 
 Tracker::~Tracker() = default;
 
@@ -150,7 +163,7 @@ void Tracker::resume() {
 void Tracker::performSubmit(const EventSubmit& event, Date submitTime, const SubmitOptions& options) {
     accessQueue_->assertCurrent("Tracker submission");
     const auto delegate = delegate_.lock();
-    if (delegate && delegate->activeSession() && options.onlyIfTimed && !timers_.contains(event.name())) return;
+    if (delegate && delegate->activeSession() && options.onlyIfTimed && !scope_->timers.contains(event.name())) return;
     const EventSubmitResult result = process(event, submitTime, delegate.get());
     if (options.completion) callHost("submit completion", [&] { options.completion(result); });
 }
@@ -202,11 +215,11 @@ std::optional<AnyDataEvent> Tracker::span(const EventPropertyType& property, con
                                           Date submitTime) {
     accessQueue_->assertCurrent("Tracker submission");
     if (property.trait() == EventPropertyTrait::data && property.isDataType(DataType::of<TimedData>())) {
-        if (const auto timer = timers_.find(event.name()); timer != timers_.end()) {
+        if (const auto timer = scope_->timers.find(event.name()); timer != scope_->timers.end()) {
             const TimedData span(timer->second.startTime, submitTime);
-            timers_.erase(timer);
-            if (const auto restart = restartTimers_.find(event.name()); restart != restartTimers_.end()) {
-                restartTimers_.erase(restart);
+            scope_->timers.erase(timer);
+            if (const auto restart = scope_->restartTimers.find(event.name()); restart != scope_->restartTimers.end()) {
+                scope_->restartTimers.erase(restart);
             }
             return AnyDataEvent(span);
         }
@@ -217,7 +230,7 @@ std::optional<AnyDataEvent> Tracker::span(const EventPropertyType& property, con
 std::optional<AnyDataEvent> Tracker::lookup(std::string_view key) {
     for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
         tracker->accessQueue_->assertCurrent("Tracker lookup");
-        if (auto data = tracker->dataStacks_.take(key)) return data;
+        if (auto data = tracker->scope_->dataStacks.take(key)) return data;
     }
     return std::nullopt;
 }
@@ -237,48 +250,48 @@ void Tracker::reportOtherType(std::string_view name, const EventPropertyType& pr
 std::optional<std::string> Tracker::groupName() {
     for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
         tracker->accessQueue_->assertCurrent("Tracker group");
-        if (!tracker->groupStack_.empty()) return tracker->groupStack_.back().name;
+        if (!tracker->scope_->groupStack.empty()) return tracker->scope_->groupStack.back().name;
     }
     return std::nullopt;
 }
 
 const std::string& Tracker::eventPath() {
     accessQueue_->assertCurrent("Tracker path");
-    if (eventPath_.empty()) {
-        for (const auto& component : path()) eventPath_ += "/" + component;
+    if (scope_->eventPath.empty()) {
+        for (const auto& component : path()) scope_->eventPath += "/" + component;
     }
-    return eventPath_;
+    return scope_->eventPath;
 }
 
 void Tracker::performTime(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession) {
     accessQueue_->assertCurrent("Tracker timer");
-    if (timers_.contains(event.name())) return;
-    timers_.emplace(std::string(event.name()), Timer{startTime});
-    if (submitAndRestartWithSession) restartTimers_.insert_or_assign(std::string(event.name()), event);
+    if (scope_->timers.contains(event.name())) return;
+    scope_->timers.emplace(std::string(event.name()), Timer{startTime});
+    if (submitAndRestartWithSession) scope_->restartTimers.insert_or_assign(std::string(event.name()), event);
 }
 
 void Tracker::performPush(AnyDataEventEntry entry) {
     accessQueue_->assertCurrent("Tracker push");
-    dataStacks_.push(std::move(entry));
+    scope_->dataStacks.push(std::move(entry));
 }
 
 void Tracker::performPop(std::string_view key, DataType type) {
     accessQueue_->assertCurrent("Tracker pop");
-    dataStacks_.pop(key, type);
+    scope_->dataStacks.pop(key, type);
 }
 
 void Tracker::performEnterGroup(Group group) {
     accessQueue_->assertCurrent("Tracker group");
-    groupStack_.push_back(group);
+    scope_->groupStack.push_back(group);
     if (const auto delegate = delegate_.lock()) delegate->didEnterGroup(group);
 }
 
 void Tracker::performLeaveGroup() {
     for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
         tracker->accessQueue_->assertCurrent("Tracker group");
-        if (tracker->groupStack_.empty()) continue;
-        const Group left = std::move(tracker->groupStack_.back());
-        tracker->groupStack_.pop_back();
+        if (tracker->scope_->groupStack.empty()) continue;
+        const Group left = std::move(tracker->scope_->groupStack.back());
+        tracker->scope_->groupStack.pop_back();
         if (const auto delegate = delegate_.lock()) delegate->didLeaveGroup(left);
         return;
     }
@@ -313,8 +326,8 @@ std::vector<SnapshotLevel> Tracker::levels(SnapshotPolicy policy) {
     std::set<std::string_view> taken;
     for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
         tracker->accessQueue_->assertCurrent("Tracker snapshot");
-        SnapshotLevel level{tracker->name_, {}, tracker->timers_};
-        for (const auto& [key, stack] : tracker->dataStacks_.all()) {
+        SnapshotLevel level{tracker->name_, {}, tracker->scope_->timers};
+        for (const auto& [key, stack] : tracker->scope_->dataStacks.all()) {
             if (stack.isEmpty()) continue;
             if (policy == SnapshotPolicy::all) {
                 level.entries.emplace(key, stack.entries());
@@ -331,13 +344,13 @@ std::vector<SnapshotLevel> Tracker::levels(SnapshotPolicy policy) {
 void Tracker::react(SessionChange change) {
     accessQueue_->assertCurrent("Tracker session change");
     if (change != SessionChange::didStart && change != SessionChange::willEnd) return;
-    const auto timers = restartTimers_;  // reactions change the map
+    const auto timers = scope_->restartTimers;  // reactions change the map
     for (const auto& [name, event] : timers) {
         if (change == SessionChange::didStart) {
             performTime(event, now(), true);
         } else {
             performSubmit(event, now(), {.onlyIfTimed = true});
-            restartTimers_.insert_or_assign(name, event);
+            scope_->restartTimers.insert_or_assign(name, event);
         }
     }
 }

@@ -1,19 +1,15 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Models/AnyDataEventEntry.h>
 #include <corvane/Models/EventProperty.h>
 #include <corvane/Models/EventSubmit.h>
-#include <corvane/Models/Group.h>
-#include <corvane/Models/SessionChange.h>
+#include <corvane/Models/Session.h>
 #include <corvane/Platform/Date.h>
 #include <corvane/Platform/SerialQueue.h>
-#include <corvane/Platform/StringMap.h>
 #include <corvane/Platform/ThreadAnnotations.h>
-#include <corvane/Snapshot/Snapshot.h>
-#include <corvane/Tracker/DataEventStacks.h>
-#include <corvane/Tracker/DelayedToken.h>
+#include <corvane/Snapshot/SnapshotType.h>
 #include <corvane/Tracker/EventSubmitResult.h>
-#include <corvane/Tracker/Sequence.h>
 #include <corvane/Tracker/TrackerError.h>
 
 #include <functional>
@@ -30,6 +26,9 @@ namespace corvane {
 class AccessTracker;
 class SessionObserver;
 class TrackerDelegate;
+struct Sequence;
+struct SnapshotLevel;
+struct TrackerTimer;
 
 /// Records events, and holds the context data that they carry.
 ///
@@ -151,6 +150,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
   private:
     friend class AccessTracker;
     friend class SessionCore;
+    struct Scope;  // what the tracker holds: data, timers, groups
 
     Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue, std::shared_ptr<EventMirrorStore> mirrorStore,
             std::shared_ptr<Tracker> parent, std::weak_ptr<TrackerDelegate> delegate);
@@ -186,11 +186,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     std::shared_ptr<Tracker> parentTracker_;  // until it is released
     const std::weak_ptr<TrackerDelegate> delegate_;
 
-    TrackerTimers timers_ CORVANE_GUARDED_BY(*accessQueue_);
-    StringMap<EventSubmit> restartTimers_ CORVANE_GUARDED_BY(*accessQueue_);
-    DataEventStacks dataStacks_ CORVANE_GUARDED_BY(*accessQueue_);
-    std::vector<Group> groupStack_ CORVANE_GUARDED_BY(*accessQueue_);
-    std::string eventPath_ CORVANE_GUARDED_BY(*accessQueue_);  // made with the first event
+    const std::unique_ptr<Scope> scope_ CORVANE_PT_GUARDED_BY(*accessQueue_);
 };
 
 }  // namespace corvane

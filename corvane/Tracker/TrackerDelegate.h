@@ -1,8 +1,8 @@
 #pragma once
 
 #include <corvane/Export.h>
-#include <corvane/Models/Group.h>
 #include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/Session.h>
 
 #include <memory>
 

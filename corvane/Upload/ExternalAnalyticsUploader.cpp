@@ -1,5 +1,7 @@
 #include <corvane/Upload/ExternalAnalyticsUploader.h>
 
+#include <corvane/Transfer/HTTPSession.h>
+
 #include <algorithm>
 #include <thread>
 #include <utility>
@@ -18,11 +20,12 @@ ExternalAnalyticsUploaderError::ExternalAnalyticsUploaderError(Code code)
     : Error("Corvane.ExternalAnalyticsUploader.Errors", code, "the server did not answer in HTTP") {}
 ExternalAnalyticsUploaderError::~ExternalAnalyticsUploaderError() = default;
 
-ExternalAnalyticsUploader::ExternalAnalyticsUploader() : session_(limitsOfThisMachine()) {}
+ExternalAnalyticsUploader::ExternalAnalyticsUploader()
+    : session_(std::make_shared<HTTPSession>(limitsOfThisMachine())) {}
 
 void ExternalAnalyticsUploader::submitExternalAnalytics(std::string url, Completion completion) {
-    session_.get(std::move(url), [completion = std::move(completion)](std::optional<TransferResponse> response,
-                                                                      std::optional<AnyError> error) {
+    session_->get(std::move(url), [completion = std::move(completion)](std::optional<TransferResponse> response,
+                                                                       std::optional<AnyError> error) {
         using Result = ExternalResult<TransferResponse>;
         if (!completion) return;
         if (response && response->isHTTP) {

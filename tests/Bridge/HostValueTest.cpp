@@ -1,6 +1,6 @@
 #include <corvane/Bridge/Models/BridgedDataEvent.h>
-#include <corvane/Bridge/Models/BridgedDataType.h>
-#include <corvane/Bridge/Models/toJsonValue.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
+#include <corvane/Bridge/Models/HostValue.h>
 #include <corvane/Models/Decoding.h>
 
 #include <gtest/gtest.h>

@@ -1,3 +1,5 @@
+#include <corvane/Snapshot/Snapshot.h>
+
 #include "tests/Bridge/BridgeFixture.h"
 
 #include <corvane/corvane.h>

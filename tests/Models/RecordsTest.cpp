@@ -4,7 +4,6 @@
 #include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/Session.h>
 #include <corvane/Models/SessionData.h>
-#include <corvane/Models/TimedData.h>
 
 #include "tests/support/CapturedLog.h"
 

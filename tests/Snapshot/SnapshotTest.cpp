@@ -1,3 +1,5 @@
+#include <corvane/Snapshot/Snapshot.h>
+
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <corvane/Models/EventData.h>
-#include <corvane/Models/TimedData.h>
 #include <corvane/Session/SessionManager.h>
 #include <corvane/Tracker/AccessTracker.h>
 

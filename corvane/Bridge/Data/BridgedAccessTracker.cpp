@@ -1,5 +1,7 @@
 #include <corvane/Bridge/Data/BridgedAccessTracker.h>
 
+#include <corvane/Bridge/Data/BridgedEventMirrorStore.h>
+
 #include <corvane/Bridge/Data/StackEntry.h>
 #include <corvane/Bridge/Models/Refusal.h>
 #include <corvane/Platform/HostCall.h>

@@ -1,20 +1,26 @@
 #pragma once
 
 #include <corvane/Bridge/Data/BridgedDataEventClass.h>
-#include <corvane/Bridge/Data/BridgedDataEventTraits.h>
-#include <corvane/Bridge/Data/BridgedEventMirrorStore.h>
 #include <corvane/Bridge/Data/BridgedRawEvent.h>
-#include <corvane/Bridge/Data/BridgedSubmitCompletion.h>
 #include <corvane/Bridge/Models/BridgedDataEventType.h>
+#include <corvane/Bridge/Session/BridgedEventProcessorType.h>
 #include <corvane/Export.h>
 #include <corvane/Tracker/AccessTracker.h>
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <source_location>
 #include <string>
 
 namespace corvane {
+
+class BridgedEventMirrorStore;
+
+/// Called once with the outcome of a submission, on the tracker's queue: the event that was handed on, or the error
+/// that stopped it; the other one is nullptr. Both are good for the length of the call. What it throws is logged.
+/// Callers see it as `CVSubmitCompletion`.
+using BridgedSubmitCompletion = std::function<void(const BridgedProcessEvent* event, const BridgedError* error)>;
 
 /// A handle on a tracker for blocks that run on the tracker's queue. Callers see it as `CVAccessTracker`.
 ///

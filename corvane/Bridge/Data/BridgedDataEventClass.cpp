@@ -12,4 +12,8 @@ BridgedDataEventClass::BridgedDataEventClass(std::string dataName)
 BridgedDataEventClass::BridgedDataEventClass(std::string dataName, DataType type)
     : dataName_(std::move(dataName)), type_(type) {}
 
+BridgedRawDataEvent::BridgedRawDataEvent(std::string name, HostValue::Dictionary dictionary)
+    : name_(std::move(name)), dictionary_(std::move(dictionary)) {}
+BridgedRawDataEvent::~BridgedRawDataEvent() = default;
+
 }  // namespace corvane

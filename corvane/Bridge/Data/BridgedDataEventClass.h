@@ -1,11 +1,32 @@
 #pragma once
 
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
 #include <corvane/Export.h>
 #include <corvane/Reflection/DataType.h>
 
 #include <string>
 
 namespace corvane {
+
+/// A data event that is nothing but its name and a dictionary. Callers see it as `CVRawDataEvent`. Immutable.
+///
+///     tracker.pushDataEvent(std::make_shared<CVRawDataEvent>("Screen", CVDictionary{{"name", "home"}}));
+class CORVANE_EXPORT BridgedRawDataEvent final : public BridgedDataEventType {
+  public:
+    BridgedRawDataEvent(std::string name, HostValue::Dictionary dictionary);
+    BridgedRawDataEvent(const BridgedRawDataEvent&) = default;
+    ~BridgedRawDataEvent() override;
+
+    [[nodiscard]] const std::string& name() const { return name_; }
+    [[nodiscard]] const HostValue::Dictionary& dictionary() const { return dictionary_; }
+
+    [[nodiscard]] std::string dataName() const override { return name_; }
+    [[nodiscard]] HostValue::Dictionary toDict() const override { return dictionary_; }
+
+  private:
+    const std::string name_;
+    const HostValue::Dictionary dictionary_;
+};
 
 /// A class of data events as an object: what event classes ask for and what is popped. Callers see it as
 /// `CVDataEventClass`. A value.

@@ -1,6 +1,6 @@
 #include <corvane/Bridge/Data/BridgedEventClass.h>
 
-#include <corvane/Bridge/Models/BridgeError.h>
+#include <corvane/Bridge/Models/BridgedError.h>
 
 #include <utility>
 

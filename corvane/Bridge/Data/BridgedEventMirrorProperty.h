@@ -1,8 +1,8 @@
 #pragma once
 
-#include <corvane/Bridge/Data/BridgedEventProperty.h>
+#include <corvane/Bridge/Data/BridgedEventClass.h>
 #include <corvane/Export.h>
-#include <corvane/Models/EventPropertyType.h>
+#include <corvane/Models/EventProperty.h>
 
 namespace corvane {
 

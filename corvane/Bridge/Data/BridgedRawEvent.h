@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Bridge/Data/BridgedRawEventProperty.h>
+#include <corvane/Bridge/Data/BridgedEventClass.h>
 #include <corvane/Export.h>
 #include <corvane/Models/EventSubmit.h>
 
@@ -9,6 +9,20 @@
 #include <vector>
 
 namespace corvane {
+
+/// A property of a raw event: the name of the data that fills it. Callers see it as `CVRawEventProperty`. A value.
+class BridgedRawEventProperty {
+  public:
+    BridgedRawEventProperty(std::string dataName, BridgedEventPropertyRequirement requirement)
+        : dataName_(std::move(dataName)), requirement_(requirement) {}
+
+    [[nodiscard]] const std::string& dataName() const { return dataName_; }
+    [[nodiscard]] BridgedEventPropertyRequirement requirement() const { return requirement_; }
+
+  private:
+    std::string dataName_;
+    BridgedEventPropertyRequirement requirement_;
+};
 
 /// An event that is nothing but its name and what it carries. Callers see it as `CVRawEvent`. Immutable; copies share
 /// the declaration, so an event that is submitted often is best made once. May be read from any thread.

@@ -1,8 +1,8 @@
 #pragma once
 
-#include <corvane/Bridge/Data/BridgedRawEventProperty.h>
+#include <corvane/Bridge/Data/BridgedRawEvent.h>
 #include <corvane/Export.h>
-#include <corvane/Models/EventPropertyType.h>
+#include <corvane/Models/EventProperty.h>
 
 namespace corvane {
 

@@ -1,5 +1,7 @@
 #include <corvane/Bridge/Data/BridgedTracker.h>
 
+#include <corvane/Bridge/Data/BridgedEventMirrorStore.h>
+
 #include <corvane/Bridge/Data/StackEntry.h>
 #include <corvane/Bridge/Models/Refusal.h>
 
@@ -176,6 +178,14 @@ void BridgedTracker::suspend() {
 }
 void BridgedTracker::resume() {
     tracker_->resume();
+}
+
+BridgedSessionObserver::BridgedSessionObserver(std::shared_ptr<SessionObserver> sessionObserver)
+    : sessionObserver_(std::move(sessionObserver)) {}
+BridgedSessionObserver::~BridgedSessionObserver() = default;
+
+void BridgedSessionObserver::disposeOnObject(const std::shared_ptr<const void>& object) {
+    sessionObserver_->disposeOn(object);
 }
 
 }  // namespace corvane

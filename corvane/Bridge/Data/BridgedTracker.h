@@ -2,13 +2,13 @@
 
 #include <corvane/Bridge/Data/BridgedAccessTracker.h>
 #include <corvane/Bridge/Data/BridgedDataEventClass.h>
-#include <corvane/Bridge/Data/BridgedDataEventTraits.h>
-#include <corvane/Bridge/Data/BridgedEventMirrorStore.h>
 #include <corvane/Bridge/Data/BridgedRawEvent.h>
-#include <corvane/Bridge/Data/BridgedSubmitCompletion.h>
-#include <corvane/Bridge/Session/BridgedSessionObserver.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
+#include <corvane/Bridge/Models/BridgedError.h>
+#include <corvane/Bridge/Session/BridgedEventProcessorType.h>
 #include <corvane/Export.h>
-#include <corvane/Models/SessionChange.h>
+#include <corvane/Models/Session.h>
+#include <corvane/Tracker/SessionObserver.h>
 #include <corvane/Tracker/Tracker.h>
 
 #include <cstdint>
@@ -19,6 +19,22 @@
 #include <vector>
 
 namespace corvane {
+
+class BridgedEventMirrorStore;
+
+/// An observation of session changes. Callers see it as `CVSessionObserver`. Letting go of it ends nothing: the
+/// observation lasts as long as the object that bounds it, at first the tracker that was asked.
+class CORVANE_EXPORT BridgedSessionObserver {
+  public:
+    explicit BridgedSessionObserver(std::shared_ptr<SessionObserver> sessionObserver);
+    ~BridgedSessionObserver();
+
+    /// Bounds the observation by the life of another object, which is held weakly. Any thread.
+    void disposeOnObject(const std::shared_ptr<const void>& object);
+
+  private:
+    const std::shared_ptr<SessionObserver> sessionObserver_;
+};
 
 /// A tracker for callers who know their events and data by name only. Callers see it as `CVTracker`.
 ///

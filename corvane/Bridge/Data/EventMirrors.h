@@ -2,7 +2,7 @@
 
 // Internal: making and checking the property lists of bridged events. Never included by a public header.
 
-#include <corvane/Bridge/Data/BridgedEventPropertyRequirement.h>
+#include <corvane/Bridge/Data/BridgedEventClass.h>
 #include <corvane/Bridge/Models/Refusal.h>
 #include <corvane/Models/EventMirrorStore.h>
 

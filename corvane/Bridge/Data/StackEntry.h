@@ -2,10 +2,9 @@
 
 // Internal: what object-facing callers push, as the library's stacks take it. Never included by a public header.
 
-#include <corvane/Bridge/Data/BridgedDataEventTraits.h>
-#include <corvane/Bridge/Data/BridgedSubmitCompletion.h>
+#include <corvane/Bridge/Data/BridgedTracker.h>
 #include <corvane/Bridge/Models/BridgedDataEventType.h>
-#include <corvane/Bridge/Models/BridgedSessionData.h>
+#include <corvane/Bridge/Models/BridgedSession.h>
 #include <corvane/Tracker/DataEventStack.h>
 #include <corvane/Tracker/EventSubmitResult.h>
 

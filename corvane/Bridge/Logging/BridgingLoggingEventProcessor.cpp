@@ -1,6 +1,6 @@
 #include <corvane/Bridge/Logging/BridgingLoggingEventProcessor.h>
 
-#include <corvane/Bridge/Models/BridgeError.h>
+#include <corvane/Bridge/Models/BridgedError.h>
 
 #include <utility>
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Bridge/Logging/BridgedLoggingEventProcessorFormat.h>
 #include <corvane/Bridge/Session/BridgedEventProcessorType.h>
 #include <corvane/Export.h>
 #include <corvane/Processing/LoggingEventProcessor.h>
@@ -9,6 +8,14 @@
 #include <string>
 
 namespace corvane {
+
+/// How the logging processor writes events. Callers see it as `CVLoggingEventProcessorFormat`. The values may not
+/// change.
+enum class BridgedLoggingEventProcessorFormat : int {
+    json = 0,      ///< compact JSON
+    custom = 1,    ///< by a formatter of the host's
+    default_ = 2,  ///< in the library's own form
+};
 
 /// The logging processor for object-facing hosts, which add it like one of their own. Callers see it as
 /// `CVLoggingEventProcessor`. Shared by the host.

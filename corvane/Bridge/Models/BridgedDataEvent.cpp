@@ -1,6 +1,6 @@
 #include <corvane/Bridge/Models/BridgedDataEvent.h>
 
-#include <corvane/Bridge/Models/toJsonValue.h>
+#include <corvane/Bridge/Models/HostValue.h>
 
 #include <utility>
 

@@ -1,14 +1,38 @@
 #pragma once
 
-#include <corvane/Bridge/Session/BridgedSessionKind.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
 #include <corvane/Export.h>
 #include <corvane/Models/Session.h>
 
+#include <memory>
 #include <optional>
 #include <string>
 #include <utility>
 
 namespace corvane {
+
+/// What a session is for. Callers see it as `CVSessionKind`, and may hand over any integer: a call with one that is not
+/// a value here is refused. The values may not change.
+enum class BridgedSessionKind : int {
+    userEvents = 0,
+    telemetry = 1,
+    realtime = 2,
+    custom = 3,  ///< a kind of the host's own, which has a name
+};
+
+/// A data event with the key by which a session carries it. Callers see it as `CVSessionData`. A value.
+class BridgedSessionData {
+  public:
+    BridgedSessionData(std::string key, std::shared_ptr<const BridgedDataEventType> data)
+        : key_(std::move(key)), data_(std::move(data)) {}
+
+    [[nodiscard]] const std::string& key() const { return key_; }
+    [[nodiscard]] const std::shared_ptr<const BridgedDataEventType>& data() const { return data_; }
+
+  private:
+    std::string key_;
+    std::shared_ptr<const BridgedDataEventType> data_;
+};
 
 /// The record of a session as processors see it. Callers see it as `CVSession`. A value: it does not change after it
 /// was made.

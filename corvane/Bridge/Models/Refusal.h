@@ -2,7 +2,6 @@
 
 // Internal: how calls through the bridge refuse their arguments. Never included by a public header.
 
-#include <corvane/Bridge/Models/BridgeError.h>
 #include <corvane/Bridge/Models/BridgedError.h>
 #include <corvane/Platform/JSONText.h>
 #include <corvane/Platform/Log.h>

@@ -2,6 +2,7 @@
 
 #include <corvane/Bridge/Data/StackEntry.h>
 #include <corvane/Bridge/Models/Refusal.h>
+#include <corvane/Bridge/Session/BridgedEventProcessor.h>
 
 #include <utility>
 
@@ -70,6 +71,46 @@ void BridgedSessionManager::transaction(AccessBlock block) {
         const auto bridged = std::make_shared<BridgedAccessSessionManager>(access);
         const Ending ending(*bridged);
         block(bridged);
+    });
+}
+
+BridgedProcessorManager::BridgedProcessorManager(std::shared_ptr<ProcessorManager> processorManager)
+    : processorManager_(bridge::present(std::move(processorManager), "the processor manager")) {}
+BridgedProcessorManager::~BridgedProcessorManager() = default;
+
+bool BridgedProcessorManager::addEventProcessor(const std::shared_ptr<BridgedEventProcessorType>& eventProcessor,
+                                                BridgedError* error) {
+    return bridge::attempt("addEventProcessor", error,
+                           [&] { processorManager_->add(std::make_shared<BridgedEventProcessor>(eventProcessor)); });
+}
+
+void BridgedProcessorManager::removeEventProcessor(const std::shared_ptr<BridgedEventProcessorType>& eventProcessor) {
+    if (eventProcessor) processorManager_->remove(std::make_shared<BridgedEventProcessor>(eventProcessor));
+}
+
+void BridgedProcessorManager::resumeBackgroundProcessingForIdentifier(std::string identifier,
+                                                                      std::function<void()> completion) {
+    processorManager_->resumeBackgroundProcessing(std::move(identifier), std::move(completion));
+}
+
+BridgedAccessSessionManager::BridgedAccessSessionManager(AccessSessionManager& accessSessionManager)
+    : thread_(std::this_thread::get_id()), accessSessionManager_(&accessSessionManager) {}
+
+AccessSessionManager* BridgedAccessSessionManager::usable() const {
+    return std::this_thread::get_id() == thread_ ? accessSessionManager_ : nullptr;
+}
+
+bool BridgedAccessSessionManager::isActive() const {
+    const auto* manager = usable();
+    return manager && manager->isActive();
+}
+
+bool BridgedAccessSessionManager::pushSessionData(const BridgedSessionData& data, BridgedDataEventTraits traits,
+                                                  bool submitEventQueues, BridgedError* error) const {
+    return bridge::attempt("pushSessionData", error, [&] {
+        auto* manager = usable();
+        if (!manager) throw BridgeError(BridgeError::wrongQueue, "the session manager's handle");
+        manager->push(bridge::sessionEntry(data, traits), submitEventQueues);
     });
 }
 

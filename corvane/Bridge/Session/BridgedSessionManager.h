@@ -1,18 +1,73 @@
 #pragma once
 
 #include <corvane/Bridge/Data/BridgedTracker.h>
-#include <corvane/Bridge/Session/BridgedAccessSessionManager.h>
-#include <corvane/Bridge/Session/BridgedProcessorManager.h>
-#include <corvane/Bridge/Session/BridgedSessionKind.h>
+#include <corvane/Bridge/Models/BridgedDataEventType.h>
+#include <corvane/Bridge/Models/BridgedError.h>
+#include <corvane/Bridge/Models/BridgedSession.h>
+#include <corvane/Bridge/Session/BridgedEventProcessorType.h>
 #include <corvane/Export.h>
+#include <corvane/Processing/ProcessorManager.h>
+#include <corvane/Session/AccessSessionManager.h>
 #include <corvane/Session/SessionManager.h>
 
 #include <functional>
 #include <memory>
 #include <optional>
 #include <string>
+#include <thread>
 
 namespace corvane {
+
+/// Where a host adds and removes its processors. Callers see it as `CVProcessorManager`. Shared by the host; all
+/// members may be called from any thread and return at once.
+class CORVANE_EXPORT BridgedProcessorManager {
+  public:
+    /// Throws `BridgeError::missingObject` without a manager.
+    explicit BridgedProcessorManager(std::shared_ptr<ProcessorManager> processorManager);
+    ~BridgedProcessorManager();
+
+    /// Adds a processor at the end. Refuses, with false and `error` filled, a missing one and one whose
+    /// `registerAccessQueue` throws.
+    bool addEventProcessor(const std::shared_ptr<BridgedEventProcessorType>& eventProcessor,
+                           BridgedError* error = nullptr);
+    /// Removes every entry of a processor, which gets no further callback; nothing if it was never added.
+    void removeEventProcessor(const std::shared_ptr<BridgedEventProcessorType>& eventProcessor);
+    /// Hands on that the platform woke the application for a background transfer session.
+    void resumeBackgroundProcessingForIdentifier(std::string identifier, std::function<void()> completion);
+
+    /// The library's own manager.
+    [[nodiscard]] const std::shared_ptr<ProcessorManager>& processorManager() const { return processorManager_; }
+
+  private:
+    const std::shared_ptr<ProcessorManager> processorManager_;
+};
+
+/// A handle on the session manager for the length of a transaction block. Callers see it as `CVAccessSessionManager`.
+/// Its members run inline. One that is kept is of no further use: after the block, and off the block's thread, it is
+/// not active and refuses pushes with `BridgeError::wrongQueue`.
+class CORVANE_EXPORT BridgedAccessSessionManager {
+  public:
+    explicit BridgedAccessSessionManager(AccessSessionManager& accessSessionManager);
+    BridgedAccessSessionManager(const BridgedAccessSessionManager&) = delete;
+    BridgedAccessSessionManager& operator=(const BridgedAccessSessionManager&) = delete;
+    ~BridgedAccessSessionManager() = default;
+
+    [[nodiscard]] bool isActive() const;
+
+    /// As `BridgedSessionManager::pushSessionData`, done when it returns.
+    bool pushSessionData(const BridgedSessionData& data, BridgedDataEventTraits traits = {},
+                         bool submitEventQueues = false, BridgedError* error = nullptr) const;
+
+    /// The block is over. On the block's thread.
+    void end() { accessSessionManager_ = nullptr; }
+
+  private:
+    /// The library's handle, or nullptr where it must not be used.
+    [[nodiscard]] AccessSessionManager* usable() const;
+
+    const std::thread::id thread_;
+    AccessSessionManager* accessSessionManager_;  // read and changed on the block's thread alone
+};
 
 /// The session manager for object-facing hosts. Callers see it as `CVSessionManager`.
 ///
