@@ -1,7 +1,8 @@
 #pragma once
 
+#include <corvane/Platform/Mutex.h>
+
 #include <cstdint>
-#include <mutex>
 
 namespace corvane {
 
@@ -10,25 +11,25 @@ namespace corvane {
 class AtomicCounter {
   public:
     [[nodiscard]] std::int64_t value() const {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         return value_;
     }
     /// Adds and returns the new value.
     std::int64_t add(std::int64_t difference) {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         return value_ += difference;
     }
     /// Sets and returns the value that was there before.
     std::int64_t exchange(std::int64_t value) {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         const std::int64_t previous = value_;
         value_ = value;
         return previous;
     }
 
   private:
-    mutable std::mutex mutex_;
-    std::int64_t value_ = 0;
+    mutable Mutex mutex_;
+    std::int64_t value_ CORVANE_GUARDED_BY(mutex_) = 0;
 };
 
 }  // namespace corvane

@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Bundle.h>
 #include <corvane/Platform/Error.h>
+#include <corvane/Platform/Mutex.h>
 
 #include <pwd.h>
 #include <sys/stat.h>
@@ -10,7 +11,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdlib>
-#include <mutex>
 #include <utility>
 
 namespace corvane {
@@ -18,8 +18,8 @@ namespace corvane {
 namespace {
 
 struct Choice {
-    std::mutex mutex;
-    std::filesystem::path directory;
+    Mutex mutex;
+    std::filesystem::path directory CORVANE_GUARDED_BY(mutex);
 };
 
 Choice& choice() {
@@ -55,13 +55,13 @@ bool isSpace(char c) {
 }  // namespace
 
 void DocumentsDirectory::set(std::filesystem::path directory) {
-    std::lock_guard lock(choice().mutex);
+    const Lock lock(choice().mutex);
     choice().directory = std::move(directory);
 }
 
 std::filesystem::path DocumentsDirectory::path() {
     {
-        std::lock_guard lock(choice().mutex);
+        const Lock lock(choice().mutex);
         if (!choice().directory.empty()) return choice().directory;
     }
     return dataHome() / applicationName() / "Documents";

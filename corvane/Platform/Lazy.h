@@ -1,7 +1,8 @@
 #pragma once
 
+#include <corvane/Platform/Mutex.h>
+
 #include <functional>
-#include <mutex>
 #include <optional>
 #include <utility>
 
@@ -16,7 +17,7 @@ class Lazy {
 
     /// The value; the reference is good as long as this object. Callable from any thread.
     const T& value() const {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         if (!value_) {
             value_.emplace(load_());
             load_ = nullptr;
@@ -25,9 +26,9 @@ class Lazy {
     }
 
   private:
-    mutable std::mutex mutex_;
-    mutable std::function<T()> load_;
-    mutable std::optional<T> value_;
+    mutable Mutex mutex_;
+    mutable std::function<T()> load_ CORVANE_GUARDED_BY(mutex_);
+    mutable std::optional<T> value_ CORVANE_GUARDED_BY(mutex_);
 };
 
 }  // namespace corvane

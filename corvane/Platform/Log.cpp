@@ -1,12 +1,12 @@
 #include <corvane/Platform/Log.h>
 
 #include <corvane/Platform/JSONText.h>
+#include <corvane/Platform/Mutex.h>
 
 #include <spdlog/sinks/stdout_sinks.h>
 #include <spdlog/spdlog.h>
 
 #include <algorithm>
-#include <mutex>
 #include <utility>
 
 namespace corvane {
@@ -111,9 +111,9 @@ void LogArgument::appendTo(std::string& out) const {
 }
 
 struct Log::Output {
-    std::mutex mutex;
-    std::shared_ptr<const Sink> sink;
-    std::shared_ptr<spdlog::logger> logger;
+    Mutex mutex;
+    std::shared_ptr<const Sink> sink CORVANE_GUARDED_BY(mutex);
+    std::shared_ptr<spdlog::logger> logger CORVANE_GUARDED_BY(mutex);
 };
 
 Log::Log() : output_(new Output) {}
@@ -125,7 +125,7 @@ Log& Log::shared() {
 
 void Log::setSink(Sink sink) {
     auto shared = sink ? std::make_shared<const Sink>(std::move(sink)) : nullptr;
-    std::lock_guard lock(output_->mutex);
+    const Lock lock(output_->mutex);
     output_->sink.swap(shared);
 }
 
@@ -135,7 +135,7 @@ void Log::write(LogLevel level, std::string_view format, std::initializer_list<L
         std::shared_ptr<const Sink> sink;
         std::shared_ptr<spdlog::logger> logger;
         {
-            std::lock_guard lock(output_->mutex);
+            const Lock lock(output_->mutex);
             sink = output_->sink;
             if (!sink && !output_->logger) output_->logger = makeLogger();
             logger = output_->logger;

@@ -2,18 +2,18 @@
 
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
 
 #include <memory>
-#include <mutex>
 #include <utility>
 
 namespace corvane {
 
 namespace {
 struct Registry {
-    std::mutex mutex;
-    std::shared_ptr<const MainQueue::Executor> executor;
+    Mutex mutex;
+    std::shared_ptr<const MainQueue::Executor> executor CORVANE_GUARDED_BY(mutex);
     SerialQueue queue{"com.veskar.corvane.main"};
 };
 
@@ -36,14 +36,14 @@ std::function<void()> shareable(std::shared_ptr<Task> task) {
 
 void MainQueue::setExecutor(Executor executor) {
     auto shared = executor ? std::make_shared<const Executor>(std::move(executor)) : nullptr;
-    std::lock_guard lock(registry().mutex);
+    const Lock lock(registry().mutex);
     registry().executor.swap(shared);  // the old one goes behind the lock
 }
 
 void MainQueue::async(Task task) {
     std::shared_ptr<const Executor> executor;
     {
-        std::lock_guard lock(registry().mutex);
+        const Lock lock(registry().mutex);
         executor = registry().executor;
     }
     if (!executor) {

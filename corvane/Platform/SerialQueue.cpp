@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/ForkMark.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/Require.h>
 #include <corvane/Platform/TaskList.h>
 #include <corvane/Platform/Thread.h>
@@ -10,7 +11,6 @@
 #include <condition_variable>
 #include <deque>
 #include <exception>
-#include <mutex>
 #include <utility>
 
 namespace corvane {
@@ -58,10 +58,13 @@ void runGuarded(Task& task, const std::string& label) noexcept {
 
 // Keeps a task for good: in a child made by fork nothing runs it, and destroying what it holds could wait for ever.
 void abandon(Task task) {
-    static auto& mutex = *new std::mutex;
-    static auto& tasks = *new std::deque<Task>;
-    std::lock_guard lock(mutex);
-    tasks.push_back(std::move(task));
+    struct Abandoned {
+        Mutex mutex;
+        std::deque<Task> tasks CORVANE_GUARDED_BY(mutex);
+    };
+    static auto& abandoned = *new Abandoned;
+    const Lock lock(abandoned.mutex);
+    abandoned.tasks.push_back(std::move(task));
 }
 
 }  // namespace
@@ -73,15 +76,15 @@ struct SerialQueue::State {
     const QualityOfService qualityOfService;
     const ForkMark born;
 
-    std::mutex mutex;
+    Mutex mutex;
     std::condition_variable wake;      // the worker waits here
     std::condition_variable syncDone;  // callers of sync() wait here
-    TaskList waiting;
-    bool running = false;  // somebody, the worker or an inline sync(), is running tasks
-    bool asleep = false;   // the worker waits for `wake`
-    bool workerStarted = false;
-    bool startFailed = false;  // there was no thread to be had, which has been logged
-    bool closed = false;       // the last reference is gone; the worker ends when nothing is left
+    TaskList waiting CORVANE_GUARDED_BY(mutex);
+    bool running CORVANE_GUARDED_BY(mutex) = false;  // somebody, the worker or an inline sync(), is running tasks
+    bool asleep CORVANE_GUARDED_BY(mutex) = false;   // the worker waits for `wake`
+    bool workerStarted CORVANE_GUARDED_BY(mutex) = false;
+    bool startFailed CORVANE_GUARDED_BY(mutex) = false;  // there was no thread to be had, which has been logged
+    bool closed CORVANE_GUARDED_BY(mutex) = false;  // the last reference is gone; the worker ends when nothing is left
     // Written under the mutex; the worker reads it without between two tasks.
     std::atomic<int> suspensions = 0;
 
@@ -89,7 +92,7 @@ struct SerialQueue::State {
 
     static void startWorker(const std::shared_ptr<State>& state);
     void work();
-    void workUntil(const bool& done, std::unique_lock<std::mutex>& lock);
+    void workUntil(const bool& done, Lock& lock) CORVANE_REQUIRES(mutex);
     void runTaken(TaskList& taken);
 };
 
@@ -102,7 +105,7 @@ void SerialQueue::State::startWorker(const std::shared_ptr<State>& state) {
     } catch (const std::exception& error) {  // no thread, or no memory for one
         bool isNews = false;
         {
-            std::lock_guard lock(state->mutex);
+            const Lock lock(state->mutex);
             isNews = !std::exchange(state->startFailed, true);
             state->workerStarted = false;  // what waits stays; the next call tries again
             state->syncDone.notify_all();  // whoever waits for the queue sees to it now
@@ -114,13 +117,13 @@ void SerialQueue::State::startWorker(const std::shared_ptr<State>& state) {
 
 void SerialQueue::State::work() {
     TaskList taken;
-    std::unique_lock lock(mutex);
+    Lock lock(mutex);
     startFailed = false;
     for (;;) {
         while (running || waiting.empty() || suspended()) {
             if (closed && waiting.empty()) return;
             asleep = true;
-            wake.wait(lock);
+            lock.wait(wake);
             asleep = false;
         }
         running = true;
@@ -134,18 +137,18 @@ void SerialQueue::State::work() {
 
 // For a caller that waits for its own task on a queue without a thread: runs what waits, in order, where it is. `done`
 // is guarded by the mutex.
-void SerialQueue::State::workUntil(const bool& done, std::unique_lock<std::mutex>& lock) {
+void SerialQueue::State::workUntil(const bool& done, Lock& lock) {
     while (!done) {
         if (workerStarted || running || suspended()) {
-            syncDone.wait(lock);
+            lock.wait(syncDone);
             continue;
         }
         TaskList taken;
         taken.takeAll(waiting);
         running = true;
-        lock.unlock();
+        mutex.unlock();
         runTaken(taken);
-        lock.lock();
+        mutex.lock();
         running = false;
         if (workerStarted) wake.notify_one();
         syncDone.notify_all();
@@ -156,8 +159,8 @@ void SerialQueue::State::runTaken(TaskList& taken) {
     FrameScope scope(this, nullptr);
     while (!taken.empty()) {
         if (suspended()) {
-            std::unique_lock lock(mutex);
-            while (suspended()) wake.wait(lock);
+            Lock lock(mutex);
+            while (suspended()) lock.wait(wake);
         }
         Task task = taken.pop();
         runGuarded(task, label);
@@ -169,7 +172,7 @@ SerialQueue::SerialQueue(std::string label, QualityOfService qualityOfService)
 
 SerialQueue::~SerialQueue() {
     if (state_->born.isInChild()) return;
-    std::unique_lock lock(state_->mutex);
+    Lock lock(state_->mutex);
     state_->closed = true;
     state_->suspensions = 0;
     const bool start = !state_->workerStarted && !state_->waiting.empty();
@@ -189,7 +192,7 @@ void SerialQueue::async(Task task) {
     bool wake = false;
     bool start = false;
     {
-        std::lock_guard lock(state.mutex);
+        const Lock lock(state.mutex);
         state.waiting.push(std::move(task));
         if (!state.workerStarted) {
             state.workerStarted = start = true;
@@ -209,7 +212,7 @@ void SerialQueue::runSync(FunctionRef function) {
     CORVANE_REQUIRE(
         !state.born.isInChild(),
         "a child made by fork cannot wait for a queue of its parent; it may exec or _exit, queue=" + label());
-    std::unique_lock lock(state.mutex);
+    Lock lock(state.mutex);
     if (!state.running && state.waiting.empty() && !state.suspended()) {
         state.running = true;
         lock.unlock();
@@ -217,7 +220,7 @@ void SerialQueue::runSync(FunctionRef function) {
             ~Finish() {
                 bool wake = false;
                 {
-                    std::lock_guard guard(state->mutex);
+                    const Lock guard(state->mutex);
                     state->running = false;
                     wake = state->asleep && (!state->waiting.empty() || state->closed);
                     if (!state->workerStarted) state->syncDone.notify_all();
@@ -245,7 +248,7 @@ void SerialQueue::runSync(FunctionRef function) {
         } catch (...) {
             call.error = std::current_exception();
         }
-        std::lock_guard guard(state.mutex);
+        const Lock guard(state.mutex);
         call.done = true;
         state.syncDone.notify_all();
     });
@@ -262,13 +265,13 @@ void SerialQueue::runSync(FunctionRef function) {
 }
 
 void SerialQueue::suspend() {
-    std::lock_guard lock(state_->mutex);
+    const Lock lock(state_->mutex);
     ++state_->suspensions;
 }
 
 void SerialQueue::resume() {
     {
-        std::lock_guard lock(state_->mutex);
+        const Lock lock(state_->mutex);
         CORVANE_REQUIRE(state_->suspended(), "resume of a queue that is not suspended, queue=" + label());
         --state_->suspensions;
     }

@@ -26,20 +26,20 @@ std::shared_ptr<SessionCore> SessionCore::make() {
 }
 
 void SessionCore::close() {
-    std::lock_guard lock(suspensionMutex_);
+    const Lock lock(suspensionMutex_);
     closed_ = true;
     for (auto count = suspendCount_.exchange(0); count > 0; --count) accessQueue_->resume();
 }
 
 void SessionCore::suspend() {
-    std::lock_guard lock(suspensionMutex_);
+    const Lock lock(suspensionMutex_);
     if (closed_) return;
     suspendCount_.add(1);
     accessQueue_->suspend();
 }
 
 void SessionCore::resume() {
-    std::lock_guard lock(suspensionMutex_);
+    const Lock lock(suspensionMutex_);
     if (closed_) return;
     suspendCount_.add(-1);
     accessQueue_->resume();

@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/AtomicCounter.h>
 #include <corvane/Platform/ForkMark.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Session/ActiveSession.h>
@@ -12,7 +13,6 @@
 
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <string>
 #include <variant>
 #include <vector>
@@ -82,8 +82,8 @@ class SessionCore final : public TrackerDelegate,
     const std::shared_ptr<ProcessorManager> processorManager_;
 
     AtomicCounter suspendCount_;
-    std::mutex suspensionMutex_;  // keeps the count and the queue's own in step; never held while a task runs
-    bool closed_ = false;         // guarded by suspensionMutex_
+    Mutex suspensionMutex_;  // keeps the count and the queue's own in step; never held while a task runs
+    bool closed_ CORVANE_GUARDED_BY(suspensionMutex_) = false;
 
     SessionState state_ CORVANE_GUARDED_BY(*accessQueue_) = None{};
     DataEventStacks dataStacks_ CORVANE_GUARDED_BY(*accessQueue_);

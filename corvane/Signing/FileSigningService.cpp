@@ -93,7 +93,7 @@ FileSigningService::FileSigningService(std::optional<std::filesystem::path> dire
 FileSigningService::~FileSigningService() = default;
 
 std::string FileSigningService::rawKey() {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     if (!rawKey_.empty()) return rawKey_;
     if (directory_) createPrivateDirectories(*directory_);
     const auto directory = directory_ ? *directory_ : DocumentsDirectory::create();

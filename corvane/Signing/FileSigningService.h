@@ -1,10 +1,10 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Signing/SigningServiceType.h>
 
 #include <filesystem>
-#include <mutex>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -31,11 +31,11 @@ class CORVANE_EXPORT FileSigningService final : public SigningServiceType {
     [[nodiscard]] std::string sign(std::string_view digest) override;
 
   private:
-    [[nodiscard]] std::string rawKey();
+    [[nodiscard]] std::string rawKey() CORVANE_EXCLUDES(mutex_);
 
-    std::mutex mutex_;
-    std::optional<std::filesystem::path> directory_;
-    std::string rawKey_;  // 32 bytes, or empty until the first use; guarded by mutex_
+    Mutex mutex_;
+    std::optional<std::filesystem::path> directory_ CORVANE_GUARDED_BY(mutex_);
+    std::string rawKey_ CORVANE_GUARDED_BY(mutex_);  // 32 bytes, or empty until the first use
 };
 
 }  // namespace corvane

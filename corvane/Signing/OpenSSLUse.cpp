@@ -6,15 +6,14 @@
 #include <openssl/crypto.h>
 
 #include <cstdlib>
-#include <mutex>
 
 namespace corvane {
 
 namespace {
 
 struct ExitState {
-    std::shared_mutex mutex;
-    bool exiting = false;
+    SharedMutex mutex;
+    bool exiting CORVANE_GUARDED_BY(mutex) = false;
     const ForkMark made;
 
     static ExitState& shared() {
@@ -28,7 +27,7 @@ struct ExitState {
         exiting = std::atexit([] {
                       // A thread of the parent may have held it when the child was made; there are none in the child.
                       if (instance->made.isInChild()) return;
-                      const std::lock_guard lock(instance->mutex);
+                      const WriteLock lock(instance->mutex);
                       instance->exiting = true;
                   }) != 0;
     }

@@ -2,7 +2,7 @@
 
 #include <openssl/crypto.h>
 
-#include <shared_mutex>
+#include <corvane/Platform/SharedMutex.h>
 
 namespace corvane {
 
@@ -14,7 +14,7 @@ namespace corvane {
 /// exit handler could not free it any more.
 class OpenSSLUse {
   public:
-    OpenSSLUse();
+    OpenSSLUse() CORVANE_NO_THREAD_ANALYSIS;  // which does not see that its lock is held
     ~OpenSSLUse();
     OpenSSLUse(const OpenSSLUse&) = delete;
     OpenSSLUse& operator=(const OpenSSLUse&) = delete;
@@ -27,7 +27,7 @@ class OpenSSLUse {
     }
 
   private:
-    std::shared_lock<std::shared_mutex> lock_;
+    ReadLock lock_;
 };
 
 }  // namespace corvane

@@ -1,8 +1,8 @@
 #include <corvane/Signing/SigningServiceType.h>
 
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Signing/FileSigningService.h>
 
-#include <mutex>
 #include <utility>
 
 namespace corvane {
@@ -10,8 +10,8 @@ namespace corvane {
 namespace {
 
 struct SharedService {
-    std::mutex mutex;
-    std::shared_ptr<SigningServiceType> service;
+    Mutex mutex;
+    std::shared_ptr<SigningServiceType> service CORVANE_GUARDED_BY(mutex);
 
     static SharedService& instance() {
         static auto& instance = *new SharedService;
@@ -23,13 +23,13 @@ struct SharedService {
 
 void SigningServiceType::setShared(std::shared_ptr<SigningServiceType> service) {
     auto& shared = SharedService::instance();
-    const std::lock_guard lock(shared.mutex);
+    const Lock lock(shared.mutex);
     std::swap(shared.service, service);  // the old one goes after the lock
 }
 
 std::shared_ptr<SigningServiceType> SigningServiceType::shared() {
     auto& shared = SharedService::instance();
-    const std::lock_guard lock(shared.mutex);
+    const Lock lock(shared.mutex);
     if (!shared.service) shared.service = std::make_shared<FileSigningService>();
     return shared.service;
 }

@@ -11,18 +11,18 @@ SessionObserver::SessionObserver(AccessTracker sessionChangeTracker, Block block
 SessionObserver::~SessionObserver() = default;
 
 void SessionObserver::disposeOn(std::weak_ptr<const void> object) {
-    std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     // Whether a dead observer has been dropped yet depends on other registrations: it may not come back to life.
     if (!object_ || !object_->expired()) object_ = std::move(object);
 }
 
 std::shared_ptr<const void> SessionObserver::object() const {
-    std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     return object_ ? object_->lock() : nullptr;
 }
 
 bool SessionObserver::isOwnedBy(const std::weak_ptr<const void>& object) const {
-    std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     return object_ && !object_->owner_before(object) && !object.owner_before(*object_);
 }
 

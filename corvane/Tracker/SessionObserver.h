@@ -2,11 +2,11 @@
 
 #include <corvane/Export.h>
 #include <corvane/Models/Session.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Tracker/AccessTracker.h>
 
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <optional>
 
 namespace corvane {
@@ -39,8 +39,8 @@ class CORVANE_EXPORT SessionObserver {
   private:
     AccessTracker sessionChangeTracker_;
     const Block block_;
-    mutable std::mutex mutex_;
-    std::optional<std::weak_ptr<const void>> object_;  // guarded by mutex_; nothing until the first `disposeOn`
+    mutable Mutex mutex_;
+    std::optional<std::weak_ptr<const void>> object_ CORVANE_GUARDED_BY(mutex_);  // nothing until the first `disposeOn`
 };
 
 }  // namespace corvane

@@ -12,18 +12,18 @@ void addTo(DeliveryReport::Count& count, std::int64_t events) {
 }  // namespace
 
 void DeliveryLedger::add(std::string_view identifier, std::int64_t events) {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     onTheirWay_.emplace(identifier, events);
 }
 
 void DeliveryLedger::remove(std::string_view identifier) {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) onTheirWay_.erase(found);
     if (onTheirWay_.empty()) settled_.notify_all();
 }
 
 void DeliveryLedger::settle(std::string_view identifier, Outcome outcome) {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     const auto found = onTheirWay_.find(identifier);
     if (found == onTheirWay_.end()) return;
     switch (outcome) {
@@ -43,19 +43,19 @@ void DeliveryLedger::settle(std::string_view identifier, Outcome outcome) {
 }
 
 bool DeliveryLedger::follow(std::string_view identifier) {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     if (!onTheirWay_.contains(identifier)) return false;
     followed_.try_emplace(std::string(identifier));
     return true;
 }
 
 void DeliveryLedger::unfollow(std::string_view identifier) {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     if (const auto found = followed_.find(identifier); found != followed_.end()) followed_.erase(found);
 }
 
 std::optional<DeliveryLedger::Outcome> DeliveryLedger::takeOutcome(std::string_view identifier) {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     const auto found = followed_.find(identifier);
     if (found == followed_.end() || !found->second) return std::nullopt;
     const auto outcome = found->second;
@@ -70,13 +70,13 @@ DeliveryReport DeliveryLedger::reportLocked() const {
 }
 
 DeliveryReport DeliveryLedger::report() const {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     return reportLocked();
 }
 
 DeliveryReport DeliveryLedger::wait(std::chrono::steady_clock::time_point deadline) const {
-    std::unique_lock lock(mutex_);
-    settled_.wait_until(lock, deadline, [&] { return onTheirWay_.empty(); });
+    Lock lock(mutex_);
+    while (!onTheirWay_.empty() && lock.waitUntil(settled_, deadline)) continue;
     return reportLocked();
 }
 

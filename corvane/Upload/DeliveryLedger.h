@@ -1,13 +1,13 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Upload/DeliveryReport.h>
 
 #include <chrono>
 #include <condition_variable>
 #include <cstdint>
 #include <map>
-#include <mutex>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -54,13 +54,14 @@ class CORVANE_EXPORT DeliveryLedger {
     DeliveryReport wait(std::chrono::steady_clock::time_point deadline) const;
 
   private:
-    [[nodiscard]] DeliveryReport reportLocked() const;
+    [[nodiscard]] DeliveryReport reportLocked() const CORVANE_REQUIRES(mutex_);
 
-    mutable std::mutex mutex_;
+    mutable Mutex mutex_;
     mutable std::condition_variable settled_;
-    std::map<std::string, std::int64_t, std::less<>> onTheirWay_;  // events by document identifier
-    DeliveryReport totals_;                                        // of settled documents
-    std::map<std::string, std::optional<Outcome>, std::less<>> followed_;
+    std::map<std::string, std::int64_t, std::less<>> onTheirWay_
+        CORVANE_GUARDED_BY(mutex_);                     // events by document identifier
+    DeliveryReport totals_ CORVANE_GUARDED_BY(mutex_);  // of settled documents
+    std::map<std::string, std::optional<Outcome>, std::less<>> followed_ CORVANE_GUARDED_BY(mutex_);
 };
 
 }  // namespace corvane

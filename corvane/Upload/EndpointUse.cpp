@@ -1,9 +1,9 @@
 #include <corvane/Upload/EndpointUse.h>
 
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Upload/UploadService.h>
 
-#include <mutex>
 #include <set>
 
 namespace corvane {
@@ -11,8 +11,8 @@ namespace corvane {
 namespace {
 
 struct Uses {
-    std::mutex mutex;
-    std::multiset<std::string> keys;
+    Mutex mutex;
+    std::multiset<std::string> keys CORVANE_GUARDED_BY(mutex);
 };
 
 Uses& uses() {
@@ -25,7 +25,7 @@ Uses& uses() {
 EndpointUse::EndpointUse(const Endpoint& endpoint) : key_(UploadService::ownerKey(endpoint)) {
     bool isShared = false;
     {
-        const std::lock_guard lock(uses().mutex);
+        const Lock lock(uses().mutex);
         isShared = uses().keys.contains(key_);
         uses().keys.insert(key_);
     }
@@ -37,7 +37,7 @@ EndpointUse::EndpointUse(const Endpoint& endpoint) : key_(UploadService::ownerKe
 }
 
 EndpointUse::~EndpointUse() {
-    const std::lock_guard lock(uses().mutex);
+    const Lock lock(uses().mutex);
     if (const auto found = uses().keys.find(key_); found != uses().keys.end()) uses().keys.erase(found);
 }
 

@@ -119,7 +119,7 @@ UploadTaken UploadManager::record(const SignedEntity& entity, const UploadReques
         return UploadTaken::recorded;
     } catch (...) {
         // This attempt is made all the same; if it fails, the contents go out again from where they are kept.
-        const std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         unrecorded_.insert(entity.identifier);
         return UploadTaken::underWay;
     }
@@ -252,7 +252,7 @@ void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
 }
 
 bool UploadManager::forgetUnrecorded(const std::string& identifier) {
-    const std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     return unrecorded_.erase(identifier) > 0;
 }
 

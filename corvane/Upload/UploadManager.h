@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Upload/DeliveryLedger.h>
@@ -15,7 +16,6 @@
 #include <filesystem>
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <optional>
 #include <set>
 #include <string>
@@ -101,8 +101,8 @@ class CORVANE_EXPORT UploadManager final : public UploadManagerType,
     SerialQueue queue_{"com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background};
     bool retriedIncompleteRequests_ CORVANE_GUARDED_BY(queue_) = false;
 
-    std::mutex mutex_;                  // guards this one
-    std::set<std::string> unrecorded_;  // documents that are under way without a row
+    Mutex mutex_;
+    std::set<std::string> unrecorded_ CORVANE_GUARDED_BY(mutex_);  // documents that are under way without a row
 };
 
 }  // namespace corvane

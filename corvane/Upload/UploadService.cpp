@@ -121,12 +121,12 @@ UploadService::~UploadService() {
 }
 
 void UploadService::setDelegate(std::weak_ptr<UploadServiceDelegate> delegate) {
-    std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     delegate_ = std::move(delegate);
 }
 
 void UploadService::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
-    std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     accessQueue_ = std::move(queue);
 }
 
@@ -142,7 +142,7 @@ std::shared_ptr<TransferSession> UploadService::openSession() {
     configuration.trustedCertificates = endpoint_.trustedCertificates();
     std::shared_ptr<SerialQueue> queue;
     {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         queue = accessQueue_;
     }
     CORVANE_REQUIRE(!weak_from_this().expired(), "an upload service must be made with std::make_shared");
@@ -208,12 +208,12 @@ std::string UploadService::signature(const std::filesystem::path& file) {
 void UploadService::resubmit(std::vector<PreparedUploadRequest> requests) {
     if (requests.empty()) return;
     {
-        std::lock_guard lock(mutex_);  // before the session is opened: its first words may be completions
+        const Lock lock(mutex_);  // before the session is opened: its first words may be completions
         ++pendingListings_;
     }
     const auto opened = session();
     if (!opened) {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         --pendingListings_;
         return;
     }
@@ -233,7 +233,7 @@ void UploadService::resubmit(const std::vector<PreparedUploadRequest>& requests,
     const auto inFlight = identifiersOfRunning(tasks);
     std::set<std::string> ended;
     {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         ended = endedMeanwhile_;
         if (--pendingListings_ == 0) endedMeanwhile_.clear();
     }
@@ -272,7 +272,7 @@ void UploadService::taskDidEndElsewhere(const TransferTask& task, const std::opt
 }
 
 std::shared_ptr<UploadServiceDelegate> UploadService::noteEnd(const TransferTask& task) {
-    std::lock_guard lock(mutex_);
+    const Lock lock(mutex_);
     if (pendingListings_ > 0) endedMeanwhile_.insert(task.description().value_or(unknown));
     return delegate_.lock();
 }
@@ -342,7 +342,7 @@ bool UploadService::shouldResume(std::string_view identifier, std::function<void
     const bool resumes = opened && opened->description() == identifier;
     std::size_t waiting = 0;
     {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         waiting = backgroundCompletions_.size();
         if (resumes && completion) backgroundCompletions_.push_back(std::move(completion));
     }
@@ -364,7 +364,7 @@ void UploadService::allEventsDelivered() {
 void UploadService::invokeBackgroundCompletions(const std::string& session) {
     Completions completions;
     {
-        std::lock_guard lock(mutex_);
+        const Lock lock(mutex_);
         completions.swap(backgroundCompletions_);
     }
     Log::shared().default_(

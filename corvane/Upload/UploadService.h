@@ -2,6 +2,7 @@
 
 #include <corvane/Export.h>
 #include <corvane/Platform/Lazy.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Transfer/TransferSession.h>
 #include <corvane/Upload/Endpoint.h>
 #include <corvane/Upload/SignerType.h>
@@ -12,7 +13,6 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <optional>
 #include <set>
 #include <string>
@@ -104,14 +104,14 @@ class CORVANE_EXPORT UploadService final : public UploadServiceType,
     const TransferSession::Factory factory_;
     const Lazy<std::shared_ptr<TransferSession>> lazyURLSession_;
 
-    std::mutex mutex_;  // guards these; never held while calling out
-    std::weak_ptr<UploadServiceDelegate> delegate_;
-    std::shared_ptr<SerialQueue> accessQueue_;
-    Completions backgroundCompletions_;
+    Mutex mutex_;  // never held while calling out
+    std::weak_ptr<UploadServiceDelegate> delegate_ CORVANE_GUARDED_BY(mutex_);
+    std::shared_ptr<SerialQueue> accessQueue_ CORVANE_GUARDED_BY(mutex_);
+    Completions backgroundCompletions_ CORVANE_GUARDED_BY(mutex_);
     // What ended while a retry pass waits for the listing of tasks: an earlier run's upload that has had its outcome is
     // neither in flight then nor to be sent again.
-    int pendingListings_ = 0;
-    std::set<std::string> endedMeanwhile_;
+    int pendingListings_ CORVANE_GUARDED_BY(mutex_) = 0;
+    std::set<std::string> endedMeanwhile_ CORVANE_GUARDED_BY(mutex_);
 };
 
 }  // namespace corvane
