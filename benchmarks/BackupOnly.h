@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Processing/UploadBatchEntity.h>
+#include <corvane/Processing/UploadBatches.h>
 #include <corvane/Upload/UploadManagerType.h>
 #include <corvane/corvane.h>
 
@@ -23,10 +23,10 @@ class NullUploadManager final : public UploadManagerType {
 
 /// A batching processor whose full batches go nowhere.
 inline std::shared_ptr<UploadBatchEventProcessor> backupOnly(const std::string& name, int batchSize) {
-    return std::make_shared<UploadBatchEventProcessor>(
+    return std::make_shared<UploadBatchEventProcessor>(std::make_shared<UploadBatches>(
         Client{"com.example.bench", "Bench", "1.0", 1}, std::make_shared<NullUploadManager>(),
         std::make_shared<DeferredStore<UploadBatchEntity>>(name), UploadBatchEventConfig(batchSize, false),
-        std::make_shared<DeliveryLedger>());
+        std::make_shared<DeliveryLedger>()));
 }
 
 }  // namespace corvane::bench

@@ -1,51 +1,12 @@
 # Installs the library with its public headers, the CMake package and the pkg-config file.
 include(CMakePackageConfigHelpers)
 
-# Headers that only the library's own sources include: what they pull in is not a consumer's affair.
-file(GLOB_RECURSE headers RELATIVE ${PROJECT_SOURCE_DIR} CONFIGURE_DEPENDS ${PROJECT_SOURCE_DIR}/corvane/*.h)
-set(internal_headers
-    corvane/Bridge/Data/EventMirrors.h
-    corvane/Bridge/Data/StackEntry.h
-    corvane/Bridge/Models/Refusal.h
-    corvane/Models/JSONShape.h
-    corvane/Models/JSONTree.h
-    corvane/Models/OwnJSON.h
-    corvane/Agent/AgentDirectory.h
-    corvane/Agent/Host/AgentLink.h
-    corvane/Agent/AgentMessage.h
-    corvane/Agent/Host/AgentProgram.h
-    corvane/Agent/Host/AgentThread.h
-    corvane/Agent/Host/BackgroundTransferCore.h
-    corvane/Agent/Host/BackgroundTransferTask.h
-    corvane/Transfer/CurlTransfer.h
-    corvane/Platform/Descriptor.h
-    corvane/Agent/FrameSocket.h
-    corvane/Platform/HostCall.h
-    corvane/Transfer/HTTPTransfer.h
-    corvane/Signing/OpenSSLUse.h
-    corvane/Platform/PrivateFile.h
-    corvane/Platform/TaskList.h
-    corvane/Platform/Thread.h
-    corvane/Agent/TransferOutcome.h
-    corvane/Transfer/TransferScheduler.h
-    corvane/Agent/TransferSubmission.h
-    corvane/Transfer/TransferThread.h
-    corvane/Agent/WireReader.h
-    corvane/Agent/WireWriter.h
-    corvane/Session/SessionCore.h)
-list(REMOVE_ITEM headers ${internal_headers})
-list(FILTER headers EXCLUDE REGEX "^corvane/Agent/Daemon/")  # the agent's own
-foreach(header IN LISTS headers)
-    get_filename_component(folder ${header} DIRECTORY)
-    install(FILES ${PROJECT_SOURCE_DIR}/${header} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/${folder})
-endforeach()
-install(FILES ${CMAKE_CURRENT_BINARY_DIR}/include/corvane/Export.h
-    DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/corvane)
-
 install(TARGETS corvane EXPORT corvaneTargets
     RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
-    ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR})
+    ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    FILE_SET HEADERS DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
+    FILE_SET generated DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 
 if(CORVANE_BUILD_AGENT)
     install(TARGETS corvane-transferd RUNTIME DESTINATION ${CMAKE_INSTALL_LIBEXECDIR})

@@ -21,6 +21,7 @@
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 #include <corvane/Session/SessionManager.h>
+#include <corvane/Signing/SigningError.h>
 #include <corvane/Signing/SigningServiceType.h>
 #include <corvane/Snapshot/SnapshotType.h>
 #include <corvane/Tracker/AccessTracker.h>

@@ -1,7 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <filesystem>
 #include <string>
 #include <string_view>
@@ -13,18 +11,18 @@ namespace corvane {
 // throw `SystemError`, and leave no file of their own behind.
 
 /// Writes the file, in place of one of that name.
-CORVANE_EXPORT void replacePrivateFile(const std::filesystem::path& file, std::string_view contents);
+void replacePrivateFile(const std::filesystem::path& file, std::string_view contents);
 
 /// Writes the file unless there is one of that name. Returns whether it was written; its contents then survive a power
 /// cut if its name does.
-CORVANE_EXPORT bool createPrivateFile(const std::filesystem::path& file, std::string_view contents);
+bool createPrivateFile(const std::filesystem::path& file, std::string_view contents);
 
 /// Removes from a directory what a process that was killed left half written. Files younger than an hour stay: another
 /// process may be at work on them. What cannot be looked at or removed stays.
-CORVANE_EXPORT void removeAbandonedPartialFiles(const std::filesystem::path& directory) noexcept;
+void removeAbandonedPartialFiles(const std::filesystem::path& directory) noexcept;
 
 /// The contents of a regular file. Throws `SystemError` when it cannot be read, at once also where a pipe or a device
 /// has taken its place.
-[[nodiscard]] CORVANE_EXPORT std::string readWholeFile(const std::filesystem::path& file);
+[[nodiscard]] std::string readWholeFile(const std::filesystem::path& file);
 
 }  // namespace corvane

@@ -1,14 +1,12 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <string_view>
 
 namespace corvane {
 
 /// Stops the process with `message` on standard error. The one way in which the library ends on a
 /// programming error.
-[[noreturn]] CORVANE_EXPORT void fail(std::string_view message) noexcept;
+[[noreturn]] void fail(std::string_view message) noexcept;
 
 }  // namespace corvane
 

@@ -1,16 +1,14 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <string>
 #include <string_view>
 
 namespace corvane {
 
 /// A new random UUID in its upper-case text form of 36 characters. Callable from any thread.
-[[nodiscard]] CORVANE_EXPORT std::string newUUID();
+[[nodiscard]] std::string newUUID();
 
 /// Whether `text` has the form of one: 36 characters, upper-case hexadecimal digits in groups of 8, 4, 4, 4 and 12.
-[[nodiscard]] CORVANE_EXPORT bool isUUID(std::string_view text) noexcept;
+[[nodiscard]] bool isUUID(std::string_view text) noexcept;
 
 }  // namespace corvane

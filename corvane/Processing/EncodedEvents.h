@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/JSON.h>
 #include <corvane/Store/GrowingBlob.h>
 
@@ -14,7 +13,7 @@ namespace corvane {
 /// The event payloads of one batch, in order, in the two forms in which they are written: as JSON text for the
 /// document, and as the blob of the backup row. Both grow with each event, and nothing written before is encoded again.
 /// Not thread-safe; not changed any more once a document shares it.
-class CORVANE_EXPORT EncodedEvents {
+class EncodedEvents {
   public:
     /// What the blob of a backup row begins and ends with.
     static constexpr std::string_view opening = R"({"events":[)";

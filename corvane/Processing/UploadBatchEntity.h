@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/JSON.h>
 #include <corvane/Processing/EncodedEvents.h>
 #include <corvane/Store/Storable.h>
@@ -15,7 +14,7 @@ namespace corvane {
 
 /// The backup of a batch that has not been handed over yet: one row of "upload_batches". The format outlives the
 /// process: names and layout may not change without a new schema version.
-struct CORVANE_EXPORT UploadBatchEntity {
+struct UploadBatchEntity {
     static constexpr std::string_view tableName = "upload_batches";
     static constexpr std::int64_t schemaVersion = 0;
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Error.h>
 
 #include <compare>
@@ -11,7 +10,7 @@
 namespace corvane {
 
 /// No key can be made. Domain "Corvane.UploadBatchQueueKey.Errors".
-class CORVANE_EXPORT UploadBatchQueueKeyError : public Error {
+class UploadBatchQueueKeyError : public Error {
   public:
     enum Code {
         invalid = 0,  ///< no session is current: the event belongs to no batch
@@ -25,7 +24,7 @@ class CORVANE_EXPORT UploadBatchQueueKeyError : public Error {
 };
 
 /// Which batch an event belongs to: its session's, or its group's within the session. A value.
-class CORVANE_EXPORT UploadBatchQueueKey {
+class UploadBatchQueueKey {
   public:
     using Errors = UploadBatchQueueKeyError;
 

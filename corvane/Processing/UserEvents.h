@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Processing/EncodedEvents.h>
 #include <corvane/Upload/ResourceType.h>
 
@@ -12,7 +11,7 @@
 namespace corvane {
 
 /// The user-events document: the events of one batch with the session they belong to.
-class CORVANE_EXPORT UserEvents final : public ResourceType {
+class UserEvents final : public ResourceType {
   public:
     static constexpr std::string_view mediaType = "application/vnd.veskar.corvane.user_events+json";
     static constexpr std::string_view formatVersion = "0.1.0";

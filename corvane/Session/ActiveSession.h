@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/Session.h>
 #include <corvane/Tracker/ActiveSessionType.h>
@@ -12,7 +11,7 @@ namespace corvane {
 
 /// The session that runs, with every event handed over while it was active. Made by the session manager only, and used
 /// on its queue.
-class CORVANE_EXPORT ActiveSession final : public ActiveSessionType {
+class ActiveSession final : public ActiveSessionType {
   public:
     ActiveSession(std::string identifier, Session::Kind kind, Date startDate);
     ActiveSession(const ActiveSession&) = delete;

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Signing/SigningServiceType.h>
 
@@ -15,7 +14,7 @@ namespace corvane {
 ///
 /// The key is made on first use and belongs to whoever made it first: processes that share the directory agree on one.
 /// Its file is 0600; beside it lies the public key, which a collector needs to verify signatures. Safe from any thread.
-class CORVANE_EXPORT FileSigningService final : public SigningServiceType {
+class FileSigningService final : public SigningServiceType {
   public:
     /// The private key, PKCS #8 in PEM.
     static constexpr std::string_view keyFileName = "com.veskar.corvane.signing-key.pem";

@@ -21,7 +21,7 @@ struct SnapshotLevel {
 };
 
 /// See SnapshotType. Internal.
-class CORVANE_EXPORT Snapshot final : public SnapshotType {
+class Snapshot final : public SnapshotType {
   public:
     using SnapshotType::evaluate;
 

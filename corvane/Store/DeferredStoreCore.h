@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Store/StoreConnection.h>
 #include <corvane/Store/StoreTable.h>
@@ -16,7 +15,7 @@ namespace corvane {
 /// schema version, falls back to memory.
 ///
 /// States: pending, then ready (on disk or in memory) or failed, for good.
-class CORVANE_EXPORT DeferredStoreCore {
+class DeferredStoreCore {
   public:
     /// The one queue on which all database work of the process runs; never destroyed.
     [[nodiscard]] static SerialQueue& queue();

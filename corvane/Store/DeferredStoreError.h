@@ -1,12 +1,11 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Error.h>
 
 namespace corvane {
 
 /// What a deferred store itself throws: `DeferredStore<Entity>::Errors`. Domain "Corvane.DeferredStore.Errors".
-class CORVANE_EXPORT DeferredStoreError : public Error {
+class DeferredStoreError : public Error {
   public:
     enum Code {
         noStore = 0,  ///< neither the database file nor one in memory could be had; the log says why

@@ -1,7 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <cstddef>
 #include <string>
 #include <string_view>
@@ -16,7 +14,7 @@ namespace corvane {
 ///
 ///     GrowingBlob events(R"({"events":[)", "]}");
 ///     events.append(R"({"n":1})");     // a row with {"events":[{"n":1}]} can be written
-class CORVANE_EXPORT GrowingBlob {
+class GrowingBlob {
   public:
     explicit GrowingBlob(std::string_view prefix = {}, std::string_view suffix = {});
 

@@ -1,7 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <concepts>
 #include <cstddef>
 #include <cstdint>
@@ -17,7 +15,7 @@ class GrowingBlob;
 /// A value that can stand in an SQL statement. It is the only way for a value to get into one.
 ///
 /// A value, except that a growing blob is referred to and must outlive it.
-class CORVANE_EXPORT StorableValue {
+class StorableValue {
   public:
     // Implicit, so that an entity returns its fields as they are.
     StorableValue(std::string text);                           // NOLINT(google-explicit-constructor)

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Store/StoreError.h>
 #include <corvane/Store/StoreLocation.h>
 #include <corvane/Store/StoreStepper.h>
@@ -23,7 +22,7 @@ namespace corvane {
 /// stores, and two processes, can share a file. Not getting that mode is not a failure to open. A statement waits for
 /// another process's lock up to the busy timeout; once that was in vain, the next ones hardly wait until one can write,
 /// so that a lock that is never released costs its user one timeout and not one per statement.
-class CORVANE_EXPORT StoreConnection {
+class StoreConnection {
   public:
     /// Opens the database. Throws what `open` throws.
     explicit StoreConnection(StoreLocation location);

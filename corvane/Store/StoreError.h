@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Store/StoreLocation.h>
 
@@ -14,7 +13,7 @@ namespace corvane {
 ///
 /// The message holds the database's own reason, and of the statement the part before its first value: what users did
 /// stays out of logs.
-class CORVANE_EXPORT StoreError : public Error {
+class StoreError : public Error {
   public:
     enum Code {
         cantOpen = 0,       ///< the database was not opened; see location()

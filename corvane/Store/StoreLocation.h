@@ -1,14 +1,12 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <optional>
 #include <string>
 
 namespace corvane {
 
 /// Where a store keeps its table: in a database file of the documents directory, or in memory. A value.
-class CORVANE_EXPORT StoreLocation {
+class StoreLocation {
   public:
     /// The database file named after `name`; surrounding white space and capitals make no difference. A name that no
     /// file can have is found out when the store is opened.

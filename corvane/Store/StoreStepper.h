@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Store/StoreStepperError.h>
 
 #include <cstdint>
@@ -13,7 +12,7 @@ namespace corvane {
 /// throws.
 ///
 /// Good for the length of the call that it is passed to.
-class CORVANE_EXPORT StoreStepper {
+class StoreStepper {
   public:
     using Errors = StoreStepperError;
 

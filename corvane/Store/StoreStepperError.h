@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Error.h>
 
 #include <string>
@@ -8,7 +7,7 @@
 namespace corvane {
 
 /// A result row is not what the entity needs: `StoreStepper::Errors`. Domain "Corvane.StoreStepper.Errors".
-class CORVANE_EXPORT StoreStepperError : public Error {
+class StoreStepperError : public Error {
   public:
     enum Code {
         badColumn = 0,        ///< the column holds no text or no bytes where some are needed

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Store/StorableValue.h>
 #include <corvane/Store/StoreColumn.h>
 
@@ -12,7 +11,7 @@ namespace corvane {
 
 /// The statements of one table. The only place where statement text is made; values get into it as literals of
 /// `StorableValue`. Constant after construction; safe from any thread.
-class CORVANE_EXPORT StoreTable {
+class StoreTable {
   public:
     StoreTable(std::string_view name, std::vector<StoreColumn> columns);
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Store/StorableValue.h>
 #include <corvane/Store/StoreColumn.h>
 #include <corvane/Store/StoreStepper.h>
@@ -13,7 +12,7 @@
 namespace corvane {
 
 /// The schema version in which an entity table was last written: a row of the table "versions". A value.
-struct CORVANE_EXPORT VersionEntity {
+struct VersionEntity {
     static constexpr std::string_view tableName = "versions";
     static constexpr std::int64_t schemaVersion = 0;  ///< never looked at: the table of versions has no version
     static std::vector<StoreColumn> columns();

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/Session.h>
 
 #include <string>
@@ -8,7 +7,7 @@
 namespace corvane {
 
 /// What trackers see of the session that runs.
-class CORVANE_EXPORT ActiveSessionType {
+class ActiveSessionType {
   public:
     virtual ~ActiveSessionType() = default;
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/AnyDataEventEntry.h>
 
 #include <optional>
@@ -15,7 +14,7 @@ namespace corvane {
 ///
 /// One class serves every data type: the entries are held by reference, so a stack needs to know its type only to tell
 /// a push of another type under the same key.
-class CORVANE_EXPORT DataEventStack {
+class DataEventStack {
   public:
     DataEventStack(std::string_view stackKey, DataType type) : stackKey_(stackKey), type_(type) {}
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Tracker/DataEventStack.h>
 
 #include <map>
@@ -11,7 +10,7 @@
 namespace corvane {
 
 /// The stacks of one owner, at most one per key. Not thread-safe: it lives on its owner's queue.
-class CORVANE_EXPORT DataEventStacks {
+class DataEventStacks {
   public:
     using Map = std::map<std::string, DataEventStack, std::less<>>;
 

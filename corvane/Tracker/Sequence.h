@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/DataEvent.h>
 
 #include <string_view>
@@ -21,6 +20,6 @@ struct Sequence {
 
 /// The event's JSON: one object, flat at its top, with the object of each entry under the entry's name. Of two entries
 /// of one name the later one counts. Throws what `toDict` of an entry throws; an `EncodingError` names the property.
-[[nodiscard]] CORVANE_EXPORT JSON encode(const Sequence& sequence);
+[[nodiscard]] JSON encode(const Sequence& sequence);
 
 }  // namespace corvane

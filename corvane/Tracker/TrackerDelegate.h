@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/Session.h>
 
@@ -12,7 +11,7 @@ class ActiveSessionType;
 class SessionObserver;
 
 /// Who receives what trackers make: the session manager. Unless said otherwise, called on the trackers' queue.
-class CORVANE_EXPORT TrackerDelegate {
+class TrackerDelegate {
   public:
     virtual ~TrackerDelegate() = default;
 

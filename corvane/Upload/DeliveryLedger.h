@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Upload/DeliveryReport.h>
 
@@ -19,7 +18,7 @@ namespace corvane {
 /// The batching processor enters a document before it hands it over, the upload manager says what became of it. Holds
 /// one entry per document on its way; settled ones are folded into totals. Safe from any thread; nothing but `wait`
 /// waits.
-class CORVANE_EXPORT DeliveryLedger {
+class DeliveryLedger {
   public:
     /// Each enumerator says what happens next with the document.
     enum class Outcome {

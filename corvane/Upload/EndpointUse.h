@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Upload/Endpoint.h>
 
 #include <string>
@@ -11,7 +10,7 @@ namespace corvane {
 ///
 /// Two users of one endpoint in one process lose nothing, but each sends again what the other has under way, and a host
 /// hardly ever means it: the second one is told so with an error line. Safe from any thread.
-class CORVANE_EXPORT EndpointUse {
+class EndpointUse {
   public:
     explicit EndpointUse(const Endpoint& endpoint);
     EndpointUse(const EndpointUse&) = delete;

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Error.h>
 
 #include <cstdint>
@@ -8,7 +7,7 @@
 namespace corvane {
 
 /// The compression of a payload failed. Domain "Corvane.GZIPError".
-class CORVANE_EXPORT GZIPError : public Error {
+class GZIPError : public Error {
   public:
     enum Code {
         failed = 0,  ///< zlib refused; see status()

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Upload/SignerType.h>
 
 #include <string>
@@ -10,7 +9,7 @@ namespace corvane {
 
 /// Has the SHA-1 digest of a body signed by the process's signing service (`SigningServiceType::shared`). The header
 /// text is the signature in base64. Keeps no state; safe from any thread.
-class CORVANE_EXPORT OstrelSigner final : public SignerType {
+class OstrelSigner final : public SignerType {
   public:
     OstrelSigner();
     OstrelSigner(const OstrelSigner&) = default;

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/JSON.h>
 
 #include <string>
@@ -9,7 +8,7 @@ namespace corvane {
 
 /// A document that can be uploaded. Implementations do not change once they are handed over, and may be read from any
 /// thread.
-class CORVANE_EXPORT ResourceType {
+class ResourceType {
   public:
     virtual ~ResourceType() = default;
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Date.h>
 #include <corvane/Store/StorableValue.h>
 #include <corvane/Store/StoreColumn.h>
@@ -15,7 +14,7 @@
 namespace corvane {
 
 /// An upload that is not finished: a row of the table "signed_requests". A value. Dates are kept as seconds since 1970.
-struct CORVANE_EXPORT SignedEntity {
+struct SignedEntity {
     static constexpr std::string_view tableName = "signed_requests";
     static constexpr std::int64_t schemaVersion = 2;
     static std::vector<StoreColumn> columns();

@@ -1,14 +1,12 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <string>
 #include <string_view>
 
 namespace corvane {
 
 /// Turns the body of an upload into the text of its signature header.
-class CORVANE_EXPORT SignerType {
+class SignerType {
   public:
     virtual ~SignerType() = default;
 

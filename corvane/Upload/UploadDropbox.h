@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Lazy.h>
 #include <corvane/Upload/UploadDropboxType.h>
 
@@ -20,7 +19,7 @@ namespace corvane {
 /// written; what a killed process left of one is removed with the first `write`, once it is an hour old. Identifiers
 /// are file names: one that is empty, a relative step, or holds a slash or NUL is refused with `InvalidArgument`.
 /// Failures of the file system are `SystemError`. Safe from any thread.
-class CORVANE_EXPORT UploadDropbox final : public UploadDropboxType {
+class UploadDropbox final : public UploadDropboxType {
   public:
     /// Whether, and where, debugging copies are kept.
     class Debugging {

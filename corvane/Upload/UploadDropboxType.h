@@ -1,7 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <filesystem>
 #include <optional>
 #include <set>
@@ -16,7 +14,7 @@ struct UploadResponse;
 
 /// Holds one payload file per pending upload. The upload manager writes and removes the files, the transfer reads them,
 /// so all operations may be called from any thread.
-class CORVANE_EXPORT UploadDropboxType {
+class UploadDropboxType {
   public:
     virtual ~UploadDropboxType() = default;
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Store/DeferredStore.h>
@@ -35,9 +34,9 @@ namespace corvane {
 /// `open` and `upload` run on the manager's own queue, in the caller's time, and use the deferred store from there;
 /// results are handled where they arrive. States: built, opened (what was left over has been sent again, once), closed;
 /// uploads work in each of them.
-class CORVANE_EXPORT UploadManager final : public UploadManagerType,
-                                           public UploadServiceDelegate,
-                                           public std::enable_shared_from_this<UploadManager> {
+class UploadManager final : public UploadManagerType,
+                            public UploadServiceDelegate,
+                            public std::enable_shared_from_this<UploadManager> {
   public:
     /// An upload whose row counts more retries than this is not sent again.
     static constexpr std::int64_t maximumRetries = 4;

@@ -1,7 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <functional>
 #include <memory>
 #include <string_view>
@@ -22,7 +20,7 @@ enum class UploadTaken {
 /// too many attempts, over restarts of the process too.
 ///
 /// Owned by the batching processor, which calls everything here on the access queue, one call at a time.
-class CORVANE_EXPORT UploadManagerType {
+class UploadManagerType {
   public:
     virtual ~UploadManagerType() = default;
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Models/Client.h>
 #include <corvane/Upload/ResourceType.h>
 
@@ -16,7 +15,7 @@ class StoreConnection;
 /// Whoever keeps the document's contents elsewhere hands along how they are let go of, so that one transaction puts the
 /// document's row in and takes them out: a process that is killed, or a disk that fills up, leaves the one or the
 /// other.
-struct CORVANE_EXPORT UploadRequest {
+struct UploadRequest {
     /// Throws `InvalidArgument` when the document's type or version holds a control character: both go into a header.
     UploadRequest(Client sender, std::shared_ptr<const ResourceType> document);
 

@@ -1,7 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <cstdint>
 #include <map>
 #include <string>
@@ -9,7 +7,7 @@
 namespace corvane {
 
 /// What a collector answered to one upload. A value.
-struct CORVANE_EXPORT UploadResponse {
+struct UploadResponse {
     std::int64_t statusCode = 0;                      ///< the HTTP status code
     std::map<std::string, std::string> headers = {};  ///< field values by name, as the transfer layer spells them
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Lazy.h>
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Transfer/TransferSession.h>
@@ -34,9 +33,9 @@ namespace corvane {
 ///     service->setDelegate(manager);
 ///     service->registerAccessQueue(queue);
 ///     service->submit(request);            // later: manager->uploadService(*service, result) on the queue
-class CORVANE_EXPORT UploadService final : public UploadServiceType,
-                                           public TransferSessionDelegate,
-                                           public std::enable_shared_from_this<UploadService> {
+class UploadService final : public UploadServiceType,
+                            public TransferSessionDelegate,
+                            public std::enable_shared_from_this<UploadService> {
   public:
     /// The session's identifier, which is its description too. Every service uses this one; the owner key tells their
     /// tasks apart.

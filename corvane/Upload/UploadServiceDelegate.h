@@ -1,14 +1,12 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 namespace corvane {
 
 class UploadServiceType;
 struct UploadResult;
 
 /// Whoever keeps the books of an upload service's uploads: the upload manager. The service holds it weakly.
-class CORVANE_EXPORT UploadServiceDelegate {
+class UploadServiceDelegate {
   public:
     virtual ~UploadServiceDelegate() = default;
 

@@ -1,7 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
-
 #include <functional>
 #include <memory>
 #include <set>
@@ -19,7 +17,7 @@ struct PreparedUploadRequest;
 ///
 /// Owned by the upload manager. `submit` and `resubmit` are called on the manager's queue and must not wait for
 /// another; results arrive at the delegate asynchronously, on the registered queue, never inside a call.
-class CORVANE_EXPORT UploadServiceType {
+class UploadServiceType {
   public:
     virtual ~UploadServiceType() = default;
 

@@ -2,9 +2,6 @@
 
 #include "Refusal.h"
 
-#include <corvane/Platform/Bytes.h>
-#include <corvane/Signing/SHA1.h>
-
 #include <openssl/evp.h>
 #include <openssl/pem.h>
 
@@ -34,8 +31,21 @@ std::string decodedSignature(const std::string& base64) {
         EVP_DecodeBlock(reinterpret_cast<unsigned char*>(bytes.data()),
                         reinterpret_cast<const unsigned char*>(base64.data()), static_cast<int>(base64.size()));
     if (size < static_cast<int>(signatureSize)) return {};
-    bytes.resize(signatureSize);  // without the zeros that stand for the padding
-    return corvane::base64String(bytes) == base64 ? bytes : std::string();
+    bytes.resize(signatureSize);                 // without the zeros that stand for the padding
+    std::string again(base64.size() + 1, '\0');  // the encoder ends its text with a NUL
+    EVP_EncodeBlock(reinterpret_cast<unsigned char*>(again.data()),
+                    reinterpret_cast<const unsigned char*>(bytes.data()), static_cast<int>(bytes.size()));
+    again.pop_back();
+    return again == base64 ? bytes : std::string();
+}
+
+std::string sha1Digest(std::string_view bytes) {
+    std::string digest(20, '\0');
+    if (EVP_Digest(bytes.data(), bytes.size(), reinterpret_cast<unsigned char*>(digest.data()), nullptr, EVP_sha1(),
+                   nullptr) != 1) {
+        throw Refusal(503, "SHA-1 is not available");
+    }
+    return digest;
 }
 
 }  // namespace
@@ -66,7 +76,7 @@ void SignatureVerifier::verify(std::string_view body, const std::string& header)
     const std::string signature = decodedSignature(header);
     if (signature.empty()) throw Refusal(401, "the signature is not 64 bytes in base64");
     const auto publicKey = key();
-    const std::string digest = corvane::sha1Digest(body);
+    const std::string digest = sha1Digest(body);
     const Context context(EVP_MD_CTX_new());
     if (!context || EVP_DigestVerifyInit(context.get(), nullptr, nullptr, nullptr, publicKey->handle.get()) != 1 ||
         EVP_DigestVerify(context.get(), reinterpret_cast<const unsigned char*>(signature.data()), signature.size(),

@@ -1,13 +1,12 @@
 #pragma once
 
 #include <corvane/Bridge/Data/BridgedEventClass.h>
-#include <corvane/Export.h>
 #include <corvane/Models/EventProperty.h>
 
 namespace corvane {
 
 /// A property of an event class as the tracker reads it. Immutable.
-class CORVANE_EXPORT BridgedEventMirrorProperty final : public EventPropertyType {
+class BridgedEventMirrorProperty final : public EventPropertyType {
   public:
     explicit BridgedEventMirrorProperty(BridgedEventProperty bridgedEventProperty);
     BridgedEventMirrorProperty(const BridgedEventMirrorProperty&) = default;

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <corvane/Bridge/Data/BridgedEventClass.h>
-#include <corvane/Export.h>
 #include <corvane/Models/EventMirrorStore.h>
 #include <corvane/Models/EventSubmit.h>
 #include <corvane/Platform/StringMap.h>
@@ -12,7 +11,7 @@ namespace corvane {
 
 /// Keeps the properties of event classes, asked for once per event name. One store belongs to one bridged tracker and
 /// the handles on it, and is used on that tracker's queue; it grows by one list per distinct name.
-class CORVANE_EXPORT BridgedEventMirrorStore {
+class BridgedEventMirrorStore {
   public:
     BridgedEventMirrorStore();
     BridgedEventMirrorStore(const BridgedEventMirrorStore&) = delete;

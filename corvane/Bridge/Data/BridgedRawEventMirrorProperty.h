@@ -1,14 +1,13 @@
 #pragma once
 
 #include <corvane/Bridge/Data/BridgedRawEvent.h>
-#include <corvane/Export.h>
 #include <corvane/Models/EventProperty.h>
 
 namespace corvane {
 
 /// A property of a raw event as the tracker reads it: data of any type under a name, which is always looked up. What a
 /// tracker knows of an event itself is for typed and bridged event classes. Immutable.
-class CORVANE_EXPORT BridgedRawEventMirrorProperty final : public EventPropertyType {
+class BridgedRawEventMirrorProperty final : public EventPropertyType {
   public:
     explicit BridgedRawEventMirrorProperty(BridgedRawEventProperty rawEventProperty);
     BridgedRawEventMirrorProperty(const BridgedRawEventMirrorProperty&) = default;

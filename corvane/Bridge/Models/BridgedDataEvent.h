@@ -1,7 +1,6 @@
 #pragma once
 
 #include <corvane/Bridge/Models/BridgedDataEventType.h>
-#include <corvane/Export.h>
 #include <corvane/Models/DataEvent.h>
 
 #include <memory>
@@ -12,7 +11,7 @@ namespace corvane {
 ///
 /// It only ever becomes JSON through the object's own dictionary: `encode` and `decode` throw
 /// `DataEventError::internalError`.
-class CORVANE_EXPORT BridgedDataEvent {
+class BridgedDataEvent {
   public:
     /// Throws `InvalidArgument` without an object.
     explicit BridgedDataEvent(std::shared_ptr<const BridgedDataEventType> object);

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <corvane/Bridge/Session/BridgedEventProcessorType.h>
-#include <corvane/Export.h>
 #include <corvane/Processing/EventProcessorType.h>
 
 #include <memory>
@@ -11,7 +10,7 @@ namespace corvane {
 
 /// Stands for a host's object-facing processor among the library's: forwards every callback, with its arguments as the
 /// host sees them. Two of them that stand for one object are one processor.
-class CORVANE_EXPORT BridgedEventProcessor final : public EventProcessorType {
+class BridgedEventProcessor final : public EventProcessorType {
   public:
     /// Throws `BridgeError::missingObject` without a processor.
     explicit BridgedEventProcessor(std::shared_ptr<BridgedEventProcessorType> eventProcessor);
