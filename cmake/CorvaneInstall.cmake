@@ -31,5 +31,7 @@ set(pc_libs_extra "")
 if(NOT BUILD_SHARED_LIBS)
     set(pc_libs_extra "-lsqlite3 -lz -lcurl -lcrypto -lspdlog -lfmt -lboost_json -lboost_container -pthread")
 endif()
+# Relative, so that a package may be moved as a whole.
+file(RELATIVE_PATH pc_prefix ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
 configure_file(${PROJECT_SOURCE_DIR}/cmake/corvane.pc.in ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc @ONLY)
 install(FILES ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
