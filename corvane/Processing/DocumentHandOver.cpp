@@ -17,7 +17,7 @@ DocumentHandOver::DocumentHandOver(Client client, std::shared_ptr<UploadManagerT
       deferredStore_(std::move(deferredStore)),
       ledger_(std::move(ledger)) {}
 
-DocumentHandOver::Removal DocumentHandOver::upload(const UploadBatchEntity& batch, const MayDelete& mayDelete) {
+DocumentHandOver::Removal DocumentHandOver::handOver(const UploadBatchEntity& batch, const MayDelete& mayDelete) {
     const auto document = std::make_shared<UserEvents>(batch.session, batch.events, newUUID());
     Removal removal;
     ledger_->add(document->identifier(), static_cast<std::int64_t>(batch.events->count()));

@@ -37,7 +37,7 @@ class DocumentHandOver {
 
     /// Makes a document, enters it in the ledger and hands it over, and deletes the batch's row if it may go and the
     /// document is recorded. Throws what the manager throws; the batch is then as it was.
-    Removal upload(const UploadBatchEntity& batch, const MayDelete& mayDelete);
+    Removal handOver(const UploadBatchEntity& batch, const MayDelete& mayDelete);
 
   private:
     void removeBackup(const std::shared_ptr<StoreConnection>& connection, const std::string& identifier,

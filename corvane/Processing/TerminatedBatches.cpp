@@ -28,7 +28,7 @@ void TerminatedBatches::list() {
     const std::set<std::string> listed(identifiers_.begin(), identifiers_.end());
     for (auto& identifier : found) {
         if (listed.contains(identifier)) continue;
-        ledger_->resubmitted(identifier);
+        ledger_->addEarlier(identifier);
         identifiers_.push_back(std::move(identifier));
     }
 }

@@ -44,7 +44,7 @@ UploadBatches::UploadBatches(Client client, std::shared_ptr<UploadManagerType> u
       deferredStore_(deferredStore),
       config_(config),
       endpointUse_(std::move(endpointUse)),
-      handOver_(std::move(client), uploadManager_, deferredStore, ledger_),
+      documents_(std::move(client), uploadManager_, deferredStore, ledger_),
       terminated_(deferredStore, ledger_) {}
 
 std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint& endpoint,
@@ -105,7 +105,7 @@ void UploadBatches::process(const ProcessEvent& processEvent) {
     try {
         const UploadBatchQueueKey key = keyOf(processEvent);
         add(key, processEvent.payload());
-        if (!key.isGroup()) submit(key, false);
+        if (!key.isGroup()) handOver(key, false);
     } catch (...) {
         Log::shared().error("Failed to process event for batching, error=%{public}@", AnyError::current().what());
     }
@@ -157,7 +157,7 @@ void UploadBatches::backUpAll() {
     if (!unsaved_.empty()) backupsAreBehind_ = true;
 }
 
-void UploadBatches::submit(const UploadBatchQueueKey& key, bool force) {
+void UploadBatches::handOver(const UploadBatchQueueKey& key, bool force) {
     const auto found = batchQueues_.find(key);
     if (found == batchQueues_.end()) return;
     if (!currentSession_) {
@@ -174,15 +174,15 @@ void UploadBatches::submit(const UploadBatchQueueKey& key, bool force) {
     // A manager of the host's may submit events from inside its call: they go into a batch of their own.
     auto handedOver = batchQueues_.extract(found);
     try {
-        handOver(handedOver.mapped());
+        tryHandOver(handedOver.mapped());
     } catch (...) {
         Log::shared().error("Failed to submit request for upload, error=%{public}@", AnyError::current().what());
         putBack(std::move(handedOver));
     }
 }
 
-void UploadBatches::handOver(UploadBatchQueue& queue) {
-    const auto removal = handOver_.upload({queue.identifier, currentSession_->sessionData, queue.events}, {});
+void UploadBatches::tryHandOver(UploadBatchQueue& queue) {
+    const auto removal = documents_.handOver({queue.identifier, currentSession_->sessionData, queue.events}, {});
     if (removal.error) {
         Log::shared().error("Failed to clean up request after submission, error=%{public}@", removal.error->what());
     }
@@ -230,7 +230,7 @@ void UploadBatches::didLeaveGroup(const Group& group) {
         Log::shared().error("Attempt to leave group and perform upload without a current session");
         return;
     }
-    submit(UploadBatchQueueKey::group(currentSession_->identifier, group.name), true);
+    handOver(UploadBatchQueueKey::group(currentSession_->identifier, group.name), true);
 }
 
 void UploadBatches::didStartSession(const Session& session) {
@@ -249,28 +249,28 @@ void UploadBatches::didStartSession(const Session& session) {
     // rest.
     backUpAll();
     terminated_.list();
-    resubmitTerminated();
+    handOverTerminated();
 }
 
-void UploadBatches::resubmitTerminated() {
+void UploadBatches::handOverTerminated() {
     constexpr std::size_t atOnce = std::size_t{256} * 1024;
     const auto self = weak_from_this();
     for (std::size_t bytes = 0; !terminated_.isEmpty() && (bytes < atOnce || self.expired());) {
         bytes += terminated_.sendNext([this](UploadBatchEntity batch) {
-            assertOnQueue("UploadBatchEventProcessor::resubmitTerminated");
-            resubmit(std::move(batch));
+            assertOnQueue("UploadBatchEventProcessor::handOverTerminated");
+            handOverTerminated(std::move(batch));
         });
     }
     if (terminated_.isEmpty()) return;
     accessQueue_->async([self] {
         const auto batches = self.lock();
         if (!batches) return;
-        batches->assertOnQueue("UploadBatchEventProcessor::resubmitTerminated");
-        batches->resubmitTerminated();
+        batches->assertOnQueue("UploadBatchEventProcessor::handOverTerminated");
+        batches->handOverTerminated();
     });
 }
 
-void UploadBatches::resubmit(UploadBatchEntity batch) {
+void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
     Log::shared().default_("Attempting to resubmit terminated batch, identifier=%{public}@", batch.identifier);
     // A batch of this run that could not be handed over at its session's end. Its row may be behind: then the batch
     // itself goes out.
@@ -289,7 +289,7 @@ void UploadBatches::resubmit(UploadBatchEntity batch) {
     };
     DocumentHandOver::Removal removal;
     try {
-        removal = handOver_.upload(batch, hasNotGrown);
+        removal = documents_.handOver(batch, hasNotGrown);
         if (removal.error) {
             Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
                                 batch.identifier, removal.error->what());
@@ -307,7 +307,7 @@ void UploadBatches::resubmit(UploadBatchEntity batch) {
 
 void UploadBatches::didUpdateSession(const Session& session, bool submitQueues) {
     assertOnQueue("UploadBatchEventProcessor::didUpdateSession");
-    if (currentSession_ && submitQueues) submit(UploadBatchQueueKey::session(currentSession_->identifier), true);
+    if (currentSession_ && submitQueues) handOver(UploadBatchQueueKey::session(currentSession_->identifier), true);
     setSession(session);
 }
 
@@ -326,7 +326,7 @@ void UploadBatches::didEndSession() {
     std::vector<UploadBatchQueueKey> keys;
     keys.reserve(batchQueues_.size());
     for (const auto& [key, queue] : batchQueues_) keys.push_back(key);
-    for (const auto& key : keys) submit(key, true);
+    for (const auto& key : keys) handOver(key, true);
     currentSession_.reset();
     try {
         deferredStore_->perform([](Rows& rows) { rows.close(); });

@@ -82,19 +82,19 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     void dropDelivered() CORVANE_REQUIRES(*accessQueue_);
 
     /// Hands a batch over when it is full, or in any case; one that is refused is open again.
-    void submit(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
+    void handOver(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
     /// Hands a batch over that is in no list any more, with the session's data as it is now.
     /// Throws what the manager throws; the batch is then as it was.
-    void handOver(UploadBatchQueue& queue) CORVANE_REQUIRES(*accessQueue_);
+    void tryHandOver(UploadBatchQueue& queue) CORVANE_REQUIRES(*accessQueue_);
     /// Sees to it that a batch whose document is under way without a row of its own stays in its backup.
     void keep(UploadBatchQueue& queue, const std::string& document) CORVANE_REQUIRES(*accessQueue_);
     /// Puts a batch back that was refused, before what was added to its successor meanwhile.
     void putBack(Queues::node_type refused) CORVANE_REQUIRES(*accessQueue_);
 
     /// Sends some of the terminated batches, and goes on later, behind what waits on the queue.
-    void resubmitTerminated() CORVANE_REQUIRES(*accessQueue_);
+    void handOverTerminated() CORVANE_REQUIRES(*accessQueue_);
     /// Sends one as its row holds it, or as it is open here if that has more.
-    void resubmit(UploadBatchEntity batch) CORVANE_REQUIRES(*accessQueue_);
+    void handOverTerminated(UploadBatchEntity batch) CORVANE_REQUIRES(*accessQueue_);
 
     // Constant after construction.
     const std::shared_ptr<DeliveryLedger> ledger_;
@@ -108,7 +108,7 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     mutable Mutex registrationMutex_;
     std::shared_ptr<SerialQueue> accessQueue_;
 
-    DocumentHandOver handOver_ CORVANE_GUARDED_BY(*accessQueue_);
+    DocumentHandOver documents_ CORVANE_GUARDED_BY(*accessQueue_);
     Queues batchQueues_ CORVANE_GUARDED_BY(*accessQueue_);
     // By document.
     std::map<std::string, UploadBatchQueue> unsaved_ CORVANE_GUARDED_BY(*accessQueue_);

@@ -69,10 +69,16 @@ class SessionCore final : public TrackerDelegate,
 
     SessionCore();
 
+    /// The record of the active session as of now, for processors.
     [[nodiscard]] Session sessionOf(const ActiveSession& active) const;
+    /// The session's dictionary: its identifier, and what lies on top of each stack of session data. Encodes host data,
+    /// whose code may push meanwhile.
     [[nodiscard]] JSON sessionData(const std::string& identifier) const;
+    /// Tells the observers that are registered now of a step, in the order of their registration.
     void announce(SessionChange change);
+    /// After a session's end: takes data with the trait `onlyOnce` off its stack, and drops empty stacks.
     void pruneOnceOnlyData();
+    /// Drops the observers for which `isOver` holds; what their blocks hold is destroyed last.
     template <class Predicate>
     void dropObservers(Predicate isOver);
 
@@ -87,6 +93,7 @@ class SessionCore final : public TrackerDelegate,
 
     SessionState state_ CORVANE_GUARDED_BY(*accessQueue_) = None{};
     DataEventStacks dataStacks_ CORVANE_GUARDED_BY(*accessQueue_);
+    // In the order of registration; those whose object is gone are dropped once the list has doubled.
     std::vector<std::shared_ptr<SessionObserver>> observers_ CORVANE_GUARDED_BY(*accessQueue_);
     std::size_t pruneAt_ CORVANE_GUARDED_BY(*accessQueue_) = 16;
 };

@@ -84,10 +84,6 @@ void ensureFile(const std::filesystem::path& file, const std::string& contents) 
 
 }  // namespace
 
-SigningError::SigningError(Code code, const std::string& detail)
-    : Error("Corvane.SigningError", code, "cannot sign: " + detail) {}
-SigningError::~SigningError() = default;
-
 FileSigningService::FileSigningService(std::optional<std::filesystem::path> directory)
     : directory_(std::move(directory)) {}
 FileSigningService::~FileSigningService() = default;

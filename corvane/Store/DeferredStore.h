@@ -1,7 +1,6 @@
 #pragma once
 
 #include <corvane/Store/DeferredStoreCore.h>
-#include <corvane/Store/DeferredStoreError.h>
 #include <corvane/Store/Store.h>
 
 #include <memory>

@@ -1,7 +1,6 @@
 #include <corvane/Store/DeferredStoreCore.h>
 
 #include <corvane/Platform/Log.h>
-#include <corvane/Store/DeferredStoreError.h>
 #include <corvane/Store/Store.h>
 #include <corvane/Store/VersionEntity.h>
 

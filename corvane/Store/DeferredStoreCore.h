@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Platform/Error.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Store/StoreConnection.h>
 #include <corvane/Store/StoreTable.h>
@@ -10,6 +11,20 @@
 #include <string>
 
 namespace corvane {
+
+/// What a deferred store itself throws: `DeferredStore<Entity>::Errors`. Domain "Corvane.DeferredStore.Errors".
+class DeferredStoreError : public Error {
+  public:
+    enum Code {
+        noStore = 0,  ///< neither the database file nor one in memory could be had; the log says why
+    };
+    explicit DeferredStoreError(Code code);
+    DeferredStoreError(const DeferredStoreError&) = default;
+    DeferredStoreError& operator=(const DeferredStoreError&) = default;
+    ~DeferredStoreError() override;
+
+    [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
+};
 
 /// What every `DeferredStore` does, whatever its entity: makes the connection on the shared queue, checks the table's
 /// schema version, falls back to memory.

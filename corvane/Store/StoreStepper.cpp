@@ -6,10 +6,6 @@ namespace corvane {
 
 namespace {
 
-sqlite3_stmt* handle(void* statement) {
-    return static_cast<sqlite3_stmt*>(statement);
-}
-
 [[noreturn]] void throwBadColumn(int column, const char* missing) {
     throw StoreStepperError(StoreStepperError::badColumn, "column " + std::to_string(column) + " holds no " + missing);
 }
@@ -32,9 +28,9 @@ int StoreStepper::take() {
 
 std::optional<std::string> StoreStepper::optionalText() {
     const int column = take();
-    const auto* text = reinterpret_cast<const char*>(sqlite3_column_text(handle(statement_), column));
+    const auto* text = reinterpret_cast<const char*>(sqlite3_column_text(statement_, column));
     if (!text) return std::nullopt;
-    return std::string(text, static_cast<std::size_t>(sqlite3_column_bytes(handle(statement_), column)));
+    return std::string(text, static_cast<std::size_t>(sqlite3_column_bytes(statement_, column)));
 }
 
 std::string StoreStepper::text() {
@@ -45,19 +41,19 @@ std::string StoreStepper::text() {
 
 std::int64_t StoreStepper::integer() {
     const int column = take();
-    return sqlite3_column_int64(handle(statement_), column);
+    return sqlite3_column_int64(statement_, column);
 }
 
 double StoreStepper::double_() {
     const int column = take();
-    return sqlite3_column_double(handle(statement_), column);
+    return sqlite3_column_double(statement_, column);
 }
 
 std::string StoreStepper::bytes() {
     const int column = take();
-    const auto* bytes = static_cast<const char*>(sqlite3_column_blob(handle(statement_), column));
+    const auto* bytes = static_cast<const char*>(sqlite3_column_blob(statement_, column));
     if (!bytes) throwBadColumn(column, "bytes");
-    return {bytes, static_cast<std::size_t>(sqlite3_column_bytes(handle(statement_), column))};
+    return {bytes, static_cast<std::size_t>(sqlite3_column_bytes(statement_, column))};
 }
 
 }  // namespace corvane

@@ -1,12 +1,30 @@
 #pragma once
 
-#include <corvane/Store/StoreStepperError.h>
+#include <corvane/Platform/Error.h>
 
 #include <cstdint>
 #include <optional>
 #include <string>
 
+struct sqlite3_stmt;
+
 namespace corvane {
+
+/// A result row is not what the entity needs: `StoreStepper::Errors`. Domain "Corvane.StoreStepper.Errors".
+class StoreStepperError : public Error {
+  public:
+    enum Code {
+        badColumn = 0,        ///< the column holds no text or no bytes where some are needed
+        badDataInColumn = 1,  ///< the column's contents do not decode as the entity requires
+    };
+    /// @param detail which column or what about it, for the message.
+    StoreStepperError(Code code, const std::string& detail);
+    StoreStepperError(const StoreStepperError&) = default;
+    StoreStepperError& operator=(const StoreStepperError&) = default;
+    ~StoreStepperError() override;
+
+    [[nodiscard]] Code value() const noexcept { return static_cast<Code>(code()); }
+};
 
 /// Reads one result row, column by column in table order. Every read takes the next column, whether it succeeds or
 /// throws.
@@ -18,7 +36,7 @@ class StoreStepper {
 
     /// @param statement the prepared statement that stands on a row, as the database connection holds it; nullptr for
     /// no row, which makes every read throw.
-    explicit StoreStepper(void* statement) noexcept : statement_(statement) {}
+    explicit StoreStepper(sqlite3_stmt* statement) noexcept : statement_(statement) {}
 
     /// The next column's text. Throws `badColumn` for NULL.
     [[nodiscard]] std::string text();
@@ -39,7 +57,7 @@ class StoreStepper {
     int take();
 
     std::int32_t index_ = 0;
-    void* statement_;
+    sqlite3_stmt* statement_;
 };
 
 }  // namespace corvane

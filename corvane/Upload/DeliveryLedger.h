@@ -32,7 +32,7 @@ class DeliveryLedger {
     /// Strikes out a document whose hand-over was refused. Harmless for one that is not there.
     void remove(std::string_view identifier);
     /// Enters a document of an earlier run, whose number of events is not known.
-    void resubmitted(std::string_view identifier) { add(identifier, 0); }
+    void addEarlier(std::string_view identifier) { add(identifier, 0); }
     /// Settles a document, for good. Harmless for one that is not there.
     void settle(std::string_view identifier, Outcome outcome);
 

@@ -143,7 +143,7 @@ void UploadManager::retryStoredRequests() {
     removeOrphans();
     std::vector<SignedEntity> kept;
     for (auto& entity : entities) {
-        if (ledger_) ledger_->resubmitted(entity.identifier);
+        if (ledger_) ledger_->addEarlier(entity.identifier);
         if (entity.retries > maximumRetries) {
             dropExceeded(entity);
         } else {

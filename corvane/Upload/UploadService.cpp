@@ -164,10 +164,10 @@ std::shared_ptr<TransferSession> UploadService::session() noexcept {
 }
 
 void UploadService::submit(const PreparedUploadRequest& request) {
-    if (const auto opened = session()) submit(*opened, request);
+    if (const auto opened = session()) startTask(*opened, request);
 }
 
-void UploadService::submit(TransferSession& session, const PreparedUploadRequest& request) {
+void UploadService::startTask(TransferSession& session, const PreparedUploadRequest& request) {
     const std::string signatureText = signature(request.dataFileURL);
     HTTPHeaders headers{{"Content-Type", headerText(request.contentType)},
                         {"User-Agent", headerText(request.userAgent)},
@@ -218,7 +218,7 @@ void UploadService::resubmit(std::vector<PreparedUploadRequest> requests) {
         return;
     }
     opened->tasks([weak = weak_from_this(), requests = std::move(requests)](const auto& tasks) {
-        if (const auto service = weak.lock()) service->resubmit(requests, tasks);
+        if (const auto service = weak.lock()) service->startMissing(requests, tasks);
     });
 }
 
@@ -228,8 +228,8 @@ void UploadService::inFlight(std::function<void(const std::set<std::string>&)> a
     }
 }
 
-void UploadService::resubmit(const std::vector<PreparedUploadRequest>& requests,
-                             const std::vector<std::shared_ptr<TransferTask>>& tasks) {
+void UploadService::startMissing(const std::vector<PreparedUploadRequest>& requests,
+                                 const std::vector<std::shared_ptr<TransferTask>>& tasks) {
     const auto inFlight = identifiersOfRunning(tasks);
     std::set<std::string> ended;
     {

@@ -83,18 +83,28 @@ class UploadService final : public UploadServiceType,
   private:
     using Completions = std::vector<std::function<void()>>;
 
+    /// Opens the transfer session, once: under the lock of `lazyURLSession_`. Throws what the factory throws.
     std::shared_ptr<TransferSession> openSession();
+    /// The session, opened with the first use; nullptr when it cannot be, which is logged. The next use tries again.
     std::shared_ptr<TransferSession> session() noexcept;
-    void submit(TransferSession& session, const PreparedUploadRequest& request);
-    void resubmit(const std::vector<PreparedUploadRequest>& requests,
-                  const std::vector<std::shared_ptr<TransferTask>>& tasks);
+    /// Makes the upload task of a request and resumes it. A signature that cannot be made goes out as its error.
+    void startTask(TransferSession& session, const PreparedUploadRequest& request);
+    /// Starts what is neither running, as the listing says, nor has ended since the listing was asked for.
+    void startMissing(const std::vector<PreparedUploadRequest>& requests,
+                      const std::vector<std::shared_ptr<TransferTask>>& tasks);
+    /// The text of the signature's header.
     std::string signature(const std::filesystem::path& file);
+    /// Asks the host for its headers, and adds those that may be sent.
     void appendHostHeaders(HTTPHeaders& headers) const;
+    /// Remembers the end of an upload for the listings that are under way. Returns who is to be told of it.
     std::shared_ptr<UploadServiceDelegate> noteEnd(const TransferTask& task);
+    /// What the end of a task means for its upload; logs it.
     UploadResult result(const TransferTask& task, const std::optional<AnyError>& error,
                         const std::optional<TransferResponse>& response);
     UploadResult result(const std::string& identifier, const std::string& taskID, UploadResponse response);
+    /// The task in the log: "<session>.<number>".
     std::string urlSessionTaskID(const TransferTask& task);
+    /// Calls and forgets the completions of the platform's wake-ups. On the main queue.
     void invokeBackgroundCompletions(const std::string& session);
     static void invoke(const Completions& completions) noexcept;
 

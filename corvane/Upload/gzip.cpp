@@ -1,7 +1,5 @@
 #include <corvane/Upload/gzip.h>
 
-#include <corvane/Upload/GZIPError.h>
-
 #include <zlib.h>
 
 #include <limits>

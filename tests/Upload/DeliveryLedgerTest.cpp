@@ -19,8 +19,8 @@ TEST(DeliveryLedger, FoldsOutcomesIntoTotals) {
     ledger.add("b", 20);
     ledger.add("c", 1);
     ledger.add("d", 3);
-    ledger.resubmitted("old");
-    ledger.resubmitted("a");  // is known: changes nothing
+    ledger.addEarlier("old");
+    ledger.addEarlier("a");  // is known: changes nothing
     ledger.settle("a", Outcome::delivered);
     ledger.settle("b", Outcome::pending);
     ledger.settle("b", Outcome::delivered);  // settled for good
