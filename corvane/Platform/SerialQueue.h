@@ -84,7 +84,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
     void assertNotCurrent(const char* operation) const;
 
   private:
-    struct CORVANE_LOCAL State;
+    struct State;
     struct FunctionRef {
         void* object;
         void (*call)(void*);
