@@ -3,13 +3,7 @@
 #include <corvane/Bridge/CV.h>
 
 #include "tests/support/RecordingProcessor.h"
-
-#include <gtest/gtest.h>
-
-#include <memory>
-#include <string>
-#include <utility>
-#include <vector>
+#include "tests/support/Testing.h"
 
 namespace corvane::test {
 

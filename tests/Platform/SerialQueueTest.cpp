@@ -1,19 +1,9 @@
 #include <corvane/Platform/SerialQueue.h>
 
-#include "tests/support/CapturedLog.h"
-
-#include <gtest/gtest.h>
-
 #include <sys/resource.h>
 #include <unistd.h>
 
-#include <atomic>
-#include <cstdlib>
-#include <future>
-#include <stdexcept>
-#include <string>
-#include <thread>
-#include <vector>
+#include "tests/support/Testing.h"
 
 namespace corvane {
 namespace {
@@ -60,17 +50,15 @@ TEST(SerialQueue, SyncReturnsResultsAndRethrowsOnBothPaths) {
 }
 
 TEST(SerialQueue, SyncIsOnItsQueueAndStillOnTheOuterOne) {
-    SerialQueue outer("outer");
-    SerialQueue inner("inner");
+    SerialQueue outer("outer"), inner("inner");
     const auto check = [&] {
         inner.sync([&] { EXPECT_TRUE(inner.isCurrent() && outer.isCurrent()); });
-        EXPECT_TRUE(outer.isCurrent());
-        EXPECT_FALSE(inner.isCurrent());
+        EXPECT_TRUE(outer.isCurrent() && !inner.isCurrent());
     };
     outer.sync(check);
     std::promise<void> release;
     inner.async([&] { release.get_future().wait(); });
-    outer.async([&] { check(); });
+    outer.async(check);
     release.set_value();
     outer.sync([] {});
     EXPECT_FALSE(outer.isCurrent());
@@ -138,7 +126,6 @@ TEST(SerialQueue, LogsWhatATaskThrowsAndGoesOn) {
 
 // The limit holds for users without privileges, in a process of its own.
 TEST(SerialQueueDeathTest, SyncRunsWhatWaitsItselfWhenThereIsNoThreadToBeHad) {
-    GTEST_FLAG_SET(death_test_style, "threadsafe");
     const auto withoutThreads = [] {
         const rlimit none{1, 1};
         if (geteuid() == 0 && setuid(65534) != 0) std::_Exit(2);
@@ -158,7 +145,6 @@ TEST(SerialQueueDeathTest, SyncRunsWhatWaitsItselfWhenThereIsNoThreadToBeHad) {
 }
 
 TEST(SerialQueueDeathTest, StopsOnProgrammingErrors) {
-    GTEST_FLAG_SET(death_test_style, "threadsafe");
     SerialQueue queue("com.example.q");
     EXPECT_DEATH(queue.resume(), "resume of a queue that is not suspended, queue=com.example.q");
     EXPECT_DEATH(queue.sync([&] { queue.sync([] {}); }), "would wait for itself, queue=com.example.q");

@@ -1,4 +1,3 @@
-#include "tests/support/CapturedLog.h"
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {
