@@ -111,7 +111,10 @@ TEST_F(BridgeSessions, ObserversAreToldUntilTheirObjectGoes) {
     EXPECT_EQ(late, "{}");
     EXPECT_EQ(blocks, 1);
     owner.reset();
-    sessions->startSessionForKind(CVSessionKind::userEvents);
+    for (int session = 0; session < 2; ++session) {
+        sessions->startSessionForKind(CVSessionKind::userEvents);
+        sessions->endSession();
+    }
     processor->drain();
     EXPECT_EQ(changes.size(), 2u);
     EXPECT_EQ(blocks, 2);

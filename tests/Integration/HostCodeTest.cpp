@@ -6,25 +6,22 @@ namespace corvane::test {
 namespace {
 
 /// A processor that does the same thing in every callback, and says in which it was.
-class EveryCallback final : public EventProcessorType {
-  public:
+struct EveryCallback final : EventProcessorType {
     using Action = std::function<void(const std::string& callback)>;
-    explicit EveryCallback(Action action) : action_(std::move(action)) {}
+    explicit EveryCallback(Action given) : action(std::move(given)) {}
 
     void registerAccessQueue(std::shared_ptr<SerialQueue>) override {}
-    void process(const ProcessEvent&) override { action_("process"); }
-    void didEnterGroup(const Group&) override { action_("didEnterGroup"); }
-    void didLeaveGroup(const Group&) override { action_("didLeaveGroup"); }
-    void didStartSession(const Session&) override { action_("didStartSession"); }
-    void didUpdateSession(const Session&, bool) override { action_("didUpdateSession"); }
-    void didEndSession(const Session&, Date) override { action_("didEndSession"); }
+    void process(const ProcessEvent&) override { action("process"); }
+    void didEnterGroup(const Group&) override { action("didEnterGroup"); }
+    void didLeaveGroup(const Group&) override { action("didLeaveGroup"); }
+    void didStartSession(const Session&) override { action("didStartSession"); }
+    void didUpdateSession(const Session&, bool) override { action("didUpdateSession"); }
+    void didEndSession(const Session&, Date) override { action("didEndSession"); }
     bool resumeBackgroundProcessing(const std::string&, const std::function<void()>&) override {
-        action_("resumeBackgroundProcessing");
+        action("resumeBackgroundProcessing");
         return false;
     }
-
-  private:
-    const Action action_;
+    const Action action;
 };
 
 struct Calling {

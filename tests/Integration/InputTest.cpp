@@ -1,7 +1,4 @@
-#include "tests/Integration/Application.h"
-
-#include "tests/support/Documents.h"
-#include "tests/support/Testing.h"
+#include "tests/Integration/FaultFixture.h"
 
 namespace corvane::test {
 namespace {
@@ -14,7 +11,7 @@ struct Attached {
     EventProperty<Attachment> attachment = required;
 };
 
-class Input : public ::testing::Test {
+class Input : public ::testing::Test, protected FaultFixture {
   protected:
     static JSON objects(int levels) {
         std::string text = "{}";
@@ -31,9 +28,6 @@ class Input : public ::testing::Test {
         }
         return contents;
     }
-
-    TemporaryDocuments documents;
-    ScriptedServer server;
 };
 
 TEST_F(Input, LargeWideAndDeepEventsAreDeliveredAndAlsoReadBackAfterARestart) {

@@ -183,6 +183,7 @@ TEST(DataEvent, IsEncodedOnceAndGivenBackByType) {
             encoder.endObject();
         }
     };
+    encodings = 0;
     const AnyDataEvent event{Counting{}};
     EXPECT_EQ(event.toDict().text() + event.toDict().text(), "{}{}");
     EXPECT_EQ(encodings, 1);
@@ -195,18 +196,13 @@ template <class T, class U>
 struct Pair {};
 struct Outer {
     struct Inner {};
-    struct Named {
-        static constexpr std::string_view typeName = "Outer.Named";
-    };
 };
 }  // namespace media
 
 TEST(TypeName, IsTheLastComponentOfEveryName) {
     struct Local {};
-    EXPECT_EQ(typeName<Track>(), "Track");
     EXPECT_EQ(typeName<Local>(), "Local");
     EXPECT_EQ(typeName<media::Outer::Inner>(), "Inner");
-    EXPECT_EQ(typeName<media::Outer::Named>(), "Outer.Named");
     EXPECT_EQ((typeName<media::Pair<Track, media::Pair<Local, media::Outer>>>()), "Pair<Track, Pair<Local, Outer>>");
 }
 

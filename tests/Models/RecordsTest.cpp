@@ -1,7 +1,6 @@
 #include <corvane/Models/Client.h>
 #include <corvane/Models/Decoding.h>
 #include <corvane/Models/EventData.h>
-#include <corvane/Models/ProcessEvent.h>
 #include <corvane/Models/SessionData.h>
 #include <corvane/Models/TimedData.h>
 
@@ -53,14 +52,6 @@ TEST(Client, ComesFromABundleOrNotAtAll) {
         EXPECT_THROW(Client("com.example.app", bad, "1", 1), InvalidArgument);
         EXPECT_THROW(Client("com.example.app", "App", bad, 1), InvalidArgument);
     }
-}
-
-TEST(ProcessEvent, PayloadHoldsDataAndMetadataButNotTheGroup) {
-    const JSON json(R"({"screen":{"name":"home"}})");
-    EXPECT_EQ(ProcessEvent("View", json, "group").payload().text(),
-              R"({"data":{"screen":{"name":"home"}},"metadata":{"name":"View","version":"0.1.0"}})");
-    EXPECT_THROW((void)ProcessEvent("View", JSON("[]"), std::nullopt).payload(), JSONError);
-    EXPECT_THROW((void)ProcessEvent("View", JSON("broken"), std::nullopt).payload(), JSONError);
 }
 
 }  // namespace

@@ -38,13 +38,10 @@ TEST(SerialQueue, SyncReturnsResultsAndRethrowsOnBothPaths) {
     const auto caller = std::this_thread::get_id();
     EXPECT_EQ(queue.sync([] { return std::this_thread::get_id(); }), caller) << "an idle queue needs no thread switch";
     EXPECT_THROW(queue.sync([] { throw std::runtime_error("x"); }), std::runtime_error);
-
     std::promise<void> release;
     queue.async([&] { release.get_future().wait(); });
-    std::thread releaser([&] { release.set_value(); });
+    std::jthread releaser([&] { release.set_value(); });
     EXPECT_EQ(queue.sync([] { return 7; }), 7);
-    releaser.join();
-
     queue.async([] {});
     EXPECT_THROW(queue.sync([]() -> int { throw std::runtime_error("x"); }), std::runtime_error);
 }

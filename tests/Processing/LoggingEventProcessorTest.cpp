@@ -11,8 +11,7 @@ std::string logged(const LoggingEventProcessorFormat& format, const ProcessEvent
     return log.lines().at(0).message;
 }
 
-class Shouting final : public LoggingEventProcessorFormatterType {
-  public:
+struct Shouting final : LoggingEventProcessorFormatterType {
     std::string format(const ProcessEvent& event) const override { return event.name() + "! %@ %ld"; }
 };
 

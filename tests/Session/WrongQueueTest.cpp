@@ -35,7 +35,10 @@ TEST_F(WrongQueueDeathTest, NothingRunsWhereItWouldRaceOrWaitForItself) {
         {[&] { access.push(Screen{}); }, "Tracker push" + must},
         {[&] { access.pop<Screen>(); }, "Tracker pop" + must},
         {[&] { (void)session.isActive(); }, "SessionManager activeSession" + must},
-        {[&] { session.push(SessionData{"screen", Screen{}}); }, "SessionManager push" + must},
+        {[&] {
+             session.push(SessionData{"screen", Screen{}});
+         },
+         "SessionManager push" + must},
         {[&] { manager.process(event); }, "process" + must},
         {[&] { manager.didStartSession(ended); }, "didStartSession" + must},
         {[&] { uploads.process(event); }, "UploadBatchEventProcessor::process" + must},

@@ -12,21 +12,6 @@ class Handles : public TrackingTest {
     struct Mark {};
 };
 
-TEST_F(Handles, ATransactionRunsInlineAndSurvivesWhatItsBlockThrows) {
-    std::vector<std::string> order;
-    root->submit<Mark>([&](const EventSubmitResult&) { order.emplace_back("before"); });
-    root->transaction([&](AccessTracker& access) {
-        access.push(Screen{"inside"});
-        access.submit<ScreenView>([&](const EventSubmitResult& result) { order.push_back(result.event()->name()); });
-        order.emplace_back("end");
-        access.pop<Screen>();
-        throw std::runtime_error("x");
-    });
-    root->submit<Mark>([&](const EventSubmitResult&) { order.emplace_back("after"); });
-    processor->drain();
-    EXPECT_EQ(order, (std::vector<std::string>{"before", "ScreenView", "end", "after"}));
-}
-
 TEST_F(Handles, ADelayedSubmissionCarriesTheTimeOfTheCallAndGoesOutOnce) {
     const auto token = root->delayedSubmit<Identified>();
     const Date after = now();
@@ -51,27 +36,6 @@ TEST_F(Handles, ADelayedSubmissionCarriesTheTimeOfTheCallAndGoesOutOnce) {
     processor->drain();
     EXPECT_FALSE(called);
     EXPECT_TRUE(orphan->sealed());
-}
-
-TEST_F(Handles, WhenSessionRunsOnceNowOrWithTheNextStart) {
-    int now = 0, later = 0;
-    root->whenSession([&](AccessTracker&) { ++now; });
-    processor->drain();
-    EXPECT_EQ(now, 1);
-    sessions->endSync();
-    root->whenSession([&](AccessTracker& access) {
-        ++later;
-        access.submit<Mark>();
-        throw 1;
-    });
-    processor->drain();
-    EXPECT_EQ(later, 0);
-    for (int i = 0; i < 2; ++i) {
-        sessions->start(Session::Kind::userEvents());
-        sessions->endSync();
-    }
-    EXPECT_EQ(later, 1);
-    EXPECT_EQ(processor->events.size(), 1u);
 }
 
 TEST_F(Handles, BlocksThatRunOnceLetGoOfWhatTheyHold) {
