@@ -90,8 +90,8 @@ TEST_F(BridgeInput, NamesAndObjectsThatCannotBeUsedChangeNothing) {
     const auto start = [&](int kind, const char* name, CVError* error) {
         return sessions->startSessionForKind(static_cast<CVSessionKind>(kind), name, error);
     };
-    const auto pushData = [&](const CVSessionData& data, CVError* error) {
-        return sessions->pushSessionData(data, {}, false, error);
+    const auto pushData = [&](const char* key, std::shared_ptr<CVDataEventType> data, CVError* error) {
+        return sessions->pushSessionData({key, std::move(data)}, {}, false, error);
     };
     const std::string noData = "0: the data event is missing", noName = "1: the data event's name is not UTF-8",
                       noKind = "2: the session's kind is not a value of its enumeration";
@@ -104,18 +104,9 @@ TEST_F(BridgeInput, NamesAndObjectsThatCannotBeUsedChangeNothing) {
         {[&](CVError* e) { return root->pushDataEvent(unnamed, {}, "script.lua", 7, e); }, noName},
         {[&](CVError* e) { return root->chainWithName("\xff", e) != nullptr; }, "1: the tracker's name is not UTF-8"},
         {[&](CVError* e) { return root->enterGroupWithName("\xff", e); }, "1: the group's name is not UTF-8"},
-        {[&](CVError* e) {
-             return pushData({"k", nullptr}, e);
-         },
-         noData},
-        {[&](CVError* e) {
-             return pushData({"\xff", screen}, e);
-         },
-         "1: the key of the session data is not UTF-8"},
-        {[&](CVError* e) {
-             return pushData({"k", unnamed}, e);
-         },
-         noName},
+        {[&](CVError* e) { return pushData("k", nullptr, e); }, noData},
+        {[&](CVError* e) { return pushData("\xff", screen, e); }, "1: the key of the session data is not UTF-8"},
+        {[&](CVError* e) { return pushData("k", unnamed, e); }, noName},
         {[&](CVError* e) { return start(3, "\xff", e); }, "1: the name of the session's kind is not UTF-8"},
         {[&](CVError* e) { return start(4, "", e); }, noKind},
         {[&](CVError* e) { return start(-1, "", e); }, noKind},

@@ -79,15 +79,20 @@ TEST(SerialQueue, SuspensionsNestAndHoldBackOnlyLaterTasks) {
     waiter.join();
     EXPECT_EQ(ran, 2);
 
-    // A task may suspend its own queue: the next one waits, though it was already taken up with the first.
+    // A task may suspend its own queue: the next one waits, though it was taken up together with the first.
     std::promise<void> suspended;
+    std::atomic<bool> resumed = false;
+    queue.suspend();
     queue.async([&] {
         queue.suspend();
         suspended.set_value();
     });
-    queue.async([&] { ran = 10; });
+    queue.async([&] { ran = resumed ? 10 : -1; });
+    queue.resume();
     suspended.get_future().wait();
+    for (int i = 0; i < 10000 && ran == 2; ++i) std::this_thread::yield();  // a chance for one that does not wait
     EXPECT_EQ(ran, 2);
+    resumed = true;
     queue.resume();
     queue.sync([] {});
     EXPECT_EQ(ran, 10);

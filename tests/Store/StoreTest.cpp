@@ -93,6 +93,9 @@ TEST(Store, FailedStatementsCarryTheirTextAndKeepDataOutOfTheMessage) {
     const auto unexecuted = thrownBy([&] { connection.run("INSERT INTO t VALUES (NULL);"); });
     EXPECT_EQ(unexecuted.value(), StoreError::execute);
     EXPECT_EQ(unexecuted.sql(), "INSERT INTO t VALUES (NULL);");
+    const auto overflow = "SELECT 1 UNION ALL SELECT abs(-9223372036854775807 - 1);";
+    const auto interrupted = thrownBy([&] { connection.query(overflow, [](StoreStepper&) {}); });
+    EXPECT_EQ(interrupted.value(), StoreError::execute) << "what was read by then is not all there is";
 }
 
 TEST(StoreStepper, AReadTakesItsColumnWhetherItFailsOrNot) {

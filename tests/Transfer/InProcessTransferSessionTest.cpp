@@ -43,7 +43,7 @@ class Recorder final : public TransferSessionDelegate {
         EXPECT_TRUE(completions_.emplace(task.identifier(), Completion{error, response, task.state()}).second);
         changed_.notify_all();
     }
-    void allEventsDelivered() override {}
+    void allEventsDelivered() override { completedAtSignal.push_back(completed()); }
 
     Completion wait(const TransferTask& task) {
         std::unique_lock lock(mutex_);
@@ -59,6 +59,8 @@ class Recorder final : public TransferSessionDelegate {
         std::lock_guard lock(mutex_);
         return sums_.at(task.identifier());
     }
+
+    std::vector<std::size_t> completedAtSignal;  // to be read behind what the queue has run
 
   private:
     mutable std::mutex mutex_;
@@ -313,6 +315,15 @@ TEST_F(InProcessTransferSessionTest, ListsTasksBehindPendingCompletions) {
     queue->sync([] {});
     EXPECT_EQ(listed, (std::vector<std::pair<std::int64_t, State>>{{2, State::running}, {3, State::suspended}}));
     EXPECT_EQ(recorder->completed(), 1u);
+}
+
+TEST_F(InProcessTransferSessionTest, SignalsAWakeUpOnceAndBehindWhatIsPending) {
+    auto session = open();
+    session->deliverPendingEvents();
+    recorder->wait(*start(*session, server.url()));
+    session->deliverPendingEvents();
+    queue->sync([] {});
+    EXPECT_EQ(recorder->completedAtSignal, (std::vector<std::size_t>{0, 1}));
 }
 
 TEST_F(InProcessTransferSessionTest, CancelsItsTransfersWhenItGoes) {
