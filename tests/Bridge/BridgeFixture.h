@@ -3,29 +3,18 @@
 #include <corvane/Bridge/CV.h>
 
 #include "tests/support/RecordingProcessor.h"
-
-#include <gtest/gtest.h>
-
-#include <memory>
-#include <string>
-#include <utility>
-#include <vector>
+#include "tests/support/Testing.h"
 
 namespace corvane::test {
 
 /// An event class whose properties are given, and which counts how often it is asked for them.
-class CountingEvent final : public CVEventType {
-  public:
-    CountingEvent(std::vector<CVEventProperty> properties, std::shared_ptr<int> asked)
-        : properties_(std::move(properties)), asked_(std::move(asked)) {}
-    std::vector<CVEventProperty> eventProperties() const override {
-        ++*asked_;
-        return properties_;
-    }
+struct CountingEvent final : CVEventType {
+    CountingEvent(std::vector<CVEventProperty> given, std::shared_ptr<int> count)
+        : properties(std::move(given)), asked(std::move(count)) {}
+    std::vector<CVEventProperty> eventProperties() const override { return ++*asked, properties; }
 
-  private:
-    std::vector<CVEventProperty> properties_;
-    std::shared_ptr<int> asked_;
+    const std::vector<CVEventProperty> properties;
+    const std::shared_ptr<int> asked;
 };
 
 inline CVEventClass eventClass(std::string name, std::vector<CVEventProperty> properties,

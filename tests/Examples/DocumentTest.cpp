@@ -2,9 +2,7 @@
 #include <examples/collector/Refusal.h>
 #include <examples/collector/gunzip.h>
 
-#include <gtest/gtest.h>
-
-#include <string>
+#include "tests/support/Testing.h"
 
 namespace collector {
 namespace {

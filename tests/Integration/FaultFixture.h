@@ -1,21 +1,12 @@
 #pragma once
 
 #include "tests/Integration/Application.h"
-#include "tests/support/CapturedLog.h"
 #include "tests/support/Documents.h"
-#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/Testing.h"
 
 #include <corvane/Processing/UploadBatchEntity.h>
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Upload/SignedEntity.h>
-
-#include <gtest/gtest.h>
-
-#include <filesystem>
-#include <iterator>
-#include <set>
-#include <string>
-#include <vector>
 
 namespace corvane::test {
 

@@ -1,14 +1,4 @@
-#include "tests/Integration/Application.h"
-
-#include <corvane/Upload/UploadRequest.h>
-
-#include "tests/support/Documents.h"
-#include "tests/support/TemporaryDocuments.h"
-
-#include <gtest/gtest.h>
-
-#include <future>
-#include <map>
+#include "tests/Integration/FaultFixture.h"
 
 namespace corvane::test {
 namespace {
@@ -21,7 +11,7 @@ struct Attached {
     EventProperty<Attachment> attachment = required;
 };
 
-class Input : public ::testing::Test {
+class Input : public ::testing::Test, protected FaultFixture {
   protected:
     static JSON objects(int levels) {
         std::string text = "{}";
@@ -38,9 +28,6 @@ class Input : public ::testing::Test {
         }
         return contents;
     }
-
-    TemporaryDocuments documents;
-    ScriptedServer server;
 };
 
 TEST_F(Input, LargeWideAndDeepEventsAreDeliveredAndAlsoReadBackAfterARestart) {
@@ -89,28 +76,6 @@ TEST_F(Input, LargeWideAndDeepEventsAreDeliveredAndAlsoReadBackAfterARestart) {
     for (const auto& document : documentsAt(server)) {
         const JSON viewer = document["data"]["session"][std::string_view("o'clock\"\0", 9)];
         EXPECT_EQ(viewer["name"].string(), std::string("'\0\n\"", 4));
-    }
-}
-
-TEST_F(Input, TextThatWouldBreakOutOfAHeaderIsRefused) {
-    struct Document final : ResourceType {
-        std::string type, format;
-        [[nodiscard]] std::string contentType() const override { return type; }
-        [[nodiscard]] std::string version() const override { return format; }
-        [[nodiscard]] std::string identifier() const override { return "I"; }
-        [[nodiscard]] JSON jsonObject() const override { return JSON("{}"); }
-    };
-    const Client good("com.example.app", "App", "1", 1);
-    for (const std::string& bad : {std::string("a\0b", 3), std::string("a\rb"), std::string("a\nX-Y: b")}) {
-        EXPECT_THROW(Client(bad, "App", "1", 1), InvalidArgument);
-        EXPECT_THROW(Client("com.example.app", bad, "1", 1), InvalidArgument);
-        EXPECT_THROW(Client("com.example.app", "App", bad, 1), InvalidArgument);
-        EXPECT_THROW(Endpoint(server.url() + bad, "main"), InvalidArgument);
-        const auto document = std::make_shared<Document>();
-        document->type = bad;
-        EXPECT_THROW(UploadRequest(good, document), InvalidArgument);
-        std::swap(document->type, document->format);
-        EXPECT_THROW(UploadRequest(good, document), InvalidArgument);
     }
 }
 

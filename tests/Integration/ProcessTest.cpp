@@ -1,17 +1,12 @@
 #include "tests/support/Documents.h"
-#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/Testing.h"
 
-#include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <array>
 #include <cstdio>
-#include <cstdlib>
-#include <filesystem>
-#include <future>
 #include <sstream>
 
 namespace corvane::test {

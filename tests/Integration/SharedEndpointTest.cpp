@@ -1,7 +1,5 @@
 #include "tests/Integration/FaultFixture.h"
 
-#include <future>
-
 namespace corvane::test {
 namespace {
 

@@ -1,15 +1,7 @@
 #include "tests/Integration/Application.h"
+#include "tests/support/Testing.h"
 
-#include "tests/support/CapturedLog.h"
-#include "tests/support/ScriptedServer.h"
-#include "tests/support/TemporaryDocuments.h"
-
-#include <gtest/gtest.h>
-
-#include <atomic>
-#include <functional>
 #include <random>
-#include <thread>
 
 namespace corvane::test {
 namespace {

@@ -1,22 +1,16 @@
 #include <corvane/Models/JSON.h>
 
-#include <gtest/gtest.h>
-
-#include <string>
+#include "tests/support/Testing.h"
 
 namespace corvane {
 namespace {
 
 TEST(JSON, HoldsAnyTopLevelValueAndSerialisesOnlyObjectsAndArrays) {
-    const JSON number("42");
-    EXPECT_TRUE(number.exists());
-    EXPECT_EQ(number.integer(), 42);
-    EXPECT_THROW((void)number.toData(), JSONError);
-    EXPECT_THROW((void)number.payload(), JSONError);
+    EXPECT_EQ(JSON("42").integer(), 42);
+    EXPECT_THROW((void)JSON("42").toData(), JSONError);
     EXPECT_EQ(JSON(" [1, 2] ").toData(), "[1,2]");
     EXPECT_THROW((void)JSON("[]").payload(), JSONError);
     EXPECT_TRUE(JSON("null").exists());
-    EXPECT_FALSE(JSONError::fromCode(1));
 }
 
 TEST(JSON, IsNothingWhenTheBytesAreNotJSON) {

@@ -1,13 +1,9 @@
 #include <corvane/Models/Client.h>
 #include <corvane/Models/Decoding.h>
 #include <corvane/Models/EventData.h>
-#include <corvane/Models/ProcessEvent.h>
-#include <corvane/Models/Session.h>
 #include <corvane/Models/SessionData.h>
 
-#include "tests/support/CapturedLog.h"
-
-#include <gtest/gtest.h>
+#include "tests/support/Testing.h"
 
 namespace corvane {
 namespace {
@@ -37,12 +33,6 @@ TEST(Records, SessionDataIsOneEntryUnderItsKey) {
     EXPECT_THROW((void)toDict(SessionData{"user", Bare{}}), DataEventError);
 }
 
-TEST(Records, KindsCompareByCaseAndName) {
-    EXPECT_EQ(Session::Kind::custom("a"), Session::Kind::custom("a"));
-    EXPECT_NE(Session::Kind::custom("a"), Session::Kind::custom("b"));
-    EXPECT_NE(Session::Kind::custom(""), Session::Kind::userEvents());
-}
-
 TEST(Client, ComesFromABundleOrNotAtAll) {
     test::CapturedLog log;
     const auto client = [](const char* build) {
@@ -56,15 +46,11 @@ TEST(Client, ComesFromABundleOrNotAtAll) {
     EXPECT_EQ(client("77")->fullVersion(), "2.3.77");
     EXPECT_FALSE(Client::fromBundle(Bundle()));
     EXPECT_EQ(log.count("Failed to make a client"), 1);
-    EXPECT_THROW(Client("com.example\r\nX: y", "App", "1", 1), InvalidArgument);
-}
-
-TEST(ProcessEvent, PayloadHoldsDataAndMetadataButNotTheGroup) {
-    const JSON json(R"({"screen":{"name":"home"}})");
-    EXPECT_EQ(ProcessEvent("View", json, "group").payload().text(),
-              R"({"data":{"screen":{"name":"home"}},"metadata":{"name":"View","version":"0.1.0"}})");
-    EXPECT_THROW((void)ProcessEvent("View", JSON("[]"), std::nullopt).payload(), JSONError);
-    EXPECT_THROW((void)ProcessEvent("View", JSON("broken"), std::nullopt).payload(), JSONError);
+    for (const std::string& bad : {std::string("a\0b", 3), std::string("a\rb"), std::string("a\nX-Y: b")}) {
+        EXPECT_THROW(Client(bad, "App", "1", 1), InvalidArgument);
+        EXPECT_THROW(Client("com.example.app", bad, "1", 1), InvalidArgument);
+        EXPECT_THROW(Client("com.example.app", "App", bad, 1), InvalidArgument);
+    }
 }
 
 }  // namespace

@@ -1,19 +1,9 @@
 #include <corvane/Platform/SerialQueue.h>
 
-#include "tests/support/CapturedLog.h"
-
-#include <gtest/gtest.h>
-
 #include <sys/resource.h>
 #include <unistd.h>
 
-#include <atomic>
-#include <cstdlib>
-#include <future>
-#include <stdexcept>
-#include <string>
-#include <thread>
-#include <vector>
+#include "tests/support/Testing.h"
 
 namespace corvane {
 namespace {
@@ -48,29 +38,24 @@ TEST(SerialQueue, SyncReturnsResultsAndRethrowsOnBothPaths) {
     const auto caller = std::this_thread::get_id();
     EXPECT_EQ(queue.sync([] { return std::this_thread::get_id(); }), caller) << "an idle queue needs no thread switch";
     EXPECT_THROW(queue.sync([] { throw std::runtime_error("x"); }), std::runtime_error);
-
     std::promise<void> release;
     queue.async([&] { release.get_future().wait(); });
-    std::thread releaser([&] { release.set_value(); });
+    std::jthread releaser([&] { release.set_value(); });
     EXPECT_EQ(queue.sync([] { return 7; }), 7);
-    releaser.join();
-
     queue.async([] {});
     EXPECT_THROW(queue.sync([]() -> int { throw std::runtime_error("x"); }), std::runtime_error);
 }
 
 TEST(SerialQueue, SyncIsOnItsQueueAndStillOnTheOuterOne) {
-    SerialQueue outer("outer");
-    SerialQueue inner("inner");
+    SerialQueue outer("outer"), inner("inner");
     const auto check = [&] {
         inner.sync([&] { EXPECT_TRUE(inner.isCurrent() && outer.isCurrent()); });
-        EXPECT_TRUE(outer.isCurrent());
-        EXPECT_FALSE(inner.isCurrent());
+        EXPECT_TRUE(outer.isCurrent() && !inner.isCurrent());
     };
     outer.sync(check);
     std::promise<void> release;
     inner.async([&] { release.get_future().wait(); });
-    outer.async([&] { check(); });
+    outer.async(check);
     release.set_value();
     outer.sync([] {});
     EXPECT_FALSE(outer.isCurrent());
@@ -94,15 +79,20 @@ TEST(SerialQueue, SuspensionsNestAndHoldBackOnlyLaterTasks) {
     waiter.join();
     EXPECT_EQ(ran, 2);
 
-    // A task may suspend its own queue: the next one waits, though it was already taken up with the first.
+    // A task may suspend its own queue: the next one waits, though it was taken up together with the first.
     std::promise<void> suspended;
+    std::atomic<bool> resumed = false;
+    queue.suspend();
     queue.async([&] {
         queue.suspend();
         suspended.set_value();
     });
-    queue.async([&] { ran = 10; });
+    queue.async([&] { ran = resumed ? 10 : -1; });
+    queue.resume();
     suspended.get_future().wait();
+    for (int i = 0; i < 10000 && ran == 2; ++i) std::this_thread::yield();  // a chance for one that does not wait
     EXPECT_EQ(ran, 2);
+    resumed = true;
     queue.resume();
     queue.sync([] {});
     EXPECT_EQ(ran, 10);
@@ -138,7 +128,6 @@ TEST(SerialQueue, LogsWhatATaskThrowsAndGoesOn) {
 
 // The limit holds for users without privileges, in a process of its own.
 TEST(SerialQueueDeathTest, SyncRunsWhatWaitsItselfWhenThereIsNoThreadToBeHad) {
-    GTEST_FLAG_SET(death_test_style, "threadsafe");
     const auto withoutThreads = [] {
         const rlimit none{1, 1};
         if (geteuid() == 0 && setuid(65534) != 0) std::_Exit(2);
@@ -158,7 +147,6 @@ TEST(SerialQueueDeathTest, SyncRunsWhatWaitsItselfWhenThereIsNoThreadToBeHad) {
 }
 
 TEST(SerialQueueDeathTest, StopsOnProgrammingErrors) {
-    GTEST_FLAG_SET(death_test_style, "threadsafe");
     SerialQueue queue("com.example.q");
     EXPECT_DEATH(queue.resume(), "resume of a queue that is not suspended, queue=com.example.q");
     EXPECT_DEATH(queue.sync([&] { queue.sync([] {}); }), "would wait for itself, queue=com.example.q");

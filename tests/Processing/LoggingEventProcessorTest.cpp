@@ -1,13 +1,9 @@
 #include <corvane/Processing/LoggingEventProcessor.h>
 
-#include "tests/support/CapturedLog.h"
-
-#include <gtest/gtest.h>
+#include "tests/support/Testing.h"
 
 namespace corvane::test {
 namespace {
-
-using namespace std::chrono_literals;
 
 std::string logged(const LoggingEventProcessorFormat& format, const ProcessEvent& event) {
     CapturedLog log;
@@ -15,8 +11,7 @@ std::string logged(const LoggingEventProcessorFormat& format, const ProcessEvent
     return log.lines().at(0).message;
 }
 
-class Shouting final : public LoggingEventProcessorFormatterType {
-  public:
+struct Shouting final : LoggingEventProcessorFormatterType {
     std::string format(const ProcessEvent& event) const override { return event.name() + "! %@ %ld"; }
 };
 
@@ -36,28 +31,6 @@ TEST(LoggingEventProcessor, WritesEventsInTheFormChosen) {
     for (const char* broken : {"{broken", "{\"a\":1e999}", "{\"a\":\"\xff\"}"}) {
         EXPECT_EQ(logged(Format::json(), ProcessEvent("V", JSON::fromEncodedText(broken), {})), "V ~> nil");
     }
-}
-
-TEST(LoggingEventProcessor, WritesSessionsAndGroupsAtDebugLevel) {
-    CapturedLog log;
-    LoggingEventProcessor processor;
-    const Session session{"S", Session::Kind::userEvents(), Date(1500ms), JSON("{}")};
-    processor.didStartSession(session);
-    processor.didUpdateSession(session, true);
-    processor.didEndSession(session, Date(61s));
-    processor.didEnterGroup({"g", Date(0s)});
-    processor.didLeaveGroup({"g", Date(0s)});
-    std::vector<std::string> messages;
-    for (const auto& line : log.lines()) {
-        EXPECT_EQ(line.level, LogLevel::debug);
-        messages.push_back(line.message);
-    }
-    EXPECT_EQ(messages, (std::vector<std::string>{
-                            "Started session, identifier=S, startDate=1970-01-01 00:00:01 +0000, sessionData=[:]",
-                            "Updated session, identifier=S, startDate=1970-01-01 00:00:01 +0000, sessionData=[:]",
-                            "Ended session, identifier=S, startDate=1970-01-01 00:00:01 +0000, "
-                            "endDate=1970-01-01 00:01:01 +0000, sessionData=[:]",
-                            "Entering group, name=g startDate=1970-01-01 00:00:00 +0000", "Leaving group, name=g"}));
 }
 
 TEST(Log, HidesPrivateArgumentsWhenAskedAndKeepsPublicOnes) {

@@ -4,62 +4,60 @@
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Store/DeferredStoreCore.h>
 
-#include "tests/support/TemporaryDocuments.h"
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {
 namespace {
 
-/// Each operation that must run on a queue, called on another thread or on a queue that it would wait for. (What
-/// stands here besides is tested beside its class: endSync, waitForDelivery and the queue's own operations.)
-class WrongQueueDeathTest : public TrackingTest {
-  protected:
-    WrongQueueDeathTest() { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
+using WrongQueueDeathTest = TrackingTest;
 
-    static std::string mustRun(const std::string& operation) {
-        return operation + " must run on queue com.veskar.corvane.event-tracker";
-    }
-
-    const std::shared_ptr<SessionCore> core = SessionCore::make();
-    const Session session{"S", Session::Kind::userEvents(), Date(), JSON("{}")};
-};
-
-TEST_F(WrongQueueDeathTest, HandlesOnTrackers) {
+TEST_F(WrongQueueDeathTest, NothingRunsWhereItWouldRaceOrWaitForItself) {
+    const std::string tracking = " queue com.veskar.corvane.event-tracker";
+    const std::string storing = "com.veskar.corvane.deferred-store.queue";
+    const std::string must = " must run on" + tracking, mustNot = " must not be called on" + tracking;
     const AccessTracker access(root);
-    EXPECT_DEATH(access.submit<ScreenView>(), mustRun("Tracker submission"));
-    EXPECT_DEATH(access.time<Played>(), mustRun("Tracker timer"));
-    EXPECT_DEATH(access.push(Screen{}), mustRun("Tracker push"));
-    EXPECT_DEATH(access.pop<Screen>(), mustRun("Tracker pop"));
-}
-
-TEST_F(WrongQueueDeathTest, HandlesOnSessionManagers) {
-    AccessSessionManager access(core);
-    EXPECT_DEATH((void)access.isActive(), mustRun("SessionManager activeSession"));
-    EXPECT_DEATH(access.push(SessionData{"screen", Screen{}}), mustRun("SessionManager push"));
-}
-
-TEST_F(WrongQueueDeathTest, DeliveriesToProcessors) {
+    const auto core = SessionCore::make();
+    AccessSessionManager session(core);
     ProcessorManager& manager = *sessions->processorManager();
-    EXPECT_DEATH(manager.process(ProcessEvent("E", JSON("{}"), {})), mustRun("process"));
-    EXPECT_DEATH(manager.didStartSession(session), mustRun("didStartSession"));
-
     TemporaryDocuments documents;
-    UploadBatchEventProcessor uploads({"com.example.app", "App", "1", 1}, Endpoint("http://127.0.0.1:9", "main"));
-    EXPECT_DEATH(uploads.didEndSession(session, now()), "didEndSession of an upload processor that was never added");
+    const Client client{"com.example.app", "App", "1", 1};
+    const Endpoint endpoint("http://127.0.0.1:9", "main");
+    UploadBatchEventProcessor uploads(client, endpoint), neverAdded(client, endpoint);
     uploads.registerAccessQueue(core->accessQueue());
     EXPECT_NO_THROW(uploads.registerAccessQueue(core->accessQueue())) << "added twice, to one manager";
-    EXPECT_THROW(sessions->processorManager()->add({std::shared_ptr<void>(), &uploads}), InvalidArgument);
-    EXPECT_DEATH(uploads.process(ProcessEvent("E", JSON("{}"), {})), mustRun("UploadBatchEventProcessor::process"));
-}
-
-TEST_F(WrongQueueDeathTest, TheDatabaseFromItsOwnQueue) {
+    EXPECT_THROW(manager.add({std::shared_ptr<void>(), &uploads}), InvalidArgument);
+    const ProcessEvent event("E", JSON("{}"), {});
+    const Session ended{"S", Session::Kind::userEvents(), Date(), JSON("{}")};
     DeferredStore<UploadBatchEntity> rows(std::nullopt);
-    const auto nothing = [](Store<UploadBatchEntity>&) {};
-    EXPECT_DEATH(rows.perform([&](Store<UploadBatchEntity>&) { rows.perform(nothing); }),
-                 "would wait for itself, queue=com.veskar.corvane.deferred-store.queue");
     const auto store = DeferredStoreCore::make(Store<UploadBatchEntity>::table(), 0, std::nullopt);
-    EXPECT_DEATH((void)store->connection(),
-                 "DeferredStoreCore::connection must run on queue com.veskar.corvane.deferred-store.queue");
+    const auto nothing = [](Store<UploadBatchEntity>&) {};
+    const std::pair<std::function<void()>, std::string> elsewhere[] = {
+        {[&] { access.submit<ScreenView>(); }, "Tracker submission" + must},
+        {[&] { access.time<Played>(); }, "Tracker timer" + must},
+        {[&] { access.push(Screen{}); }, "Tracker push" + must},
+        {[&] { access.pop<Screen>(); }, "Tracker pop" + must},
+        {[&] { (void)session.isActive(); }, "SessionManager activeSession" + must},
+        {[&] {
+             session.push(SessionData{"screen", Screen{}});
+         },
+         "SessionManager push" + must},
+        {[&] { manager.process(event); }, "process" + must},
+        {[&] { manager.didStartSession(ended); }, "didStartSession" + must},
+        {[&] { uploads.process(event); }, "UploadBatchEventProcessor::process" + must},
+        {[&] { neverAdded.didEndSession(ended, now()); }, "didEndSession of an upload processor that was never added"},
+        {[&] { (void)store->connection(); }, "DeferredStoreCore::connection must run on queue " + storing},
+        {[&] { rows.perform([&](auto&) { rows.perform(nothing); }); }, "would wait for itself, queue=" + storing},
+    };
+    for (const auto& [call, message] : elsewhere) EXPECT_DEATH(call(), message);
+    const std::pair<std::function<void()>, std::string> onTheQueue[] = {
+        {[&] { sessions->endSync(); }, "SessionManager::endSync" + mustNot},
+        {[&] { (void)root->snapshot(SnapshotPolicy::now); }, "Tracker::snapshot" + mustNot},
+        {[&] { (void)uploads.waitForDelivery({}); }, "waitForDelivery" + mustNot},
+    };
+    for (const auto& [call, message] : onTheQueue) {
+        const auto inside = [&, call = call](AccessSessionManager&) { call(); };
+        EXPECT_DEATH((sessions->transaction(inside), core->accessQueue()->sync(call), processor->drain()), message);
+    }
 }
 
 }  // namespace

@@ -3,17 +3,12 @@
 #include <corvane/Upload/UploadRequest.h>
 #include <corvane/Upload/gzip.h>
 
-#include <gtest/gtest.h>
-
-#include "tests/support/CapturedLog.h"
 #include "tests/support/FakeUploadService.h"
-#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/Testing.h"
 #include "tests/support/TextResource.h"
 
 namespace corvane::test {
 namespace {
-
-using namespace std::chrono_literals;
 
 /// What one run of a process has: a manager over the files that earlier runs left.
 struct ProcessRun {
@@ -80,7 +75,6 @@ TEST(UploadManager, TakesADocumentOverAndForgetsItOnceTheCollectorHasAnswered) {
         EXPECT_EQ(run.dropbox->existingFile("I"), std::nullopt);
     }
     EXPECT_EQ(run.ledger->report(), (DeliveryReport{.delivered = {10, 1}, .pending = {}, .givenUp = {10, 1}}));
-    EXPECT_EQ(log.count("Creating upload task, identifier=I"), 2);
     EXPECT_EQ(log.count("Failed"), 0);
 }
 
@@ -144,40 +138,6 @@ TEST(UploadManager, ARetrysWholeLife) {
     EXPECT_TRUE(run.rows().empty());
 }
 
-TEST(UploadManager, ARowWithoutItsPayloadIsDroppedAndTheOthersGoOn) {
-    const TemporaryDocuments documents;
-    const CapturedLog log;
-    ProcessRun run;
-    run.insert(row("gone", 0));
-    run.insert(row("exceeded and gone", 5));
-    run.insert(row("there", 4));
-    run.dropbox->write("there", "x", TextResource("there"));
-    run.manager->open();
-    EXPECT_EQ(run.resubmitted(), std::vector<std::string>{"there"});
-    EXPECT_EQ(run.rows().size(), 1U);
-    EXPECT_EQ(log.count("Retry dropped for missing upload file, identifier=gone"), 1);
-    EXPECT_EQ(log.count("Failed to cleanup request that exceeded allowed attempts, identifier=exceeded and gone"), 1);
-
-    std::filesystem::remove(*run.dropbox->existingFile("there"));
-    run.service->complete(UploadResult::success("there", {200}));
-    EXPECT_EQ(log.count("Completed upload but failed to cleanup tracking data, identifier=there"), 1);
-    EXPECT_EQ(run.ledger->report().delivered.documents, 1);
-}
-
-TEST(UploadManager, SendsWithoutARowAndSaysSo) {
-    const TemporaryDocuments documents;
-    ProcessRun run(std::nullopt);  // never opened: there is no table
-    EXPECT_EQ(run.upload("I"), UploadTaken::underWay);
-    EXPECT_EQ(run.service->submitted.size(), 1U);
-    run.store->perform([](Store<SignedEntity>& rows) { rows.createTable(); });
-    EXPECT_EQ(run.upload("J"), UploadTaken::recorded);
-    run.store->perform([](Store<SignedEntity>& rows) { rows.deleteWhere("identifier", "J"); });
-    run.service->complete(UploadResult::retry("I", now()));
-    run.service->complete(UploadResult::retry("J", now()));
-    EXPECT_EQ(run.ledger->report().pending, (DeliveryReport::Count{10, 1})) << "whoever handed it over still has it";
-    EXPECT_EQ(run.ledger->report().givenUp, (DeliveryReport::Count{10, 1}));
-}
-
 TEST(UploadManager, RemovesOldPayloadsThatNobodyHas) {
     const TemporaryDocuments documents;
     const CapturedLog log;
@@ -207,11 +167,12 @@ TEST(UploadManager, RefusesWhatItCannotWriteAndLeavesNoRow) {
     const TemporaryDocuments documents;
     ProcessRun run;
     run.manager->open();
-    const auto upload = [&](const std::string& identifier, const std::string& text) {
-        run.manager->upload({{"a", "b", "1", 1}, std::make_shared<TextResource>(identifier, text)});
+    const auto upload = [&](const std::string& identifier, const std::string& text, const std::string& type = "t") {
+        run.manager->upload({{"a", "b", "1", 1}, std::make_shared<TextResource>(identifier, text, type)});
     };
     EXPECT_THROW(upload("I", "\"not an object\""), JSONError);
     EXPECT_THROW(upload("../I", "{}"), InvalidArgument);
+    for (const char* type : {"a\rb", "a\nX-Y: b"}) EXPECT_THROW(upload("I", "{}", type), InvalidArgument);
     EXPECT_TRUE(run.rows().empty());
     EXPECT_TRUE(run.service->submitted.empty());
 }
@@ -232,20 +193,6 @@ TEST(UploadManager, TellsOfABrokenTableAndGoesOn) {
     EXPECT_EQ(log.count("Completed upload but failed to cleanup tracking data, identifier=I, error="), 1);
     EXPECT_NE(run.dropbox->existingFile("I"), std::nullopt);  // kept with its row
     EXPECT_EQ(run.service->submitted.size(), 1U);
-}
-
-TEST(UploadManager, PassesQueueAndWakeUpsOnAndIsHeldWeaklyByItsService) {
-    const TemporaryDocuments documents;
-    ProcessRun run(std::nullopt);
-    const auto queue = std::make_shared<SerialQueue>("test");
-    run.manager->registerAccessQueue(queue);
-    EXPECT_EQ(run.service->accessQueue, queue);
-    EXPECT_TRUE(run.manager->shouldResume("mine", [] {}));
-    EXPECT_FALSE(run.manager->shouldResume("another's", [] {}));
-    const std::weak_ptr<UploadManager> manager = run.manager;
-    run.manager.reset();
-    EXPECT_TRUE(manager.expired());
-    run.service->complete(UploadResult::success("I", {200}));  // nobody is there
 }
 
 }  // namespace

@@ -2,12 +2,10 @@
 
 #include <corvane/Transfer/TransferSession.h>
 
-#include <cstdint>
-#include <map>
 #include <memory>
-#include <mutex>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace corvane::test {
@@ -15,78 +13,80 @@ namespace corvane::test {
 /// A transfer session in memory, in which nothing happens until the test says so.
 ///
 /// It keeps the rules of the real one: callbacks run asynchronously on the queue, a task counts as running until its
-/// completion callback has returned, and a listing comes behind what is pending. Thread-safe.
+/// completion callback has returned, and a listing comes behind what is pending. One thread at a time may use it: the
+/// test's, and the queue's while the test waits for it.
 ///
-///     FakeTransferSession::Shelf shelf;                     // the sessions that a factory opened
-///     UploadService service(endpoint, signer, shelf.factory());
+///     std::shared_ptr<FakeTransferSession> session;  // the one that was opened last
+///     UploadService service(endpoint, signer, FakeTransferSession::factory(session));
 ///     ...
-///     shelf.only()->complete(1, 503);
+///     session->complete(1, 503);
 class FakeTransferSession final : public TransferSession {
   public:
-    struct Upload {
-        std::int64_t identifier;
-        std::optional<std::string> description;
-        TransferTask::State state;
-        TransferRequest request;
-        std::filesystem::path file;
-    };
+    struct Task final : TransferTask {
+        Task(std::int64_t number, TransferRequest sent, std::filesystem::path body)
+            : request(std::move(sent)), file(std::move(body)), number_(number) {}
 
-    /// Keeps what its factory opened.
-    class Shelf {
-      public:
-        [[nodiscard]] Factory factory();
-        [[nodiscard]] std::size_t count() const;
-        /// The only session there is; nothing when there is none or there are more.
-        [[nodiscard]] std::shared_ptr<FakeTransferSession> only() const;
+        std::int64_t identifier() const override { return number_; }
+        std::optional<std::string> description() const override { return description_; }
+        State state() const override { return now; }
+        void setDescription(std::string description) override { description_ = std::move(description); }
+        void resume() override { now = State::running; }
+
+        const TransferRequest request;
+        const std::filesystem::path file;
+        State now = State::suspended;
 
       private:
-        struct Contents {
-            std::mutex mutex;
-            std::vector<std::shared_ptr<FakeTransferSession>> sessions;
-        };
-        std::shared_ptr<Contents> contents_ = std::make_shared<Contents>();
+        const std::int64_t number_;
+        std::optional<std::string> description_;
     };
 
-    FakeTransferSession(TransferSessionConfiguration configuration, std::weak_ptr<TransferSessionDelegate> delegate,
-                        std::shared_ptr<SerialQueue> queue);
-    ~FakeTransferSession() override;
-
-    [[nodiscard]] const TransferSessionConfiguration& configuration() const { return configuration_; }
-    /// Every task ever made, in order.
-    [[nodiscard]] std::vector<Upload> uploads() const;
-    /// How often the session was told of a wake-up.
-    [[nodiscard]] int wakeUps() const;
+    static Factory factory(std::shared_ptr<FakeTransferSession>& opened) {
+        return [&opened](auto configuration, auto delegate, auto queue) {
+            return opened = std::make_shared<FakeTransferSession>(configuration, delegate, queue);
+        };
+    }
+    FakeTransferSession(TransferSessionConfiguration given, std::weak_ptr<TransferSessionDelegate> delegate,
+                        std::shared_ptr<SerialQueue> queue)
+        : configuration(std::move(given)), delegate_(std::move(delegate)), queue_(std::move(queue)) {}
 
     /// Ends a task with an answer, whatever its state.
-    void complete(std::int64_t identifier, std::int64_t statusCode, std::map<std::string, std::string> headers = {});
+    void complete(std::int64_t identifier, std::int64_t statusCode, std::map<std::string, std::string> headers = {}) {
+        complete(identifier, std::nullopt, TransferResponse{true, statusCode, std::move(headers)});
+    }
     /// Ends a task with whatever the delegate is to be told.
-    void complete(std::int64_t identifier, std::optional<AnyError> error, std::optional<TransferResponse> response);
-    void progress(std::int64_t identifier, std::int64_t sent, std::int64_t total, std::int64_t expected);
-    void setState(std::int64_t identifier, TransferTask::State state);
-    void signalAllEventsDelivered();
+    void complete(std::int64_t identifier, std::optional<AnyError> error, std::optional<TransferResponse> response) {
+        queue_->async([this, task = made.at(static_cast<std::size_t>(identifier) - 1), error = std::move(error),
+                       response = std::move(response)] {
+            if (const auto delegate = delegate_.lock()) delegate->taskDidComplete(*task, error, response);
+            task->now = TransferTask::State::completed;
+        });
+    }
+    void signalAllEventsDelivered() {
+        queue_->async([this] { delegate_.lock()->allEventsDelivered(); });
+    }
 
-    [[nodiscard]] std::optional<std::string> description() const override;
-    void setDescription(std::string description) override;
-    std::shared_ptr<TransferTask> uploadTask(TransferRequest request, std::filesystem::path file) override;
-    void tasks(Listing listing) override;
+    std::optional<std::string> description() const override { return description_; }
+    void setDescription(std::string description) override { description_ = std::move(description); }
+    std::shared_ptr<TransferTask> uploadTask(TransferRequest request, std::filesystem::path file) override {
+        const auto number = static_cast<std::int64_t>(made.size()) + 1;
+        return made.emplace_back(std::make_shared<Task>(number, std::move(request), std::move(file)));
+    }
+    /// Unlike the real session it lists completed tasks too, as sessions outside the process may.
+    void tasks(Listing listing) override {
+        queue_->async([this, listing = std::move(listing)] { listing({made.begin(), made.end()}); });
+    }
     /// Counts the wake-up; the signal is the test's to give.
-    void deliverPendingEvents() override;
+    void deliverPendingEvents() override { ++wakeUps; }
+
+    const TransferSessionConfiguration configuration;
+    std::vector<std::shared_ptr<Task>> made;  // in order; the first is task 1
+    int wakeUps = 0;
 
   private:
-    class Task;
-    using Tasks = std::vector<std::shared_ptr<Task>>;
-
-    [[nodiscard]] std::shared_ptr<Task> find(std::int64_t identifier) const;
-    [[nodiscard]] Tasks all() const;
-
-    const TransferSessionConfiguration configuration_;
     const std::weak_ptr<TransferSessionDelegate> delegate_;
     const std::shared_ptr<SerialQueue> queue_;
-
-    mutable std::mutex mutex_;
     std::optional<std::string> description_;
-    Tasks tasks_;
-    int wakeUps_ = 0;
 };
 
 }  // namespace corvane::test

@@ -133,21 +133,9 @@ std::vector<ScriptedServer::Request> ScriptedServer::requests() const {
     return requests_;
 }
 
-int ScriptedServer::mostAtOnce() const {
-    std::lock_guard lock(mutex_);
-    return mostAtOnce_;
-}
-
 bool ScriptedServer::waitForRequests(std::size_t count) const {
     std::unique_lock lock(mutex_);
     return changed_.wait_for(lock, std::chrono::seconds(10), [&] { return requests_.size() >= count; });
-}
-
-bool ScriptedServer::waitForPause() {
-    std::unique_lock lock(mutex_);
-    const bool came = changed_.wait_for(lock, std::chrono::seconds(10), [this] { return paused_ > 0; });
-    if (came) --paused_;
-    return came;
 }
 
 void ScriptedServer::acceptConnections() {
@@ -180,32 +168,23 @@ bool ScriptedServer::readRequest(int connection, std::string& buffer) {
     buffer.erase(0, end + 4);
     const Reply reply = nextReply();
     const auto length = static_cast<std::size_t>(std::strtoull(request.header("Content-Length").c_str(), nullptr, 10));
-    const auto wanted = std::min(length, reply.bodyLimit);
-    readBody(connection, buffer, wanted, reply);
-    request.body = buffer.substr(0, wanted);
-    buffer.erase(0, wanted);
-    record(std::move(request));
-    if (reply.held) waitForRelease();
-    {
+    const auto read = [&](std::size_t wanted) {
+        while (buffer.size() < wanted && receiveMore(connection, buffer)) {
+        }
+        auto part = buffer.substr(0, wanted);
+        buffer.erase(0, wanted);
+        return part;
+    };
+    request.body = read(std::min(length, reply.bodyLimit));
+    const auto left = length - request.body.size();
+    const auto number = record(std::move(request));
+    if (reply.held) {
+        waitForRelease();
+        const auto rest = read(left);
         std::lock_guard lock(mutex_);
-        --atOnce_;
+        requests_[number].body += rest;
     }
     return answer(connection, reply);
-}
-
-void ScriptedServer::readBody(int connection, std::string& buffer, std::size_t length, const Reply& reply) {
-    if (reply.pauseAfter) {
-        while (buffer.size() < *reply.pauseAfter && receiveMore(connection, buffer)) {
-        }
-        {
-            std::lock_guard lock(mutex_);
-            ++paused_;
-        }
-        changed_.notify_all();
-        waitForRelease();
-    }
-    while (buffer.size() < length && receiveMore(connection, buffer)) {
-    }
 }
 
 bool ScriptedServer::answer(int connection, const Reply& reply) {
@@ -257,13 +236,11 @@ void ScriptedServer::waitForRelease() {
     --released_;
 }
 
-void ScriptedServer::record(Request request) {
-    {
-        std::lock_guard lock(mutex_);
-        requests_.push_back(std::move(request));
-        mostAtOnce_ = std::max(mostAtOnce_, ++atOnce_);
-    }
+std::size_t ScriptedServer::record(Request request) {
+    std::lock_guard lock(mutex_);
+    requests_.push_back(std::move(request));
     changed_.notify_all();
+    return requests_.size() - 1;
 }
 
 }  // namespace corvane::test

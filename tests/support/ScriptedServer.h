@@ -5,7 +5,6 @@
 #include <deque>
 #include <map>
 #include <mutex>
-#include <optional>
 #include <string>
 #include <string_view>
 #include <thread>
@@ -51,10 +50,8 @@ class ScriptedServer {
         };
         std::string bytes;  ///< sent as they are
         Ending ending = Ending::keepAlive;
-        bool held = false;            ///< wait for `release` before the first byte
+        bool held = false;            ///< wait for `release`, then read on and answer
         std::size_t bodyLimit = ~0u;  ///< stop reading the request's body after this many bytes
-        std::optional<std::size_t> pauseAfter =
-            std::nullopt;  ///< read this much of the body, then wait for `release` to go on
 
         /// A whole answer.
         static Reply status(int code, const Headers& headers = {}, std::string_view body = {});
@@ -76,27 +73,21 @@ class ScriptedServer {
 
     /// Appends replies for the next requests.
     void script(Reply reply, int times = 1);
-    /// Lets this many held or paused requests go on, now or when they are due.
+    /// Lets this many held requests go on, now or when they are due.
     void release(int replies = 1);
 
     [[nodiscard]] std::vector<Request> requests() const;
-    /// The most requests that were waiting for their answer at one time.
-    [[nodiscard]] int mostAtOnce() const;
     /// Waits until this many requests have been read; false when they did not come within ten seconds.
     [[nodiscard]] bool waitForRequests(std::size_t count) const;
-
-    /// Waits until a request has been paused since the last call; false when none was within ten seconds.
-    [[nodiscard]] bool waitForPause();
 
   private:
     void acceptConnections();
     void serve(int connection);
     bool answer(int connection, const Reply& reply);
     bool readRequest(int connection, std::string& buffer);
-    void readBody(int connection, std::string& buffer, std::size_t length, const Reply& reply);
     Reply nextReply();
     void waitForRelease();
-    void record(Request request);
+    std::size_t record(Request request);
 
     int listener_ = -1;
     int port_ = 0;
@@ -107,9 +98,6 @@ class ScriptedServer {
     std::deque<Reply> script_;
     std::vector<Request> requests_;
     int released_ = 0;
-    int paused_ = 0;
-    int atOnce_ = 0;
-    int mostAtOnce_ = 0;
     bool stopping_ = false;
     std::map<int, std::thread> connections_;
 };

@@ -5,12 +5,7 @@
 #include <corvane/Tracker/AccessTracker.h>
 
 #include "tests/support/RecordingProcessor.h"
-
-#include <gtest/gtest.h>
-
-#include <memory>
-#include <optional>
-#include <string>
+#include "tests/support/Testing.h"
 
 namespace corvane::test {
 

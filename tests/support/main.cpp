@@ -13,6 +13,7 @@ class RestoresSettings final : public ::testing::EmptyTestEventListener {
 
 int main(int argc, char** argv) {
     ::testing::InitGoogleTest(&argc, argv);
+    GTEST_FLAG_SET(death_test_style, "threadsafe");  // forks are safe in no process with threads
     ::testing::UnitTest::GetInstance()->listeners().Append(new RestoresSettings);
     return RUN_ALL_TESTS();
 }

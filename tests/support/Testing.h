@@ -1,0 +1,30 @@
+#pragma once
+
+// What nearly every test needs.
+
+#include "tests/support/CapturedLog.h"
+#include "tests/support/ScriptedServer.h"
+#include "tests/support/TemporaryDocuments.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <cstdlib>
+#include <functional>
+#include <future>
+#include <limits>
+#include <map>
+#include <memory>
+#include <optional>
+#include <set>
+#include <stdexcept>
+#include <string>
+#include <thread>
+#include <utility>
+#include <vector>
+
+namespace corvane::test {
+using namespace std::chrono_literals;
+}
