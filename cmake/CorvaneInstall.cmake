@@ -11,12 +11,19 @@ set(internal_headers
     corvane/Models/JSONTree.h
     corvane/Models/OwnJSON.h
     corvane/Agent/AgentDirectory.h
+    corvane/Agent/Host/Acknowledgements.h
+    corvane/Agent/Host/AgentConversation.h
     corvane/Agent/Host/AgentLink.h
     corvane/Agent/AgentMessage.h
     corvane/Agent/Host/AgentProgram.h
+    corvane/Agent/Host/AgentQuestions.h
     corvane/Agent/Host/AgentThread.h
     corvane/Agent/Host/BackgroundTransferCore.h
     corvane/Agent/Host/BackgroundTransferTask.h
+    corvane/Agent/FormatError.h
+    corvane/Agent/Host/InsideTransfers.h
+    corvane/Agent/OutcomeCodec.h
+    corvane/Agent/Host/TaskTable.h
     corvane/Transfer/CurlTransfer.h
     corvane/Platform/Descriptor.h
     corvane/Agent/FrameSocket.h
@@ -26,7 +33,11 @@ set(internal_headers
     corvane/Platform/PrivateFile.h
     corvane/Platform/TaskList.h
     corvane/Platform/Thread.h
-    corvane/Agent/TransferOutcome.h
+    corvane/Transfer/Description.h
+    corvane/Transfer/SessionReporter.h
+    corvane/Transfer/SessionTask.h
+    corvane/Transfer/TransferOutcome.h
+    corvane/Transfer/TransferQueue.h
     corvane/Transfer/TransferScheduler.h
     corvane/Agent/TransferSubmission.h
     corvane/Transfer/TransferThread.h

@@ -88,9 +88,9 @@ void CurlTransfer::HeaderListDeleter::operator()(void* list) const noexcept {
     curl_slist_free_all(static_cast<curl_slist*>(list));
 }
 
-std::string CurlTransfer::hostKey(const HTTPTransfer& transfer) {
-    const URLParts url = parse(transfer.request.url);
-    return transfer.pool + ' ' + url.host + ' ' + url.port;
+std::string CurlTransfer::server(const std::string& url) {
+    const URLParts parts = parse(url);
+    return parts.host + ':' + parts.port;
 }
 
 CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
@@ -99,7 +99,7 @@ CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
       deadline_(Clock::now() + limits_.timeWithoutProgress),
       easy_(curl_easy_init()) {
     if (!easy_) throw std::bad_alloc();
-    if (transfer.bodyFile) openBody(*transfer.bodyFile, transfer.bodyMustBeOwn);
+    if (transfer.bodyPath) openBody(*transfer.bodyPath, transfer.bodyMustBeOwn);
     setHeaders(transfer.request);
     setOptions(transfer);
 }
@@ -163,7 +163,7 @@ void CurlTransfer::setOptions(const HTTPTransfer& transfer) {
     curl_easy_setopt(easy, CURLOPT_HEADERDATA, this);
     curl_easy_setopt(easy, CURLOPT_WRITEFUNCTION, &bodyArrived);
     curl_easy_setopt(easy, CURLOPT_WRITEDATA, this);
-    if (!transfer.bodyFile) return;
+    if (!transfer.bodyPath) return;
 
     if (!isToken(transfer.request.method)) throw TransferError(Code::invalidRequest, "the method cannot be sent");
     curl_easy_setopt(easy, CURLOPT_UPLOAD, 1L);

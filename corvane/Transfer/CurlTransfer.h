@@ -24,8 +24,8 @@ class CurlTransfer {
   public:
     using Clock = std::chrono::steady_clock;
 
-    /// What transfers are counted by: pool, host and port. Throws `TransferError` for a URL that cannot be used.
-    [[nodiscard]] static std::string hostKey(const HTTPTransfer& transfer);
+    /// The host and port of a URL, "example.com:443". Throws `TransferError` for a URL that cannot be used.
+    [[nodiscard]] static std::string server(const std::string& url);
 
     /// Opens the body file and sets the handle up. Throws `TransferError`.
     explicit CurlTransfer(const HTTPTransfer& transfer);

@@ -173,9 +173,9 @@ TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {
     good.token = token;
     good.session = "s";
     good.owner = "o";
-    good.file = "/tmp/x";
+    good.bodyPath = "/tmp/x";
     auto relative = good, foreign = good, other = good;
-    relative.file = "x";
+    relative.bodyPath = "x";
     foreign.owner = "p";
     other.token = TransferSubmission::newToken();
     const std::pair<const char*, std::string> cases[] = {

@@ -1,4 +1,4 @@
-#include <corvane/Agent/TransferOutcome.h>
+#include <corvane/Agent/OutcomeCodec.h>
 #include <corvane/Agent/TransferSubmission.h>
 #include <corvane/Agent/WireWriter.h>
 
@@ -112,7 +112,7 @@ TEST_F(JournalTest, TakesOverWhatAnEarlierVersionHasLeft) {
         old.run(add + tokens[0] + accepted + "open', ?, NULL)", {submission(tokens[0], "open")});
         old.run(add + tokens[1] + accepted + "over', ?, ?)",
                 {submission(tokens[1], "over"),
-                 TransferOutcome::of(std::nullopt, TransferResponse{true, 204, {}}).encoded()});
+                 encodeOutcome({std::nullopt, TransferResponse{true, 204, {}}})});
         old.run(add + tokens[2] + accepted + "broken outcome', ?, 'x')", {submission(tokens[2], "broken outcome")});
         old.run(add + tokens[3] + accepted + "broken submission', 'x', NULL)");
         old.run("INSERT INTO wakes VALUES ('session', 'owner', 'x')");

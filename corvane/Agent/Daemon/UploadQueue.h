@@ -26,8 +26,7 @@ class UploadQueue {
 
     struct Ended {
         std::int64_t number;
-        std::optional<AnyError> error;
-        std::optional<TransferResponse> response;
+        TransferOutcome outcome;
     };
     struct Progress {
         std::int64_t number;
@@ -53,7 +52,7 @@ class UploadQueue {
         virtual std::optional<HTTPTransfer> transfer(std::int64_t number) = 0;
         /// Whether an upload whose server cannot be reached is to be tried again.
         virtual bool mayWait(std::int64_t number) = 0;
-        /// Uploads to a host begin to wait, or go on. Not to call back.
+        /// These uploads to a host begin to wait, or all of them go on. Not to call back.
         virtual void troubleChanged(const Trouble& trouble, const std::vector<std::int64_t>& uploads) = 0;
     };
 
@@ -62,8 +61,8 @@ class UploadQueue {
     /// What tells the transfers to one host apart that do not go there in the same way.
     [[nodiscard]] static std::string pool(const TransferSubmission& submission);
 
-    /// Returns what holds it up, if it has to wait. Throws `TransferError` for a request that cannot be sent.
-    const Trouble* add(std::int64_t number, const TransferSubmission& submission);
+    /// Lets an upload wait for its turn. Throws `TransferError` for a request that cannot be sent.
+    void add(std::int64_t number, const TransferSubmission& submission);
     /// Drops an upload, whether it runs or waits.
     void remove(std::int64_t number);
 
