@@ -2,9 +2,7 @@
 
 #include <corvane/Transfer/TransferError.h>
 
-#include <arpa/inet.h>
 #include <signal.h>
-#include <sys/socket.h>
 #include <unistd.h>
 
 #include <future>
@@ -100,35 +98,6 @@ std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
 std::int64_t SessionRecorder::bytesSent() const {
     std::lock_guard lock(mutex_);
     return sent_;
-}
-
-LatePort::LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t size = sizeof address;
-    EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address), size), 0);
-    getsockname(socket_, reinterpret_cast<sockaddr*>(&address), &size);
-    port_ = ntohs(address.sin_port);
-}
-
-LatePort::~LatePort() {
-    close(socket_);
-}
-
-std::string LatePort::url() const {
-    return "http://127.0.0.1:" + std::to_string(port_);
-}
-
-void LatePort::answerOne() const {
-    listen(socket_, 8);
-    const int connection = accept(socket_, nullptr, nullptr);
-    char buffer[4096];
-    EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
-    const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
-    send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
-    recv(connection, buffer, sizeof buffer, 0);
-    close(connection);
 }
 
 AgentFixture::AgentFixture() {

@@ -90,21 +90,6 @@ class AgentFixture : public ::testing::Test {
     std::shared_ptr<SessionRecorder> recorder = std::make_shared<SessionRecorder>();
 };
 
-/// A port of the loopback address at which nobody listens until it is told to.
-class LatePort {
-  public:
-    LatePort();
-    LatePort(const LatePort&) = delete;
-    LatePort& operator=(const LatePort&) = delete;
-    ~LatePort();
-    [[nodiscard]] std::string url() const;
-    void answerOne() const;
-
-  private:
-    int socket_;
-    int port_;
-};
-
 /// Waits until a condition holds that nothing signals; false when it does not within the time.
 [[nodiscard]] bool eventually(const std::function<bool()>& condition, std::chrono::milliseconds time = 10s);
 

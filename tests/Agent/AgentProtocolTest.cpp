@@ -1,5 +1,6 @@
 #include <corvane/Agent/AgentDirectory.h>
 #include <corvane/Agent/AgentMessage.h>
+#include <corvane/Agent/FormatError.h>
 #include <corvane/Agent/FrameSocket.h>
 #include <corvane/Agent/TransferSubmission.h>
 
@@ -151,20 +152,17 @@ TEST_F(AgentProtocolTest, WaitsForDescriptorsWhenThereAreNone) {
     expectAgentWorks();
 }
 
-TEST_F(AgentProtocolTest, SurvivesAnyBytes) {
+TEST(AgentMessage, AnyBytesAreAMessageOrAFormatError) {
     std::mt19937 random(11);
-    const std::string hello =
-        frame(agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {"a", "b"}}));
-    for (int i = 0; i < 300; ++i) {
-        std::string bytes = hello + frame(agent::encode(agent::Describe{"token", "text"}));
+    const std::string hello = agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {"a", "b"}});
+    for (int i = 0; i < 3000; ++i) {
+        std::string bytes = hello;
         for (int change = 0; change < 3; ++change) bytes[random() % bytes.size()] = static_cast<char>(random());
-        RawClient client(options.directory);
-        client.sendBytes(bytes);
-        client.endSending();
-        while (client.reply()) {
+        try {
+            static_cast<void>(agent::decodeRequest(bytes));
+        } catch (const FormatError&) {
         }
     }
-    expectAgentWorks();
 }
 
 TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {
@@ -174,22 +172,18 @@ TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {
     good.session = "s";
     good.owner = "o";
     good.bodyPath = "/tmp/x";
-    auto relative = good, foreign = good, other = good;
-    relative.bodyPath = "x";
+    auto foreign = good, other = good;
     foreign.owner = "p";
     other.token = TransferSubmission::newToken();
     const std::pair<const char*, std::string> cases[] = {
-        {"nothing", ""},
         {"garbage", std::string(1000, 'x')},
         {"cut off", good.encoded().substr(0, 90)},
         {"too long", good.encoded() + std::string(TransferSubmission::longest, 'x')},
-        {"a relative path", relative.encoded()},
         {"another task's", other.encoded()},
         {"another owner's", foreign.encoded()},
     };
     RawClient client(options.directory);
-    client.send(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {}});
-    ASSERT_TRUE(client.gets<agent::Welcome>());
+    client.greet();
     client.send(agent::Submit{token});
     EXPECT_TRUE(client.gets<agent::Refused>()) << "there is none";
     for (const auto& [name, bytes] : cases) {
