@@ -29,6 +29,7 @@ set(internal_headers
     corvane/Agent/FrameSocket.h
     corvane/Platform/HostCall.h
     corvane/Transfer/HTTPTransfer.h
+    corvane/Transfer/HTTPURL.h
     corvane/Signing/OpenSSLUse.h
     corvane/Platform/PrivateFile.h
     corvane/Platform/TaskList.h

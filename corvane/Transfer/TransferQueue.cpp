@@ -1,5 +1,7 @@
 #include <corvane/Transfer/TransferQueue.h>
 
+#include <corvane/Transfer/HTTPURL.h>
+
 #include <utility>
 
 namespace corvane {
@@ -7,7 +9,7 @@ namespace corvane {
 void TransferQueue::start(Ticket ticket, HTTPTransfer transfer) {
     Waiting arrived{ticket, std::move(transfer)};
     try {
-        const std::string host = arrived.transfer.pool + ' ' + CurlTransfer::server(arrived.transfer.request.url);
+        const std::string host = arrived.transfer.pool + ' ' + HTTPURL::parse(arrived.transfer.request.url).server();
         hosts_[host].waiting.push_back(std::move(arrived));
     } catch (...) {
         TransferScheduler::reportFailure(arrived.transfer);

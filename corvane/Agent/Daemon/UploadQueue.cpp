@@ -1,5 +1,6 @@
 #include <corvane/Agent/Daemon/UploadQueue.h>
 
+#include <corvane/Transfer/HTTPURL.h>
 #include <corvane/Transfer/TransferError.h>
 
 #include <algorithm>
@@ -52,7 +53,7 @@ std::string UploadQueue::pool(const TransferSubmission& submission) {
 }
 
 void UploadQueue::add(std::int64_t number, const TransferSubmission& submission) {
-    std::string server = CurlTransfer::server(submission.request.url);
+    std::string server = HTTPURL::parse(submission.request.url).server();
     Host& host = hosts_[pool(submission) + ' ' + server];
     host.server = std::move(server);
     host.waiting.push_back({number, submission.limits.transfersPerHost});
