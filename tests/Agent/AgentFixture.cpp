@@ -6,7 +6,6 @@
 #include <unistd.h>
 
 #include <future>
-#include <sstream>
 #include <thread>
 
 namespace corvane::test {
@@ -38,27 +37,10 @@ std::map<std::string, int> bodies(const ScriptedServer& server) {
     return counts;
 }
 
-void SessionRecorder::taskDidSendBodyData(const TransferTask&, std::int64_t sent, std::int64_t total,
-                                          std::int64_t expected) {
+void SessionRecorder::note(Outcomes& where, const TransferTask& task, const std::optional<AnyError>& error,
+                           const std::optional<TransferResponse>& response) {
     std::lock_guard lock(mutex_);
-    sent_ += sent;
-    EXPECT_LE(total, expected);
-}
-
-void SessionRecorder::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
-                                      const std::optional<TransferResponse>& response) {
-    EXPECT_EQ(task.state(), TransferTask::State::running);
-    if (whenCompleted) whenCompleted();
-    std::lock_guard lock(mutex_);
-    outcomes_[task.description().value_or("none")] += describe(error, response);
-    ++completed_;
-    changed_.notify_all();
-}
-
-void SessionRecorder::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
-                                          const std::optional<TransferResponse>& response) {
-    std::lock_guard lock(mutex_);
-    elsewhere_[task.description().value_or("none")] += describe(error, response);
+    where[task.description().value_or("none")] += describe(error, response);
     ++completed_;
     changed_.notify_all();
 }
@@ -75,29 +57,10 @@ bool SessionRecorder::wait(std::size_t count) const {
     return changed_.wait_for(lock, 20s, [&] { return completed_ >= count; });
 }
 
-bool SessionRecorder::waitForSignal() const {
+std::optional<std::size_t> SessionRecorder::waitForSignal() const {
     std::unique_lock lock(mutex_);
-    return changed_.wait_for(lock, 20s, [&] { return completedAtSignal_.has_value(); });
-}
-
-std::map<std::string, std::string> SessionRecorder::outcomes() const {
-    std::lock_guard lock(mutex_);
-    return outcomes_;
-}
-
-std::map<std::string, std::string> SessionRecorder::elsewhere() const {
-    std::lock_guard lock(mutex_);
-    return elsewhere_;
-}
-
-std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
-    std::lock_guard lock(mutex_);
+    changed_.wait_for(lock, 20s, [&] { return completedAtSignal_.has_value(); });
     return completedAtSignal_;
-}
-
-std::int64_t SessionRecorder::bytesSent() const {
-    std::lock_guard lock(mutex_);
-    return sent_;
 }
 
 AgentFixture::AgentFixture() {
@@ -163,15 +126,6 @@ long AgentFixture::agent(const std::filesystem::path& directory) {
     std::error_code gone;
     const auto real = std::filesystem::weakly_canonical(directory, gone).string();
     return command.find(real + '\0') == std::string::npos ? 0 : process;
-}
-
-long AgentFixture::processorTime(long process) {
-    std::istringstream stat(readFile("/proc/" + std::to_string(process) + "/stat"));
-    std::string word;
-    for (int i = 0; i < 13; ++i) stat >> word;
-    long user = 0, system = 0;
-    stat >> user >> system;
-    return user + system;
 }
 
 void AgentFixture::kill(int signal) const {

@@ -1,18 +1,17 @@
 #include "tests/Agent/AgentFixture.h"
 #include "tests/support/Documents.h"
 
-#include <fcntl.h>
 #include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <array>
+#include <cstdio>
+#include <cstring>
 #include <future>
 #include <random>
 #include <set>
-#include <sstream>
 #include <thread>
 
 namespace corvane::test {
@@ -25,33 +24,18 @@ struct Outcome {
 
 class HostTest : public AgentFixture {
   protected:
-    Outcome run(const std::string& endpoint, int events, const std::string& mode,
-                const std::vector<std::string>& wake = {}) {
-        int channel[2];
-        EXPECT_EQ(pipe2(channel, O_CLOEXEC), 0);
-        std::vector<std::string> arguments{
-            CORVANE_BACKGROUND_HOST, CORVANE_AGENT, server.url("/" + endpoint), documents.path(), endpoint,
-            std::to_string(events),  mode};
-        arguments.insert(arguments.end(), wake.begin(), wake.end());
-        std::vector<char*> argv;
-        for (auto& argument : arguments) argv.push_back(argument.data());
-        argv.push_back(nullptr);
-        const pid_t child = fork();
-        if (child == 0) {
-            setenv("ASAN_OPTIONS", "detect_leaks=0", 1);  // it ends while its threads work, and they hold memory then
-            dup2(channel[1], STDOUT_FILENO);
-            execv(argv[0], argv.data());
-            _exit(127);
+    Outcome run(const std::string& endpoint, int events, const std::string& mode, const std::string& wake = {}) {
+        std::string command = "ASAN_OPTIONS=detect_leaks=0 exec";  // it ends while its threads work and hold memory
+        for (const std::string& argument :
+             {std::string(CORVANE_BACKGROUND_HOST), std::string(CORVANE_AGENT), server.url("/" + endpoint),
+              documents.path().string(), endpoint, std::to_string(events), mode, wake}) {
+            if (!argument.empty()) command += " '" + argument + "'";
         }
-        close(channel[1]);
-        std::string output;
-        std::array<char, 4096> buffer;
-        for (ssize_t n = 0; (n = read(channel[0], buffer.data(), buffer.size())) > 0;) output.append(buffer.data(), n);
-        close(channel[0]);
+        FILE* output = popen(command.c_str(), "re");
         Outcome result;
-        waitpid(child, &result.status, 0);
-        std::istringstream lines(output);
-        for (std::string line; std::getline(lines, line);) result.acknowledged.insert(line);
+        char line[256];
+        while (fgets(line, sizeof line, output)) result.acknowledged.insert(std::string(line, strcspn(line, "\n")));
+        result.status = pclose(output);
         return result;
     }
 
@@ -128,9 +112,10 @@ TEST_F(HostTest, TwoHostsAndTwoEndpointsAtOnceSeeTheirOwn) {
 }
 
 TEST_F(HostTest, RunsACommandForAHostThatIsNotThereOnce) {
-    const auto woken = documents / "woken";
-    const Outcome killed =
-        run("main", 5, "kill", {"/bin/sh", "-c", "echo \"$0\" $(umask) $(pwd) >> '" + woken.string() + "'"});
+    const auto woken = documents / "woken", program = body("wake", "#!/bin/sh\necho \"$1\" $(umask) $(pwd) >> '" +
+                                                                       (documents / "woken").string() + "'\n");
+    chmod(program.c_str(), 0700);
+    const Outcome killed = run("main", 5, "kill", program);
     ASSERT_TRUE(wasKilled(killed));
     ASSERT_TRUE(eventually([&] { return std::filesystem::exists(woken) && !readFile(woken).empty(); }));
     EXPECT_TRUE(succeeded(run("main", 1, "wait"))) << "a host that is there is told, not woken";
