@@ -138,7 +138,6 @@ void Journal::open(const std::filesystem::path& path) {
     if (found != version) takeOver(found);
 }
 
-// Makes a new file's tables, or an earlier version's into this one's.
 void Journal::takeOver(std::int64_t found) {
     run("BEGIN IMMEDIATE;");
     run(found == 0 ? layout : fromVersion1);

@@ -69,9 +69,12 @@ class Journal {
     };
 
     void open(const std::filesystem::path& path);
+    /// Makes a new file's tables, or an earlier version's into this one's.
     void takeOver(std::int64_t found);
+    /// Looks at every page.
     void check();
     void run(const char* sql);
+    /// Notes whether the result tells of damage, and throws it.
     [[noreturn]] void fail(int code);
 
     std::unique_ptr<sqlite3, Close> database_;

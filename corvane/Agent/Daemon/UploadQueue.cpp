@@ -70,7 +70,6 @@ void UploadQueue::remove(std::int64_t number) {
     }
 }
 
-// A host with nothing to do is forgotten, with what is known of it.
 void UploadQueue::settle(std::map<std::string, Host>::iterator host) {
     if (host->second.waiting.empty() && host->second.running.empty()) hosts_.erase(host);
 }

@@ -20,6 +20,13 @@ namespace corvane::transferd {
 /// run as the host may have, and a host that cannot be reached, or that the way to is blocked, is left alone for a
 /// delay that doubles from failure to failure. After a failure one upload at a time tries the host, each in its turn,
 /// until one gets through.
+///
+///     open    -> paused      an upload was held up; the others that run are not stopped
+///     paused  -> trying      the delay is over: one upload
+///     trying  -> paused      held up again: the next one in turn, after twice the delay
+///     trying  -> open        it got through, or failed in a way that says nothing of the host
+///
+/// Times are the caller's, so that every delay is counted from the moment of the call.
 class UploadQueue {
   public:
     using Clock = TransferScheduler::Clock;
@@ -99,12 +106,18 @@ class UploadQueue {
         [[nodiscard]] bool mayStart(Clock::time_point now) const;
     };
 
+    /// Starts the upload that has waited longest, unless its source has none for it any more.
     void startOne(Host& host);
     void run(Host& host, const Waiting& next, HTTPTransfer transfer);
+    /// An upload has come back: it is over, or it waits again.
     void finished(const Ended& ended, Clock::time_point now);
+    /// The host answers: opens it, and says so where it was in trouble.
     void goOn(Host& host);
+    /// The host does not answer: pauses it, and ends the uploads that have waited long enough.
     void holdUp(Host& host, const AnyError& why, Clock::time_point now);
+    /// Says why a host's uploads wait, unless that was the last thing said of it.
     void note(Host& host, const AnyError& why);
+    /// Forgets a host with nothing to do, with what is known of it.
     void settle(std::map<std::string, Host>::iterator host);
 
     Source& source_;
