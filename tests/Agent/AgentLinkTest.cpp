@@ -130,19 +130,5 @@ TEST_F(AgentLinkTest, GivesUpAnAgentThatOwesAnAnswerAndAsksASilentOneForASignOfL
     EXPECT_EQ(log.count("error=no answer in time"), 1);
 }
 
-TEST_F(AgentLinkTest, ConnectsAgainToAnAgentThatIsLostOrBreaksTheRules) {
-    open();
-    say(agent::Welcome{});
-    for (const bool isLost : {true, false}) {
-        peer->send("");
-        EXPECT_TRUE(peer->flush());
-        if (isLost) peer.reset();
-        pass(50ms);
-        say(agent::Welcome{});
-    }
-    EXPECT_EQ(log.count("Transfer agent was lost and is started again"), 2);
-    EXPECT_EQ(heard, "ready ready ready ");
-}
-
 }  // namespace
 }  // namespace corvane::test

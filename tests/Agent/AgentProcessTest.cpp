@@ -1,9 +1,7 @@
 #include "tests/Agent/AgentFixture.h"
 
-#include <dirent.h>
 #include <fcntl.h>
 #include <signal.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <set>
@@ -118,9 +116,8 @@ TEST_F(AgentProcessTest, EndsWhenThereIsNothingToDoAndIsStartedAgain) {
 TEST_F(AgentProcessTest, ThereIsOneHoweverManyStartIt) {
     std::vector<std::shared_ptr<TransferSession>> sessions;
     for (int i = 0; i < 8; ++i) sessions.push_back(open(recorder, "owner " + std::to_string(i)));
-    for (int i = 0; i < 8; ++i) upload(*sessions[static_cast<std::size_t>(i)], server.url(), std::to_string(i));
+    for (const auto& session : sessions) upload(*session, server.url(), "a");
     ASSERT_TRUE(recorder->wait(8));
-    for (const auto& session : sessions) EXPECT_TRUE(running(*session).empty());
     const auto agents = [&] {
         int found = 0;
         for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
@@ -145,8 +142,7 @@ TEST_F(AgentProcessTest, AThousandWaitingTasksCostLittleMemoryAndNoProcessorTime
         if (name.starts_with("Private_") && rollup >> value) kilobytes += value;
     }
 #ifndef CORVANE_SANITIZED
-    EXPECT_GT(kilobytes, 0);
-    EXPECT_LT(kilobytes, 16 * 1024);
+    EXPECT_TRUE(kilobytes > 0 && kilobytes < 16 * 1024) << kilobytes;
 #endif
     // Once what it was asked has been done, it does not come back to the system by itself.
     const auto switches = [&] { return field("\n" + readFile(proc("status")), "voluntary_ctxt_switches"); };

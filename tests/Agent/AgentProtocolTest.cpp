@@ -101,8 +101,7 @@ TEST_F(AgentProtocolTest, ClosesTheConnectionOfWhoeverBreaksTheRulesAndNoOther) 
     for (const auto& [name, bytes] : cases) {
         RawClient client(options.directory);
         client.sendBytes(bytes);
-        std::optional<agent::Reply> reply;
-        while ((reply = client.reply())) {
+        while (const auto reply = client.reply()) {
             EXPECT_TRUE(std::holds_alternative<agent::Welcome>(*reply)) << name;
         }
     }

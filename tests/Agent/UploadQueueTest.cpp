@@ -34,10 +34,8 @@ class UploadQueueTest : public testing::Test, public UploadQueue::Source {
     }
     bool mayWait(std::int64_t) override { return isPatient; }
     void troubleChanged(const UploadQueue::Trouble& trouble, const Numbers& uploads) override {
-        troubles += (!trouble.lasts      ? "over"
-                     : trouble.isBlocked ? "blocked "
-                                         : "unreachable ") +
-                    (trouble.lasts ? std::to_string(uploads.size()) + ";" : ";");
+        const std::string kind = trouble.isBlocked ? "blocked " : "unreachable ";
+        troubles += trouble.lasts ? kind + std::to_string(uploads.size()) + ";" : "over;";
     }
     void add(std::int64_t number, const std::string& url, int perHost = 4) {
         TransferSubmission submission;
@@ -56,17 +54,13 @@ class UploadQueueTest : public testing::Test, public UploadQueue::Source {
                 ended[one.number] = error ? error->as<TransferError>()->code() : int(one.outcome.response->statusCode);
             }
             queue.ended().clear();
-            if (started.size() == starts && ended.size() == ends && !isAtWork()) return true;
+            const bool rests =
+                isHeld ? server.requests().size() == started.size() : queue.isEmpty() || queue.isStalled(now);
+            if (started.size() == starts && ended.size() == ends && rests) return true;
             queue.wait({}, 20);
         } while (std::chrono::steady_clock::now() < deadline);
         return false;
     }
-    /// Whether an upload runs that can go on by itself.
-    [[nodiscard]] bool isAtWork() const {
-        if (isHeld) return server.requests().size() < started.size();
-        return !queue.isEmpty() && !queue.isStalled(now);
-    }
-
     TemporaryDocuments documents;
     ScriptedServer server;
     UploadQueue::Clock::time_point now{1h};
