@@ -68,7 +68,7 @@ std::vector<std::string> tokensIn(const std::filesystem::path& directory) {
 }  // namespace
 
 AgentDirectory::AgentDirectory(const std::filesystem::path& directory) : path_(std::filesystem::absolute(directory)) {
-    for (const auto& one : {path_, spool(), path_ / "withdrawn"}) {
+    for (const auto& one : {path_, spoolPath(), withdrawnPath()}) {
         createPrivateDirectories(one);
         requireOwn(one);
     }
@@ -104,26 +104,26 @@ void AgentDirectory::removeSocket() const {
 // The mark is there before the task starts elsewhere: an agent that reads it late finds it, and one that has taken the
 // submission from the spool meanwhile looks for it before every start.
 bool AgentDirectory::withdraw(std::string_view token) const {
-    const auto mark = path_ / "withdrawn" / token;
-    if (::rename(submission(token).c_str(), mark.c_str()) == 0) return true;
+    const auto mark = withdrawnPath() / token;
+    if (::rename(submissionPath(token).c_str(), mark.c_str()) == 0) return true;
     const Descriptor made(::open(mark.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
     return false;
 }
 
 bool AgentDirectory::isWithdrawn(std::string_view token) const {
-    return ::access((path_ / "withdrawn" / token).c_str(), F_OK) == 0;
+    return ::access((withdrawnPath() / token).c_str(), F_OK) == 0;
 }
 
 std::vector<std::string> AgentDirectory::withdrawn() const {
-    return tokensIn(path_ / "withdrawn");
+    return tokensIn(withdrawnPath());
 }
 
 void AgentDirectory::removeMark(std::string_view token) const {
-    ::unlink((path_ / "withdrawn" / token).c_str());
+    ::unlink((withdrawnPath() / token).c_str());
 }
 
 std::vector<std::string> AgentDirectory::spooled() const {
-    return tokensIn(spool());
+    return tokensIn(spoolPath());
 }
 
 }  // namespace corvane

@@ -20,10 +20,11 @@ class AgentDirectory {
     explicit AgentDirectory(const std::filesystem::path& directory);
 
     [[nodiscard]] const std::filesystem::path& path() const { return path_; }
-    [[nodiscard]] std::filesystem::path journal() const { return path_ / "journal.db"; }
-    [[nodiscard]] std::filesystem::path lockFile() const { return path_ / "agent.lock"; }
-    [[nodiscard]] std::filesystem::path spool() const { return path_ / "spool"; }
-    [[nodiscard]] std::filesystem::path submission(std::string_view token) const { return spool() / token; }
+    [[nodiscard]] std::filesystem::path journalPath() const { return path_ / "journal.db"; }
+    [[nodiscard]] std::filesystem::path lockPath() const { return path_ / "agent.lock"; }
+    [[nodiscard]] std::filesystem::path spoolPath() const { return path_ / "spool"; }
+    [[nodiscard]] std::filesystem::path withdrawnPath() const { return path_ / "withdrawn"; }
+    [[nodiscard]] std::filesystem::path submissionPath(std::string_view token) const { return spoolPath() / token; }
 
     /// A connected, non-blocking socket; none, and `errno`, when nobody answers there. However long the path is.
     [[nodiscard]] Descriptor connect() const;

@@ -33,7 +33,7 @@ bool decodeAs(std::uint8_t kind, std::string_view bytes, std::optional<Message>&
 
 template <class Message>
 std::optional<Message> decodeAny(std::string_view bytes) {
-    if (bytes.empty()) throw InvalidArgument("the message is empty");
+    if (bytes.empty()) throw FormatError("the message is empty");
     const auto kind = static_cast<std::uint8_t>(bytes.front());
     bytes.remove_prefix(1);
     std::optional<Message> decoded;
@@ -44,6 +44,25 @@ std::optional<Message> decodeAny(std::string_view bytes) {
 }
 
 }  // namespace
+
+bool isAnswered(const Request& request) {
+    return std::visit(
+        [](const auto& one) {
+            return requires {
+                one.isAnswered;
+            };
+        },
+        request);
+}
+bool isAnswer(const Reply& reply) {
+    return std::visit(
+        [](const auto& one) {
+            return requires {
+                one.isAnswer;
+            };
+        },
+        reply);
+}
 
 std::string encode(Request message) {
     return encodeAny(message);

@@ -31,17 +31,20 @@ struct Hello {
 /// A submission has been put into the spool.
 struct Submit {
     static constexpr std::uint8_t kind = 2;
+    static constexpr bool isAnswered = true;
     std::string token;
     void visit(auto&& with) { with(token); }
 };
 /// Asks for the owner's tasks.
 struct List {
     static constexpr std::uint8_t kind = 3;
+    static constexpr bool isAnswered = true;
     void visit(auto&&) {}
 };
 /// The delegate has been told of a completion; the agent may forget the task.
 struct Acknowledge {
     static constexpr std::uint8_t kind = 4;
+    static constexpr bool isAnswered = true;
     std::string token;
     void visit(auto&& with) { with(token); }
 };
@@ -60,6 +63,7 @@ struct Flush {
 /// Asks for a sign of life.
 struct Ping {
     static constexpr std::uint8_t kind = 7;
+    static constexpr bool isAnswered = true;
     void visit(auto&&) {}
 };
 
@@ -72,12 +76,14 @@ struct Welcome {
 /// The task is in the journal, and the agent's affair from now on.
 struct Accepted {
     static constexpr std::uint8_t kind = 66;
+    static constexpr bool isAnswer = true;
     std::string token;
     void visit(auto&& with) { with(token); }
 };
 /// The task was not taken, and is not in the journal.
 struct Refused {
     static constexpr std::uint8_t kind = 67;
+    static constexpr bool isAnswer = true;
     std::string token;
     std::string reason;
     void visit(auto&& with) { with(token, reason); }
@@ -92,6 +98,7 @@ struct Known {
 /// Every task was named.
 struct Listed {
     static constexpr std::uint8_t kind = 69;
+    static constexpr bool isAnswer = true;
     void visit(auto&&) {}
 };
 /// So much of a task's body has gone out.
@@ -107,7 +114,7 @@ struct Completed {
     static constexpr std::uint8_t kind = 71;
     std::string token;
     std::optional<std::string> description;
-    std::string outcome;  ///< the bytes of a `TransferOutcome`
+    std::string outcome;  ///< its bytes, see `decodeOutcome`
     void visit(auto&& with) { with(token, description, outcome); }
 };
 /// Nothing waits for the library any more.
@@ -117,11 +124,13 @@ struct Flushed {
 };
 struct Pong {
     static constexpr std::uint8_t kind = 73;
+    static constexpr bool isAnswer = true;
     void visit(auto&&) {}
 };
 /// An acknowledged task has left the journal.
 struct Forgotten {
     static constexpr std::uint8_t kind = 74;
+    static constexpr bool isAnswer = true;
     std::string token;
     void visit(auto&& with) { with(token); }
 };
@@ -132,7 +141,7 @@ struct Elsewhere {
     static constexpr std::uint8_t kind = 75;
     std::string token;
     std::optional<std::string> description;
-    std::string outcome;  ///< the bytes of a `TransferOutcome`; empty when it was taken back
+    std::string outcome;  ///< its bytes, see `decodeOutcome`; empty when it was taken back
     void visit(auto&& with) { with(token, description, outcome); }
 };
 /// Uploads of the owner to a server are held up, or go on.
@@ -146,6 +155,7 @@ struct Trouble {
 /// The agent does not know such a request.
 struct Unsupported {
     static constexpr std::uint8_t kind = 77;
+    static constexpr bool isAnswer = true;
     std::int64_t request = 0;
     void visit(auto&& with) { with(request); }
 };
@@ -157,10 +167,16 @@ using Reply = std::variant<Welcome, Accepted, Refused, Known, Listed, Progress, 
 /// The longest message there may be, without its length: an answer's head of 256 KiB fits.
 constexpr std::size_t longestMessage = std::size_t{512} * 1024;
 
+/// Whether the agent answers a request at once, so that its answer can be waited for. The one to a flush may take as
+/// long as a transfer.
+[[nodiscard]] bool isAnswered(const Request& request);
+/// Whether a reply is the answer to a request, and does not come by itself.
+[[nodiscard]] bool isAnswer(const Reply& reply);
+
 /// The bytes of a message, without its length.
 [[nodiscard]] std::string encode(Request message);
 [[nodiscard]] std::string encode(Reply message);
-/// Nothing for a message of a kind that is not known here. Throw `InvalidArgument` for one that is broken.
+/// Nothing for a message of a kind that is not known here. Throw `FormatError` for one that is broken.
 [[nodiscard]] std::optional<Request> decodeRequest(std::string_view bytes);
 [[nodiscard]] std::optional<Reply> decodeReply(std::string_view bytes);
 

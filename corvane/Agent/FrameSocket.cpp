@@ -1,7 +1,7 @@
 #include <corvane/Agent/FrameSocket.h>
 
 #include <corvane/Agent/AgentMessage.h>
-#include <corvane/Platform/Error.h>
+#include <corvane/Agent/FormatError.h>
 
 #include <sys/socket.h>
 #include <unistd.h>
@@ -48,7 +48,7 @@ std::optional<std::string> FrameSocket::next() {
         for (std::size_t i = 0; i < prefixLength; ++i) {
             length |= std::size_t{static_cast<unsigned char>(in_[taken_ + i])} << (8 * i);
         }
-        if (length == 0 || length > agent::longestMessage) throw InvalidArgument("the length of a message is wrong");
+        if (length == 0 || length > agent::longestMessage) throw FormatError("the length of a message is wrong");
         if (in_.size() - taken_ - prefixLength >= length) {
             message = in_.substr(taken_ + prefixLength, length);
             taken_ += prefixLength + length;

@@ -22,7 +22,7 @@ class FrameSocket {
     /// has ended; what came before is still handed out.
     [[nodiscard]] bool receive();
 
-    /// The next whole message, if it is in. Throws `InvalidArgument` when the peer announces one that is empty or too
+    /// The next whole message, if it is in. Throws `FormatError` when the peer announces one that is empty or too
     /// long: nothing can be read behind that.
     [[nodiscard]] std::optional<std::string> next();
 

@@ -33,7 +33,7 @@ bool TransferSubmission::isToken(std::string_view text) noexcept {
 
 std::string TransferSubmission::encoded() const {
     WireWriter write;
-    write(magic, version, token, session, owner, description, request.url, request.method, request.headers, file);
+    write(magic, version, token, session, owner, description, request.url, request.method, request.headers, bodyPath);
     write(static_cast<std::int64_t>(limits.responseBody), std::int64_t{limits.timeWithoutProgress.count()},
           std::int64_t{limits.answer.count()}, std::int64_t{limits.transfersPerHost}, std::int64_t{patience.count()},
           wakeCommand);
@@ -45,7 +45,7 @@ void TransferSubmission::checkNames(std::string_view session, std::string_view o
                                     const std::vector<std::string>& wakeCommand) {
     const auto check = [](const char* what, std::size_t size, std::size_t most) {
         if (size > most) {
-            throw InvalidArgument(std::string(what) + " is longer than " + std::to_string(most) + " bytes");
+            throw FormatError(std::string(what) + " is longer than " + std::to_string(most) + " bytes");
         }
     };
     check("the session's identifier", session.size(), longestName);
@@ -56,28 +56,28 @@ void TransferSubmission::checkNames(std::string_view session, std::string_view o
 }
 
 TransferSubmission TransferSubmission::decode(std::string_view bytes) {
-    if (bytes.size() > longest) throw InvalidArgument("the submission is too long");
+    if (bytes.size() > longest) throw FormatError("the submission is too long");
     WireReader read(bytes);
     std::string start;
     std::int64_t format = 0;
     read(start, format);
-    if (start != magic) throw InvalidArgument("the bytes are no submission");
-    if (format < 1 || format > version) throw InvalidArgument("the submission is of another version");
+    if (start != magic) throw FormatError("the bytes are no submission");
+    if (format < 1 || format > version) throw FormatError("the submission is of another version");
     TransferSubmission made;
     std::int64_t body = 0, progress = 0, answer = 0, perHost = 0, patience = 0;
     read(made.token, made.session, made.owner, made.description, made.request.url, made.request.method,
-         made.request.headers, made.file, body, progress, answer, perHost, patience, made.wakeCommand);
+         made.request.headers, made.bodyPath, body, progress, answer, perHost, patience, made.wakeCommand);
     // Version 1 ends here, and behind the last value of this one there may be more.
     if (format == 1) read.finish();
     if (format > 1) read(made.trustedCertificates, made.proxy.url, made.proxy.exceptions, made.extras);
     const bool inRange = body >= 0 && progress > 0 && progress <= longestTime && answer > 0 && answer <= longestTime &&
                          perHost > 0 && perHost <= 1000 && patience >= 0 && patience <= longestTime;
-    if (!inRange || !isToken(made.token)) throw InvalidArgument("a value of the submission is out of range");
-    if (!made.file.starts_with('/') || made.file.find('\0') != std::string::npos) {
-        throw InvalidArgument("the path of the body is not absolute");
+    if (!inRange || !isToken(made.token)) throw FormatError("a value of the submission is out of range");
+    if (!made.bodyPath.starts_with('/') || made.bodyPath.find('\0') != std::string::npos) {
+        throw FormatError("the path of the body is not absolute");
     }
     if (!made.trustedCertificates.empty() && !made.trustedCertificates.starts_with('/')) {
-        throw InvalidArgument("the path of the certificates is not absolute");
+        throw FormatError("the path of the certificates is not absolute");
     }
     made.limits.responseBody = static_cast<std::size_t>(body);
     made.limits.timeWithoutProgress = std::chrono::milliseconds(progress);

@@ -25,8 +25,8 @@ struct TransferSubmission {
     std::string owner;
     std::optional<std::string> description;
     TransferRequest request;
-    /// The body, an absolute path.
-    std::string file;
+    /// The body; absolute.
+    std::string bodyPath;
     TransferLimits limits;
     /// How long the agent may wait for a server that cannot be reached.
     std::chrono::milliseconds patience{};
@@ -40,7 +40,7 @@ struct TransferSubmission {
     std::vector<std::pair<std::string, std::string>> extras = {};
 
     [[nodiscard]] std::string encoded() const;
-    /// Reads what version 1 wrote, too. Throws `InvalidArgument` for bytes that are no submission, and for values that
+    /// Reads what version 1 wrote, too. Throws `FormatError` for bytes that are no submission, and for values that
     /// cannot be right.
     [[nodiscard]] static TransferSubmission decode(std::string_view bytes);
 
@@ -56,7 +56,7 @@ struct TransferSubmission {
     static constexpr std::size_t longestName = std::size_t{8} * 1024;
     static constexpr std::size_t longestCommand = std::size_t{32} * 1024;
     static constexpr std::size_t longestDescription = std::size_t{64} * 1024;
-    /// Throws `InvalidArgument`, and says which, when one is beyond its bound.
+    /// Throws `FormatError`, and says which, when one is beyond its bound.
     static void checkNames(std::string_view session, std::string_view owner,
                            const std::vector<std::string>& wakeCommand);
 };

@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Platform/Error.h>
+#include <corvane/Agent/FormatError.h>
 
 #include <cstdint>
 #include <map>
@@ -12,7 +12,7 @@
 
 namespace corvane {
 
-/// Reads back what `WireWriter` wrote. Throws `InvalidArgument` on bytes that it cannot have written, and never takes
+/// Reads back what `WireWriter` wrote. Throws `FormatError` on bytes that it cannot have written, and never takes
 /// more memory than a small multiple of their number. Internal.
 class WireReader {
   public:
@@ -21,7 +21,7 @@ class WireReader {
 
     void operator()(bool& flag) {
         const char byte = take(1).front();
-        if (byte != '\0' && byte != '\1') throw InvalidArgument("a flag is neither set nor clear");
+        if (byte != '\0' && byte != '\1') throw FormatError("a flag is neither set nor clear");
         flag = byte == '\1';
     }
     void operator()(std::int64_t& number) { number = static_cast<std::int64_t>(integer(8)); }
@@ -60,12 +60,12 @@ class WireReader {
 
     /// Throws when something is left over, where nothing may be.
     void finish() const {
-        if (!bytes_.empty()) throw InvalidArgument("there are bytes behind the last value");
+        if (!bytes_.empty()) throw FormatError("there are bytes behind the last value");
     }
 
   private:
     std::string_view take(std::size_t count) {
-        if (count > bytes_.size()) throw InvalidArgument("a value is cut off");
+        if (count > bytes_.size()) throw FormatError("a value is cut off");
         const auto taken = bytes_.substr(0, count);
         bytes_.remove_prefix(count);
         return taken;
@@ -82,7 +82,7 @@ class WireReader {
     // Every element takes a byte at least, so a count beyond what is left is a lie, and costs no memory.
     std::size_t size() {
         const auto count = static_cast<std::size_t>(integer(4));
-        if (count > bytes_.size()) throw InvalidArgument("a value is cut off");
+        if (count > bytes_.size()) throw FormatError("a value is cut off");
         return count;
     }
 

@@ -1,5 +1,7 @@
 #include <corvane/Transfer/CurlTransfer.h>
 
+#include <corvane/Transfer/HTTPURL.h>
+
 #include <curl/curl.h>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -19,51 +21,6 @@ using Code = TransferError::Code;
 
 // More than any server has to say, and little enough to keep for every transfer.
 constexpr std::size_t longestHead = std::size_t{256} * 1024;
-
-struct URLParts {
-    std::string scheme;
-    std::string host;
-    std::string port;
-};
-
-std::string part(CURLU* url, CURLUPart which) {
-    char* text = nullptr;
-    if (curl_url_get(url, which, &text, CURLU_DEFAULT_PORT) != CURLUE_OK) return {};
-    const std::unique_ptr<char, decltype(&curl_free)> owned(text, curl_free);
-    return text;
-}
-
-std::string lowerCase(std::string text) {
-    std::transform(text.begin(), text.end(), text.begin(),
-                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
-    return text;
-}
-
-// For messages: a user and a password are nobody's business.
-std::string withoutUser(const std::string& url) {
-    const auto slashes = url.find("//");
-    const auto start = slashes == std::string::npos ? 0 : slashes + 2;
-    const auto at = url.rfind('@', url.find_first_of("/?#", start));
-    return at == std::string::npos || at < start ? url : url.substr(0, start) + url.substr(at + 1);
-}
-
-URLParts parse(const std::string& text) {
-    const std::unique_ptr<CURLU, decltype(&curl_url_cleanup)> url(curl_url(), curl_url_cleanup);
-    if (!url) throw std::bad_alloc();
-    if (text.find('\0') != std::string::npos || curl_url_set(url.get(), CURLUPART_URL, text.c_str(), 0) != CURLUE_OK) {
-        throw TransferError(Code::invalidRequest, "the URL cannot be used: " + withoutUser(text));
-    }
-    URLParts parts{part(url.get(), CURLUPART_SCHEME), part(url.get(), CURLUPART_HOST), part(url.get(), CURLUPART_PORT)};
-    if (parts.scheme != "http" && parts.scheme != "https") {
-        throw TransferError(Code::invalidRequest, "the URL is neither http nor https: " + withoutUser(text));
-    }
-    parts.host = lowerCase(std::move(parts.host));
-    return parts;
-}
-
-bool isLoopback(const std::string& host) {
-    return host == "localhost" || host.ends_with(".localhost") || host.starts_with("127.") || host == "[::1]";
-}
 
 bool isToken(std::string_view text) {
     return !text.empty() && std::all_of(text.begin(), text.end(), [](char c) {
@@ -88,18 +45,13 @@ void CurlTransfer::HeaderListDeleter::operator()(void* list) const noexcept {
     curl_slist_free_all(static_cast<curl_slist*>(list));
 }
 
-std::string CurlTransfer::hostKey(const HTTPTransfer& transfer) {
-    const URLParts url = parse(transfer.request.url);
-    return transfer.pool + ' ' + url.host + ' ' + url.port;
-}
-
 CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
     : limits_(transfer.limits),
       didSend_(transfer.didSend),
       deadline_(Clock::now() + limits_.timeWithoutProgress),
       easy_(curl_easy_init()) {
     if (!easy_) throw std::bad_alloc();
-    if (transfer.bodyFile) openBody(*transfer.bodyFile, transfer.bodyMustBeOwn);
+    if (transfer.bodyPath) openBody(*transfer.bodyPath, transfer.bodyMustBeOwn);
     setHeaders(transfer.request);
     setOptions(transfer);
 }
@@ -143,7 +95,7 @@ void CurlTransfer::setHeaders(const TransferRequest& request) {
 
 void CurlTransfer::setOptions(const HTTPTransfer& transfer) {
     CURL* easy = easy_.get();
-    const URLParts url = parse(transfer.request.url);
+    const HTTPURL url = HTTPURL::parse(transfer.request.url);
     curl_easy_setopt(easy, CURLOPT_URL, transfer.request.url.c_str());
     curl_easy_setopt(easy, CURLOPT_PROTOCOLS_STR, "http,https");
     curl_easy_setopt(easy, CURLOPT_FOLLOWLOCATION, 0L);
@@ -156,14 +108,14 @@ void CurlTransfer::setOptions(const HTTPTransfer& transfer) {
     curl_easy_setopt(easy, CURLOPT_ERRORBUFFER, errorText_);
     curl_easy_setopt(easy, CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
     setTrust(transfer.trustedCertificates);
-    setProxy(transfer.proxy, url.host);
+    setProxy(transfer.proxy, url.isLoopback());
 
     curl_easy_setopt(easy, CURLOPT_HTTPHEADER, static_cast<curl_slist*>(headerList_.get()));
     curl_easy_setopt(easy, CURLOPT_HEADERFUNCTION, &headerArrived);
     curl_easy_setopt(easy, CURLOPT_HEADERDATA, this);
     curl_easy_setopt(easy, CURLOPT_WRITEFUNCTION, &bodyArrived);
     curl_easy_setopt(easy, CURLOPT_WRITEDATA, this);
-    if (!transfer.bodyFile) return;
+    if (!transfer.bodyPath) return;
 
     if (!isToken(transfer.request.method)) throw TransferError(Code::invalidRequest, "the method cannot be sent");
     curl_easy_setopt(easy, CURLOPT_UPLOAD, 1L);
@@ -188,8 +140,8 @@ void CurlTransfer::setTrust(const std::filesystem::path& certificates) {
 }
 
 // Both are set in any case: what is left out libcurl would look for in the environment.
-void CurlTransfer::setProxy(const TransferProxy& proxy, const std::string& host) {
-    if (!isLoopback(host)) proxy_ = proxy.url;
+void CurlTransfer::setProxy(const TransferProxy& proxy, bool isLoopback) {
+    if (!isLoopback) proxy_ = proxy.url;
     curl_easy_setopt(easy_.get(), CURLOPT_PROXY, proxy_.c_str());
     curl_easy_setopt(easy_.get(), CURLOPT_NOPROXY, proxy.exceptions.c_str());
 }
@@ -312,7 +264,7 @@ void CurlTransfer::takeHeader(std::string_view line) {
         const std::string name(line.substr(0, colon));
         const auto value = trimmed(line.substr(colon + 1));
         // Looked up, and not searched for: a head of many fields must not keep the thread from everything else.
-        const auto [known, isNew] = spellings_.try_emplace(lowerCase(name), name);
+        const auto [known, isNew] = spellings_.try_emplace(inLowerCase(name), name);
         std::string& values = answer_.headers[known->second];
         if (!isNew) values.append(", ");
         values.append(value);

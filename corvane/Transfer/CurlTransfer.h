@@ -24,9 +24,6 @@ class CurlTransfer {
   public:
     using Clock = std::chrono::steady_clock;
 
-    /// What transfers are counted by: pool, host and port. Throws `TransferError` for a URL that cannot be used.
-    [[nodiscard]] static std::string hostKey(const HTTPTransfer& transfer);
-
     /// Opens the body file and sets the handle up. Throws `TransferError`.
     explicit CurlTransfer(const HTTPTransfer& transfer);
     CurlTransfer(const CurlTransfer&) = delete;
@@ -57,7 +54,7 @@ class CurlTransfer {
     };
     void openBody(const std::filesystem::path& file, bool mustBeOwn);
     void setTrust(const std::filesystem::path& certificates);
-    void setProxy(const TransferProxy& proxy, const std::string& host);
+    void setProxy(const TransferProxy& proxy, bool isLoopback);
     [[nodiscard]] bool hasBegun() const;
     [[nodiscard]] TransferError failure(int curlCode) const;
     [[nodiscard]] bool isProxyRefusal() const;

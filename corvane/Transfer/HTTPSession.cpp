@@ -51,10 +51,8 @@ void HTTPSession::get(std::string url, Completion completion) {
     transfer.limits = limits_;
     transfer.proxy = TransferProxy::ofEnvironment(transfer.request.url);
     transfer.pool = pool_;
-    transfer.didComplete = [queue = queue_, completion = std::move(completion)](
-                               std::optional<AnyError> error, std::optional<TransferResponse> response) {
-        queue->async(
-            [completion, error = std::move(error), response = std::move(response)] { completion(response, error); });
+    transfer.didComplete = [queue = queue_, completion = std::move(completion)](TransferOutcome outcome) {
+        queue->async([completion, outcome = std::move(outcome)] { completion(outcome.response, outcome.error); });
     };
     TransferThread::start(std::move(transfer));
 }

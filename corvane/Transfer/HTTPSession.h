@@ -1,8 +1,7 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Platform/Error.h>
-#include <corvane/Transfer/TransferResponse.h>
+#include <corvane/Transfer/TransferRequest.h>
 #include <corvane/Transfer/TransferSessionConfiguration.h>
 
 #include <functional>
@@ -21,7 +20,7 @@ class SerialQueue;
 ///
 ///     HTTPSession session;
 ///     session.get("https://example.com/ping", [](auto response, auto error) { ... });
-class CORVANE_EXPORT HTTPSession {
+class HTTPSession {
   public:
     /// @param response the head of the answer, if there was one; also beside an error, when the connection broke inside
     ///        the answer's body.

@@ -19,16 +19,6 @@ namespace corvane {
 
 namespace {
 
-void report(const HTTPTransfer& transfer, const std::optional<AnyError>& error,
-            const std::optional<TransferResponse>& response) {
-    transfer.didComplete(error, response);
-}
-
-// A transfer that never ends would be worse than one whose ending there is no memory for.
-void reportFailure(const HTTPTransfer& transfer) noexcept {
-    callHost("transfer completion", [&] { report(transfer, AnyError::current(), std::nullopt); });
-}
-
 // A wait that the system refuses (no memory, a lowered limit of descriptors) must not become a spin.
 void rest(int milliseconds) {
     constexpr int longest = 50;
@@ -57,15 +47,25 @@ TransferScheduler::~TransferScheduler() {
     for (const auto& one : running_) curl_multi_remove_handle(multi_.get(), one.curl->handle());
 }
 
-void TransferScheduler::start(Ticket ticket, HTTPTransfer transfer) {
-    Waiting arrived{ticket, std::move(transfer)};
+bool TransferScheduler::start(Ticket ticket, HTTPTransfer transfer) {
     try {
-        const std::string host = CurlTransfer::hostKey(arrived.transfer);
-        hosts_[host].waiting.push_back(std::move(arrived));
-        startWaiting(host);
+        auto curl = std::make_unique<CurlTransfer>(transfer);
+        makeRoom();
+        if (curl_multi_add_handle(multi_.get(), curl->handle()) != CURLM_OK) throw std::bad_alloc();
+        running_.push_back({ticket, std::move(transfer), std::move(curl)});
+        return true;
     } catch (...) {
-        reportFailure(arrived.transfer);
+        reportFailure(transfer);
+        return false;
     }
+}
+
+bool TransferScheduler::isRunning(Ticket ticket) const {
+    return std::any_of(running_.begin(), running_.end(), [ticket](const Running& one) { return one.ticket == ticket; });
+}
+
+void TransferScheduler::reportFailure(const HTTPTransfer& transfer) noexcept {
+    callHost("transfer completion", [&] { transfer.didComplete({AnyError::current(), std::nullopt}); });
 }
 
 void TransferScheduler::perform() {
@@ -99,36 +99,11 @@ void TransferScheduler::wakeUp() noexcept {
     eventfd_write(wakeUp_.get(), 1);
 }
 
-// Those that wait go first, so that none of them gets the place of one that runs.
 void TransferScheduler::cancel(const std::set<Ticket>& tickets) {
-    const auto dropped = [&tickets](const auto& one) { return tickets.contains(one.ticket); };
-    for (auto& [name, host] : hosts_) std::erase_if(host.waiting, dropped);
+    const auto dropped = [&tickets](const Running& one) { return tickets.contains(one.ticket); };
     for (auto found = running_.end();
          (found = std::find_if(running_.begin(), running_.end(), dropped)) != running_.end();) {
-        startWaiting(takeOut(found).host);
-    }
-    std::erase_if(hosts_, [](const auto& host) { return !host.second.running && host.second.waiting.empty(); });
-}
-
-void TransferScheduler::startWaiting(const std::string& name) {
-    Host& host = hosts_[name];
-    while (!host.waiting.empty() && host.running < host.waiting.front().transfer.limits.transfersPerHost) {
-        Waiting next = std::move(host.waiting.front());
-        host.waiting.pop_front();
-        startOne(name, std::move(next));
-    }
-    if (!host.running && host.waiting.empty()) hosts_.erase(name);
-}
-
-void TransferScheduler::startOne(const std::string& host, Waiting next) {
-    try {
-        auto curl = std::make_unique<CurlTransfer>(next.transfer);
-        makeRoom();
-        if (curl_multi_add_handle(multi_.get(), curl->handle()) != CURLM_OK) throw std::bad_alloc();
-        running_.push_back({next.ticket, host, std::move(next.transfer), std::move(curl)});
-        ++hosts_[host].running;
-    } catch (...) {
-        reportFailure(next.transfer);
+        takeOut(found);
     }
 }
 
@@ -138,18 +113,17 @@ void TransferScheduler::makeRoom() {
     if (running_.size() == running_.capacity()) running_.reserve(std::max(least, 2 * running_.size()));
 }
 
-// Takes a running transfer away from curl; the caller looks after those that waited for its place.
+// Takes a running transfer away from curl.
 TransferScheduler::Running TransferScheduler::takeOut(std::vector<Running>::iterator position) {
     Running ended = std::move(*position);
     running_.erase(position);
     curl_multi_remove_handle(multi_.get(), ended.curl->handle());
-    --hosts_[ended.host].running;
     return ended;
 }
 
 void TransferScheduler::finish(const Running& ended, const auto& error) noexcept {
     try {
-        report(ended.transfer, error(), ended.curl->response());
+        ended.transfer.didComplete({error(), ended.curl->response()});
     } catch (...) {
         reportFailure(ended.transfer);
     }
@@ -166,7 +140,6 @@ void TransferScheduler::finishEnded() {
         if (found == running_.end()) continue;
         const Running ended = takeOut(found);
         finish(ended, [&] { return ended.curl->error(code); });
-        startWaiting(ended.host);
     }
 }
 
@@ -178,7 +151,6 @@ void TransferScheduler::checkProgress() {
          (late = std::find_if(running_.begin(), running_.end(), isLate)) != running_.end();) {
         const Running ended = takeOut(late);
         finish(ended, [&] { return ended.curl->timeoutError(); });
-        startWaiting(ended.host);
     }
 }
 

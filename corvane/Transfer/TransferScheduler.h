@@ -5,26 +5,23 @@
 #include <corvane/Transfer/HTTPTransfer.h>
 
 #include <cstdint>
-#include <deque>
-#include <map>
 #include <memory>
 #include <set>
 #include <span>
-#include <string>
 #include <vector>
 
 struct pollfd;
 
 namespace corvane {
 
-/// Runs HTTP exchanges side by side, with the limit per host: the part of a transfer thread, or of a program's loop,
-/// that deals with libcurl. Internal.
+/// Runs HTTP exchanges side by side, all that it is given: the part of a transfer thread, or of a program's loop, that
+/// deals with libcurl. How many may run at once is its owner's affair. Internal.
 ///
 /// Everything but `wakeUp` is called on one thread, and never from a transfer's functions, which run inside `perform`
 /// and `start`. Destroying a scheduler drops what runs without reporting it.
 ///
 ///     scheduler.start(1, std::move(transfer));
-///     while (!scheduler.isIdle()) {
+///     while (scheduler.isRunning(1)) {
 ///         scheduler.perform();                 // transfer.didComplete(...) is called in here
 ///         scheduler.wait({}, scheduler.millisecondsToDeadline());
 ///     }
@@ -40,9 +37,9 @@ class TransferScheduler {
     TransferScheduler& operator=(const TransferScheduler&) = delete;
     ~TransferScheduler();
 
-    /// Starts a transfer, or lets it wait for others of its host. One that cannot be started is reported at once.
-    /// Requires: the ticket is not in use.
-    void start(Ticket ticket, HTTPTransfer transfer);
+    /// Starts a transfer. One that cannot be started is reported at once, which `false` tells of. Requires: the ticket
+    /// is not in use.
+    bool start(Ticket ticket, HTTPTransfer transfer);
 
     /// Drops transfers without reporting them; tickets that are not in use are left alone.
     void cancel(const std::set<Ticket>& tickets);
@@ -57,33 +54,26 @@ class TransferScheduler {
     /// Ends a wait, this one or the next. Callable from any thread, while the scheduler lives.
     void wakeUp() noexcept;
 
-    [[nodiscard]] bool isIdle() const { return running_.empty() && hosts_.empty(); }
+    [[nodiscard]] bool isRunning(Ticket ticket) const;
 
     /// How long `wait` may take before a transfer is out of time; the greatest integer when there is none.
     [[nodiscard]] int millisecondsToDeadline() const;
 
+    /// Reports the exception that is being handled as a transfer's end: one that never ends would be worse than one
+    /// whose ending there is no memory for. Requires: called inside a `catch` block.
+    static void reportFailure(const HTTPTransfer& transfer) noexcept;
+
   private:
-    struct Waiting {
-        Ticket ticket;
-        HTTPTransfer transfer;
-    };
     struct Running {
         Ticket ticket;
-        std::string host;
         HTTPTransfer transfer;
         std::unique_ptr<CurlTransfer> curl;
-    };
-    struct Host {
-        int running = 0;
-        std::deque<Waiting> waiting;
     };
     struct MultiDeleter {
         void operator()(void* multi) const noexcept;
     };
 
-    void startWaiting(const std::string& host);
     void makeRoom();
-    void startOne(const std::string& host, Waiting next);
     static void finish(const Running& ended, const auto& error) noexcept;
     void finishEnded();
     void checkProgress();
@@ -91,7 +81,6 @@ class TransferScheduler {
 
     Descriptor wakeUp_;  // libcurl goes on without one of its own when the process has none left
     std::unique_ptr<void, MultiDeleter> multi_;
-    std::map<std::string, Host> hosts_;
     std::vector<Running> running_;
 };
 

@@ -1,14 +1,15 @@
 #include <corvane/Transfer/TransferSession.h>
 
-#include <mutex>
+#include <corvane/Platform/Mutex.h>
+
 #include <utility>
 
 namespace corvane {
 
 namespace {
 struct Registry {
-    std::mutex mutex;
-    TransferSession::Factory factory;
+    Mutex mutex;
+    TransferSession::Factory factory CORVANE_GUARDED_BY(mutex);
 };
 
 Registry& registry() {
@@ -18,13 +19,15 @@ Registry& registry() {
 }  // namespace
 
 void TransferSession::setFactory(Factory factory) {
-    std::lock_guard lock(registry().mutex);
-    registry().factory.swap(factory);  // the old one, and what it holds, goes behind the lock
+    auto& all = registry();
+    Lock lock(all.mutex);
+    all.factory.swap(factory);  // the old one, and what it holds, goes behind the lock
 }
 
 TransferSession::Factory TransferSession::factory() {
-    std::lock_guard lock(registry().mutex);
-    return registry().factory;
+    auto& all = registry();
+    Lock lock(all.mutex);
+    return all.factory;
 }
 
 }  // namespace corvane

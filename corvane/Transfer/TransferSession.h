@@ -1,12 +1,12 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Platform/Error.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Transfer/TransferRequest.h>
 #include <corvane/Transfer/TransferSessionConfiguration.h>
-#include <corvane/Transfer/TransferSessionDelegate.h>
-#include <corvane/Transfer/TransferTask.h>
 
+#include <cstdint>
 #include <filesystem>
 #include <functional>
 #include <memory>
@@ -15,6 +15,68 @@
 #include <vector>
 
 namespace corvane {
+
+/// One upload of a transfer session.
+///
+/// Made by `TransferSession::uploadTask`, suspended; shared between the session, which holds it until its completion
+/// callback has returned, and whoever asked for it. Letting go of a task does not stop it, and a task may outlive its
+/// session: it then never runs. All operations may be called from any thread.
+class CORVANE_EXPORT TransferTask {
+  public:
+    enum class State {
+        running,     ///< resumed, and its completion callback has not returned yet
+        suspended,   ///< not resumed yet
+        cancelling,  ///< told to stop, not completed yet
+        completed,   ///< over, and the delegate has been told
+    };
+
+    virtual ~TransferTask() = default;
+
+    /// Unique in its session.
+    [[nodiscard]] virtual std::int64_t identifier() const = 0;
+
+    /// Text of the owner's, kept with the task also where tasks outlive the process.
+    [[nodiscard]] virtual std::optional<std::string> description() const = 0;
+    virtual void setDescription(std::string description) = 0;
+
+    [[nodiscard]] virtual State state() const = 0;
+
+    /// Starts a suspended task; a task in another state stays as it is. Failures of any kind are reported through the
+    /// delegate, later.
+    virtual void resume() = 0;
+};
+
+/// Whoever a transfer session reports to. The session holds it weakly; every callback runs on the session's queue,
+/// never inside a call to the session, and what it throws is logged.
+class CORVANE_EXPORT TransferSessionDelegate {
+  public:
+    virtual ~TransferSessionDelegate() = default;
+
+    /// Part of a task's body went out. Counts are bytes; sessions may report several steps as one.
+    /// @param sent since the last report of this task.
+    /// @param total since the task began; less than before never, also when a part had to be sent again.
+    /// @param expected the size of the body.
+    virtual void taskDidSendBodyData(const TransferTask& task, std::int64_t sent, std::int64_t total,
+                                     std::int64_t expected) = 0;
+
+    /// A task is over; called once for every resumed task, as the last callback about it. Until it returns the task
+    /// counts as running.
+    /// @param error what went wrong, a `TransferError` as a rule; nothing when the server's answer is in.
+    /// @param response the head of the answer. It may be there beside an error, when the connection broke inside the
+    ///        answer's body.
+    virtual void taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
+                                 const std::optional<TransferResponse>& response) = 0;
+
+    /// A task is over, and the session of another process, of the same owner, was told by `taskDidComplete`: nothing is
+    /// left to do for it here. Sessions outside the process only. Does nothing by default.
+    /// @param error also when how the task ended is not known here, because that process has taken it over.
+    virtual void taskDidEndElsewhere(const TransferTask& /*task*/, const std::optional<AnyError>& /*error*/,
+                                     const std::optional<TransferResponse>& /*response*/) {}
+
+    /// Everything that was pending when the host was woken has been delivered; see
+    /// `TransferSession::deliverPendingEvents`.
+    virtual void allEventsDelivered() = 0;
+};
 
 /// Uploads files in the background: the seam behind which an agent outside the process can carry the transfers on when
 /// the process has gone.

@@ -2,14 +2,14 @@
 
 #include <corvane/Platform/ForkMark.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/Thread.h>
-#include <corvane/Transfer/TransferScheduler.h>
+#include <corvane/Transfer/TransferQueue.h>
 
 #include <atomic>
 #include <chrono>
 #include <cstdlib>
 #include <exception>
-#include <mutex>
 #include <set>
 #include <thread>
 #include <utility>
@@ -51,14 +51,14 @@ class Engine {
     static inline std::atomic<Engine*> instance_ = nullptr;
 
     const ForkMark made_;
-    TransferScheduler scheduler_;  // the thread's own, but for waking it up
+    TransferQueue queue_;  // the thread's own, but for waking it up
     std::thread thread_;
 
-    std::mutex mutex_;  // guards these; held for a few moves only
-    Ticket lastTicket_ = 0;
-    std::vector<Arrived> arrived_;
-    std::set<Ticket> cancelled_;
-    bool stopping_ = false;
+    Mutex mutex_;  // held for a few moves only
+    Ticket lastTicket_ CORVANE_GUARDED_BY(mutex_) = 0;
+    std::vector<Arrived> arrived_ CORVANE_GUARDED_BY(mutex_);
+    std::set<Ticket> cancelled_ CORVANE_GUARDED_BY(mutex_);
+    bool stopping_ CORVANE_GUARDED_BY(mutex_) = false;
 };
 
 Engine::Engine() {
@@ -74,10 +74,10 @@ Engine::Engine() {
 void Engine::stop() {
     if (made_.isInChild()) return;  // it has no such thread
     {
-        std::lock_guard lock(mutex_);
+        Lock lock(mutex_);
         stopping_ = true;
     }
-    scheduler_.wakeUp();
+    queue_.wakeUp();
     thread_.join();
 }
 
@@ -85,29 +85,29 @@ Ticket Engine::start(HTTPTransfer transfer) {
     if (made_.isInChild()) return 0;  // a thread of the parent may have held the lock
     Ticket ticket = 0;
     {
-        std::lock_guard lock(mutex_);
+        Lock lock(mutex_);
         ticket = ++lastTicket_;
         if (!stopping_) arrived_.push_back({ticket, std::move(transfer)});
     }
-    scheduler_.wakeUp();
+    queue_.wakeUp();
     return ticket;
 }
 
 void Engine::cancel(const std::vector<Ticket>& tickets) {
     if (made_.isInChild()) return;  // as for stop(); the transfers are the parent's
     {
-        std::lock_guard lock(mutex_);
+        Lock lock(mutex_);
         if (stopping_) return;
         cancelled_.insert(tickets.begin(), tickets.end());
     }
-    scheduler_.wakeUp();
+    queue_.wakeUp();
 }
 
 void Engine::run() {
     while (takeInbox()) {
         try {
-            scheduler_.perform();
-            scheduler_.wait({}, scheduler_.millisecondsToDeadline());
+            queue_.perform();
+            queue_.wait();
         } catch (const std::exception&) {  // no memory: it is tried again, and not in a spin
             std::this_thread::sleep_for(betweenAttempts);
         }
@@ -118,13 +118,13 @@ bool Engine::takeInbox() {
     std::vector<Arrived> arrived;
     std::set<Ticket> cancelled;
     {
-        std::lock_guard lock(mutex_);
+        Lock lock(mutex_);
         if (stopping_) return false;
         arrived.swap(arrived_);
         cancelled.swap(cancelled_);
     }
-    for (auto& one : arrived) scheduler_.start(one.ticket, std::move(one.transfer));
-    if (!cancelled.empty()) scheduler_.cancel(cancelled);
+    for (auto& one : arrived) queue_.start(one.ticket, std::move(one.transfer));
+    if (!cancelled.empty()) queue_.cancel(cancelled);
     return true;
 }
 
@@ -136,7 +136,7 @@ TransferThread::Ticket TransferThread::start(HTTPTransfer transfer) {
         engine = &Engine::shared();
     } catch (...) {
         try {
-            transfer.didComplete(AnyError::current(), std::nullopt);
+            transfer.didComplete({AnyError::current(), std::nullopt});
         } catch (...) {
             Log::shared().error("Transfer could not be reported, error=%{public}@", AnyError::current().what());
         }

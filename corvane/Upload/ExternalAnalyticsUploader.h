@@ -2,7 +2,7 @@
 
 #include <corvane/Export.h>
 #include <corvane/Platform/Error.h>
-#include <corvane/Transfer/TransferResponse.h>
+#include <corvane/Transfer/TransferRequest.h>
 
 #include <functional>
 #include <memory>

@@ -2,13 +2,10 @@
 
 #include <corvane/Transfer/TransferError.h>
 
-#include <arpa/inet.h>
 #include <signal.h>
-#include <sys/socket.h>
 #include <unistd.h>
 
 #include <future>
-#include <sstream>
 #include <thread>
 
 namespace corvane::test {
@@ -40,27 +37,10 @@ std::map<std::string, int> bodies(const ScriptedServer& server) {
     return counts;
 }
 
-void SessionRecorder::taskDidSendBodyData(const TransferTask&, std::int64_t sent, std::int64_t total,
-                                          std::int64_t expected) {
+void SessionRecorder::note(Outcomes& where, const TransferTask& task, const std::optional<AnyError>& error,
+                           const std::optional<TransferResponse>& response) {
     std::lock_guard lock(mutex_);
-    sent_ += sent;
-    EXPECT_LE(total, expected);
-}
-
-void SessionRecorder::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
-                                      const std::optional<TransferResponse>& response) {
-    EXPECT_EQ(task.state(), TransferTask::State::running);
-    if (whenCompleted) whenCompleted();
-    std::lock_guard lock(mutex_);
-    outcomes_[task.description().value_or("none")] += describe(error, response);
-    ++completed_;
-    changed_.notify_all();
-}
-
-void SessionRecorder::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
-                                          const std::optional<TransferResponse>& response) {
-    std::lock_guard lock(mutex_);
-    elsewhere_[task.description().value_or("none")] += describe(error, response);
+    where[task.description().value_or("none")] += describe(error, response);
     ++completed_;
     changed_.notify_all();
 }
@@ -77,58 +57,10 @@ bool SessionRecorder::wait(std::size_t count) const {
     return changed_.wait_for(lock, 20s, [&] { return completed_ >= count; });
 }
 
-bool SessionRecorder::waitForSignal() const {
+std::optional<std::size_t> SessionRecorder::waitForSignal() const {
     std::unique_lock lock(mutex_);
-    return changed_.wait_for(lock, 20s, [&] { return completedAtSignal_.has_value(); });
-}
-
-std::map<std::string, std::string> SessionRecorder::outcomes() const {
-    std::lock_guard lock(mutex_);
-    return outcomes_;
-}
-
-std::map<std::string, std::string> SessionRecorder::elsewhere() const {
-    std::lock_guard lock(mutex_);
-    return elsewhere_;
-}
-
-std::optional<std::size_t> SessionRecorder::completedAtSignal() const {
-    std::lock_guard lock(mutex_);
+    changed_.wait_for(lock, 20s, [&] { return completedAtSignal_.has_value(); });
     return completedAtSignal_;
-}
-
-std::int64_t SessionRecorder::bytesSent() const {
-    std::lock_guard lock(mutex_);
-    return sent_;
-}
-
-LatePort::LatePort() : socket_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t size = sizeof address;
-    EXPECT_EQ(bind(socket_, reinterpret_cast<sockaddr*>(&address), size), 0);
-    getsockname(socket_, reinterpret_cast<sockaddr*>(&address), &size);
-    port_ = ntohs(address.sin_port);
-}
-
-LatePort::~LatePort() {
-    close(socket_);
-}
-
-std::string LatePort::url() const {
-    return "http://127.0.0.1:" + std::to_string(port_);
-}
-
-void LatePort::answerOne() const {
-    listen(socket_, 8);
-    const int connection = accept(socket_, nullptr, nullptr);
-    char buffer[4096];
-    EXPECT_GT(recv(connection, buffer, sizeof buffer, 0), 0);
-    const std::string answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\nConnection: close\r\n\r\n";
-    send(connection, answer.data(), answer.size(), MSG_NOSIGNAL);
-    recv(connection, buffer, sizeof buffer, 0);
-    close(connection);
 }
 
 AgentFixture::AgentFixture() {
@@ -194,15 +126,6 @@ long AgentFixture::agent(const std::filesystem::path& directory) {
     std::error_code gone;
     const auto real = std::filesystem::weakly_canonical(directory, gone).string();
     return command.find(real + '\0') == std::string::npos ? 0 : process;
-}
-
-long AgentFixture::processorTime(long process) {
-    std::istringstream stat(readFile("/proc/" + std::to_string(process) + "/stat"));
-    std::string word;
-    for (int i = 0; i < 13; ++i) stat >> word;
-    long user = 0, system = 0;
-    stat >> user >> system;
-    return user + system;
 }
 
 void AgentFixture::kill(int signal) const {

@@ -8,6 +8,7 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <chrono>
 #include <condition_variable>
 #include <filesystem>
@@ -26,34 +27,46 @@ using namespace std::chrono_literals;
 /// Keeps what a session told it. Thread-safe.
 class SessionRecorder final : public TransferSessionDelegate {
   public:
-    void taskDidSendBodyData(const TransferTask&, std::int64_t, std::int64_t, std::int64_t) override;
+    using Outcomes = std::map<std::string, std::string>;
+
+    void taskDidSendBodyData(const TransferTask&, std::int64_t sent, std::int64_t total,
+                             std::int64_t expected) override {
+        bytesSent += sent;
+        EXPECT_LE(total, expected);
+    }
     void taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
-                         const std::optional<TransferResponse>& response) override;
+                         const std::optional<TransferResponse>& response) override {
+        EXPECT_EQ(task.state(), TransferTask::State::running);
+        if (whenCompleted) whenCompleted();
+        note(outcomes_, task, error, response);
+    }
     void taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
-                             const std::optional<TransferResponse>& response) override;
+                             const std::optional<TransferResponse>& response) override {
+        note(elsewhere_, task, error, response);
+    }
     void allEventsDelivered() override;
 
     /// Called first by every completion, where it arrives. Set before the session is opened.
     std::function<void()> whenCompleted;
+    std::atomic<std::int64_t> bytesSent = 0;
 
     /// Waits until so many completions came, also of tasks that ended elsewhere.
     [[nodiscard]] bool wait(std::size_t count) const;
-    [[nodiscard]] bool waitForSignal() const;
+    /// Waits for the signal; how many completions had come before.
+    [[nodiscard]] std::optional<std::size_t> waitForSignal() const;
     /// "200", or the kind of the error, by the description of the task; joined when it came more than once.
-    [[nodiscard]] std::map<std::string, std::string> outcomes() const;
+    [[nodiscard]] Outcomes outcomes() const { return std::lock_guard(mutex_), outcomes_; }
     /// The same of what was reported to another process.
-    [[nodiscard]] std::map<std::string, std::string> elsewhere() const;
-    /// How many completions had come before the signal did.
-    [[nodiscard]] std::optional<std::size_t> completedAtSignal() const;
-    [[nodiscard]] std::int64_t bytesSent() const;
+    [[nodiscard]] Outcomes elsewhere() const { return std::lock_guard(mutex_), elsewhere_; }
 
   private:
+    void note(Outcomes& where, const TransferTask& task, const std::optional<AnyError>& error,
+              const std::optional<TransferResponse>& response);
+
     mutable std::mutex mutex_;
     mutable std::condition_variable changed_;
-    std::map<std::string, std::string> outcomes_;
-    std::map<std::string, std::string> elsewhere_;
+    Outcomes outcomes_, elsewhere_;
     std::size_t completed_ = 0;
-    std::int64_t sent_ = 0;
     std::optional<std::size_t> completedAtSignal_;
 };
 
@@ -77,8 +90,6 @@ class AgentFixture : public ::testing::Test {
     /// The agent of the directory, or 0.
     [[nodiscard]] static long agent(const std::filesystem::path& directory);
     [[nodiscard]] long agent() const { return agent(options.directory); }
-    /// Processor time that a process has used, in the system's ticks.
-    [[nodiscard]] static long processorTime(long process);
     void kill(int signal) const;
     /// Kills the agent of a directory and waits for its end.
     static void end(const std::filesystem::path& directory);
@@ -88,21 +99,6 @@ class AgentFixture : public ::testing::Test {
     ScriptedServer server;
     TransferAgentOptions options;
     std::shared_ptr<SessionRecorder> recorder = std::make_shared<SessionRecorder>();
-};
-
-/// A port of the loopback address at which nobody listens until it is told to.
-class LatePort {
-  public:
-    LatePort();
-    LatePort(const LatePort&) = delete;
-    LatePort& operator=(const LatePort&) = delete;
-    ~LatePort();
-    [[nodiscard]] std::string url() const;
-    void answerOne() const;
-
-  private:
-    int socket_;
-    int port_;
 };
 
 /// Waits until a condition holds that nothing signals; false when it does not within the time.

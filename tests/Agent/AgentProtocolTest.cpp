@@ -1,5 +1,6 @@
 #include <corvane/Agent/AgentDirectory.h>
 #include <corvane/Agent/AgentMessage.h>
+#include <corvane/Agent/FormatError.h>
 #include <corvane/Agent/FrameSocket.h>
 #include <corvane/Agent/TransferSubmission.h>
 
@@ -34,19 +35,13 @@ class RawClient {
         send(agent::Hello{.session = "s", .owner = owner, .wakeCommand = {}});
         EXPECT_TRUE(gets<agent::Welcome>());
     }
-    void endSending() const { shutdown(socket_.descriptor(), SHUT_WR); }
     /// The next reply; nothing when the agent has closed the connection.
     std::optional<agent::Reply> reply() {
-        for (int i = 0; i < 100; ++i) {
+        for (bool isOpen = true;; isOpen = socket_.receive()) {
             if (const auto message = socket_.next()) return agent::decodeReply(*message);
             pollfd polled{socket_.descriptor(), POLLIN, 0};
-            poll(&polled, 1, 10'000);
-            if (!socket_.receive()) {
-                if (const auto last = socket_.next()) return agent::decodeReply(*last);
-                return std::nullopt;
-            }
+            if (!isOpen || poll(&polled, 1, 10'000) <= 0) return std::nullopt;
         }
-        return std::nullopt;
     }
     template <class Kind>
     bool gets() {
@@ -62,6 +57,13 @@ std::string frame(const std::string& message) {
     std::string bytes;
     for (int shift = 0; shift < 32; shift += 8) bytes.push_back(static_cast<char>(message.size() >> shift));
     return bytes + message;
+}
+
+std::chrono::nanoseconds processorTime(pid_t process) {
+    clockid_t clock = 0;
+    timespec used{};
+    EXPECT_TRUE(clock_getcpuclockid(process, &clock) == 0 && clock_gettime(clock, &used) == 0);
+    return std::chrono::seconds(used.tv_sec) + std::chrono::nanoseconds(used.tv_nsec);
 }
 
 class AgentProtocolTest : public AgentFixture {
@@ -99,8 +101,7 @@ TEST_F(AgentProtocolTest, ClosesTheConnectionOfWhoeverBreaksTheRulesAndNoOther) 
     for (const auto& [name, bytes] : cases) {
         RawClient client(options.directory);
         client.sendBytes(bytes);
-        std::optional<agent::Reply> reply;
-        while ((reply = client.reply())) {
+        while (const auto reply = client.reply()) {
             EXPECT_TRUE(std::holds_alternative<agent::Welcome>(*reply)) << name;
         }
     }
@@ -145,26 +146,23 @@ TEST_F(AgentProtocolTest, WaitsForDescriptorsWhenThereAreNone) {
     ASSERT_EQ(prlimit(process, RLIMIT_NOFILE, &few, nullptr), 0);
     RawClient client(options.directory);
     client.send(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {}});
-    EXPECT_FALSE(eventually([&] { return processorTime(process) > 20; }, 500ms)) << "it does not spin";
+    EXPECT_FALSE(eventually([&] { return processorTime(process) > 200ms; }, 500ms)) << "it does not spin";
     ASSERT_EQ(prlimit(process, RLIMIT_NOFILE, &before, nullptr), 0);
     EXPECT_TRUE(client.gets<agent::Welcome>());
     expectAgentWorks();
 }
 
-TEST_F(AgentProtocolTest, SurvivesAnyBytes) {
+TEST(AgentMessage, AnyBytesAreAMessageOrAFormatError) {
     std::mt19937 random(11);
-    const std::string hello =
-        frame(agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {"a", "b"}}));
-    for (int i = 0; i < 300; ++i) {
-        std::string bytes = hello + frame(agent::encode(agent::Describe{"token", "text"}));
+    const std::string hello = agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {"a", "b"}});
+    for (int i = 0; i < 3000; ++i) {
+        std::string bytes = hello;
         for (int change = 0; change < 3; ++change) bytes[random() % bytes.size()] = static_cast<char>(random());
-        RawClient client(options.directory);
-        client.sendBytes(bytes);
-        client.endSending();
-        while (client.reply()) {
+        try {
+            static_cast<void>(agent::decodeRequest(bytes));
+        } catch (const FormatError&) {
         }
     }
-    expectAgentWorks();
 }
 
 TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {
@@ -173,23 +171,19 @@ TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {
     good.token = token;
     good.session = "s";
     good.owner = "o";
-    good.file = "/tmp/x";
-    auto relative = good, foreign = good, other = good;
-    relative.file = "x";
+    good.bodyPath = "/tmp/x";
+    auto foreign = good, other = good;
     foreign.owner = "p";
     other.token = TransferSubmission::newToken();
     const std::pair<const char*, std::string> cases[] = {
-        {"nothing", ""},
         {"garbage", std::string(1000, 'x')},
         {"cut off", good.encoded().substr(0, 90)},
         {"too long", good.encoded() + std::string(TransferSubmission::longest, 'x')},
-        {"a relative path", relative.encoded()},
         {"another task's", other.encoded()},
         {"another owner's", foreign.encoded()},
     };
     RawClient client(options.directory);
-    client.send(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {}});
-    ASSERT_TRUE(client.gets<agent::Welcome>());
+    client.greet();
     client.send(agent::Submit{token});
     EXPECT_TRUE(client.gets<agent::Refused>()) << "there is none";
     for (const auto& [name, bytes] : cases) {

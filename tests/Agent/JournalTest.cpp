@@ -1,21 +1,20 @@
-#include <corvane/Agent/TransferOutcome.h>
-#include <corvane/Agent/TransferSubmission.h>
+#include <corvane/Agent/Daemon/JournalError.h>
+#include <corvane/Agent/Daemon/TaskBook.h>
+#include <corvane/Agent/OutcomeCodec.h>
 #include <corvane/Agent/WireWriter.h>
+#include <corvane/Transfer/TransferError.h>
 
-#include "tests/Agent/AgentFixture.h"
+#include "tests/support/TemporaryDocuments.h"
 
-#include <signal.h>
+#include <gtest/gtest.h>
 #include <sqlite3.h>
-#include <sys/resource.h>
-#include <sys/stat.h>
 
 #include <algorithm>
 
 namespace corvane::test {
 namespace {
 
-using Reply = ScriptedServer::Reply;
-using Outcomes = std::map<std::string, std::string>;
+using namespace transferd;
 
 // The journal's tables as version 1 made them.
 constexpr const char* version1 =
@@ -25,182 +24,138 @@ constexpr const char* version1 =
     "CREATE TABLE wakes (session TEXT NOT NULL, owner TEXT NOT NULL, command BLOB NOT NULL, "
     "PRIMARY KEY (session, owner));";
 
-class Database {
-  public:
-    explicit Database(const std::filesystem::path& file) {
-        EXPECT_EQ(sqlite3_open(file.c_str(), &database_), SQLITE_OK);
-        sqlite3_busy_timeout(database_, 5000);
-    }
-    Database(const Database&) = delete;
-    Database& operator=(const Database&) = delete;
-    ~Database() { sqlite3_close(database_); }
+// A submission as version 1 wrote it.
+std::string submission1(const std::string& token) {
+    WireWriter write;
+    write(std::string("CVTS"), std::int64_t{1}, token, std::string("session"), std::string("owner"),
+          std::optional<std::string>(), std::string("http://127.0.0.1/"), std::string("PUT"),
+          std::vector<std::pair<std::string, std::string>>{}, std::string("/body"));
+    for (const std::int64_t number : {65'536, 60'000, 300'000, 4, 86'400'000}) write(number);
+    write(std::vector<std::string>{});
+    return write.take();
+}
 
-    void run(const std::string& sql, const std::vector<std::string>& blobs = {}) {
-        sqlite3_stmt* statement = nullptr;
-        for (const char* rest = sql.c_str(); *rest;) {
-            ASSERT_EQ(sqlite3_prepare_v2(database_, rest, -1, &statement, &rest), SQLITE_OK)
-                << sqlite3_errmsg(database_);
-            int bound = 0;
-            for (const auto& blob : blobs) {
-                sqlite3_bind_blob(statement, ++bound, blob.data(), static_cast<int>(blob.size()), SQLITE_TRANSIENT);
-            }
-            while (sqlite3_step(statement) == SQLITE_ROW) text_ = text(statement);
-            sqlite3_finalize(statement);
-        }
-    }
-    std::string ask(const std::string& sql) {
-        text_.clear();
-        run(sql);
-        return text_;
-    }
+std::string literal(const std::string& bytes) {
+    std::string text = "x'";
+    for (const unsigned char byte : bytes) text += {"0123456789ABCDEF"[byte >> 4], "0123456789ABCDEF"[byte & 15]};
+    return text + "'";
+}
 
-  private:
-    static std::string text(sqlite3_stmt* statement) {
-        const auto* found = sqlite3_column_text(statement, 0);
-        return found ? reinterpret_cast<const char*>(found) : "NULL";
-    }
-
-    sqlite3* database_ = nullptr;
-    std::string text_;
-};
-
-class JournalTest : public AgentFixture {
+/// A journal with its book. Every test has the file `path`, into which it looks by itself.
+class JournalTest : public testing::Test {
   protected:
-    [[nodiscard]] std::filesystem::path journal() const { return options.directory / "journal.db"; }
+    struct Opened {
+        explicit Opened(const std::filesystem::path& path) : journal(path, problem), book(journal) {
+            book.load([this](std::int64_t number, const auto&) { open.push_back(number); });
+        }
+        std::string problem;
+        Journal journal;
+        TaskBook book;
+        std::vector<std::int64_t> open;
+    };
+    /// Runs statements; the first column of the last row.
+    std::string ask(const std::string& sql) const {
+        sqlite3* database = nullptr;
+        std::string text;
+        const auto keep = [](void* into, int, char** values, char**) {
+            *static_cast<std::string*>(into) = values[0] ? values[0] : "NULL";
+            return 0;
+        };
+        EXPECT_EQ(sqlite3_open(path.c_str(), &database), SQLITE_OK);
+        EXPECT_EQ(sqlite3_exec(database, sql.c_str(), keep, &text, nullptr), SQLITE_OK) << sqlite3_errmsg(database);
+        sqlite3_close(database);
+        return text;
+    }
+    static TransferSubmission submission() {
+        return {.token = TransferSubmission::newToken(),
+                .session = "session",
+                .owner = "owner",
+                .description = "text",
+                .request = {.url = "http://127.0.0.1/", .headers = {}},
+                .bodyPath = "/body",
+                .limits = {},
+                .wakeCommand = {}};
+    }
+    static int code(TaskBook& book, std::int64_t number) {
+        const auto outcome = decodeOutcome(book.outcome(number));
+        return outcome.error ? outcome.error->as<TransferError>()->code() : int(outcome.response->statusCode);
+    }
 
-    /// A submission as version 1 wrote it.
-    std::string submission(const std::string& token, const std::string& description) {
-        WireWriter write;
-        write(std::string("CVTS"), std::int64_t{1}, token, std::string("session"), std::string("owner"),
-              std::optional(description), server.url(), std::string("PUT"),
-              std::vector<std::pair<std::string, std::string>>{}, body("body " + description, description).string());
-        for (const std::int64_t number : {65'536, 60'000, 300'000, 4, 86'400'000}) write(number);
-        write(std::vector<std::string>{});
-        return write.take();
-    }
-    void limitFiles(rlim_t size) const {
-        const rlimit limit{size, RLIM_INFINITY};
-        EXPECT_EQ(prlimit(static_cast<pid_t>(agent()), RLIMIT_FSIZE, &limit, nullptr), 0);
-    }
-    [[nodiscard]] bool hasOpen(const std::filesystem::path& file) const {
-        std::error_code none;
-        const std::filesystem::directory_iterator descriptors("/proc/" + std::to_string(agent()) + "/fd", none), end;
-        return std::any_of(descriptors, end, [&](const auto& one) {
-            std::error_code gone;
-            return std::filesystem::read_symlink(one, gone) == file;
-        });
-    }
-    /// The agent's program behind one that counts how often it is started.
-    void countStarts() {
-        const auto counting = body("counting", "#!/bin/sh\necho >> '" + starts().string() + "'\nexec '" +
-                                                   options.program.string() + "' \"$@\"\n");
-        chmod(counting.c_str(), 0700);
-        options.program = counting;
-    }
-    [[nodiscard]] std::filesystem::path starts() const { return documents / "starts"; }
+    TemporaryDocuments documents;
+    const std::filesystem::path path = documents / "journal.db";
+    const int network = static_cast<int>(TransferError::Code::network);
 };
 
 TEST_F(JournalTest, TakesOverWhatAnEarlierVersionHasLeft) {
-    std::filesystem::create_directories(options.directory / "spool");
-    const std::string tokens[] = {TransferSubmission::newToken(), TransferSubmission::newToken(),
-                                  TransferSubmission::newToken(), TransferSubmission::newToken()};
+    const auto token = [](int i) { return std::string(35, '0') + std::to_string(i); };
+    const auto insert = [&](int i, const std::string& submission, const std::string& outcome) {
+        ask("INSERT INTO tasks (token, accepted, submission, outcome) VALUES ('" + token(i) + "', 1, " +
+            literal(submission) + ", " + outcome + ")");
+    };
+    ask(version1);
+    insert(1, submission1(token(1)), "NULL");
+    insert(2, submission1(token(2)), literal(encodeOutcome({std::nullopt, TransferResponse{true, 204, {}}})));
+    insert(3, submission1(token(3)), "'x'");
+    insert(4, "x", "NULL");  // nobody knows whose
+    ask("INSERT INTO wakes VALUES ('session', 'owner', 'x')");
     {
-        Database old(journal());
-        old.run(version1);
-        const std::string add = "INSERT INTO tasks (token, accepted, description, submission, outcome) VALUES ('";
-        const std::string accepted = "', strftime('%s', 'now') * 1000, '";
-        old.run(add + tokens[0] + accepted + "open', ?, NULL)", {submission(tokens[0], "open")});
-        old.run(add + tokens[1] + accepted + "over', ?, ?)",
-                {submission(tokens[1], "over"),
-                 TransferOutcome::of(std::nullopt, TransferResponse{true, 204, {}}).encoded()});
-        old.run(add + tokens[2] + accepted + "broken outcome', ?, 'x')", {submission(tokens[2], "broken outcome")});
-        old.run(add + tokens[3] + accepted + "broken submission', 'x', NULL)");
-        old.run("INSERT INTO wakes VALUES ('session', 'owner', 'x')");
+        Opened now(path);
+        EXPECT_EQ(now.open, std::vector<std::int64_t>{1});
+        EXPECT_EQ(code(now.book, 2), 204);
+        EXPECT_EQ(code(now.book, 3), network);
+        EXPECT_EQ(now.book.owners().size(), 1u);
+        EXPECT_EQ(ask("PRAGMA user_version") + ask("SELECT count(*) FROM tasks"), "23");
+        // A record of this version says whose it is even when the rest of it cannot be read.
+        const auto number = now.book.accept(submission(), 0);
+        ask("UPDATE tasks SET submission = 'x' WHERE number = " + std::to_string(number));
     }
-    const auto spooled = TransferSubmission::newToken();
-    writeFile(options.directory / "spool" / spooled, submission(spooled, "spooled"));
-
-    const auto abandoned = options.directory / "spool" / ("." + spooled + ".x.partial");
-    writeFile(abandoned, "half");
-    std::filesystem::last_write_time(abandoned, std::filesystem::file_time_type::clock::now() - std::chrono::hours(2));
-
-    auto session = open(recorder);
-    ASSERT_TRUE(recorder->wait(4));
-    EXPECT_FALSE(std::filesystem::exists(abandoned));
-    EXPECT_EQ(recorder->outcomes(),
-              (Outcomes{{"open", "200"}, {"over", "204"}, {"broken outcome", "network"}, {"spooled", "200"}}));
-    EXPECT_TRUE(running(*session).empty());
-    EXPECT_EQ(log.count("agent"), 0);
-    EXPECT_EQ(Database(journal()).ask("PRAGMA user_version"), "2");
-
-    // A record of this version says whose it is even when the rest of it cannot be read.
-    server.script(Reply::never());
-    upload(*session, server.url(), "cut off");
-    ASSERT_TRUE(server.waitForRequests(3));
-    session.reset();
-    end(options.directory);
-    Database(journal()).run("UPDATE tasks SET submission = 'x'");
-    session = open(recorder);
-    ASSERT_TRUE(recorder->wait(5));
-    EXPECT_EQ(recorder->outcomes()["cut off"], "network");
+    Opened again(path);
+    EXPECT_EQ(code(again.book, 5), network);
+    EXPECT_EQ(again.book.owner("session", "owner").over.size(), 3u);
 }
 
-TEST_F(JournalTest, OneThatCannotBeUsedIsMovedAsideOrLeftAloneAndTheHostIsTold) {
-    server.script(Reply::never(), 4);
-    auto session = open(recorder);
-    for (int i = 0; i < 200; ++i) upload(*session, server.url(), std::to_string(i));
-    EXPECT_EQ(running(*session).size(), 200u);
-    session.reset();
-    end(options.directory);
-    {  // damage behind the first page, in pages that a start would not need
-        Database(journal()).run("PRAGMA wal_checkpoint(TRUNCATE)");
-        auto contents = readFile(journal());
-        ASSERT_GT(contents.size(), 10u * 4096);
-        std::fill(contents.begin() + 4 * 4096, contents.end(), 'x');
-        writeFile(journal(), contents);
+TEST_F(JournalTest, OneThatIsDamagedIsMovedAsideAndALaterVersionsIsLeftAlone) {
+    {
+        Opened before(path);
+        for (int i = 0; i < 200; ++i) before.book.accept(submission(), 0);
     }
-    recorder = std::make_shared<SessionRecorder>();
-    session = open(recorder);
-    upload(*session, server.url(), "after damage");
-    ASSERT_TRUE(recorder->wait(1));
-    EXPECT_EQ(log.count("Transfer agent reports a problem"), 1);
-    EXPECT_TRUE(std::filesystem::exists(options.directory / "journal.db.damaged"));
-    session.reset();
-    end(options.directory);
-
-    Database(journal()).run("PRAGMA user_version = 99");
-    options.deadline = 500ms;
-    countStarts();
-    recorder = std::make_shared<SessionRecorder>();
-    session = open(recorder);
-    upload(*session, server.url(), "beside a later version");
-    ASSERT_TRUE(recorder->wait(1));
-    EXPECT_EQ(recorder->outcomes(), (Outcomes{{"beside a later version", "200"}}));
-    EXPECT_TRUE(log.waitFor("inside the process, error=the journal is of version 99"));
-    EXPECT_LE(readFile(starts()).size(), 8u);
-    EXPECT_EQ(Database(journal()).ask("PRAGMA user_version"), "99");
+    auto contents = readFile(path);
+    ASSERT_GT(contents.size(), 10u * 4096);
+    std::fill(contents.begin() + 4 * 4096, contents.end(), 'x');  // in pages that a start would not need
+    writeFile(path, contents);
+    {
+        Opened after(path);
+        EXPECT_NE(after.problem.find("it was moved to " + path.string() + ".damaged"), std::string::npos);
+        EXPECT_TRUE(after.open.empty());
+        EXPECT_EQ(after.book.accept(submission(), 0), 1);
+    }
+    EXPECT_EQ(readFile(path.string() + ".damaged"), contents);
+    ask("PRAGMA user_version = 99");
+    std::string refusal;
+    try {
+        const Opened later(path);
+    } catch (const JournalError& error) {
+        refusal = error.what();
+    }
+    EXPECT_EQ(refusal, "the journal is of version 99");
+    EXPECT_EQ(ask("PRAGMA user_version") + ask("SELECT count(*) FROM tasks"), "991");
 }
 
-TEST_F(JournalTest, WritesHowATaskEndedWhenTheDiskHasRoomAgain) {
-    server.script(Reply::status(200).hold());
-    auto session = open(recorder);
-    upload(*session, server.url(), "a");
-    ASSERT_TRUE(server.waitForRequests(1));
-    session.reset();
-    limitFiles(1);
-    server.release();
-    ASSERT_TRUE(eventually([&] { return !hasOpen(documents / "body a"); }));
-    auto second = open(std::make_shared<SessionRecorder>(), "another");  // the agent answers it behind the end
-    EXPECT_TRUE(running(*second).empty());
-    EXPECT_EQ(Database(journal()).ask("SELECT outcome FROM tasks"), "NULL");
-    limitFiles(RLIM_INFINITY);
-    EXPECT_TRUE(eventually([&] { return Database(journal()).ask("SELECT outcome FROM tasks") != "NULL"; }, 20s));
-    second.reset();
-    end(options.directory);
-    session = open(recorder);
-    ASSERT_TRUE(recorder->wait(1));
-    EXPECT_EQ(recorder->outcomes(), (Outcomes{{"a", "200"}}));
-    EXPECT_EQ(server.requests().size(), 1u) << "it is not sent twice";
+TEST_F(JournalTest, WritesWhatItDidNotTakeWhenTheDiskHasRoomAgain) {
+    Opened now(path);
+    const auto ended = now.book.accept(submission(), 0), told = now.book.accept(submission(), 0);
+    for (const std::string change : {"INSERT", "UPDATE", "DELETE"}) {
+        ask("CREATE TRIGGER full" + change + " BEFORE " + change + " ON tasks BEGIN SELECT RAISE(FAIL, 'full'); END");
+    }
+    EXPECT_THROW(now.book.accept(submission(), 0), JournalError);
+    now.book.complete(ended, {std::nullopt, TransferResponse{true, 200, {}}});
+    now.book.complete(told, {std::nullopt, TransferResponse{true, 200, {}}});
+    now.book.forget(told);
+    EXPECT_EQ(code(now.book, ended), 200) << "hosts are told all the same";
+    EXPECT_FALSE(now.book.settle() || now.book.isSettled());
+    for (const std::string change : {"INSERT", "UPDATE", "DELETE"}) ask("DROP TRIGGER full" + change);
+    EXPECT_TRUE(now.book.settle() && now.book.isSettled());
+    EXPECT_EQ(ask("SELECT count(*) FROM tasks") + ask("SELECT outcome IS NULL FROM tasks"), "10");
 }
 
 }  // namespace

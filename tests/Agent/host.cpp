@@ -4,7 +4,7 @@
 //
 // Records EVENTS events, each a document of its own, and writes the identifier of each acknowledged one to standard
 // output. MODE says what happens then: "kill" (SIGKILL, as soon as every document was handed over), "wait" (for every
-// document to be delivered), "stay" (until it is killed). WAKE is the command that the agent runs for this host.
+// document to be delivered). WAKE is the command that the agent runs for this host.
 
 #include "tests/Integration/Application.h"
 
@@ -54,7 +54,6 @@ int main(int argc, char** argv) {
     for (int i = std::atoi(argv[5]); i > 0; --i) sessions.tracker()->submit<ScreenView>(acknowledge);
     sessions.endSync();
     if (mode == "kill") kill(getpid(), SIGKILL);
-    if (mode == "stay") pause();
     const auto report = uploads->waitForDelivery(std::chrono::steady_clock::now() + 60s);
     return report.pending.documents == 0 && report.givenUp.documents == 0 ? 0 : 1;
 }

@@ -64,7 +64,7 @@ void becomeDaemon() noexcept {
 }
 
 std::optional<Descriptor> lock(const AgentDirectory& directory) {
-    const auto file = directory.lockFile();
+    const auto file = directory.lockPath();
     Descriptor held(open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600));
     if (!held) throw SystemError("open " + file.string(), errno);
     const auto deadline = Clock::now() + patience;

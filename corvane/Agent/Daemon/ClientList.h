@@ -68,7 +68,9 @@ class ClientList {
     [[nodiscard]] bool hasGuests() const;
 
   private:
+    /// Lets the oldest stranger go when there are as many as there may be.
     void makeRoom();
+    /// Takes in what a client has sent, and has it handled.
     void read(Client& client);
     void removeLeaving();
 

@@ -9,7 +9,7 @@ namespace corvane::transferd {
 
 DirectoryWatch::DirectoryWatch(const AgentDirectory& directory) : watch_(inotify_init1(IN_CLOEXEC | IN_NONBLOCK)) {
     const auto events = IN_MOVED_TO | IN_CREATE | IN_DELETE_SELF | IN_ONLYDIR;
-    for (const auto& path : {directory.spool(), directory.path() / "withdrawn"}) {
+    for (const auto& path : {directory.spoolPath(), directory.withdrawnPath()}) {
         inotify_add_watch(watch_.get(), path.c_str(), events);
     }
 }

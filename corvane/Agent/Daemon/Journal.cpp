@@ -1,8 +1,9 @@
 #include <corvane/Agent/Daemon/Journal.h>
 
+#include <corvane/Agent/Daemon/JournalError.h>
+#include <corvane/Agent/FormatError.h>
 #include <corvane/Agent/WireReader.h>
 #include <corvane/Agent/WireWriter.h>
-#include <corvane/Platform/Error.h>
 
 #include <sqlite3.h>
 
@@ -32,6 +33,19 @@ constexpr const char* fromVersion1 =
     "UPDATE wakes SET used = CAST(strftime('%s', 'now') AS INTEGER) * 1000;";
 constexpr std::int64_t wakesAreKept = std::int64_t{1000} * 60 * 60 * 24 * 30;
 
+// What a database keeps beside its file belongs to the damaged one, and goes.
+std::filesystem::path moveAside(const std::filesystem::path& path) {
+    auto aside = path;
+    aside += ".damaged";
+    std::filesystem::rename(path, aside);
+    for (const char* ending : {"-wal", "-shm"}) {
+        auto side = path;
+        std::error_code none;
+        std::filesystem::remove(side += ending, none);
+    }
+    return aside;
+}
+
 }  // namespace
 
 void Journal::Close::operator()(sqlite3* database) const noexcept {
@@ -40,7 +54,7 @@ void Journal::Close::operator()(sqlite3* database) const noexcept {
 
 void Journal::fail(int code) {
     isDamaged_ = isDamaged_ || (code & 0xFF) == SQLITE_CORRUPT || (code & 0xFF) == SQLITE_NOTADB;
-    throw InvalidArgument(std::string("the journal cannot be used: ") + sqlite3_errmsg(database_.get()));
+    throw JournalError(std::string("the journal cannot be used: ") + sqlite3_errmsg(database_.get()));
 }
 
 /// A statement with its arguments, for one use.
@@ -87,31 +101,24 @@ class Journal::Statement {
     int bound_ = 0;
 };
 
-Journal::Journal(const std::filesystem::path& file, std::string& problem) {
+Journal::Journal(const std::filesystem::path& path, std::string& problem) {
     try {
-        open(file);
-    } catch (const InvalidArgument& damaged) {
+        open(path);
+    } catch (const JournalError& damaged) {
         if (!isDamaged_) throw;
         isDamaged_ = false;
         database_.reset();
-        auto aside = file;
-        aside += ".damaged";
-        std::filesystem::rename(file, aside);
-        for (const char* side : {"-wal", "-shm"}) {
-            auto path = file;
-            std::error_code none;
-            std::filesystem::remove(path += side, none);
-        }
-        open(file);
+        const auto aside = moveAside(path);
+        open(path);
         problem = std::string(damaged.what()) + "; it was moved to " + aside.string();
     }
 }
 
 Journal::~Journal() = default;
 
-void Journal::open(const std::filesystem::path& file) {
+void Journal::open(const std::filesystem::path& path) {
     sqlite3* opened = nullptr;
-    const int result = sqlite3_open_v2(file.c_str(), &opened,
+    const int result = sqlite3_open_v2(path.c_str(), &opened,
                                        SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOFOLLOW, nullptr);
     database_.reset(opened);
     if (result != SQLITE_OK) fail(result);
@@ -126,13 +133,12 @@ void Journal::open(const std::filesystem::path& file) {
         stored.step();
         found = stored.integer(0);
     }
-    if (found < 0 || found > version) throw InvalidArgument("the journal is of version " + std::to_string(found));
+    if (found < 0 || found > version) throw JournalError("the journal is of version " + std::to_string(found));
     check();
-    if (found != version) adopt(found);
+    if (found != version) takeOver(found);
 }
 
-// Makes a new file's tables, or an earlier version's into this one's.
-void Journal::adopt(std::int64_t found) {
+void Journal::takeOver(std::int64_t found) {
     run("BEGIN IMMEDIATE;");
     run(found == 0 ? layout : fromVersion1);
     run(("PRAGMA application_id=" + std::to_string(applicationID) + ";").c_str());
@@ -145,7 +151,7 @@ void Journal::check() {
     Statement checked(*this, "PRAGMA quick_check(1);");
     if (checked.step() && checked.contents(0) != "ok") {
         isDamaged_ = true;
-        throw InvalidArgument("the journal cannot be used: " + checked.contents(0));
+        throw JournalError("the journal cannot be used: " + checked.contents(0));
     }
 }
 
@@ -162,7 +168,7 @@ void Journal::forEach(const std::function<void(Task)>& visit) {
         Task task{all.integer(0), all.integer(1), {}, true, all.integer(3) != 0};
         try {
             task.submission = TransferSubmission::decode(all.contents(2));
-        } catch (const InvalidArgument&) {
+        } catch (const FormatError&) {
             task.isReadable = false;
             task.submission.token = all.contents(4);
             task.submission.session = all.contents(5);
@@ -172,7 +178,7 @@ void Journal::forEach(const std::function<void(Task)>& visit) {
     }
 }
 
-std::int64_t Journal::add(const TransferSubmission& submission, std::int64_t accepted) {
+std::int64_t Journal::accept(const TransferSubmission& submission, std::int64_t accepted) {
     Statement insert(*this,
                      "INSERT INTO tasks (token, accepted, submission, session, owner, description) "
                      "VALUES (?, ?, ?, ?, ?, ?);");
@@ -183,7 +189,7 @@ std::int64_t Journal::add(const TransferSubmission& submission, std::int64_t acc
     return sqlite3_last_insert_rowid(database_.get());
 }
 
-void Journal::finish(std::int64_t number, std::string_view outcome) {
+void Journal::complete(std::int64_t number, std::string_view outcome) {
     Statement(*this, "UPDATE tasks SET outcome = ? WHERE number = ?;").bytes(outcome).number(number).step();
 }
 
@@ -197,7 +203,7 @@ void Journal::describe(std::int64_t number, const std::string& description) {
 
 TransferSubmission Journal::submission(std::int64_t number) {
     Statement find(*this, "SELECT submission FROM tasks WHERE number = ?;");
-    if (!find.number(number).step()) throw InvalidArgument("the task is not in the journal");
+    if (!find.number(number).step()) throw JournalError("the task is not in the journal");
     return TransferSubmission::decode(find.contents(0));
 }
 
@@ -209,7 +215,7 @@ std::optional<std::string> Journal::description(std::int64_t number) {
 
 std::string Journal::outcome(std::int64_t number) {
     Statement find(*this, "SELECT outcome FROM tasks WHERE number = ?;");
-    if (!find.number(number).step()) throw InvalidArgument("the task is not in the journal");
+    if (!find.number(number).step()) throw JournalError("the task is not in the journal");
     return find.contents(0);
 }
 
@@ -239,7 +245,7 @@ std::vector<std::string> Journal::wake(const std::string& session, const std::st
     try {
         WireReader read(bytes);
         read(command);
-    } catch (const InvalidArgument&) {  // the host says it again
+    } catch (const FormatError&) {  // the host says it again
         command.clear();
     }
     return command;

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <corvane/Agent/TransferSubmission.h>
-#include <corvane/Platform/Error.h>
 
 #include <cstdint>
 #include <filesystem>
@@ -19,7 +18,7 @@ namespace corvane::transferd {
 /// What the agent must not forget when it is killed: its tasks, how they ended, and whom to wake. A SQLite database;
 /// its page in docs/formats has the tables.
 ///
-/// A change is safe from a kill of the process when the call returns. All operations throw `InvalidArgument` with the
+/// A change is safe from a kill of the process when the call returns. All operations throw `JournalError` with the
 /// database's words when it cannot be read or written.
 class Journal {
   public:
@@ -38,7 +37,7 @@ class Journal {
 
     /// Opens or creates the file, and takes over one of an earlier version. One that is damaged, anywhere, is moved
     /// aside, which `problem` then tells of. Throws for one that a later version has written, too.
-    Journal(const std::filesystem::path& file, std::string& problem);
+    Journal(const std::filesystem::path& path, std::string& problem);
     ~Journal();
 
     /// Whether an operation has found damage: there is no going on with the file, and the next agent moves it aside.
@@ -47,14 +46,14 @@ class Journal {
     /// Every task, in the order in which they were accepted.
     void forEach(const std::function<void(Task)>& visit);
     /// Keeps a task, and gives it its number.
-    std::int64_t add(const TransferSubmission& submission, std::int64_t accepted);
-    void finish(std::int64_t number, std::string_view outcome);
+    std::int64_t accept(const TransferSubmission& submission, std::int64_t accepted);
+    void complete(std::int64_t number, std::string_view outcome);
     void forget(std::int64_t number);
     void describe(std::int64_t number, const std::string& description);
 
     [[nodiscard]] TransferSubmission submission(std::int64_t number);
     [[nodiscard]] std::optional<std::string> description(std::int64_t number);
-    /// The bytes that `finish` was given.
+    /// The bytes that `complete` was given.
     [[nodiscard]] std::string outcome(std::int64_t number);
 
     /// Keeps the command for a month, from `now` on (in milliseconds since 1970), and lets go of older ones.
@@ -69,10 +68,13 @@ class Journal {
         void operator()(sqlite3* database) const noexcept;
     };
 
-    void open(const std::filesystem::path& file);
-    void adopt(std::int64_t found);
+    void open(const std::filesystem::path& path);
+    /// Makes a new file's tables, or an earlier version's into this one's.
+    void takeOver(std::int64_t found);
+    /// Looks at every page.
     void check();
     void run(const char* sql);
+    /// Notes whether the result tells of damage, and throws it.
     [[noreturn]] void fail(int code);
 
     std::unique_ptr<sqlite3, Close> database_;

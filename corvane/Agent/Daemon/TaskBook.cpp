@@ -1,6 +1,8 @@
 #include <corvane/Agent/Daemon/TaskBook.h>
 
-#include <corvane/Platform/Error.h>
+#include <corvane/Agent/Daemon/JournalError.h>
+#include <corvane/Agent/FormatError.h>
+#include <corvane/Agent/OutcomeCodec.h>
 
 namespace corvane::transferd {
 
@@ -16,13 +18,12 @@ void TaskBook::load(const std::function<void(std::int64_t number, const Transfer
     for (const auto number : unreadable) failUnreadable(number);
 }
 
-// Its host sends it again. Nobody can be told of one that is nobody's; the host misses it in the list.
 void TaskBook::failUnreadable(std::int64_t number) {
     if (!tasks_.contains(number)) {
         unforgotten_.push_back(number);
         settle();
     } else if (tasks_.at(number).owner->open.contains(number)) {
-        finish(number, TransferOutcome::unreadable());
+        complete(number, unreadableOutcome());
     }
 }
 
@@ -33,7 +34,7 @@ TaskBook::Owner& TaskBook::owner(const std::string& session, const std::string& 
     found->second.key = key;
     try {
         found->second.wakeCommand = journal_.wake(session, key);
-    } catch (const InvalidArgument&) {  // said again with every submission and every connection
+    } catch (const JournalError&) {  // said again with every submission and every connection
     }
     return found->second;
 }
@@ -45,7 +46,7 @@ void TaskBook::setWakeCommand(Owner& owner, const std::vector<std::string>& comm
     try {
         journal_.setWake(owner.session, owner.key, command, now);
         owner.lastHeard = now;
-    } catch (const InvalidArgument&) {  // said again with every submission and every connection
+    } catch (const JournalError&) {  // said again with every submission and every connection
     }
 }
 
@@ -56,9 +57,9 @@ void TaskBook::dropOwners(const std::function<bool(const Owner&)>& isReferredTo)
     });
 }
 
-std::int64_t TaskBook::add(const TransferSubmission& submission, std::int64_t now) {
-    if (tasks_.size() >= mostTasks) throw InvalidArgument("the agent has too many tasks");
-    const auto number = journal_.add(submission, now);
+std::int64_t TaskBook::accept(const TransferSubmission& submission, std::int64_t now) {
+    if (tasks_.size() >= mostTasks) throw JournalError("the agent has too many tasks");
+    const auto number = journal_.accept(submission, now);
     index(number, now, submission, false);
     return number;
 }
@@ -74,11 +75,12 @@ void TaskBook::index(std::int64_t number, std::int64_t accepted, const TransferS
     }
 }
 
-void TaskBook::finish(std::int64_t number, const TransferOutcome& outcome) {
+void TaskBook::complete(std::int64_t number, const TransferOutcome& outcome) {
+    std::string bytes = encodeOutcome(outcome);
     try {
-        journal_.finish(number, outcome.encoded());
-    } catch (const InvalidArgument&) {
-        unwritten_[number] = outcome.encoded();
+        journal_.complete(number, bytes);
+    } catch (const JournalError&) {
+        unwritten_[number] = std::move(bytes);
     }
     Owner& by = *tasks_.at(number).owner;
     by.open.erase(number);
@@ -101,10 +103,10 @@ bool TaskBook::settle() {
     try {
         for (; !unforgotten_.empty(); unforgotten_.pop_back()) journal_.forget(unforgotten_.back());
         for (; !unwritten_.empty(); unwritten_.erase(unwritten_.begin())) {
-            journal_.finish(unwritten_.begin()->first, unwritten_.begin()->second);
+            journal_.complete(unwritten_.begin()->first, unwritten_.begin()->second);
         }
         return true;
-    } catch (const InvalidArgument&) {  // tried again later
+    } catch (const JournalError&) {  // tried again later
         return false;
     }
 }
@@ -119,9 +121,9 @@ std::string TaskBook::outcome(std::int64_t number) {
     if (const auto found = unwritten_.find(number); found != unwritten_.end()) return found->second;
     std::string bytes = journal_.outcome(number);
     try {
-        static_cast<void>(TransferOutcome::decode(bytes));
-    } catch (const InvalidArgument&) {
-        bytes = TransferOutcome::unreadable().encoded();
+        static_cast<void>(decodeOutcome(bytes));
+    } catch (const FormatError&) {
+        bytes = encodeOutcome(unreadableOutcome());
     }
     return bytes;
 }

@@ -1,7 +1,7 @@
 #pragma once
 
 #include <corvane/Agent/Daemon/Journal.h>
-#include <corvane/Agent/TransferOutcome.h>
+#include <corvane/Transfer/TransferOutcome.h>
 
 #include <cstdint>
 #include <functional>
@@ -17,7 +17,13 @@
 namespace corvane::transferd {
 
 /// The agent's tasks and their owners: what the journal holds, with an index in memory that costs a task a few hundred
-/// bytes. What reads the journal, and `add` and `describe`, throw what it throws; the index then is as before.
+/// bytes. What reads the journal, and `accept` and `describe`, throw what it throws; the index then is as before.
+///
+///     accept -> open -> complete -> over -> forget
+///                 +---------------------------^      withdrawn by its host
+///
+/// `complete` and `forget` never fail: what the journal does not take at once is kept for `settle`. A kill before that
+/// leaves an open task, which is sent again, or one that is over, which is reported again.
 class TaskBook {
   public:
     /// Beyond this many tasks no more are taken, so that a host that runs wild fills neither memory nor disk.
@@ -51,9 +57,11 @@ class TaskBook {
     /// Lets go of owners without a task that nothing else refers to.
     void dropOwners(const std::function<bool(const Owner&)>& isReferredTo);
 
-    std::int64_t add(const TransferSubmission& submission, std::int64_t now);
+    /// Takes a task into the journal, and gives it its number. `now` is in milliseconds since 1970. Throws
+    /// `JournalError` also for one too many.
+    std::int64_t accept(const TransferSubmission& submission, std::int64_t now);
     /// A task whose end the journal cannot be told of is over all the same; see `settle`.
-    void finish(std::int64_t number, const TransferOutcome& outcome);
+    void complete(std::int64_t number, const TransferOutcome& outcome);
     /// A row that the journal cannot remove goes later; see `settle`.
     void forget(std::int64_t number);
     /// Tells the journal what it could not take, when its disk was full, say. Returns whether nothing is left to tell.
@@ -73,7 +81,10 @@ class TaskBook {
     [[nodiscard]] std::string outcome(std::int64_t number);
 
   private:
+    /// Ends a task whose submission cannot be read. Its host sends it again. Nobody can be told of one that is
+    /// nobody's; the host misses it in the list.
     void failUnreadable(std::int64_t number);
+    /// Enters a task of the journal into the index, and makes its owner known.
     void index(std::int64_t number, std::int64_t accepted, const TransferSubmission& submission, bool isOver);
 
     Journal& journal_;

@@ -1,5 +1,6 @@
 #include <corvane/Agent/Daemon/UploadQueue.h>
 
+#include <corvane/Transfer/HTTPURL.h>
 #include <corvane/Transfer/TransferError.h>
 
 #include <algorithm>
@@ -32,13 +33,6 @@ bool isHeldUp(const std::optional<AnyError>& error) {
     return known && (known->value() == TransferError::Code::unreachable || isBlocked(*error));
 }
 
-std::string hostKey(const TransferSubmission& submission) {
-    HTTPTransfer transfer;
-    transfer.request.url = submission.request.url;
-    transfer.pool = UploadQueue::pool(submission);
-    return CurlTransfer::hostKey(transfer);
-}
-
 }  // namespace
 
 std::vector<std::int64_t> UploadQueue::Host::uploads() const {
@@ -58,13 +52,12 @@ std::string UploadQueue::pool(const TransferSubmission& submission) {
     return submission.trustedCertificates + '\n' + submission.proxy.url + '\n' + submission.proxy.exceptions;
 }
 
-const UploadQueue::Trouble* UploadQueue::add(std::int64_t number, const TransferSubmission& submission) {
-    const std::string key = hostKey(submission);
-    Host& host = hosts_[key];
-    host.server = key.substr(key.rfind(' ', key.rfind(' ') - 1) + 1);  // without the pool
-    std::replace(host.server.begin(), host.server.end(), ' ', ':');
+void UploadQueue::add(std::int64_t number, const TransferSubmission& submission) {
+    std::string server = HTTPURL::parse(submission.request.url).server();
+    Host& host = hosts_[pool(submission) + ' ' + server];
+    host.server = std::move(server);
     host.waiting.push_back({number, submission.limits.transfersPerHost});
-    return host.trouble ? &*host.trouble : nullptr;
+    if (host.trouble) source_.troubleChanged(*host.trouble, {number});
 }
 
 void UploadQueue::remove(std::int64_t number) {
@@ -77,7 +70,6 @@ void UploadQueue::remove(std::int64_t number) {
     }
 }
 
-// A host with nothing to do is forgotten, with what is known of it.
 void UploadQueue::settle(std::map<std::string, Host>::iterator host) {
     if (host->second.waiting.empty() && host->second.running.empty()) hosts_.erase(host);
 }
@@ -96,7 +88,7 @@ void UploadQueue::startOne(Host& host) {
     try {
         if (auto transfer = source_.transfer(next.number)) run(host, next, *std::move(transfer));
     } catch (...) {
-        ended_.push_back({next.number, AnyError::current(), std::nullopt});
+        ended_.push_back({next.number, {AnyError::current(), std::nullopt}});
         host.running.erase(next.number);
     }
     host.waiting.pop_front();  // last: what there is no memory for stays
@@ -106,9 +98,8 @@ void UploadQueue::run(Host& host, const Waiting& next, HTTPTransfer transfer) {
     transfer.didSend = [this, number = next.number](std::int64_t total, std::int64_t expected) {
         progress_.push_back({number, total, expected});
     };
-    transfer.didComplete = [this, number = next.number](std::optional<AnyError> error,
-                                                        std::optional<TransferResponse> response) {
-        arrived_.push_back({number, std::move(error), std::move(response)});
+    transfer.didComplete = [this, number = next.number](TransferOutcome outcome) {
+        arrived_.push_back({number, std::move(outcome)});
     };
     host.running.emplace(next.number, next);
     scheduler_.start(static_cast<std::uint64_t>(next.number), std::move(transfer));
@@ -119,7 +110,7 @@ void UploadQueue::finished(const Ended& ended, Clock::time_point now) {
                                     [&](const auto& host) { return host.second.running.contains(ended.number); });
     if (found == hosts_.end()) return;
     Host& host = found->second;
-    const bool waits = isHeldUp(ended.error);
+    const bool waits = isHeldUp(ended.outcome.error);
     if (waits) {
         host.waiting.push_back(host.running.at(ended.number));
     } else {
@@ -127,7 +118,7 @@ void UploadQueue::finished(const Ended& ended, Clock::time_point now) {
     }
     host.running.erase(ended.number);
     if (waits) {
-        holdUp(host, *ended.error, now);
+        holdUp(host, *ended.outcome.error, now);
     } else {
         goOn(host);
     }
@@ -150,7 +141,7 @@ void UploadQueue::holdUp(Host& host, const AnyError& why, Clock::time_point now)
     // One failure speaks for all: whoever has waited long enough does not wait for an attempt of its own.
     std::erase_if(host.waiting, [&](const Waiting& one) {
         const bool isOver = !source_.mayWait(one.number);
-        if (isOver) ended_.push_back({one.number, why, std::nullopt});
+        if (isOver) ended_.push_back({one.number, {why, std::nullopt}});
         return isOver;
     });
     note(host, why);

@@ -20,14 +20,20 @@ namespace corvane::transferd {
 /// run as the host may have, and a host that cannot be reached, or that the way to is blocked, is left alone for a
 /// delay that doubles from failure to failure. After a failure one upload at a time tries the host, each in its turn,
 /// until one gets through.
+///
+///     open    -> paused      an upload was held up; the others that run are not stopped
+///     paused  -> trying      the delay is over: one upload
+///     trying  -> paused      held up again: the next one in turn, after twice the delay
+///     trying  -> open        it got through, or failed in a way that says nothing of the host
+///
+/// Times are the caller's, so that every delay is counted from the moment of the call.
 class UploadQueue {
   public:
     using Clock = TransferScheduler::Clock;
 
     struct Ended {
         std::int64_t number;
-        std::optional<AnyError> error;
-        std::optional<TransferResponse> response;
+        TransferOutcome outcome;
     };
     struct Progress {
         std::int64_t number;
@@ -53,7 +59,7 @@ class UploadQueue {
         virtual std::optional<HTTPTransfer> transfer(std::int64_t number) = 0;
         /// Whether an upload whose server cannot be reached is to be tried again.
         virtual bool mayWait(std::int64_t number) = 0;
-        /// Uploads to a host begin to wait, or go on. Not to call back.
+        /// These uploads to a host begin to wait, or all of them go on. Not to call back.
         virtual void troubleChanged(const Trouble& trouble, const std::vector<std::int64_t>& uploads) = 0;
     };
 
@@ -62,8 +68,8 @@ class UploadQueue {
     /// What tells the transfers to one host apart that do not go there in the same way.
     [[nodiscard]] static std::string pool(const TransferSubmission& submission);
 
-    /// Returns what holds it up, if it has to wait. Throws `TransferError` for a request that cannot be sent.
-    const Trouble* add(std::int64_t number, const TransferSubmission& submission);
+    /// Lets an upload wait for its turn. Throws `TransferError` for a request that cannot be sent.
+    void add(std::int64_t number, const TransferSubmission& submission);
     /// Drops an upload, whether it runs or waits.
     void remove(std::int64_t number);
 
@@ -100,12 +106,18 @@ class UploadQueue {
         [[nodiscard]] bool mayStart(Clock::time_point now) const;
     };
 
+    /// Starts the upload that has waited longest, unless its source has none for it any more.
     void startOne(Host& host);
     void run(Host& host, const Waiting& next, HTTPTransfer transfer);
+    /// An upload has come back: it is over, or it waits again.
     void finished(const Ended& ended, Clock::time_point now);
+    /// The host answers: opens it, and says so where it was in trouble.
     void goOn(Host& host);
+    /// The host does not answer: pauses it, and ends the uploads that have waited long enough.
     void holdUp(Host& host, const AnyError& why, Clock::time_point now);
+    /// Says why a host's uploads wait, unless that was the last thing said of it.
     void note(Host& host, const AnyError& why);
+    /// Forgets a host with nothing to do, with what is known of it.
     void settle(std::map<std::string, Host>::iterator host);
 
     Source& source_;

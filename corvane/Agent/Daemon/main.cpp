@@ -7,6 +7,7 @@
 
 #include <corvane/Agent/Daemon/Agent.h>
 #include <corvane/Agent/Daemon/AgentProcess.h>
+#include <corvane/Platform/Error.h>
 
 #include <malloc.h>
 #include <unistd.h>
@@ -70,7 +71,7 @@ int run(const Arguments& arguments) {
         const auto lock = process::lock(directory);
         std::string problem;
         if (!lock) return process::report("ready"), 0;
-        Journal journal(directory.journal(), problem);
+        Journal journal(directory.journalPath(), problem);
         Agent agent(directory, journal, arguments.options);
         process::report(problem.empty() ? "ready" : "ready, but " + problem);
         isReported = true;

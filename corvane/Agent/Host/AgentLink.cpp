@@ -1,13 +1,11 @@
 #include <corvane/Agent/Host/AgentLink.h>
 
-#include <corvane/Agent/Host/AgentThread.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/Log.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <system_error>
-#include <type_traits>
 #include <utility>
 
 namespace corvane {
@@ -20,46 +18,42 @@ constexpr auto betweenAttempts = 10ms;
 // An agent that dies again and again without getting anything done is started less and less often.
 constexpr auto longestRestartDelay = 2s;
 
-// One that cannot be read is a failed transfer, and no reason to leave the agent.
-TransferOutcome readable(const std::string& bytes) {
-    try {
-        return TransferOutcome::decode(bytes);
-    } catch (const InvalidArgument&) {
-        return TransferOutcome::unreadable();
-    }
-}
-
 }  // namespace
 
-AgentLink::AgentLink(AgentDirectory directory, std::filesystem::path program, TransferAgentOptions options,
-                     agent::Hello hello)
-    : directory_(std::move(directory)),
-      program_(std::move(program)),
-      options_(std::move(options)),
-      hello_(std::move(hello)) {
-    const auto now = Clock::now();
-    giveUpAt_ = now + options_.deadline;
-    if (connect(now)) return;
-    start();
+AgentLink::Way AgentLink::wayTo(AgentDirectory directory, std::filesystem::path program, TransferAgentOptions options) {
+    return {.connect = [directory] { return directory.connect(); },
+            .start =
+                [directory, program = std::move(program), options = std::move(options)] {
+                    const AgentDirectory whole(directory.path());
+                    return AgentProgram::start(program, whole.path(), options);
+                },
+            .reap =
+                [](pid_t process) {
+                    agentThread.assertCurrent("AgentThread::reap");
+                    AgentThread::shared().reap(process);
+                }};
+}
+
+AgentLink::AgentLink(Way way, std::chrono::milliseconds deadline, agent::Hello hello, Clock::time_point now)
+    : way_(std::move(way)), deadline_(deadline), hello_(std::move(hello)), giveUpAt_(now + deadline) {
+    if (!connect(now)) starter_ = way_.start();
 }
 
 AgentLink::~AgentLink() = default;
 
-void AgentLink::start() {
-    starter_ = AgentProgram::start(program_, directory_.path(), options_);
-}
-
-void AgentLink::send(agent::Request message, std::size_t answers) {
+void AgentLink::send(agent::Request request, Clock::time_point now) {
     if (state_ != State::ready) return;
-    socket_->send(agent::encode(std::move(message)));
-    if (outstanding_ == 0 && answers > 0) lastHeard_ = Clock::now();
-    outstanding_ += answers;
+    const bool isAnswered = agent::isAnswered(request);
+    socket_->send(agent::encode(std::move(request)));
+    if (!isAnswered) return;
+    if (outstanding_ == 0) lastHeard_ = now;
+    ++outstanding_;
 }
 
 void AgentLink::retry(Clock::time_point now) {
     if (state_ != State::resting) return;
     state_ = State::connecting;
-    giveUpAt_ = now + options_.deadline;
+    giveUpAt_ = now + deadline_;
     nextAttempt_ = now;
     restartDelay_ = 0ms;
     starterProblem_.clear();
@@ -98,8 +92,8 @@ AgentLink::Clock::time_point AgentLink::nextDeadline() const {
         case State::greeting:
             return giveUpAt_;
         case State::ready:
-            if (outstanding_ > 0) return lastHeard_ + options_.deadline;
-            return awaitsTasks_ ? lastHeard_ + 2 * options_.deadline : Clock::time_point::max();
+            if (outstanding_ > 0) return lastHeard_ + deadline_;
+            return awaitsTasks_ ? lastHeard_ + 2 * deadline_ : Clock::time_point::max();
         case State::resting:
         case State::closed:
             break;
@@ -107,19 +101,16 @@ AgentLink::Clock::time_point AgentLink::nextDeadline() const {
     return Clock::time_point::max();
 }
 
-// The directory may have been removed meanwhile; the agent needs it whole.
 void AgentLink::attempt(Clock::time_point now) {
     try {
-        static_cast<void>(AgentDirectory(directory_.path()));
-        if (connect(now)) return;
-        start();
+        if (!connect(now)) starter_ = way_.start();
     } catch (const std::exception& error) {
         fail(error.what());
     }
 }
 
 bool AgentLink::connect(Clock::time_point now) {
-    Descriptor connected = directory_.connect();
+    Descriptor connected = way_.connect();
     if (!connected) {
         problem_ = "no connection: " + std::system_category().message(errno);
         nextAttempt_ = now + betweenAttempts;
@@ -128,7 +119,6 @@ bool AgentLink::connect(Clock::time_point now) {
     socket_.emplace(std::move(connected));
     socket_->send(agent::encode(hello_));
     outstanding_ = 0;
-    listing_.clear();
     state_ = State::greeting;
     return true;
 }
@@ -161,11 +151,11 @@ void AgentLink::starterEnded(Clock::time_point now) {
 
 void AgentLink::waitLonger(Clock::time_point now) {
     restartDelay_ = std::clamp<std::chrono::milliseconds>(2 * restartDelay_, betweenAttempts, longestRestartDelay);
-    nextAttempt_ = now + std::min<std::chrono::milliseconds>(restartDelay_, options_.deadline / 2);
+    nextAttempt_ = now + std::min<std::chrono::milliseconds>(restartDelay_, deadline_ / 2);
 }
 
 void AgentLink::forgetStarter() {
-    if (starter_.process > 0) AgentThread::shared().reap(starter_.process);
+    if (starter_.process > 0) way_.reap(starter_.process);
     starter_ = {};
     starterSaid_.clear();
 }
@@ -189,48 +179,17 @@ void AgentLink::exchange(Clock::time_point now) {
     if (!alive) lost(now, "the connection has ended");
 }
 
+// An answer too many is no reason to stop: an agent that found a submission by itself has answered for it already.
 void AgentLink::take(const agent::Reply& reply, Clock::time_point now) {
     lastHeard_ = now;
-    const auto listener = listener_.lock();
     if (const auto* welcome = std::get_if<agent::Welcome>(&reply)) return greeted(*welcome);
+    const auto listener = listener_.lock();
     if (state_ != State::ready || !listener) return;
-    std::visit(
-        [&](const auto& one) {
-            using One = std::remove_cvref_t<decltype(one)>;
-            if constexpr (std::is_same_v<One, agent::Accepted>) {
-                endExchange();
-                restartDelay_ = 0ms;
-                listener->agentAccepted(one.token);
-            } else if constexpr (std::is_same_v<One, agent::Refused>) {
-                endExchange();
-                listener->agentRefused(one.token, one.reason);
-            } else if constexpr (std::is_same_v<One, agent::Known>) {
-                listing_.push_back({one.token, one.description});
-            } else if constexpr (std::is_same_v<One, agent::Listed>) {
-                endExchange();
-                listener->agentListed(std::exchange(listing_, {}));
-            } else if constexpr (std::is_same_v<One, agent::Progress>) {
-                listener->agentProgressed(one.token, one.total, one.expected);
-            } else if constexpr (std::is_same_v<One, agent::Completed>) {
-                restartDelay_ = 0ms;
-                listener->agentCompleted({one.token, one.description}, readable(one.outcome));
-            } else if constexpr (std::is_same_v<One, agent::Forgotten>) {
-                endExchange();
-                listener->agentForgot(one.token);
-            } else if constexpr (std::is_same_v<One, agent::Elsewhere>) {
-                const auto outcome = one.outcome.empty() ? std::nullopt : std::optional(readable(one.outcome));
-                listener->agentEndedElsewhere({one.token, one.description}, outcome);
-            } else if constexpr (std::is_same_v<One, agent::Trouble>) {
-                tell(one);
-            } else if constexpr (std::is_same_v<One, agent::Unsupported>) {
-                endExchange();
-            } else if constexpr (std::is_same_v<One, agent::Flushed>) {
-                listener->agentFlushed();
-            } else if constexpr (std::is_same_v<One, agent::Pong>) {
-                endExchange();
-            }
-        },
-        reply);
+    if (agent::isAnswer(reply) && outstanding_ > 0) --outstanding_;
+    const bool getsThingsDone =
+        std::holds_alternative<agent::Accepted>(reply) || std::holds_alternative<agent::Completed>(reply);
+    if (getsThingsDone) restartDelay_ = 0ms;
+    listener->agentSaid(reply);
 }
 
 void AgentLink::greeted(const agent::Welcome& welcome) {
@@ -244,34 +203,21 @@ void AgentLink::greeted(const agent::Welcome& welcome) {
     if (const auto listener = listener_.lock()) listener->agentIsReady();
 }
 
-void AgentLink::tell(const agent::Trouble& trouble) {
-    if (trouble.lasts) {
-        Log::shared().error("Uploads wait for their server and are tried again, server=%{public}@, reason=%{public}@",
-                            trouble.server, trouble.reason);
-    } else {
-        Log::shared().default_("Uploads to a server go on, server=%{public}@", trouble.server);
-    }
-}
-
-// An answer too many is no reason to stop: an agent that found a submission by itself has answered for it already.
-void AgentLink::endExchange() {
-    if (outstanding_ > 0) --outstanding_;
-}
-
 void AgentLink::checkDeadlines(Clock::time_point now) {
     if (state_ == State::connecting || state_ == State::greeting) {
-        if (now < giveUpAt_) return;
-        fail(state_ == State::greeting  ? "no answer in time"
-             : !starterProblem_.empty() ? starterProblem_
-             : problem_.empty()         ? "no start in time"
-                                        : problem_);
-    } else if (state_ == State::ready && outstanding_ > 0 && now >= lastHeard_ + options_.deadline) {
-        fail("no answer in time");
-    } else if (state_ == State::ready && outstanding_ == 0 && awaitsTasks_ &&
-               now >= lastHeard_ + 2 * options_.deadline) {
-        send(agent::Ping{}, 1);
+        if (now >= giveUpAt_) fail(whyNot());
+    } else if (state_ == State::ready && outstanding_ > 0) {
+        if (now >= lastHeard_ + deadline_) fail("no answer in time");
+    } else if (state_ == State::ready && awaitsTasks_ && now >= lastHeard_ + 2 * deadline_) {
+        send(agent::Ping{}, now);
         static_cast<void>(socket_->flush());
     }
+}
+
+std::string AgentLink::whyNot() const {
+    if (state_ == State::greeting) return "no answer in time";
+    if (!starterProblem_.empty()) return starterProblem_;
+    return problem_.empty() ? "no start in time" : problem_;
 }
 
 void AgentLink::lost(Clock::time_point now, const std::string& why) {
@@ -283,7 +229,7 @@ void AgentLink::lost(Clock::time_point now, const std::string& why) {
     if (!stood) return;  // an agent that ends just now, or a start that goes on until its deadline
     Log::shared().error("Transfer agent was lost and is started again, error=%{public}@", why);
     waitLonger(now);
-    giveUpAt_ = nextAttempt_ + options_.deadline;
+    giveUpAt_ = nextAttempt_ + deadline_;
 }
 
 void AgentLink::fail(const std::string& why) {

@@ -14,6 +14,7 @@
 #include <new>
 #include <string>
 #include <system_error>
+#include <vector>
 
 namespace corvane {
 
@@ -37,25 +38,52 @@ std::filesystem::path ownFile() {
     return failed ? executablePath() : file;
 }
 
+// Nothing is open in the agent but `output`, as its standard output.
 struct SpawnActions {
     posix_spawn_file_actions_t actions;
-    SpawnActions() {
+    explicit SpawnActions(int output) {
         if (posix_spawn_file_actions_init(&actions) != 0) throw std::bad_alloc();
+        posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+        // It may be a number below 3 in a host that has closed its own; the copy clears close-on-exec either way.
+        posix_spawn_file_actions_adddup2(&actions, output, STDOUT_FILENO);
+        posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
+        posix_spawn_file_actions_addclosefrom_np(&actions, STDERR_FILENO + 1);
+        posix_spawn_file_actions_addchdir_np(&actions, "/");
     }
     SpawnActions(const SpawnActions&) = delete;
     SpawnActions& operator=(const SpawnActions&) = delete;
     ~SpawnActions() { posix_spawn_file_actions_destroy(&actions); }
 };
 
+// In a session of its own, with no signal blocked or ignored.
 struct SpawnAttributes {
     posix_spawnattr_t attributes;
     SpawnAttributes() {
         if (posix_spawnattr_init(&attributes) != 0) throw std::bad_alloc();
+        sigset_t none, all;
+        sigemptyset(&none);
+        sigfillset(&all);
+        posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSID);
+        posix_spawnattr_setsigmask(&attributes, &none);
+        posix_spawnattr_setsigdefault(&attributes, &all);
     }
     SpawnAttributes(const SpawnAttributes&) = delete;
     SpawnAttributes& operator=(const SpawnAttributes&) = delete;
     ~SpawnAttributes() { posix_spawnattr_destroy(&attributes); }
 };
+
+std::vector<std::string> argumentsFor(const std::filesystem::path& program, const std::filesystem::path& directory,
+                                      const TransferAgentOptions& options) {
+    return {program.string(),
+            "--directory",
+            directory.string(),
+            "--idle-ms",
+            std::to_string(options.idleTime.count()),
+            "--retry-ms",
+            std::to_string(options.retryDelay.count()),
+            "--alone-ms",
+            std::to_string(options.patienceWithoutHost.count())};
+}
 
 }  // namespace
 
@@ -80,35 +108,14 @@ AgentProgram::Started AgentProgram::start(const std::filesystem::path& program, 
     const Descriptor input(ends[1]);
     fcntl(output.get(), F_SETFL, O_NONBLOCK);
 
-    SpawnActions files;
-    posix_spawn_file_actions_addopen(&files.actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    // Both ends may be a number below 3 in a host that has closed its own; the copy clears close-on-exec either way.
-    posix_spawn_file_actions_adddup2(&files.actions, input.get(), STDOUT_FILENO);
-    posix_spawn_file_actions_addopen(&files.actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
-    posix_spawn_file_actions_addclosefrom_np(&files.actions, STDERR_FILENO + 1);
-    posix_spawn_file_actions_addchdir_np(&files.actions, "/");
-
-    SpawnAttributes how;
-    sigset_t none, all;
-    sigemptyset(&none);
-    sigfillset(&all);
-    posix_spawnattr_setflags(&how.attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSID);
-    posix_spawnattr_setsigmask(&how.attributes, &none);
-    posix_spawnattr_setsigdefault(&how.attributes, &all);
-
-    std::string arguments[] = {program.string(),
-                               "--directory",
-                               directory.string(),
-                               "--idle-ms",
-                               std::to_string(options.idleTime.count()),
-                               "--retry-ms",
-                               std::to_string(options.retryDelay.count()),
-                               "--alone-ms",
-                               std::to_string(options.patienceWithoutHost.count())};
-    char* argv[std::size(arguments) + 1] = {};
-    for (std::size_t i = 0; i < std::size(arguments); ++i) argv[i] = arguments[i].data();
+    const SpawnActions files(input.get());
+    const SpawnAttributes how;
+    auto arguments = argumentsFor(program, directory, options);
+    std::vector<char*> argv;
+    for (auto& argument : arguments) argv.push_back(argument.data());
+    argv.push_back(nullptr);
     pid_t process = -1;
-    const int failed = posix_spawn(&process, program.c_str(), &files.actions, &how.attributes, argv, environ);
+    const int failed = posix_spawn(&process, program.c_str(), &files.actions, &how.attributes, argv.data(), environ);
     if (failed != 0) throw SystemError("start " + program.string(), failed);
     return {process, std::move(output)};
 }

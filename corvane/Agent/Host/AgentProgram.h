@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Agent/Host/TransferAgentOptions.h>
+#include <corvane/Agent/Host/BackgroundTransferSession.h>
 #include <corvane/Platform/Descriptor.h>
 
 #include <sys/types.h>

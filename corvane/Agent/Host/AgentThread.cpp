@@ -3,6 +3,7 @@
 #include <corvane/Agent/Host/AgentLink.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/Require.h>
 #include <corvane/Platform/Thread.h>
 #include <corvane/Signing/OpenSSLUse.h>
 
@@ -16,9 +17,18 @@
 #include <cstdlib>
 #include <exception>
 #include <limits>
+#include <string>
 #include <utility>
 
 namespace corvane {
+
+namespace {
+thread_local bool isAgentThread = false;
+}
+
+void AgentThreadRole::assertCurrent(const char* operation) const {
+    CORVANE_REQUIRE(isAgentThread, std::string(operation) + " must run on the agent thread");
+}
 
 constinit std::atomic<AgentThread*> AgentThread::instance_ = nullptr;
 
@@ -36,6 +46,8 @@ AgentThread::AgentThread() : wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
     SignalsBlocked blocked;
     thread_ = std::thread([this] {
         prepareThread("com.veskar.corvane.agent-link", false);
+        isAgentThread = true;
+        agentThread.assertCurrent("AgentThread");
         run();
     });
     instance_ = this;
@@ -45,7 +57,7 @@ AgentThread::AgentThread() : wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
 void AgentThread::stop() {
     if (made_.isInChild()) return;
     {
-        std::lock_guard lock(mutex_);
+        Lock lock(mutex_);
         stopping_ = true;
     }
     wakeUp();
@@ -59,7 +71,7 @@ void AgentThread::wakeUp() const noexcept {
 void AgentThread::post(std::function<void()> work) {
     if (made_.isInChild()) return;  // a thread of the parent may have held the lock
     {
-        std::lock_guard lock(mutex_);
+        Lock lock(mutex_);
         if (stopping_) return;
         inbox_.push_back(std::move(work));
         if (inbox_.size() > 1) return;  // it has been woken for the first
@@ -68,20 +80,39 @@ void AgentThread::post(std::function<void()> work) {
 }
 
 void AgentThread::attach(std::shared_ptr<AgentLink> link) {
-    post([this, link = std::move(link)] { links_.push_back(link); });
+    post([this, link = std::move(link)] {
+        agentThread.assertCurrent("AgentThread::attach");
+        links_.push_back(link);
+    });
 }
 
 void AgentThread::run() {
     bool goesOn = true;
     while (goesOn) {
         goesOn = takeInbox();
-        for (const auto& link : links_)
-            callHost("transfer agent link", [&] { link->proceed(AgentLink::Clock::now()); });
-        std::erase_if(links_, [](const auto& link) { return link->isClosed(); });
+        proceed();
         reapEnded();
         if (goesOn) wait();
     }
-    for (const auto& link : links_) callHost("transfer agent link", [&] { link->endOfProcess(); });
+    for (const auto& link : links_) {
+        callHost("transfer agent link", [&] {
+            agentThread.assertCurrent("AgentLink::endOfProcess");
+            link->endOfProcess();
+        });
+    }
+}
+
+void AgentThread::proceed() {
+    for (const auto& link : links_) {
+        callHost("transfer agent link", [&] {
+            agentThread.assertCurrent("AgentLink::proceed");
+            link->proceed(AgentLink::Clock::now());
+        });
+    }
+    std::erase_if(links_, [](const auto& link) {
+        agentThread.assertCurrent("AgentLink::isClosed");
+        return link->isClosed();
+    });
 }
 
 // The last round, at the exit, still sends what was handed over: an acknowledgement spares the next run a report.
@@ -89,7 +120,7 @@ bool AgentThread::takeInbox() {
     std::vector<std::function<void()>> inbox;
     bool isLast = false;
     {
-        std::lock_guard lock(mutex_);
+        Lock lock(mutex_);
         isLast = stopping_;
         inbox.swap(inbox_);
     }

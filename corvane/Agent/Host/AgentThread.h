@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/ForkMark.h>
+#include <corvane/Platform/Mutex.h>
 
 #include <poll.h>
 #include <sys/types.h>
@@ -9,15 +10,21 @@
 #include <atomic>
 #include <functional>
 #include <memory>
-#include <mutex>
-#include <set>
-#include <string>
 #include <thread>
 #include <vector>
 
 namespace corvane {
 
 class AgentLink;
+
+/// The capability of code that runs on the agent thread: state that is the thread's own says so with
+/// CORVANE_GUARDED_BY(agentThread), and functions with CORVANE_REQUIRES(agentThread). Internal.
+class CORVANE_CAPABILITY("thread") AgentThreadRole {
+  public:
+    /// Stops the process with a message that names `operation` unless the calling code runs on the agent thread.
+    void assertCurrent(const char* operation) const CORVANE_ASSERT_CAPABILITY(this);
+};
+inline constexpr AgentThreadRole agentThread;
 
 /// The one thread of the process on which the library talks to transfer agents.
 ///
@@ -35,22 +42,22 @@ class AgentThread {
     /// Looks after a link until it is closed. Callable from any thread.
     void attach(std::shared_ptr<AgentLink> link);
 
-    /// Waits, in the background, for a process that was started, so that none stays as a zombie. On the thread.
-    void reap(pid_t process) { unreaped_.push_back(process); }
-
-    /// The tokens of tasks that the agents are to forget, and have not said that they have. Of the whole process, so
-    /// that a session that is opened while another one's acknowledgement is under way is not told again. On the thread.
-    [[nodiscard]] std::set<std::string>& acknowledged() { return acknowledged_; }
+    /// Waits, in the background, for a process that was started, so that none stays as a zombie.
+    void reap(pid_t process) CORVANE_REQUIRES(agentThread) { unreaped_.push_back(process); }
 
   private:
     AgentThread();
     void stop();
     void wakeUp() const noexcept;
-    void run();
+    void run() CORVANE_REQUIRES(agentThread);
+    /// Runs what was posted. False when the thread is to stop.
     bool takeInbox();
-    void reapEnded();
-    void wait();
-    int prepareWait();
+    /// Lets every link do what it can, and lets go of those that are closed.
+    void proceed() CORVANE_REQUIRES(agentThread);
+    void reapEnded() CORVANE_REQUIRES(agentThread);
+    void wait() CORVANE_REQUIRES(agentThread);
+    /// Fills in what is to be polled. Returns the time that the wait may take, in milliseconds; -1 for any.
+    [[nodiscard]] int prepareWait() CORVANE_REQUIRES(agentThread);
 
     // For the exit handler. A child may be forked off while shared() makes the thread; its handler would wait there for
     // a thread that only the parent has.
@@ -60,15 +67,13 @@ class AgentThread {
     Descriptor wakeUp_;
     std::thread thread_;
 
-    std::mutex mutex_;  // guards these; held for a few moves only
-    std::vector<std::function<void()>> inbox_;
-    bool stopping_ = false;
+    Mutex mutex_;  // held for a few moves only
+    std::vector<std::function<void()>> inbox_ CORVANE_GUARDED_BY(mutex_);
+    bool stopping_ CORVANE_GUARDED_BY(mutex_) = false;
 
-    // The thread's own.
-    std::vector<std::shared_ptr<AgentLink>> links_;
-    std::vector<pollfd> polled_;
-    std::vector<pid_t> unreaped_;
-    std::set<std::string> acknowledged_;
+    std::vector<std::shared_ptr<AgentLink>> links_ CORVANE_GUARDED_BY(agentThread);
+    std::vector<pollfd> polled_ CORVANE_GUARDED_BY(agentThread);
+    std::vector<pid_t> unreaped_ CORVANE_GUARDED_BY(agentThread);
 };
 
 }  // namespace corvane

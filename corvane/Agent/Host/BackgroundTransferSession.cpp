@@ -24,9 +24,7 @@ BackgroundTransferSession::BackgroundTransferSession(const TransferSessionConfig
                                                      std::weak_ptr<TransferSessionDelegate> delegate,
                                                      std::shared_ptr<SerialQueue> queue,
                                                      const TransferAgentOptions& options)
-    : core_(std::make_shared<BackgroundTransferCore>(
-          configuration, std::move(delegate),
-          queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session"), options)) {
+    : core_(std::make_shared<BackgroundTransferCore>(configuration, std::move(delegate), std::move(queue), options)) {
     core_->open();
 }
 
@@ -35,11 +33,11 @@ BackgroundTransferSession::~BackgroundTransferSession() {
 }
 
 std::optional<std::string> BackgroundTransferSession::description() const {
-    return core_->description();
+    return core_->description.get();
 }
 
 void BackgroundTransferSession::setDescription(std::string description) {
-    core_->setDescription(std::move(description));
+    core_->description.set(std::move(description));
 }
 
 std::shared_ptr<TransferTask> BackgroundTransferSession::uploadTask(TransferRequest request,

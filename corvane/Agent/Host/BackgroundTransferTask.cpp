@@ -3,112 +3,64 @@
 #include <corvane/Agent/Host/BackgroundTransferCore.h>
 #include <corvane/Agent/TransferSubmission.h>
 
-#include <algorithm>
 #include <utility>
 
 namespace corvane {
 
 BackgroundTransferTask::BackgroundTransferTask(std::weak_ptr<BackgroundTransferCore> core, std::int64_t identifier,
-                                               TransferRequest request, std::filesystem::path file)
-    : core_(std::move(core)),
-      identifier_(identifier),
+                                               TransferRequest request, std::filesystem::path bodyPath)
+    : SessionTask(identifier),
+      core_(std::move(core)),
       token_(TransferSubmission::newToken()),
       request_(std::move(request)),
-      file_(std::move(file)),
-      isOfThisRun_(true) {}
+      bodyPath_(std::move(bodyPath)),
+      isOfThisRun_(true),
+      stage_(Stage::suspended) {}
 
 BackgroundTransferTask::BackgroundTransferTask(std::weak_ptr<BackgroundTransferCore> core, std::int64_t identifier,
                                                std::string token, std::optional<std::string> description)
-    : core_(std::move(core)),
-      identifier_(identifier),
+    : SessionTask(identifier, std::move(description)),
+      core_(std::move(core)),
       token_(std::move(token)),
       isOfThisRun_(false),
-      description_(std::move(description)),
-      state_(State::running),
-      keeper_(Keeper::agent),
-      accepted_(true) {}
+      stage_(Stage::accepted) {}
 
-std::optional<std::string> BackgroundTransferTask::description() const {
-    std::lock_guard lock(mutex_);
-    return description_;
-}
-
+// Until the task is resumed its description goes along with the submission. The agent is told of one that changes while
+// the submission is written: it may be too late for that.
 void BackgroundTransferTask::setDescription(std::string description) {
-    {
-        std::lock_guard lock(mutex_);
-        description_ = description;
-        if (keeper_ != Keeper::agent) return;  // goes along with the submission
-    }
+    SessionTask::setDescription(description);
+    if (!isWithAgent() && stage() != Stage::reporting) return;
     if (const auto core = core_.lock()) core->describe(token_, std::move(description));
 }
 
 TransferTask::State BackgroundTransferTask::state() const {
-    std::lock_guard lock(mutex_);
-    return state_;
+    switch (stage()) {
+        case Stage::suspended:
+            return State::suspended;
+        case Stage::completed:
+            return State::completed;
+        default:
+            return State::running;
+    }
 }
 
 void BackgroundTransferTask::resume() {
     const auto core = core_.lock();
-    if (!core) return;
-    {
-        std::lock_guard lock(mutex_);
-        if (state_ != State::suspended) return;
-        state_ = State::running;
-    }
-    core->start(shared_from_this());
+    if (core && advanceTo(Stage::submitting)) core->start(shared_from_this());
 }
 
-bool BackgroundTransferTask::isKeptBy(Keeper keeper) const {
-    std::lock_guard lock(mutex_);
-    return keeper_ == keeper;
-}
-
-bool BackgroundTransferTask::moveTo(Keeper keeper) {
-    std::lock_guard lock(mutex_);
-    if (state_ != State::running || keeper_ >= keeper) return false;
-    keeper_ = keeper;
+bool BackgroundTransferTask::advanceTo(Stage stage) {
+    Stage from = stage_;
+    do {
+        const bool isOtherWay = from == Stage::inside && stage == Stage::reporting;
+        if (from >= stage || isOtherWay) return false;
+    } while (!stage_.compare_exchange_weak(from, stage));
     return true;
 }
 
-void BackgroundTransferTask::setSpooled() {
-    std::lock_guard lock(mutex_);
-    spooled_ = true;
-}
-
-bool BackgroundTransferTask::isUnanswered() const {
-    std::lock_guard lock(mutex_);
-    return spooled_ && !accepted_;
-}
-
-void BackgroundTransferTask::setAccepted() {
-    std::lock_guard lock(mutex_);
-    accepted_ = true;
-}
-
-bool BackgroundTransferTask::isAccepted() const {
-    std::lock_guard lock(mutex_);
-    return accepted_;
-}
-
-void BackgroundTransferTask::setCompleted() {
-    std::lock_guard lock(mutex_);
-    state_ = State::completed;
-}
-
-// A body that is sent again after the agent was lost starts anew; nothing is reported until it is beyond what was.
-bool BackgroundTransferTask::note(std::int64_t total, std::int64_t expected) {
-    std::lock_guard lock(mutex_);
-    if (total <= reported_) return false;
-    noted_.total = std::max(noted_.total, total);
-    noted_.expected = expected;
-    return !std::exchange(reportPending_, true);
-}
-
-BackgroundTransferTask::Progress BackgroundTransferTask::takeProgress() {
-    std::lock_guard lock(mutex_);
-    reportPending_ = false;
-    noted_.step = noted_.total - std::exchange(reported_, noted_.total);
-    return noted_;
+bool BackgroundTransferTask::isWithAgent() const {
+    const Stage now = stage();
+    return now == Stage::submitting || now == Stage::spooled || now == Stage::accepted;
 }
 
 }  // namespace corvane

@@ -1,12 +1,12 @@
 #pragma once
 
+#include <corvane/Transfer/SessionTask.h>
 #include <corvane/Transfer/TransferRequest.h>
-#include <corvane/Transfer/TransferTask.h>
 
+#include <atomic>
 #include <cstdint>
 #include <filesystem>
 #include <memory>
-#include <mutex>
 #include <optional>
 #include <string>
 
@@ -15,70 +15,63 @@ namespace corvane {
 class BackgroundTransferCore;
 
 /// A task of a background session. Internal; see `TransferTask` for who holds it and who may call it.
-class BackgroundTransferTask final : public TransferTask, public std::enable_shared_from_this<BackgroundTransferTask> {
+class BackgroundTransferTask final : public SessionTask, public std::enable_shared_from_this<BackgroundTransferTask> {
   public:
-    /// Who sends the body. It goes from the first to the last and never back.
-    enum class Keeper {
-        nobody,   ///< not resumed yet
-        agent,    ///< submitted: in the agent's spool or journal
-        process,  ///< the session inside the process
-    };
-    struct Progress {
-        std::int64_t step = 0;
-        std::int64_t total = 0;
-        std::int64_t expected = 0;
+    /// The life of a task, which only goes forward. There are two ways to its end, through the agent and inside the
+    /// process; no task goes both:
+    ///
+    ///     suspended -> submitting -> spooled -> accepted -> reporting -> completed
+    ///                      |            |          |                         ^
+    ///                      +------------+----------+----> inside ------------+
+    ///
+    /// "A kill" is one of this process.
+    enum class Stage {
+        suspended,   ///< made. A kill leaves nothing here: the next run sends the file from its owner's books
+        submitting,  ///< resumed, and on the way to the spool. A kill leaves a submission there, whole, or a part of
+                     ///< one that the agent removes
+        spooled,     ///< the submission is in the agent's spool. After a kill the agent takes it from there
+        accepted,    ///< in the agent's journal, as its first word on the task or a listing has said. After a kill the
+                     ///< agent goes on with it, and tells the next run
+        inside,      ///< this process sends it, and has withdrawn it from the agent if it was there. A kill leaves the
+                     ///< file to the owner's next run
+        reporting,   ///< the agent has told how it ended; the report waits in the session's queue, or the delegate is
+                     ///< being told. After a kill the agent tells the next run
+        completed,   ///< the delegate has been told, or the session has gone. What the agent has not forgotten yet is
+                     ///< acknowledged again when it comes up; a process that exits before leaves a mark for it, and
+                     ///< after a kill in between the next run is told once more
     };
 
     /// A task of this run.
     BackgroundTransferTask(std::weak_ptr<BackgroundTransferCore> core, std::int64_t identifier, TransferRequest request,
-                           std::filesystem::path file);
-    /// A task of an earlier run, or of another process, that the agent has told of.
+                           std::filesystem::path bodyPath);
+    /// A task of an earlier run, or of another process, that the agent has told of: an accepted one.
     BackgroundTransferTask(std::weak_ptr<BackgroundTransferCore> core, std::int64_t identifier, std::string token,
                            std::optional<std::string> description);
 
-    [[nodiscard]] std::int64_t identifier() const override { return identifier_; }
-    [[nodiscard]] std::optional<std::string> description() const override;
     void setDescription(std::string description) override;
     [[nodiscard]] State state() const override;
     void resume() override;
+    void complete() override { advanceTo(Stage::completed); }
 
     [[nodiscard]] const std::string& token() const { return token_; }
     [[nodiscard]] const TransferRequest& request() const { return request_; }
-    [[nodiscard]] const std::filesystem::path& file() const { return file_; }
+    [[nodiscard]] const std::filesystem::path& bodyPath() const { return bodyPath_; }
     [[nodiscard]] bool isOfThisRun() const { return isOfThisRun_; }
 
-    [[nodiscard]] bool isKeptBy(Keeper keeper) const;
-    /// False when the keeper was this one, or a later one, already, and for a task that is over.
-    bool moveTo(Keeper keeper);
-    /// The submission is there for the agent to take, and has been taken.
-    void setSpooled();
-    void setAccepted();
-    /// Whether the agent can have the submission and has not said so.
-    [[nodiscard]] bool isUnanswered() const;
-    [[nodiscard]] bool isAccepted() const;
-    void setCompleted();
-
-    /// Notes how much has gone out; true when a report is to be enqueued, which takes all that was noted by then.
-    bool note(std::int64_t total, std::int64_t expected);
-    [[nodiscard]] Progress takeProgress();
+    [[nodiscard]] Stage stage() const { return stage_; }
+    /// Goes on to a later stage; stages may be left out. False, and the task stays where it is, when the stage does not
+    /// lie ahead of it. Of several threads that try the same step one succeeds.
+    bool advanceTo(Stage stage);
+    /// Whether the agent may have the task and has not told how it ended.
+    [[nodiscard]] bool isWithAgent() const;
 
   private:
     const std::weak_ptr<BackgroundTransferCore> core_;
-    const std::int64_t identifier_;
     const std::string token_;
     const TransferRequest request_;
-    const std::filesystem::path file_;
+    const std::filesystem::path bodyPath_;
     const bool isOfThisRun_;
-
-    mutable std::mutex mutex_;  // guards these; never held while calling out
-    std::optional<std::string> description_;
-    State state_ = State::suspended;
-    Keeper keeper_ = Keeper::nobody;
-    bool spooled_ = false;
-    bool accepted_ = false;
-    Progress noted_;
-    std::int64_t reported_ = 0;
-    bool reportPending_ = false;
+    std::atomic<Stage> stage_;
 };
 
 }  // namespace corvane

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <corvane/Export.h>
 #include <corvane/Transfer/TransferSession.h>
 
 #include <memory>
@@ -10,7 +9,7 @@ namespace corvane {
 /// Opens a session through the process's factory (`TransferSession::setFactory`). Without one: a background session
 /// with the default options where the transfer agent is there, and a session inside the process otherwise. Throws what
 /// the factory throws. Any thread.
-[[nodiscard]] CORVANE_EXPORT std::shared_ptr<TransferSession> makeDefaultTransferSession(
+[[nodiscard]] std::shared_ptr<TransferSession> makeDefaultTransferSession(
     TransferSessionConfiguration configuration, std::weak_ptr<TransferSessionDelegate> delegate,
     std::shared_ptr<SerialQueue> queue);
 

@@ -1,0 +1,61 @@
+#pragma once
+
+#include <corvane/Platform/Mutex.h>
+#include <corvane/Platform/SerialQueue.h>
+#include <corvane/Transfer/SessionTask.h>
+#include <corvane/Transfer/TransferOutcome.h>
+#include <corvane/Transfer/TransferSession.h>
+
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <vector>
+
+namespace corvane {
+
+/// Tells a session's delegate what its tasks come to, on the session's queue, until the session is closed: the one
+/// place where that happens, for every kind of session. Internal.
+///
+/// Shared by the session and what it has enqueued. Callable from any thread unless said otherwise; never calls back
+/// inside a call.
+class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
+  public:
+    /// How the delegate is told of an end: by which of its callbacks.
+    using Ending = void (TransferSessionDelegate::*)(const TransferTask&, const std::optional<AnyError>&,
+                                                     const std::optional<TransferResponse>&);
+    /// Lists the session's tasks that are not completed.
+    using List = std::function<std::vector<std::shared_ptr<TransferTask>>()>;
+
+    /// An empty `queue` means one of the session's own.
+    SessionReporter(std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue);
+
+    [[nodiscard]] const std::shared_ptr<SerialQueue>& queue() const { return queue_; }
+    /// Nothing is told any more, but for a callback that runs at this moment.
+    void close();
+    [[nodiscard]] bool isClosed() const;
+    /// The delegate, unless it or the session has gone.
+    [[nodiscard]] std::shared_ptr<TransferSessionDelegate> delegate() const;
+
+    /// Tells of a task's end, once, and completes the task when the callback has come back, whatever it throws: until
+    /// then the task counts as running. On the queue. Returns whether the delegate was told; a task of which nobody was
+    /// told is not completed.
+    bool reportEnd(SessionTask& task, Ending ending, const TransferOutcome& outcome);
+
+    /// Enqueues a report of how much has gone out, unless one waits already.
+    void reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected);
+
+    /// Answers a question for the session's tasks through the queue, behind the completions that wait there.
+    void answer(TransferSession::Listing listing, List list);
+
+    /// Enqueues the word that all events were delivered.
+    void signalDelivered();
+
+  private:
+    const std::weak_ptr<TransferSessionDelegate> delegate_;
+    const std::shared_ptr<SerialQueue> queue_;
+
+    mutable Mutex mutex_;
+    bool closed_ CORVANE_GUARDED_BY(mutex_) = false;
+};
+
+}  // namespace corvane
