@@ -8,6 +8,7 @@
 #include <corvane/Platform/Thread.h>
 
 #include <atomic>
+#include <chrono>
 #include <condition_variable>
 #include <deque>
 #include <exception>
@@ -70,6 +71,11 @@ void abandon(Task task) {
 }  // namespace
 
 struct SerialQueue::State {
+    using Clock = std::chrono::steady_clock;
+    // So many reports, or so long, are as much as one end is worth waiting for.
+    static constexpr std::size_t longestRun = 512;
+    static constexpr auto longestWait = std::chrono::milliseconds(20);
+
     State(std::string name, QualityOfService quality) : label(std::move(name)), qualityOfService(quality) {}
 
     const std::string label;
@@ -80,13 +86,21 @@ struct SerialQueue::State {
     std::condition_variable wake;      // the worker waits here
     std::condition_variable syncDone;  // callers of sync() wait here
     TaskList waiting CORVANE_GUARDED_BY(mutex);
+    TaskList waitingAhead CORVANE_GUARDED_BY(mutex);
     bool running CORVANE_GUARDED_BY(mutex) = false;  // somebody, the worker or an inline sync(), is running tasks
     bool asleep CORVANE_GUARDED_BY(mutex) = false;   // the worker waits for `wake`
     bool workerStarted CORVANE_GUARDED_BY(mutex) = false;
     bool startFailed CORVANE_GUARDED_BY(mutex) = false;  // there was no thread to be had, which has been logged
     bool closed CORVANE_GUARDED_BY(mutex) = false;  // the last reference is gone; the worker ends when nothing is left
-    // Written under the mutex; the worker reads it without between two tasks.
+    // Written under the mutex; the worker reads them without between two tasks.
     std::atomic<int> suspensions = 0;
+    std::atomic<bool> hasAhead = false;
+
+    // Of whoever runs tasks: what was left to the end of the run.
+    std::deque<Task> writes;
+    std::deque<Task> reports;
+    Clock::time_point runEndsBy;
+    bool isReporting = false;
 
     bool suspended() const noexcept { return suspensions.load(std::memory_order_relaxed) > 0; }
 
@@ -94,6 +108,11 @@ struct SerialQueue::State {
     void work();
     void workUntil(const bool& done, Lock& lock) CORVANE_REQUIRES(mutex);
     void runTaken(TaskList& taken);
+    void waitWhileSuspended();
+    void runAhead();
+    void leave(RunEnd part, Task task);
+    [[nodiscard]] bool isRunLong() const;
+    void endRun() noexcept;
 };
 
 // Requires: `running` was false and has just been checked under the lock together with
@@ -120,8 +139,8 @@ void SerialQueue::State::work() {
     Lock lock(mutex);
     startFailed = false;
     for (;;) {
-        while (running || waiting.empty() || suspended()) {
-            if (closed && waiting.empty()) return;
+        while (running || (waiting.empty() && waitingAhead.empty()) || suspended()) {
+            if (closed && waiting.empty() && waitingAhead.empty()) return;
             asleep = true;
             lock.wait(wake);
             asleep = false;
@@ -157,14 +176,61 @@ void SerialQueue::State::workUntil(const bool& done, Lock& lock) {
 
 void SerialQueue::State::runTaken(TaskList& taken) {
     FrameScope scope(this, nullptr);
+    runAhead();
     while (!taken.empty()) {
-        if (suspended()) {
-            Lock lock(mutex);
-            while (suspended()) lock.wait(wake);
-        }
+        waitWhileSuspended();
+        runAhead();
         Task task = taken.pop();
+        if (!task.isInRun() || isRunLong()) endRun();
         runGuarded(task, label);
     }
+    endRun();
+}
+
+void SerialQueue::State::waitWhileSuspended() {
+    if (!suspended()) return;
+    endRun();
+    Lock lock(mutex);
+    while (suspended()) lock.wait(wake);
+}
+
+void SerialQueue::State::runAhead() {
+    while (hasAhead.load(std::memory_order_relaxed)) {
+        TaskList taken;
+        {
+            const Lock lock(mutex);
+            taken.takeAll(waitingAhead);
+            hasAhead = false;
+        }
+        while (!taken.empty()) {
+            waitWhileSuspended();
+            Task task = taken.pop();
+            runGuarded(task, label);
+        }
+    }
+}
+
+void SerialQueue::State::leave(RunEnd part, Task task) {
+    if (writes.empty() && reports.empty()) runEndsBy = Clock::now() + longestWait;
+    (part == RunEnd::write ? writes : reports).push_back(std::move(task));
+}
+
+bool SerialQueue::State::isRunLong() const {
+    return reports.size() >= longestRun || (!(writes.empty() && reports.empty()) && Clock::now() >= runEndsBy);
+}
+
+// What is left meanwhile is done too. A report that ends the run anew, for what it has done itself, is not to run those
+// behind it inside of it.
+void SerialQueue::State::endRun() noexcept {
+    const bool isNested = isReporting;
+    while (!writes.empty() || !(isNested || reports.empty())) {
+        isReporting = isNested || writes.empty();
+        auto& part = writes.empty() ? reports : writes;
+        Task task = std::move(part.front());
+        part.pop_front();
+        runGuarded(task, label);
+    }
+    isReporting = isNested;
 }
 
 SerialQueue::SerialQueue(std::string label, QualityOfService qualityOfService)
@@ -175,7 +241,7 @@ SerialQueue::~SerialQueue() {
     Lock lock(state_->mutex);
     state_->closed = true;
     state_->suspensions = 0;
-    const bool start = !state_->workerStarted && !state_->waiting.empty();
+    const bool start = !state_->workerStarted && !(state_->waiting.empty() && state_->waitingAhead.empty());
     if (start) state_->workerStarted = true;
     lock.unlock();
     if (start) State::startWorker(state_);
@@ -187,13 +253,37 @@ const std::string& SerialQueue::label() const noexcept {
 }
 
 void SerialQueue::async(Task task) {
+    enqueue(std::move(task), false);
+}
+
+void SerialQueue::asyncInRun(Task task) {
+    task.setInRun();
+    enqueue(std::move(task), false);
+}
+
+void SerialQueue::asyncAhead(Task task) {
+    enqueue(std::move(task), true);
+}
+
+void SerialQueue::atEndOfRun(RunEnd part, Task task) {
+    assertCurrent("SerialQueue::atEndOfRun");
+    state_->leave(part, std::move(task));
+}
+
+void SerialQueue::endRun() {
+    assertCurrent("SerialQueue::endRun");
+    state_->endRun();
+}
+
+void SerialQueue::enqueue(Task task, bool isAhead) {
     State& state = *state_;
     if (state.born.isInChild()) return abandon(std::move(task));
     bool wake = false;
     bool start = false;
     {
         const Lock lock(state.mutex);
-        state.waiting.push(std::move(task));
+        (isAhead ? state.waitingAhead : state.waiting).push(std::move(task));
+        if (isAhead) state.hasAhead = true;
         if (!state.workerStarted) {
             state.workerStarted = start = true;
         } else {
@@ -213,7 +303,7 @@ void SerialQueue::runSync(FunctionRef function) {
         !state.born.isInChild(),
         "a child made by fork cannot wait for a queue of its parent; it may exec or _exit, queue=" + label());
     Lock lock(state.mutex);
-    if (!state.running && state.waiting.empty() && !state.suspended()) {
+    if (!state.running && state.waiting.empty() && state.waitingAhead.empty() && !state.suspended()) {
         state.running = true;
         lock.unlock();
         struct Finish {
@@ -222,7 +312,7 @@ void SerialQueue::runSync(FunctionRef function) {
                 {
                     const Lock guard(state->mutex);
                     state->running = false;
-                    wake = state->asleep && (!state->waiting.empty() || state->closed);
+                    wake = state->asleep && (!state->waiting.empty() || !state->waitingAhead.empty() || state->closed);
                     if (!state->workerStarted) state->syncDone.notify_all();
                 }
                 if (wake) state->wake.notify_one();
@@ -230,6 +320,10 @@ void SerialQueue::runSync(FunctionRef function) {
             std::shared_ptr<State> state;  // the function may release the queue
         } finish{state_};
         FrameScope scope(&state, currentFrame);
+        struct RunEnder {
+            ~RunEnder() { state.endRun(); }
+            State& state;
+        } ender{state};
         function.call(function.object);
         return;
     }
@@ -248,6 +342,7 @@ void SerialQueue::runSync(FunctionRef function) {
         } catch (...) {
             call.error = std::current_exception();
         }
+        state.endRun();
         const Lock guard(state.mutex);
         call.done = true;
         state.syncDone.notify_all();

@@ -44,6 +44,29 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
     /// task runs. The task's captures are destroyed on the queue, right after it ran.
     void async(Task task);
 
+    /// Enqueues a task that shares the end of its run with those around it. What the queue has at hand of such tasks is
+    /// one run: what they leave to its end (`atEndOfRun`) is done once, behind the last of them, and before anything
+    /// else: any other task, a suspension, a wait for more. A run ends early when much waits for its end, or for long.
+    void asyncInRun(Task task);
+
+    /// What happens at the end of a run, in this order.
+    enum class RunEnd {
+        write,   ///< what makes the run's effects last
+        report,  ///< what may be told once they do
+    };
+    /// Leaves a task to the end of the run that is under way, behind those that were left before. Any task is in a run,
+    /// one that shares it with nobody too. What the task throws is logged.
+    /// Requires: the caller is on this queue (the process is stopped with a message).
+    void atEndOfRun(RunEnd part, Task task);
+    /// Does at once what was left to the end of the run; inside a report only the writes, since the reports behind it
+    /// are on their way.
+    /// Requires: the caller is on this queue (the process is stopped with a message).
+    void endRun();
+
+    /// Enqueues a task ahead of all that `async` and `asyncInRun` have enqueued; tasks ahead keep their order among
+    /// themselves. For results that must not wait behind new work. It is in no run and ends none.
+    void asyncAhead(Task task);
+
     /// Runs `function` on the queue, after everything enqueued before, and returns its result or
     /// rethrows what it threw. When the queue is idle and not suspended it runs on the caller's
     /// thread; otherwise the caller waits. When the process has no thread left for the queue, the caller runs what was
@@ -90,6 +113,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
         void (*call)(void*);
     };
 
+    void enqueue(Task task, bool isAhead);
     void runSync(FunctionRef function);
 
     const std::shared_ptr<State> state_;

@@ -33,13 +33,14 @@ class Task {
         }
     }
 
-    Task(Task&& other) noexcept : operations_(std::exchange(other.operations_, nullptr)) {
+    Task(Task&& other) noexcept : operations_(std::exchange(other.operations_, nullptr)), isInRun_(other.isInRun_) {
         if (operations_) operations_->relocate(other.storage_, storage_);
     }
     Task& operator=(Task&& other) noexcept {
         if (this != &other) {
             reset();
             operations_ = std::exchange(other.operations_, nullptr);
+            isInRun_ = other.isInRun_;
             if (operations_) operations_->relocate(other.storage_, storage_);
         }
         return *this;
@@ -55,6 +56,10 @@ class Task {
     void reset() noexcept {
         if (auto* operations = std::exchange(operations_, nullptr)) operations->destroy(storage_);
     }
+
+    /// Whether the task shares the end of its run: see `SerialQueue::asyncInRun`.
+    [[nodiscard]] bool isInRun() const noexcept { return isInRun_; }
+    void setInRun() noexcept { isInRun_ = true; }
 
   private:
     struct Operations {
@@ -85,6 +90,7 @@ class Task {
 
     alignas(std::max_align_t) std::byte storage_[inlineSize];
     const Operations* operations_ = nullptr;
+    bool isInRun_ = false;
 };
 
 }  // namespace corvane

@@ -17,14 +17,17 @@ DocumentHandOver::DocumentHandOver(Client client, std::shared_ptr<UploadManagerT
       deferredStore_(std::move(deferredStore)),
       ledger_(std::move(ledger)) {}
 
-DocumentHandOver::Removal DocumentHandOver::handOver(const UploadBatchEntity& batch, const MayDelete& mayDelete) {
-    const auto document = std::make_shared<UserEvents>(batch.session, batch.events, newUUID());
+DocumentHandOver::Removal DocumentHandOver::handOver(const Contents& contents, const MayDelete& mayDelete) {
+    const auto document = std::make_shared<UserEvents>(contents.session, contents.events, newUUID());
     Removal removal;
-    ledger_->add(document->identifier(), static_cast<std::int64_t>(batch.events->count()));
+    removal.isDone = contents.rows.empty();
+    std::size_t count = 0;
+    for (const auto& events : contents.events) count += events->count();
+    ledger_->add(document->identifier(), static_cast<std::int64_t>(count));
     try {
         UploadRequest request{client_, document};
         request.removeBackup = [&](const std::shared_ptr<StoreConnection>& connection) {
-            removeBackup(connection, batch.identifier, mayDelete, removal);
+            removeBackup(connection, contents, mayDelete, removal);
         };
         removal.taken = uploadManager_->upload(request);
     } catch (...) {
@@ -37,8 +40,7 @@ DocumentHandOver::Removal DocumentHandOver::handOver(const UploadBatchEntity& ba
     }
     if (removal.isKept || removal.isDone || removal.error) return removal;
     try {
-        deferredStore_->perform(
-            [&](Rows& rows) { rows.transaction([&] { deleteRow(rows, batch.identifier, mayDelete); }); });
+        deferredStore_->perform([&](Rows& rows) { rows.transaction([&] { deleteRows(rows, contents, mayDelete); }); });
     } catch (...) {
         removal.error = AnyError::current();
     }
@@ -47,21 +49,22 @@ DocumentHandOver::Removal DocumentHandOver::handOver(const UploadBatchEntity& ba
 
 // Only where both tables are in one file; otherwise the row is deleted afterwards, and a kill in between sends it
 // again.
-void DocumentHandOver::removeBackup(const std::shared_ptr<StoreConnection>& connection, const std::string& identifier,
+void DocumentHandOver::removeBackup(const std::shared_ptr<StoreConnection>& connection, const Contents& contents,
                                     const MayDelete& mayDelete, Removal& removal) {
     removal.isKept = connection->location().isMemory() && !deferredStore_->isInMemory();
-    if (!deferredStore_->sharesFileWith(*connection)) return;
+    if (removal.isDone || !deferredStore_->sharesFileWith(*connection)) return;
     try {
         Rows rows(connection);
-        deleteRow(rows, identifier, mayDelete);
+        deleteRows(rows, contents, mayDelete);
         removal.isDone = true;
     } catch (...) {
         removal.error = AnyError::current();
     }
 }
 
-void DocumentHandOver::deleteRow(Rows& rows, const std::string& identifier, const MayDelete& mayDelete) {
-    if (!mayDelete || mayDelete(rows)) rows.deleteWhere("identifier", identifier);
+void DocumentHandOver::deleteRows(Rows& rows, const Contents& contents, const MayDelete& mayDelete) {
+    if (mayDelete && !mayDelete(rows)) return;
+    for (const auto& identifier : contents.rows) rows.deleteWhere("identifier", identifier);
 }
 
 }  // namespace corvane

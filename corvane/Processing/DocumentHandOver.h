@@ -3,6 +3,7 @@
 #include <corvane/Models/Client.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Processing/UploadBatchEntity.h>
+#include <corvane/Processing/UserEvents.h>
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Upload/DeliveryLedger.h>
 #include <corvane/Upload/UploadManagerType.h>
@@ -11,6 +12,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace corvane {
 
@@ -19,10 +21,17 @@ namespace corvane {
 class DocumentHandOver {
   public:
     using Rows = Store<UploadBatchEntity>;
-    /// Whether a batch's row may go: asked inside the transaction that deletes it.
+
+    /// What goes into one document, and the rows that it replaces.
+    struct Contents {
+        JSON session;
+        UserEvents::Events events;
+        std::vector<std::string> rows;
+    };
+    /// Whether a batch's rows may go: asked inside the transaction that deletes it.
     using MayDelete = std::function<bool(Rows&)>;
 
-    /// What became of a batch's row when its document was taken over.
+    /// What became of a batch's rows when its document was taken over.
     struct Removal {
         std::string document;
         UploadTaken taken = UploadTaken::underWay;
@@ -35,14 +44,14 @@ class DocumentHandOver {
                      std::shared_ptr<DeferredStore<UploadBatchEntity>> deferredStore,
                      std::shared_ptr<DeliveryLedger> ledger);
 
-    /// Makes a document, enters it in the ledger and hands it over, and deletes the batch's row if it may go and the
+    /// Makes a document, enters it in the ledger and hands it over, and deletes the batch's rows if they may go and the
     /// document is recorded. Throws what the manager throws; the batch is then as it was.
-    Removal handOver(const UploadBatchEntity& batch, const MayDelete& mayDelete);
+    Removal handOver(const Contents& contents, const MayDelete& mayDelete);
 
   private:
-    void removeBackup(const std::shared_ptr<StoreConnection>& connection, const std::string& identifier,
+    void removeBackup(const std::shared_ptr<StoreConnection>& connection, const Contents& contents,
                       const MayDelete& mayDelete, Removal& removal);
-    static void deleteRow(Rows& rows, const std::string& identifier, const MayDelete& mayDelete);
+    static void deleteRows(Rows& rows, const Contents& contents, const MayDelete& mayDelete);
 
     const Client client_;
     const std::shared_ptr<UploadManagerType> uploadManager_;

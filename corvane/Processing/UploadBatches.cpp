@@ -112,35 +112,54 @@ void UploadBatches::process(const ProcessEvent& processEvent) {
 }
 
 void UploadBatches::add(const UploadBatchQueueKey& key, const JSON& payload) {
-    auto found = batchQueues_.find(key);
-    if (found == batchQueues_.end()) {
-        found = batchQueues_
-                    .emplace(key, UploadBatchQueue{.identifier = newUUID(),
-                                                   .session = currentSession_->sessionData,
-                                                   .events = std::make_shared<EncodedEvents>()})
-                    .first;
+    batchQueues_[key].append(payload, currentSession_->sessionData);
+    writeAtEndOfRun();
+}
+
+void UploadBatches::writeAtEndOfRun() {
+    if (writesAtEndOfRun_) return;
+    accessQueue_->atEndOfRun(SerialQueue::RunEnd::write, [self = shared_from_this()] {
+        self->assertOnQueue("UploadBatchEventProcessor::writeChanged");
+        self->writeChanged();
+    });
+    writesAtEndOfRun_ = true;
+}
+
+void UploadBatches::writeChanged() {
+    writesAtEndOfRun_ = false;
+    bool isWritten = true;
+    for (auto& [key, batch] : batchQueues_) {
+        for (auto& part : batch.parts()) {
+            if (part.isDue && !backUp(part)) isWritten = false;
+        }
     }
-    UploadBatchQueue& queue = found->second;
-    queue.events->append(payload);
-    queue.session = currentSession_->sessionData;
-    if (!backUp(queue)) {
+    if (!isWritten) {
         backupsAreBehind_ = true;
     } else if (backupsAreBehind_) {
         backUpAll();
     }
 }
 
-bool UploadBatches::backUp(UploadBatchQueue& queue) {
-    queue.isBackedUp = false;
+bool UploadBatches::backUp(UploadBatch::Part& part) {
+    part.isDue = part.isBackedUp = false;
+    part.hasRow = true;  // also when it fails: it may be there from before
     try {
-        const UploadBatchEntity backup{queue.identifier, queue.session, queue.events};
+        const UploadBatchEntity backup{part.identifier, part.session, part.events};
         deferredStore_->perform([&](Rows& rows) { rows.insert(backup); });
-        queue.isBackedUp = true;
+        part.isBackedUp = true;
     } catch (...) {
         Log::shared().error("Failed to write queue to disk for backup uploads, identifier=%{public}@, error=%{public}@",
-                            queue.identifier, AnyError::current().what());
+                            part.identifier, AnyError::current().what());
     }
-    return queue.isBackedUp;
+    return part.isBackedUp;
+}
+
+bool UploadBatches::backUp(UploadBatch& batch) {
+    bool isWritten = true;
+    for (auto& part : batch.parts()) {
+        if (!backUp(part)) isWritten = false;
+    }
+    return isWritten;
 }
 
 void UploadBatches::backUpAll() {
@@ -170,7 +189,7 @@ void UploadBatches::handOver(const UploadBatchQueueKey& key, bool force) {
             currentSession_->identifier, key.description());
         return;
     }
-    if (found->second.events->count() < config_.batchSize() && !force) return;
+    if (found->second.count() < config_.batchSize() && !force) return;
     // A manager of the host's may submit events from inside its call: they go into a batch of their own.
     auto handedOver = batchQueues_.extract(found);
     try {
@@ -181,19 +200,24 @@ void UploadBatches::handOver(const UploadBatchQueueKey& key, bool force) {
     }
 }
 
-void UploadBatches::tryHandOver(UploadBatchQueue& queue) {
-    const auto removal = documents_.handOver({queue.identifier, currentSession_->sessionData, queue.events}, {});
+void UploadBatches::tryHandOver(UploadBatch& batch) {
+    DocumentHandOver::Contents contents{currentSession_->sessionData, {}, {}};
+    for (const auto& part : batch.parts()) {
+        contents.events.push_back(part.events);
+        if (part.hasRow) contents.rows.push_back(part.identifier);
+    }
+    const auto removal = documents_.handOver(contents, {});
     if (removal.error) {
         Log::shared().error("Failed to clean up request after submission, error=%{public}@", removal.error->what());
     }
-    if (removal.taken == UploadTaken::underWay) keep(queue, removal.document);
+    if (removal.taken == UploadTaken::underWay || removal.isKept) keep(batch, removal.document);
 }
 
-void UploadBatches::keep(UploadBatchQueue& queue, const std::string& document) {
-    if (queue.isBackedUp || backUp(queue)) return;
+void UploadBatches::keep(UploadBatch& batch, const std::string& document) {
+    if (batch.isBackedUp() || backUp(batch)) return;
     dropDelivered();
     if (!ledger_->follow(document)) return;
-    unsaved_.emplace(document, std::move(queue));
+    unsaved_.emplace(document, std::move(batch));
     backupsAreBehind_ = true;
 }
 
@@ -205,23 +229,9 @@ void UploadBatches::dropDelivered() {
 }
 
 void UploadBatches::putBack(Queues::node_type refused) {
-    const auto back = batchQueues_.insert(std::move(refused));
-    if (back.inserted) return;
-    UploadBatchQueue& successor = back.position->second;
-    UploadBatchQueue& queue = back.node.mapped();
-    queue.events->append(*successor.events);
-    std::swap(queue.identifier, successor.identifier);
-    std::swap(queue.events, successor.events);
-    if (!backUp(successor)) {
-        backupsAreBehind_ = true;
-        return;
-    }
-    try {
-        deferredStore_->perform([&](Rows& rows) { rows.deleteWhere("identifier", queue.identifier); });
-    } catch (...) {
-        Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
-                            queue.identifier, AnyError::current().what());
-    }
+    auto back = batchQueues_.insert(std::move(refused));
+    if (!back.inserted) back.position->second.prepend(std::move(back.node.mapped()));
+    writeAtEndOfRun();
 }
 
 void UploadBatches::didLeaveGroup(const Group& group) {
@@ -272,14 +282,14 @@ void UploadBatches::handOverTerminated() {
 
 void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
     Log::shared().default_("Attempting to resubmit terminated batch, identifier=%{public}@", batch.identifier);
-    // A batch of this run that could not be handed over at its session's end. Its row may be behind: then the batch
-    // itself goes out.
-    const std::size_t stored = batch.events->count();
-    const auto isThis = [&](const auto& one) { return one.second.identifier == batch.identifier; };
-    auto open = std::find_if(batchQueues_.begin(), batchQueues_.end(), isThis);
-    if (open != batchQueues_.end() && open->second.events->count() > stored) {
-        batch.session = open->second.session;
-        batch.events = open->second.events;
+    // A part of a batch of this run that could not be handed over at its session's end. Its row may be behind: then the
+    // part itself goes out.
+    const auto found = std::find_if(batchQueues_.begin(), batchQueues_.end(),
+                                    [&](auto& one) { return one.second.find(batch.identifier) != nullptr; });
+    UploadBatch::Part* const open = found == batchQueues_.end() ? nullptr : found->second.find(batch.identifier);
+    if (open && open->events->count() > batch.events->count()) {
+        batch.session = open->session;
+        batch.events = open->events;
     }
     // A row that has grown since it was read belongs to a processor that is at work, in this process or another: the
     // row is the only backup of the events that were added, and its owner will send and delete it.
@@ -289,7 +299,7 @@ void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
     };
     DocumentHandOver::Removal removal;
     try {
-        removal = documents_.handOver(batch, hasNotGrown);
+        removal = documents_.handOver({batch.session, {batch.events}, {batch.identifier}}, hasNotGrown);
         if (removal.error) {
             Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
                                 batch.identifier, removal.error->what());
@@ -299,10 +309,22 @@ void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
                             AnyError::current().what());
         return;
     }
-    open = std::find_if(batchQueues_.begin(), batchQueues_.end(), isThis);
-    if (open == batchQueues_.end()) return;
-    auto handedOver = batchQueues_.extract(open);
-    if (removal.taken == UploadTaken::underWay) keep(handedOver.mapped(), removal.document);
+    takeOut(batch.identifier, removal);
+}
+
+// The manager may be the host's, whose code may have changed the batches meanwhile.
+void UploadBatches::takeOut(const std::string& identifier, const DocumentHandOver::Removal& removal) {
+    for (auto queue = batchQueues_.begin(); queue != batchQueues_.end(); ++queue) {
+        UploadBatch::Part* const open = queue->second.find(identifier);
+        if (!open) continue;
+        auto& parts = queue->second.parts();
+        UploadBatch handedOver;
+        handedOver.parts().push_back(std::move(*open));
+        parts.erase(parts.begin() + (open - parts.data()));
+        if (parts.empty()) batchQueues_.erase(queue);
+        if (removal.taken == UploadTaken::underWay) keep(handedOver, removal.document);
+        return;
+    }
 }
 
 void UploadBatches::didUpdateSession(const Session& session, bool submitQueues) {

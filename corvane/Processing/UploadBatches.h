@@ -8,6 +8,7 @@
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Processing/DocumentHandOver.h>
 #include <corvane/Processing/TerminatedBatches.h>
+#include <corvane/Processing/UploadBatch.h>
 #include <corvane/Processing/UploadBatchEntity.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 #include <corvane/Processing/UploadBatchQueueKey.h>
@@ -27,8 +28,9 @@ namespace corvane {
 
 /// The open batches of an `UploadBatchEventProcessor`, which owns them: what it says of itself holds for them.
 ///
-/// A batch is open (in `batchQueues_`, with a row that holds all its events unless `backupsAreBehind_`), then handed
-/// over, and its row goes in the transaction that writes the document's row. Refused, it is open again. Where neither
+/// A batch is open (in `batchQueues_`, from the end of the run with rows that hold all its events unless
+/// `backupsAreBehind_`), then handed over, and its rows go in the transaction that writes the document's row; one that
+/// fills up within a run never had any. Refused, it is open again. Where neither
 /// row can be written while the document is under way, it stays in `unsaved_` until one can be, or until the document
 /// has got through. Rows of an earlier run are in `terminated_` until they are handed over in their turn. Internal.
 class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
@@ -57,14 +59,7 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
   private:
     using Rows = Store<UploadBatchEntity>;
 
-    /// An open batch. The identifier names its backup row.
-    struct UploadBatchQueue {
-        std::string identifier;
-        JSON session;  // the session's JSON form as of the last event
-        std::shared_ptr<EncodedEvents> events;
-        bool isBackedUp = false;  // the row holds all events
-    };
-    using Queues = std::map<UploadBatchQueueKey, UploadBatchQueue>;
+    using Queues = std::map<UploadBatchQueueKey, UploadBatch>;
 
     void assertOnQueue(const char* operation) const CORVANE_ASSERT_CAPABILITY(*accessQueue_);
     /// The queue that was registered, from any thread; nullptr before.
@@ -72,10 +67,15 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     void setSession(const Session& session) CORVANE_REQUIRES(*accessQueue_);
     [[nodiscard]] UploadBatchQueueKey keyOf(const ProcessEvent& processEvent) const CORVANE_REQUIRES(*accessQueue_);
 
-    /// Appends an event to its batch, which is made if need be, and writes the batch's row.
+    /// Appends an event to its batch, which is made if need be. Its row is written at the end of the run.
     void add(const UploadBatchQueueKey& key, const JSON& payload) CORVANE_REQUIRES(*accessQueue_);
-    /// Writes the batch's row. Returns whether it is written; if not, that has been logged.
-    bool backUp(UploadBatchQueue& queue);
+    /// Has the rows written whose batches have changed, once for a run.
+    void writeAtEndOfRun() CORVANE_REQUIRES(*accessQueue_);
+    void writeChanged() CORVANE_REQUIRES(*accessQueue_);
+    /// Writes a part's row. Returns whether it is written; if not, that has been logged.
+    bool backUp(UploadBatch::Part& part);
+    /// Writes the rows of all parts, and returns whether all are written.
+    bool backUp(UploadBatch& batch);
     /// Writes the rows of all batches, after one could not be written.
     void backUpAll() CORVANE_REQUIRES(*accessQueue_);
     /// Lets go of unsaved batches whose documents need no second attempt.
@@ -85,9 +85,9 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     void handOver(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
     /// Hands a batch over that is in no list any more, with the session's data as it is now.
     /// Throws what the manager throws; the batch is then as it was.
-    void tryHandOver(UploadBatchQueue& queue) CORVANE_REQUIRES(*accessQueue_);
+    void tryHandOver(UploadBatch& batch) CORVANE_REQUIRES(*accessQueue_);
     /// Sees to it that a batch whose document is under way without a row of its own stays in its backup.
-    void keep(UploadBatchQueue& queue, const std::string& document) CORVANE_REQUIRES(*accessQueue_);
+    void keep(UploadBatch& batch, const std::string& document) CORVANE_REQUIRES(*accessQueue_);
     /// Puts a batch back that was refused, before what was added to its successor meanwhile.
     void putBack(Queues::node_type refused) CORVANE_REQUIRES(*accessQueue_);
 
@@ -95,6 +95,9 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     void handOverTerminated() CORVANE_REQUIRES(*accessQueue_);
     /// Sends one as its row holds it, or as it is open here if that has more.
     void handOverTerminated(UploadBatchEntity batch) CORVANE_REQUIRES(*accessQueue_);
+    /// Takes a part that was handed over by its row out of its open batch, if it is in one.
+    void takeOut(const std::string& identifier, const DocumentHandOver::Removal& removal)
+        CORVANE_REQUIRES(*accessQueue_);
 
     // Constant after construction.
     const std::shared_ptr<DeliveryLedger> ledger_;
@@ -111,11 +114,12 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     DocumentHandOver documents_ CORVANE_GUARDED_BY(*accessQueue_);
     Queues batchQueues_ CORVANE_GUARDED_BY(*accessQueue_);
     // By document.
-    std::map<std::string, UploadBatchQueue> unsaved_ CORVANE_GUARDED_BY(*accessQueue_);
+    std::map<std::string, UploadBatch> unsaved_ CORVANE_GUARDED_BY(*accessQueue_);
     TerminatedBatches terminated_ CORVANE_GUARDED_BY(*accessQueue_);
     std::optional<Session> currentSession_ CORVANE_GUARDED_BY(*accessQueue_);
     // A row could not be written; once one can, all are.
     bool backupsAreBehind_ CORVANE_GUARDED_BY(*accessQueue_) = false;
+    bool writesAtEndOfRun_ CORVANE_GUARDED_BY(*accessQueue_) = false;
 };
 
 }  // namespace corvane

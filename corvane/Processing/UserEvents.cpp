@@ -3,6 +3,8 @@
 #include <corvane/Models/Encoder.h>
 #include <corvane/Models/OwnJSON.h>
 
+#include <utility>
+
 namespace corvane {
 
 UserEvents::~UserEvents() = default;
@@ -10,7 +12,9 @@ UserEvents::~UserEvents() = default;
 JSON UserEvents::jsonObject() const {
     // Session and events were checked when they were encoded, so their texts are joined as they are.
     std::string text;
-    text.reserve(events_->text().size() + session_.text().size() + 160);
+    std::size_t size = session_.text().size() + 160;
+    for (const auto& part : events_) size += part->text().size() + 1;
+    text.reserve(size);
     text += R"({"metadata":{"version":")";
     text += formatVersion;
     text += R"(","identifier":)";
@@ -18,7 +22,10 @@ JSON UserEvents::jsonObject() const {
     text += R"(},"data":{"session":)";
     text += session_.text();
     text += R"(,"events":[)";
-    text += events_->text();
+    const char* between = "";
+    for (const auto& part : events_) {
+        text.append(std::exchange(between, ",")).append(part->text());
+    }
     text += "]}}";
     return OwnJSON::of(std::move(text));
 }

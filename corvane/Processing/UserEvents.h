@@ -7,6 +7,7 @@
 #include <string>
 #include <string_view>
 #include <utility>
+#include <vector>
 
 namespace corvane {
 
@@ -16,9 +17,12 @@ class UserEvents final : public ResourceType {
     static constexpr std::string_view mediaType = "application/vnd.veskar.corvane.user_events+json";
     static constexpr std::string_view formatVersion = "0.1.0";
 
+    using Events = std::vector<std::shared_ptr<const EncodedEvents>>;
+
     /// @param session the session's JSON form, an object
+    /// @param events in their order; none of the parts is empty
     /// @param identifier a new UUID: the document's, not its batch's
-    UserEvents(JSON session, std::shared_ptr<const EncodedEvents> events, std::string identifier)
+    UserEvents(JSON session, Events events, std::string identifier)
         : session_(std::move(session)), events_(std::move(events)), identifier_(std::move(identifier)) {}
     UserEvents(const UserEvents&) = default;
     ~UserEvents() override;
@@ -31,7 +35,7 @@ class UserEvents final : public ResourceType {
 
   private:
     const JSON session_;
-    const std::shared_ptr<const EncodedEvents> events_;
+    const Events events_;
     const std::string identifier_;
 };
 

@@ -5,7 +5,7 @@
 namespace corvane {
 
 void AccessTracker::submit(const EventSubmit& event, Date submitTime, const SubmitOptions& options) const {
-    if (const auto tracker = tracker_.lock()) tracker->performSubmit(event, submitTime, options);
+    if (const auto tracker = tracker_.lock()) tracker->submitNow(event, submitTime, options);
 }
 
 void AccessTracker::time(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession) const {

@@ -86,8 +86,15 @@ std::vector<std::string> Tracker::path() const {
 }
 
 void Tracker::submit(EventSubmit event, Date submitTime, SubmitOptions options) {
-    accessQueue_->async([self = shared_from_this(), event = std::move(event), submitTime,
-                         options = std::move(options)] { self->performSubmit(event, submitTime, options); });
+    accessQueue_->asyncInRun(
+        [self = shared_from_this(), event = std::move(event), submitTime, options = std::move(options)]() mutable {
+            auto result = self->performSubmit(event, submitTime, options.onlyIfTimed);
+            if (!result || !options.completion) return;
+            self->accessQueue_->atEndOfRun(SerialQueue::RunEnd::report,
+                                           [completion = std::move(options.completion), result = *std::move(result)] {
+                                               callHost("submit completion", [&] { completion(result); });
+                                           });
+        });
 }
 
 std::shared_ptr<DelayedToken> Tracker::delayedSubmit(EventSubmit event, SubmitOptions options) {
@@ -117,22 +124,24 @@ std::shared_ptr<const SnapshotType> Tracker::snapshot(SnapshotPolicy policy) {
 }
 
 void Tracker::time(EventSubmit event, Date startTime, bool submitAndRestartWithSession) {
-    accessQueue_->async([self = shared_from_this(), event = std::move(event), startTime, submitAndRestartWithSession] {
-        self->performTime(event, startTime, submitAndRestartWithSession);
-    });
+    accessQueue_->asyncInRun(
+        [self = shared_from_this(), event = std::move(event), startTime, submitAndRestartWithSession] {
+            self->performTime(event, startTime, submitAndRestartWithSession);
+        });
 }
 
 void Tracker::push(AnyDataEventEntry entry) {
-    accessQueue_->async(
+    accessQueue_->asyncInRun(
         [self = shared_from_this(), entry = std::move(entry)]() mutable { self->performPush(std::move(entry)); });
 }
 
 void Tracker::pop(std::string_view key, DataType type) {
-    accessQueue_->async([self = shared_from_this(), key = std::string(key), type] { self->performPop(key, type); });
+    accessQueue_->asyncInRun(
+        [self = shared_from_this(), key = std::string(key), type] { self->performPop(key, type); });
 }
 
 void Tracker::enterGroup(std::string groupName) {
-    accessQueue_->async([self = shared_from_this(), group = Group{std::move(groupName), now()}]() mutable {
+    accessQueue_->asyncInRun([self = shared_from_this(), group = Group{std::move(groupName), now()}]() mutable {
         self->performEnterGroup(std::move(group));
     });
 }
@@ -160,12 +169,21 @@ void Tracker::resume() {
     if (const auto delegate = delegate_.lock()) delegate->resume();
 }
 
-void Tracker::performSubmit(const EventSubmit& event, Date submitTime, const SubmitOptions& options) {
+std::optional<EventSubmitResult> Tracker::performSubmit(const EventSubmit& event, Date submitTime, bool onlyIfTimed) {
     accessQueue_->assertCurrent("Tracker submission");
     const auto delegate = delegate_.lock();
-    if (delegate && delegate->activeSession() && options.onlyIfTimed && !scope_->timers.contains(event.name())) return;
-    const EventSubmitResult result = process(event, submitTime, delegate.get());
-    if (options.completion) callHost("submit completion", [&] { options.completion(result); });
+    if (delegate && delegate->activeSession() && onlyIfTimed && !scope_->timers.contains(event.name())) {
+        return std::nullopt;
+    }
+    return process(event, submitTime, delegate.get());
+}
+
+void Tracker::submitNow(const EventSubmit& event, Date submitTime, const SubmitOptions& options) {
+    accessQueue_->assertCurrent("Tracker submission");
+    accessQueue_->endRun();  // what was submitted before is told before
+    const auto result = performSubmit(event, submitTime, options.onlyIfTimed);
+    accessQueue_->endRun();
+    if (result && options.completion) callHost("submit completion", [&] { options.completion(*result); });
 }
 
 EventSubmitResult Tracker::process(const EventSubmit& event, Date submitTime, TrackerDelegate* delegate) {
@@ -349,7 +367,7 @@ void Tracker::react(SessionChange change) {
         if (change == SessionChange::didStart) {
             performTime(event, now(), true);
         } else {
-            performSubmit(event, now(), {.onlyIfTimed = true});
+            static_cast<void>(performSubmit(event, now(), true));
             scope_->restartTimers.insert_or_assign(name, event);
         }
     }

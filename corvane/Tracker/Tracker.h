@@ -62,7 +62,9 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     /// The names from the root down to this tracker. Runs on the caller's thread.
     [[nodiscard]] std::vector<std::string> path() const;
 
-    /// Submits an event. The completion, if any, is called once on the queue.
+    /// Submits an event. The completion, if any, is called once on the queue, in the order of the submissions and
+    /// before anything else that is enqueued after them; submissions that are at hand together share their writes, and
+    /// their completions run behind these.
     template <class E>
     CORVANE_LOCAL void submit(EventSubmitCompletion completion = {}) {
         submit(EventSubmit::actual<E>(), now(), {.completion = std::move(completion)});
@@ -161,7 +163,11 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     static void release(Tracker* tracker) noexcept;
 
     // On the queue.
-    void performSubmit(const EventSubmit& event, Date submitTime, const SubmitOptions& options);
+    /// Resolves, validates and hands on. Nothing, where `onlyIfTimed` asks for a timer that does not run.
+    [[nodiscard]] std::optional<EventSubmitResult> performSubmit(const EventSubmit& event, Date submitTime,
+                                                                 bool onlyIfTimed);
+    /// The whole submission in one piece, with its writes and its completion.
+    void submitNow(const EventSubmit& event, Date submitTime, const SubmitOptions& options);
     void performTime(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession);
     void performPush(AnyDataEventEntry entry);
     void performPop(std::string_view key, DataType type);

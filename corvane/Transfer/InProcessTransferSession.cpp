@@ -99,8 +99,8 @@ HTTPTransfer InProcessTransferSession::UploadTask::transfer(const Core& core) {
         auto task = self.lock();
         auto owner = weakCore.lock();
         if (!task || !owner) return;
-        const auto queue = owner->reporter->queue();  // the session may be gone before the call is back
-        queue->async([task = std::move(task), owner = std::move(owner), outcome = std::move(outcome)] {
+        const auto reporter = owner->reporter;  // the session may be gone before the call is back
+        reporter->enqueue([task = std::move(task), owner = std::move(owner), outcome = std::move(outcome)] {
             task->ended(*owner, outcome);
         });
     };

@@ -49,9 +49,14 @@ bool SessionReporter::reportEnd(SessionTask& task, Ending ending, const Transfer
     return true;
 }
 
+void SessionReporter::enqueue(Task report) {
+    const auto queue = queue_;  // what is enqueued may hold the last reference to this object
+    queue->asyncAhead(std::move(report));
+}
+
 void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected) {
     if (!task->note(total, expected)) return;
-    queue_->async([self = shared_from_this(), task = std::move(task)] {
+    enqueue([self = shared_from_this(), task = std::move(task)] {
         const auto progress = task->takeProgress();
         const auto told = self->delegate();
         if (told && progress.step > 0) {
@@ -61,11 +66,11 @@ void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int
 }
 
 void SessionReporter::answer(TransferSession::Listing listing, List list) {
-    queue_->async([listing = std::move(listing), list = std::move(list)] { listing(list()); });
+    enqueue([listing = std::move(listing), list = std::move(list)] { listing(list()); });
 }
 
 void SessionReporter::signalDelivered() {
-    queue_->async([self = shared_from_this()] {
+    enqueue([self = shared_from_this()] {
         if (const auto told = self->delegate()) told->allEventsDelivered();
     });
 }

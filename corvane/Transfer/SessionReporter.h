@@ -36,6 +36,10 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     /// The delegate, unless it or the session has gone.
     [[nodiscard]] std::shared_ptr<TransferSessionDelegate> delegate() const;
 
+    /// Enqueues what tells the delegate something, ahead of work that waits on the queue and behind other reports: a
+    /// backlog of events must not keep documents on disk that are delivered.
+    void enqueue(Task report);
+
     /// Tells of a task's end, once, and completes the task when the callback has come back, whatever it throws: until
     /// then the task counts as running. On the queue. Returns whether the delegate was told; a task of which nobody was
     /// told is not completed.

@@ -46,6 +46,113 @@ TEST(SerialQueue, SyncReturnsResultsAndRethrowsOnBothPaths) {
     EXPECT_THROW(queue.sync([]() -> int { throw std::runtime_error("x"); }), std::runtime_error);
 }
 
+/// Notes what a queue does, in order.
+class Notes {
+  public:
+    /// Enqueues a task of a run that leaves a write and a report to its end.
+    void inRun(const std::string& name) {
+        queue.asyncInRun([this, name] {
+            text += name;
+            queue.atEndOfRun(SerialQueue::RunEnd::report, [this, name] { text += "!" + name; });
+            queue.atEndOfRun(SerialQueue::RunEnd::write, [this, name] { text += "=" + name; });
+        });
+    }
+    [[nodiscard]] Task note(const std::string& name) {
+        return [this, name] { text += name; };
+    }
+    void drain() {
+        queue.sync([] {});
+    }
+
+    SerialQueue queue{"test"};
+    std::string text;
+};
+
+TEST(SerialQueue, ARunEndsOnceBeforeAnythingElseAndItsReportsFollowItsWrites) {
+    Notes notes;
+    notes.queue.suspend();
+    notes.inRun("a");
+    notes.inRun("b");
+    notes.queue.async(notes.note("x"));
+    notes.inRun("c");
+    notes.queue.resume();
+    notes.drain();
+    EXPECT_EQ(notes.text, "ab=a=b!a!bxc=c!c");
+}
+
+TEST(SerialQueue, ARunEndsBeforeASuspensionAndWithASyncThatThrows) {
+    Notes notes;
+    std::promise<void> suspended;
+    notes.queue.suspend();
+    notes.inRun("a");
+    notes.queue.asyncInRun([&] {
+        notes.queue.suspend();
+        notes.queue.atEndOfRun(SerialQueue::RunEnd::report, [&] { suspended.set_value(); });
+    });
+    notes.inRun("b");
+    notes.queue.resume();
+    suspended.get_future().wait();
+    EXPECT_EQ(notes.text, "a=a!a");
+    notes.queue.resume();
+    notes.drain();
+    EXPECT_EQ(notes.text, "a=a!ab=b!b");
+
+    notes.text.clear();
+    const auto leave = [&] {
+        notes.queue.atEndOfRun(SerialQueue::RunEnd::report, notes.note("r"));
+        throw std::runtime_error("x");
+    };
+    EXPECT_THROW(notes.queue.sync(leave), std::runtime_error);
+    EXPECT_EQ(notes.text, "r");
+}
+
+TEST(SerialQueue, ALongRunEndsOnTheWayAndAReportRunsNoOtherInsideOfIt) {
+    Notes notes;
+    int waiting = 0, most = 0;
+    notes.queue.suspend();
+    for (int i = 0; i < 2000; ++i) {
+        notes.queue.asyncInRun([&] {
+            most = std::max(most, ++waiting);
+            notes.queue.atEndOfRun(SerialQueue::RunEnd::report, [&] { --waiting; });
+        });
+    }
+    notes.queue.resume();
+    notes.drain();
+    EXPECT_LE(most, 512);
+
+    notes.queue.sync([&] {
+        notes.queue.atEndOfRun(SerialQueue::RunEnd::report, [&] {
+            notes.text += "(";
+            notes.queue.atEndOfRun(SerialQueue::RunEnd::write, notes.note("w"));
+            notes.queue.endRun();
+            notes.text += ")";
+        });
+        notes.queue.atEndOfRun(SerialQueue::RunEnd::report, notes.note("r"));
+    });
+    EXPECT_EQ(notes.text, "(w)r");
+}
+
+TEST(SerialQueue, TasksAheadOvertakeOthersKeepTheirOrderAndObeySuspensions) {
+    Notes notes;
+    std::promise<void> suspended;
+    notes.queue.suspend();
+    notes.queue.async(notes.note("a"));
+    notes.inRun("b");
+    notes.inRun("c");
+    notes.queue.asyncAhead(notes.note("1"));
+    notes.queue.asyncAhead([&] {
+        notes.text += "2";
+        notes.queue.asyncAhead(notes.note("3"));
+        notes.queue.suspend();
+        suspended.set_value();
+    });
+    notes.queue.resume();
+    suspended.get_future().wait();
+    notes.queue.resume();
+    notes.drain();
+    EXPECT_EQ(notes.text, "123abc=b=c!b!c");
+}
+
 TEST(SerialQueue, SyncIsOnItsQueueAndStillOnTheOuterOne) {
     SerialQueue outer("outer"), inner("inner");
     const auto check = [&] {

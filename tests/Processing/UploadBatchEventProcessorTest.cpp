@@ -201,7 +201,7 @@ TEST_F(UploadBatch, ADocumentThatIsUnderWayWithoutARowStaysInItsBackup) {
     manager->ledger = nullptr;
     submit(6);
     EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{3, 3, 3}));
-    EXPECT_EQ(log.count("Failed to write queue to disk for backup uploads, identifier="), 8);
+    EXPECT_EQ(log.count("Failed to write queue to disk for backup uploads, identifier="), 4);
     ledger->settle(*manager->documents[1]["metadata"]["identifier"].string(), DeliveryLedger::Outcome::delivered);
     ledger->settle(*manager->documents[2]["metadata"]["identifier"].string(), DeliveryLedger::Outcome::pending);
     EXPECT_EQ(log.count("Failed to clean up"), 0) << "what was not written is not deleted";
@@ -214,6 +214,51 @@ TEST_F(UploadBatch, ADocumentThatIsUnderWayWithoutARowStaysInItsBackup) {
     drain();
     EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{3, 1}));
     EXPECT_TRUE(rows().empty());
+}
+
+TEST_F(UploadBatch, ABurstSharesItsWritesAndALargeBatchHasRowsOfItsOwnSize) {
+    launch(1000);
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    StoreConnection counting(StoreLocation::default_("main"));
+    counting.run(
+        "CREATE TABLE writes (n); CREATE TRIGGER counts AFTER INSERT ON upload_batches "
+        "BEGIN INSERT INTO writes VALUES (1); END;");
+    int acknowledged = 0;
+    std::vector<std::size_t> onDisk;
+    root->suspend();
+    for (int i = 0; i < 200; ++i) {
+        root->submit<Mark>([&](const EventSubmitResult& result) {
+            acknowledged += result.succeeded();
+            if (acknowledged == 1) {
+                for (const auto& row : rows()) onDisk.push_back(row.events->count());
+            }
+        });
+    }
+    root->resume();
+    drain();
+    EXPECT_EQ(acknowledged, 200);
+    std::sort(onDisk.begin(), onDisk.end());
+    EXPECT_EQ(onDisk, (std::vector<std::size_t>{8, 64, 64, 64})) << "all are there before the first is acknowledged";
+    std::int64_t writes = 0;
+    counting.query("SELECT count(*) FROM writes;", [&](StoreStepper& row) { writes = row.integer(); });
+    EXPECT_LE(writes, 8) << "not one for each event";
+    sessions->endSync();
+    EXPECT_EQ(manager->sizes(), std::vector<std::size_t>{200});
+    EXPECT_TRUE(rows().empty());
+
+    // A batch that fills up before anybody could tell never has a row.
+    launch(10);
+    sessions->start(Session::Kind::userEvents());
+    drain();
+    counting.run("DELETE FROM writes;");
+    root->suspend();
+    for (int i = 0; i < 25; ++i) root->submit<Mark>();
+    root->resume();
+    drain();
+    counting.query("SELECT count(*) FROM writes;", [&](StoreStepper& row) { writes = row.integer(); });
+    EXPECT_EQ(manager->sizes(), (std::vector<std::size_t>{10, 10}));
+    EXPECT_LE(writes, 1);
 }
 
 TEST_F(UploadBatch, WhatIsOpenGoesOutInPlaceOfABackupThatIsBehind) {

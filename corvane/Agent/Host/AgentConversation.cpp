@@ -246,7 +246,7 @@ void AgentConversation::take(const agent::Completed& reply) {
 // Without memory for the report it is as if the agent had said nothing; it does so again on the next connection. One
 // that nobody was told of stays for the next session.
 void AgentConversation::reportCompletion(std::shared_ptr<Task> task, TransferOutcome outcome) {
-    reporter_->queue()->async([self = shared_from_this(), task, outcome = std::move(outcome)] {
+    reporter_->enqueue([self = shared_from_this(), task, outcome = std::move(outcome)] {
         if (!self->reporter_->reportEnd(*task, &TransferSessionDelegate::taskDidComplete, outcome)) return;
         self->post([token = task->token()](AgentConversation& on)
                        CORVANE_REQUIRES(agentThread) { on.acknowledge(token); });
@@ -274,7 +274,7 @@ void AgentConversation::take(const agent::Elsewhere& reply) {
 }
 
 void AgentConversation::reportEndElsewhere(std::shared_ptr<Task> task, TransferOutcome outcome) {
-    reporter_->queue()->async([self = shared_from_this(), task, outcome = std::move(outcome)] {
+    reporter_->enqueue([self = shared_from_this(), task, outcome = std::move(outcome)] {
         self->reporter_->reportEnd(*task, &TransferSessionDelegate::taskDidEndElsewhere, outcome);
         self->post([token = task->token()](AgentConversation& on) CORVANE_REQUIRES(agentThread) {
             on.tasks_->remove(token);

@@ -13,7 +13,7 @@ void InsideTransfers::takeOver(const std::shared_ptr<BackgroundTransferTask>& ta
     try {
         start(*task);
     } catch (...) {
-        reporter_->queue()->async([self = shared_from_this(), task, error = AnyError::current()] {
+        reporter_->enqueue([self = shared_from_this(), task, error = AnyError::current()] {
             self->end(*task, {error, std::nullopt});
         });
     }

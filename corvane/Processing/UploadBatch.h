@@ -1,0 +1,48 @@
+#pragma once
+
+#include <corvane/Models/JSON.h>
+#include <corvane/Processing/EncodedEvents.h>
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace corvane {
+
+/// An open batch: the events that become one document, in the parts that are its rows. A row takes so many events that
+/// rewriting it costs about the same for each of them, however large the batch grows; a further part is a row of its
+/// own, and a valid batch by itself. Not thread-safe. Internal.
+class UploadBatch {
+  public:
+    static constexpr std::size_t eventsOfPart = 64;
+    static constexpr std::size_t bytesOfPart = std::size_t{64} * 1024;
+
+    struct Part {
+        std::string identifier;  // the row's
+        JSON session;            // the session's JSON form as of the last event
+        std::shared_ptr<EncodedEvents> events;
+        bool isDue = true;        // to be written at the end of the run
+        bool isBackedUp = false;  // the row holds all events
+        bool hasRow = false;      // there may be a row
+    };
+
+    /// Adds an event to the last part, or to a new one when that is full.
+    void append(const JSON& payload, const JSON& session);
+    /// Puts a batch in front of this one whose events came before; in one part, if they fit and this one has no row
+    /// yet.
+    void prepend(UploadBatch earlier);
+
+    [[nodiscard]] std::size_t count() const;
+    [[nodiscard]] bool isBackedUp() const;
+    /// Never empty, once an event was added.
+    [[nodiscard]] std::vector<Part>& parts() { return parts_; }
+    [[nodiscard]] const std::vector<Part>& parts() const { return parts_; }
+    /// The part of that identifier, or nullptr.
+    [[nodiscard]] Part* find(const std::string& identifier);
+
+  private:
+    std::vector<Part> parts_;
+};
+
+}  // namespace corvane
