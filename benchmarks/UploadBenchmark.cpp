@@ -65,7 +65,7 @@ Figures throughManager(const std::string& url) {
     auto figures = perDocument([&] {
         for (int i = 0; i < documents; ++i) {
             queue->sync([&] {
-                const auto document = std::make_shared<UserEvents>(session, events, "document " + std::to_string(i));
+                const auto document = std::make_shared<UserEvents>(session, UserEvents::Events{events}, "document " + std::to_string(i));
                 ledger->add(document->identifier(), eventsEach);
                 manager->upload(UploadRequest{client, document});
             });
@@ -85,7 +85,7 @@ Figures bareUploads(const std::string& url, bool survives) {
     const auto payload = directory / "payload", partial = directory / "partial";
     BareUpload bare;
     const std::string text =
-        UserEvents(JSON(R"({"sessionID":"7E7C6B0E"})"), makeEvents(), "document").jsonObject().text();
+        UserEvents(JSON(R"({"sessionID":"7E7C6B0E"})"), {makeEvents()}, "document").jsonObject().text();
     return perDocument([&] {
         for (int i = 0; i < documents; ++i) {
             const std::string body = BareUpload::gzip(text);

@@ -275,7 +275,7 @@ void SerialQueue::endRun() {
     state_->endRun();
 }
 
-void SerialQueue::enqueue(Task task, bool isAhead) {
+void SerialQueue::enqueue(Task&& task, bool isAhead) {
     State& state = *state_;
     if (state.born.isInChild()) return abandon(std::move(task));
     bool wake = false;

@@ -113,7 +113,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
         void (*call)(void*);
     };
 
-    void enqueue(Task task, bool isAhead);
+    void enqueue(Task&& task, bool isAhead);
     void runSync(FunctionRef function);
 
     const std::shared_ptr<State> state_;
