@@ -9,6 +9,8 @@ ActiveSession::ActiveSession(std::string identifier, Session::Kind kind, Date st
 ActiveSession::~ActiveSession() = default;
 
 void ActiveSession::append(const ProcessEvent& event) {
+    ++eventCount_;
+    if (events_.size() == keptEvents) events_.pop_front();
     events_.emplace_back(event.name(), event.json().compacted(), event.groupName());
 }
 

@@ -4,13 +4,15 @@
 #include <corvane/Models/Session.h>
 #include <corvane/Tracker/ActiveSessionType.h>
 
+#include <cstddef>
+#include <cstdint>
 #include <deque>
 #include <string>
 
 namespace corvane {
 
-/// The session that runs, with every event handed over while it was active. Made by the session manager only, and used
-/// on its queue.
+/// The session that runs, with the latest events handed over while it was active. Made by the session manager only, and
+/// used on its queue.
 class ActiveSession final : public ActiveSessionType {
   public:
     ActiveSession(std::string identifier, Session::Kind kind, Date startDate);
@@ -21,10 +23,15 @@ class ActiveSession final : public ActiveSessionType {
     [[nodiscard]] const std::string& identifier() const override { return identifier_; }
     [[nodiscard]] const Session::Kind& kind() const override { return kind_; }
     [[nodiscard]] Date startDate() const override { return startDate_; }
-    /// In hand-over order.
-    [[nodiscard]] const std::deque<ProcessEvent>& events() const { return events_; }
+    /// How many events are kept: a session may run for weeks.
+    static constexpr std::size_t keptEvents = 10'000;
 
-    /// Keeps an event in its compact form: a session may run for weeks.
+    /// The latest ones, in hand-over order.
+    [[nodiscard]] const std::deque<ProcessEvent>& events() const { return events_; }
+    /// How many there were, those included that are not kept any more.
+    [[nodiscard]] std::uint64_t eventCount() const { return eventCount_; }
+
+    /// Keeps an event in its compact form, in place of the oldest one when there are too many.
     void append(const ProcessEvent& event);
 
   private:
@@ -32,6 +39,7 @@ class ActiveSession final : public ActiveSessionType {
     const Session::Kind kind_;
     const Date startDate_;
     std::deque<ProcessEvent> events_;
+    std::uint64_t eventCount_ = 0;
 };
 
 }  // namespace corvane

@@ -51,24 +51,30 @@ std::string newKeyPEM() {
         [&](BIO* out) { return PEM_write_bio_PKCS8PrivateKey(out, key.get(), nullptr, nullptr, 0, nullptr, nullptr); });
 }
 
+// The service may go while the process exits, or after it: OpenSSL has let go of its keys then.
+void freeKey(EVP_PKEY* key) noexcept {
+    try {
+        const OpenSSLUse use;
+        EVP_PKEY_free(key);
+    } catch (const SigningError&) {
+    }
+}
+
 struct KeyParts {
-    std::string raw;
+    std::shared_ptr<EVP_PKEY> key;
     std::string publicPEM;
 };
 
 KeyParts parse(const std::string& pem, const std::filesystem::path& file) {
     const OpenSSLUse use;
     const Buffer buffer(BIO_new_mem_buf(pem.data(), static_cast<int>(pem.size())));
-    const Key key(PEM_read_bio_PrivateKey(buffer.get(), nullptr, noPassword, nullptr));
-    KeyParts parts{std::string(32, '\0'), {}};
-    std::size_t length = parts.raw.size();
-    if (!key || EVP_PKEY_get_id(key.get()) != EVP_PKEY_ED25519 ||
-        EVP_PKEY_get_raw_private_key(key.get(), reinterpret_cast<unsigned char*>(parts.raw.data()), &length) != 1) {
+    Key key(PEM_read_bio_PrivateKey(buffer.get(), nullptr, noPassword, nullptr));
+    if (!key || EVP_PKEY_get_id(key.get()) != EVP_PKEY_ED25519) {
         throw SigningError(SigningError::badKey,
                            file.string() + " does not hold an Ed25519 key in PEM without password");
     }
-    parts.publicPEM = written([&](BIO* out) { return PEM_write_bio_PUBKEY(out, key.get()); });
-    return parts;
+    auto publicPEM = written([&](BIO* out) { return PEM_write_bio_PUBKEY(out, key.get()); });
+    return {{key.release(), &freeKey}, std::move(publicPEM)};
 }
 
 /// The key serves without its public part, so a failure here is told and no more.
@@ -88,9 +94,9 @@ FileSigningService::FileSigningService(std::optional<std::filesystem::path> dire
     : directory_(std::move(directory)) {}
 FileSigningService::~FileSigningService() = default;
 
-std::string FileSigningService::rawKey() {
+FileSigningService::Key FileSigningService::key() {
     const Lock lock(mutex_);
-    if (!rawKey_.empty()) return rawKey_;
+    if (key_) return key_;
     if (directory_) createPrivateDirectories(*directory_);
     const auto directory = directory_ ? *directory_ : DocumentsDirectory::create();
     const auto file = directory / keyFileName;
@@ -98,18 +104,16 @@ std::string FileSigningService::rawKey() {
     if (!std::filesystem::exists(file, ignored)) createPrivateFile(file, newKeyPEM());
     auto parts = parse(readWholeFile(file), file);
     ensureFile(directory / publicKeyFileName, parts.publicPEM);
-    return rawKey_ = std::move(parts.raw);
+    return key_ = std::move(parts.key);
 }
 
 std::string FileSigningService::sign(std::string_view digest) {
-    const std::string raw = rawKey();
+    const Key key = this->key();
     const OpenSSLUse use;
-    const Key key(EVP_PKEY_new_raw_private_key(EVP_PKEY_ED25519, nullptr,
-                                               reinterpret_cast<const unsigned char*>(raw.data()), raw.size()));
     const Context context(EVP_MD_CTX_new());
     std::string signature(64, '\0');
     std::size_t length = signature.size();
-    if (!key || !context || EVP_DigestSignInit(context.get(), nullptr, nullptr, nullptr, key.get()) != 1 ||
+    if (!context || EVP_DigestSignInit(context.get(), nullptr, nullptr, nullptr, key.get()) != 1 ||
         EVP_DigestSign(context.get(), reinterpret_cast<unsigned char*>(signature.data()), &length,
                        reinterpret_cast<const unsigned char*>(digest.data()), digest.size()) != 1) {
         throw SigningError(SigningError::failed, "the signature cannot be computed");

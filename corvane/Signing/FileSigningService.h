@@ -4,9 +4,12 @@
 #include <corvane/Signing/SigningServiceType.h>
 
 #include <filesystem>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
+
+struct evp_pkey_st;
 
 namespace corvane {
 
@@ -30,11 +33,14 @@ class FileSigningService final : public SigningServiceType {
     [[nodiscard]] std::string sign(std::string_view digest) override;
 
   private:
-    [[nodiscard]] std::string rawKey() CORVANE_EXCLUDES(mutex_);
+    using Key = std::shared_ptr<evp_pkey_st>;
+
+    /// The key, read or made with the first use.
+    [[nodiscard]] Key key() CORVANE_EXCLUDES(mutex_);
 
     Mutex mutex_;
     std::optional<std::filesystem::path> directory_ CORVANE_GUARDED_BY(mutex_);
-    std::string rawKey_ CORVANE_GUARDED_BY(mutex_);  // 32 bytes, or empty until the first use
+    Key key_ CORVANE_GUARDED_BY(mutex_);  // nothing until the first use
 };
 
 }  // namespace corvane

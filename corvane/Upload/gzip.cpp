@@ -1,9 +1,12 @@
 #include <corvane/Upload/gzip.h>
 
+#include <corvane/Platform/Mutex.h>
+
 #include <zlib.h>
 
 #include <limits>
 #include <memory>
+#include <utility>
 
 namespace corvane {
 
@@ -13,12 +16,30 @@ constexpr std::size_t outputStep = 16384;
 constexpr int gzipWindowBits = 15 + 16;  // the largest window, in the gzip wrapper
 constexpr int memoryLevel = 9;
 
-struct EndDeflate {
-    void operator()(z_stream* stream) const noexcept { deflateEnd(stream); }
+/// A compression that is set up.
+class Deflater {
+  public:
+    Deflater() {
+        const int status = deflateInit2_(&stream_, Z_BEST_COMPRESSION, Z_DEFLATED, gzipWindowBits, memoryLevel,
+                                         Z_DEFAULT_STRATEGY, "1.2.11", static_cast<int>(sizeof stream_));
+        if (status != Z_OK) throw GZIPError(GZIPError::failed, status);
+    }
+    Deflater(const Deflater&) = delete;
+    Deflater& operator=(const Deflater&) = delete;
+    ~Deflater() { deflateEnd(&stream_); }
+
+    [[nodiscard]] std::string compress(std::string_view bytes);
+    /// Makes it ready for the next input; false when it cannot be used any more.
+    [[nodiscard]] bool reset() noexcept { return deflateReset(&stream_) == Z_OK; }
+
+  private:
+    z_stream stream_{};
 };
 
-/// Compresses the whole input of `stream`, which has been set up.
-std::string deflated(z_stream& stream) {
+std::string Deflater::compress(std::string_view bytes) {
+    z_stream& stream = stream_;
+    stream.next_in = reinterpret_cast<Bytef*>(const_cast<char*>(bytes.data()));
+    stream.avail_in = static_cast<uInt>(bytes.size());
     std::string output;
     int status = Z_OK;
     do {
@@ -33,6 +54,29 @@ std::string deflated(z_stream& stream) {
     return output;
 }
 
+/// The one that the next document uses: making its state, a quarter of a megabyte, takes as long as compressing a
+/// batch.
+class Spare {
+  public:
+    [[nodiscard]] std::unique_ptr<Deflater> take() {
+        const Lock lock(mutex_);
+        return std::move(deflater_);
+    }
+    void give(std::unique_ptr<Deflater> deflater) {
+        const Lock lock(mutex_);
+        deflater_.swap(deflater);
+    }
+
+  private:
+    Mutex mutex_;
+    std::unique_ptr<Deflater> deflater_ CORVANE_GUARDED_BY(mutex_);
+};
+
+Spare& spare() {
+    static auto& instance = *new Spare;  // never destroyed: documents may be made while the process exits
+    return instance;
+}
+
 }  // namespace
 
 GZIPError::GZIPError(Code code, std::int32_t status)
@@ -42,14 +86,11 @@ GZIPError::~GZIPError() = default;
 std::string gzipCompressed(std::string_view bytes) {
     if (bytes.empty() || bytes.starts_with("\x1f\x8b")) return std::string(bytes);
     if (bytes.size() > std::numeric_limits<uInt>::max()) throw GZIPError(GZIPError::failed, Z_BUF_ERROR);
-    z_stream stream{};
-    stream.next_in = reinterpret_cast<Bytef*>(const_cast<char*>(bytes.data()));
-    stream.avail_in = static_cast<uInt>(bytes.size());
-    const int status = deflateInit2_(&stream, Z_BEST_COMPRESSION, Z_DEFLATED, gzipWindowBits, memoryLevel,
-                                     Z_DEFAULT_STRATEGY, "1.2.11", static_cast<int>(sizeof stream));
-    if (status != Z_OK) throw GZIPError(GZIPError::failed, status);
-    const std::unique_ptr<z_stream, EndDeflate> end(&stream);
-    return deflated(stream);
+    auto deflater = spare().take();
+    if (!deflater) deflater = std::make_unique<Deflater>();
+    auto compressed = deflater->compress(bytes);
+    if (deflater->reset()) spare().give(std::move(deflater));
+    return compressed;
 }
 
 }  // namespace corvane
