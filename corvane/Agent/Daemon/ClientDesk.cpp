@@ -16,6 +16,11 @@ namespace {
 // Completions that a client may leave unacknowledged, and bytes that it may leave unread, before it gets more.
 constexpr std::size_t mostTold = 32;
 constexpr std::size_t mostUnreadForMore = std::size_t{64} * 1024;
+
+TaskBook::Owner& ownerOf(const ClientList::Client& client) {
+    if (!client.owner) throw FormatError("a greeting is expected once, and first");
+    return *client.owner;
+}
 }  // namespace
 
 bool ClientDesk::hasClient(const Owner& owner) const {
@@ -69,16 +74,18 @@ void ClientDesk::take(Client& client, const agent::Submit& request) {
 
 void ClientDesk::take(Client& client, const agent::List&) {
     intake_.acceptSpooled();  // what another host of this owner has left there is under way, too
-    std::set<std::int64_t> numbers = client.owner->open;
-    for (const auto& [number, told] : client.owner->over) numbers.insert(number);
+    const Owner& owner = ownerOf(client);
+    std::set<std::int64_t> numbers = owner.open;
+    for (const auto& [number, told] : owner.over) numbers.insert(number);
     for (const auto number : numbers) client.send(agent::Known{book_.task(number).token, book_.description(number)});
     client.send(agent::Listed{});
 }
 
 void ClientDesk::take(Client& client, const agent::Acknowledge& request) {
+    const Owner& owner = ownerOf(client);
     const auto number = book_.find(request.token);
-    if (number && book_.task(*number).owner == client.owner) {
-        if (!client.owner->over.contains(*number)) throw FormatError("the task is not over");
+    if (number && book_.task(*number).owner == &owner) {
+        if (!owner.over.contains(*number)) throw FormatError("the task is not over");
         forget(*number, &client);
     }
     client.send(agent::Forgotten{request.token});

@@ -112,6 +112,7 @@ AgentProgram::Started AgentProgram::start(const std::filesystem::path& program, 
     const SpawnAttributes how;
     auto arguments = argumentsFor(program, directory, options);
     std::vector<char*> argv;
+    argv.reserve(arguments.size() + 1);
     for (auto& argument : arguments) argv.push_back(argument.data());
     argv.push_back(nullptr);
     pid_t process = -1;
