@@ -6,11 +6,13 @@
 #include "benchmarks/Samples.h"
 #include "benchmarks/Suites.h"
 #include "benchmarks/Table.h"
-#include "tests/support/TemporaryDocuments.h"
+
+#include "tests/support/Files.h"
 
 #include <corvane/Processing/EncodedEvents.h>
 #include <corvane/Processing/UserEvents.h>
 #include <corvane/Store/DeferredStore.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Upload/OstrelSigner.h>
 #include <corvane/Upload/SignedEntity.h>
 #include <corvane/Upload/UploadDropbox.h>

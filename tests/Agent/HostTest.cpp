@@ -47,7 +47,7 @@ class HostTest : public AgentFixture {
             if (request.path != "/" + endpoint ||
                 std::to_string(request.body.size()) != request.header("Content-Length"))
                 continue;
-            found.merge(eventIDs({JSON(gunzip(request.body))}));
+            found.merge(eventIDs({JSON(request.content())}));
         }
         return found;
     }

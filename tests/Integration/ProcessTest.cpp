@@ -48,7 +48,7 @@ class Process : public ::testing::Test {
     }
 
     void expectAllArrived(const std::set<std::string>& acknowledged) {
-        const auto arrived = eventIDs(documentsAt(server));
+        const auto arrived = eventIDs(server.documents());
         const std::set<std::string> distinct(arrived.begin(), arrived.end());
         EXPECT_TRUE(std::includes(distinct.begin(), distinct.end(), acknowledged.begin(), acknowledged.end()))
             << acknowledged.size() << " acknowledged, " << distinct.size() << " distinct arrived";
@@ -124,7 +124,7 @@ TEST_F(Process, GoesOnAfterAForkAndItsChildrenEndCleanlyAndSendNothing) {
     EXPECT_TRUE(WIFEXITED(forked.status) && WEXITSTATUS(forked.status) == 0) << forked.status;
     EXPECT_EQ(forked.acknowledged.size(), 200u);
     expectAllArrived(forked.acknowledged);
-    EXPECT_EQ(eventIDs(documentsAt(server)).size(), 200u) << "each once";
+    EXPECT_EQ(eventIDs(server.documents()).size(), 200u) << "each once";
 }
 
 }  // namespace

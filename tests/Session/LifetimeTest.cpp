@@ -40,12 +40,12 @@ TEST_F(Lifetime, EverythingCalledBeforeDestructionStillReachesTheProcessorsWhere
         }
         if (way != "a completion") tracker->submit<Mark>(count);
         release.set_value();
-        recorder->drain();
-        recorder->drain();  // behind the end of the manager too
+        recorder->settle();
+        recorder->settle();  // behind the end of the manager too
         EXPECT_EQ(succeeded, 10000) << way;
         EXPECT_EQ(failed, way == "a completion" ? 0 : 1) << way;
-        EXPECT_EQ(recorder->events.size(), 10000u) << way;
-        EXPECT_EQ(recorder->calls.back(), "process Mark") << "no session is ended behind the host's back";
+        EXPECT_EQ(recorder->events().size(), 10000u) << way;
+        EXPECT_EQ(recorder->history().back(), "process Mark") << "no session is ended behind the host's back";
     }
 }
 
@@ -66,12 +66,12 @@ TEST_F(Lifetime, NothingIsRecordedAfterwardsWhateverStillHoldsTheManager) {
     const auto observer = root->onSessionChange([](AccessTracker&, SessionChange) {});
     root->submit<Mark>(note);
     release.set_value();
-    processor->drain();
-    processor->drain();
+    processor->settle();
+    processor->settle();
     root->submit<Mark>(note);
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(outcomes, std::vector<std::string>(3, "there is no active session"));
-    EXPECT_TRUE(processor->events.empty());
+    EXPECT_TRUE(processor->events().empty());
 }
 
 }  // namespace

@@ -70,7 +70,7 @@ TEST_F(Observers, DoNotKeepTheirTrackerAndItsHandleTurnsIntoNothing) {
     const std::weak_ptr<Tracker> weak = child;
     const auto observer = observe(child);
     child.reset();
-    processor->drain();
+    processor->settle();
     EXPECT_TRUE(weak.expired());
     handle.push(Screen{"x"});
     handle.submit<ScreenView>([&](const EventSubmitResult&) { FAIL(); });

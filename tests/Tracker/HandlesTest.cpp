@@ -17,23 +17,23 @@ TEST_F(Handles, ADelayedSubmissionCarriesTheTimeOfTheCallAndGoesOutOnce) {
     const Date after = now();
     while (now() < after + 5ms) {
     }
-    processor->drain();
-    EXPECT_TRUE(processor->events.empty());
+    processor->settle();
+    EXPECT_TRUE(processor->events().empty());
     token->commit();
     token->commit();
-    processor->drain();
-    ASSERT_EQ(processor->events.size(), 1u);
-    EXPECT_LE(processor->events[0].json()["event"]["eventTimestamp"].integer(), millisecondsSince1970(after));
+    processor->settle();
+    ASSERT_EQ(processor->events().size(), 1u);
+    EXPECT_LE(processor->events()[0].json()["event"]["eventTimestamp"].integer(), millisecondsSince1970(after));
 
     auto child = root->chain("child");
     std::weak_ptr<Tracker> weak = child;
     bool called = false;
     const auto orphan = child->delayedSubmit<Mark>([&](const EventSubmitResult&) { called = true; });
-    processor->drain();
+    processor->settle();
     child.reset();
     EXPECT_TRUE(weak.expired()) << "a token does not keep its tracker";
     orphan->commit();
-    processor->drain();
+    processor->settle();
     EXPECT_FALSE(called);
     EXPECT_TRUE(orphan->sealed());
 }
@@ -46,7 +46,7 @@ TEST_F(Handles, BlocksThatRunOnceLetGoOfWhatTheyHold) {
     sessions->endSync();
     root->whenSession([held](AccessTracker&) {});
     sessions->start(Session::Kind::userEvents());
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(held.use_count(), 1);
 }
 
@@ -76,7 +76,7 @@ TEST_F(Handles, MayBeReleasedInEveryOrder) {
             if (parent) parent->enterGroup("g"), parent->submit<Mark>();
         }
         // What was enqueued holds them until it has run: the queue's end is the trackers' end.
-        recorder->drain();
+        recorder->settle();
         ASSERT_TRUE(weakChild.expired() && weakParent.expired());
     } while (std::next_permutation(order.begin(), order.end()));
 }
@@ -87,7 +87,7 @@ TEST_F(Handles, LongChainsManyObserversAndDeepGroupsWork) {
     root->push(Screen{"root"});
     EXPECT_EQ(submit<ScreenView>(tracker), R"({"screen":{"name":"root"}})");
     tracker = root->chain("t");  // the others are released
-    processor->drain();
+    processor->settle();
 
     int changes = 0;
     for (int i = 0; i < 10000; ++i) root->onSessionChange([&](AccessTracker&, SessionChange) { ++changes; });
@@ -98,7 +98,7 @@ TEST_F(Handles, LongChainsManyObserversAndDeepGroupsWork) {
     for (int i = 0; i < 1000; ++i) root->enterGroup(std::to_string(i));
     for (int i = 0; i < 400; ++i) tracker->leaveGroup();
     submit<ScreenView>(tracker);
-    EXPECT_EQ(processor->events.back().groupName(), "599");
+    EXPECT_EQ(processor->events().back().groupName(), "599");
 }
 
 }  // namespace
