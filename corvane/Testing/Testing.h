@@ -6,6 +6,7 @@
 
 #include <corvane/Testing/CapturedLog.h>
 #include <corvane/Testing/FakeTransferSession.h>
+#include <corvane/Testing/ProcessSettings.h>
 #include <corvane/Testing/RecordedEvent.h>
 #include <corvane/Testing/RecordingProcessor.h>
 #include <corvane/Testing/ScriptedServer.h>

@@ -12,7 +12,6 @@ TEST_F(BridgeSessions, KindsAndNamesGoBothWays) {
     for (const auto& [kind, name, seen] : cases) {
         sessions->endSession();
         EXPECT_TRUE(sessions->startSessionForKind(static_cast<CVSessionKind>(kind), name));
-        processor->settle();
         const CVSession session(processor->sessions().back());
         EXPECT_EQ(static_cast<int>(session.kind()), kind);
         EXPECT_EQ(session.name(), seen);
@@ -26,7 +25,6 @@ TEST_F(BridgeSessions, SessionDataOfOneClassSharesAStack) {
     sessions->pushSessionData({"user2", raw("User", {{"id", 8}})}, {.onlyOnce = true});
     sessions->endSession();
     sessions->startSessionForKind(CVSessionKind::userEvents);
-    processor->settle();
     EXPECT_EQ(processor->history(),
               (std::vector<std::string>{"start", "update", "update+submit", "update", "end", "start"}));
     const auto dataOf = [&](std::size_t i) {

@@ -1,5 +1,6 @@
+#include <corvane/Testing/ProcessSettings.h>
+
 #include "tests/Integration/FaultFixture.h"
-#include "tests/support/ProcessSettings.h"
 
 #include <corvane/Signing/SHA1.h>
 #include <corvane/Upload/UploadService.h>

@@ -10,7 +10,6 @@ struct Device {
 class SessionManagerTest : public TrackingTest {
   protected:
     std::string lastData() {
-        processor->settle();
         JSON::Object data = *processor->sessions().back().sessionData.object();
         EXPECT_EQ(data.at("sessionID").string(), processor->sessions().back().identifier);
         std::string text;
@@ -29,7 +28,6 @@ TEST_F(SessionManagerTest, StartsAndEndsInTurnsAndIgnoresWhatDoesNotFit) {
     processor->settle();
     EXPECT_TRUE(completed);
     sessions->start(Session::Kind::custom("kiosk"));
-    processor->settle();
     EXPECT_EQ(processor->history(), (std::vector<std::string>{"start", "end", "start"}));
     EXPECT_EQ(processor->sessions()[0].kind, Session::Kind::userEvents());
     EXPECT_EQ(processor->sessions()[0].identifier, processor->sessions()[1].identifier);
@@ -48,7 +46,6 @@ TEST_F(SessionManagerTest, DatesAreThoseOfTheCalls) {
     while (now() < after + 5ms) {
     }
     release.set_value();
-    processor->settle();
     EXPECT_GE(processor->sessions().back().startDate, before);
     EXPECT_LE(processor->sessions().back().startDate, after);
     EXPECT_LE(processor->endDates().back(), after);
@@ -77,21 +74,9 @@ TEST_F(SessionManagerTest, EndSyncDoesNothingWhileSuspended) {
     root->resume();
     sessions->endSync();
     root->resume();
-    processor->settle();
     EXPECT_EQ(processor->history(), (std::vector<std::string>{"start"}));
     sessions->endSync();
     EXPECT_EQ(processor->history().back(), "end");
-}
-
-TEST_F(SessionManagerTest, TransactionsSeeAndChangeTheSessionInline) {
-    sessions->transaction([&](AccessSessionManager& access) {
-        EXPECT_TRUE(access.isActive());
-        access.push(SessionData{"device", Device{"M1"}});
-        EXPECT_EQ(processor->history().back(), "update");
-        throw std::runtime_error("ignored");
-    });
-    sessions->endSync();
-    EXPECT_EQ(processor->history(), (std::vector<std::string>{"start", "update", "end"}));
 }
 
 }  // namespace

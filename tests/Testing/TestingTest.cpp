@@ -1,8 +1,8 @@
 #include <corvane/Testing/FakeTransferSession.h>
 #include <corvane/Testing/Matchers.h>
+#include <corvane/Testing/ProcessSettings.h>
 #include <corvane/corvane.h>
 
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {

@@ -1,3 +1,4 @@
+#include <corvane/Processing/LoggingEventProcessor.h>
 #include <corvane/Tracker/SessionObserver.h>
 
 #include "tests/support/TrackingFixture.h"
@@ -17,11 +18,9 @@ TEST_F(Handles, ADelayedSubmissionCarriesTheTimeOfTheCallAndGoesOutOnce) {
     const Date after = now();
     while (now() < after + 5ms) {
     }
-    processor->settle();
     EXPECT_TRUE(processor->events().empty());
     token->commit();
     token->commit();
-    processor->settle();
     ASSERT_EQ(processor->events().size(), 1u);
     EXPECT_LE(processor->events()[0].json()["event"]["eventTimestamp"].integer(), millisecondsSince1970(after));
 
@@ -63,6 +62,7 @@ TEST_F(Handles, MayBeReleasedInEveryOrder) {
         auto observer = child->onSessionChange([](AccessTracker& access, SessionChange) { access.submit<Mark>(); });
         auto token = child->delayedSubmit<Mark>();
         auto access = std::make_unique<AccessTracker>(child);
+        const auto processors = manager->processorManager();
         const std::function<void()> releases[] = {[&] { manager.reset(); }, [&] { parent.reset(); },
                                                   [&] { child.reset(); },   [&] { observer.reset(); },
                                                   [&] { token.reset(); },   [&] { access.reset(); }};
@@ -72,7 +72,12 @@ TEST_F(Handles, MayBeReleasedInEveryOrder) {
             if (observer) observer->disposeOn(std::weak_ptr<const void>());
             if (access) (void)access->tracker();
             if (manager) manager->end();
-            if (child) child->submit<Mark>(), child->push(Screen{"x"});
+            processors->add(std::make_shared<LoggingEventProcessor>());
+            processors->remove(recorder);
+            processors->add(recorder);
+            processors->resumeBackgroundProcessing("another", {});
+            if (child) child->submit<Mark>(), child->push(Screen{"x"}), child->time<Played>(true);
+            if (child) child->whenSession([](AccessTracker&) {}), child->suspend(), child->resume();
             if (parent) parent->enterGroup("g"), parent->submit<Mark>();
         }
         // What was enqueued holds them until it has run: the queue's end is the trackers' end.

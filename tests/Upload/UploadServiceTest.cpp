@@ -1,3 +1,4 @@
+#include <corvane/Testing/ProcessSettings.h>
 #include <corvane/Upload/UploadService.h>
 
 #include <corvane/Platform/MainQueue.h>
@@ -6,7 +7,6 @@
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/Testing.h"
 
 namespace corvane {

@@ -24,7 +24,8 @@ TEST(Instrumentation, RecordsAndUploadsWhatTheShopDoes) {
     const TemporaryDocuments documents;
     const CapturedLog log;
     ScriptedServer collector;
-    TransferSession::setFactory(InProcessTransferSession::factory());
+    ProcessSettings settings;
+    settings.setTransfers(InProcessTransferSession::factory());
     const auto recording = std::make_shared<RecordingProcessor>();
     SessionManager sessions;
     sessions.processorManager()->add(recording);
