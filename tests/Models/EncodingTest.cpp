@@ -153,19 +153,10 @@ TEST(DataEvent, IsEncodedOnceAndGivenBackByType) {
     EXPECT_THROW((void)AnyDataEvent{Bare{}}.toDict(), DataEventError);
 }
 
-namespace media {
-template <class T, class U>
-struct Pair {};
-struct Outer {
-    struct Inner {};
-};
-}  // namespace media
-
 TEST(TypeName, IsTheLastComponentOfEveryName) {
     struct Local {};
     EXPECT_EQ(typeName<Local>(), "Local");
-    EXPECT_EQ(typeName<media::Outer::Inner>(), "Inner");
-    EXPECT_EQ((typeName<media::Pair<Track, media::Pair<Local, media::Outer>>>()), "Pair<Track, Pair<Local, Outer>>");
+    EXPECT_EQ((typeName<std::pair<Track, std::pair<Local, Bare>>>()), "pair<Track, pair<Local, Bare>>");
 }
 
 }  // namespace
