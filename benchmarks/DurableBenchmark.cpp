@@ -1,5 +1,7 @@
 // Events made durable: in the database file before their completions run.
 
+#include <corvane/Testing/TemporaryDocuments.h>
+
 #include "benchmarks/Allocations.h"
 #include "benchmarks/BackupOnly.h"
 #include "benchmarks/BareSQLite.h"
@@ -7,7 +9,6 @@
 #include "benchmarks/Samples.h"
 #include "benchmarks/Suites.h"
 #include "benchmarks/Table.h"
-#include "tests/support/TemporaryDocuments.h"
 
 #include <fstream>
 

@@ -1,10 +1,11 @@
 // How the cost of an event grows with what is around it.
 
+#include <corvane/Testing/TemporaryDocuments.h>
+
 #include "benchmarks/Host.h"
 #include "benchmarks/Samples.h"
 #include "benchmarks/Suites.h"
 #include "benchmarks/Table.h"
-#include "tests/support/TemporaryDocuments.h"
 
 #include <utility>
 

@@ -2,9 +2,10 @@
 //
 //   corvane_instructions submit|encode|durable|burst COUNT
 
+#include <corvane/Testing/TemporaryDocuments.h>
+
 #include "benchmarks/BackupOnly.h"
 #include "benchmarks/Host.h"
-#include "tests/support/TemporaryDocuments.h"
 
 #include <cstdio>
 #include <cstdlib>

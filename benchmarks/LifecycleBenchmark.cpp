@@ -5,9 +5,9 @@
 #include "benchmarks/Samples.h"
 #include "benchmarks/Suites.h"
 #include "benchmarks/Table.h"
-#include "tests/support/TemporaryDocuments.h"
 
 #include <corvane/Store/DeferredStore.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Upload/SignedEntity.h>
 
 namespace corvane::bench {

@@ -6,11 +6,13 @@
 #include "benchmarks/Samples.h"
 #include "benchmarks/Suites.h"
 #include "benchmarks/Table.h"
-#include "tests/support/TemporaryDocuments.h"
+
+#include "tests/support/Files.h"
 
 #include <corvane/Processing/EncodedEvents.h>
 #include <corvane/Processing/UserEvents.h>
 #include <corvane/Store/DeferredStore.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Upload/OstrelSigner.h>
 #include <corvane/Upload/SignedEntity.h>
 #include <corvane/Upload/UploadDropbox.h>
@@ -65,7 +67,8 @@ Figures throughManager(const std::string& url) {
     auto figures = perDocument([&] {
         for (int i = 0; i < documents; ++i) {
             queue->sync([&] {
-                const auto document = std::make_shared<UserEvents>(session, UserEvents::Events{events}, "document " + std::to_string(i));
+                const auto document =
+                    std::make_shared<UserEvents>(session, UserEvents::Events{events}, "document " + std::to_string(i));
                 ledger->add(document->identifier(), eventsEach);
                 manager->upload(UploadRequest{client, document});
             });

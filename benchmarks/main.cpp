@@ -5,9 +5,9 @@
 #include "benchmarks/Server.h"
 #include "benchmarks/Suites.h"
 #include "benchmarks/Table.h"
-#include "tests/support/TemporaryDocuments.h"
 
 #include <corvane/Platform/Log.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <cstring>

@@ -6,10 +6,11 @@
 // and the time from there to the completion callback, one task at a time and all at once, for both kinds of session,
 // and the agent's memory with 1,000 tasks that wait.
 
-#include "tests/support/ScriptedServer.h"
-#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/Files.h"
 
 #include <corvane/Agent/Host/BackgroundTransferSession.h>
+#include <corvane/Testing/ScriptedServer.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <signal.h>

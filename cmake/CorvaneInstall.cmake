@@ -12,8 +12,19 @@ if(CORVANE_BUILD_AGENT)
     install(TARGETS corvane-transferd RUNTIME DESTINATION ${CMAKE_INSTALL_LIBEXECDIR})
 endif()
 
+# A set of its own: it needs zlib, which a user of the shared library may not have.
+if(CORVANE_BUILD_TESTING_LIBRARY)
+    install(TARGETS corvane_testing EXPORT corvaneTestingTargets
+        ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
+        FILE_SET HEADERS DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
+        FILE_SET matchers DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+endif()
+
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/corvane)
 install(EXPORT corvaneTargets NAMESPACE corvane:: DESTINATION ${package_dir})
+if(CORVANE_BUILD_TESTING_LIBRARY)
+    install(EXPORT corvaneTestingTargets NAMESPACE corvane:: DESTINATION ${package_dir})
+endif()
 configure_package_config_file(${PROJECT_SOURCE_DIR}/cmake/corvaneConfig.cmake.in
     ${CMAKE_CURRENT_BINARY_DIR}/corvaneConfig.cmake INSTALL_DESTINATION ${package_dir})
 write_basic_package_version_file(${CMAKE_CURRENT_BINARY_DIR}/corvaneConfigVersion.cmake

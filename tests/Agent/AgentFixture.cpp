@@ -1,6 +1,5 @@
 #include "tests/Agent/AgentFixture.h"
-
-#include <corvane/Transfer/TransferError.h>
+#include "tests/support/Outcome.h"
 
 #include <signal.h>
 #include <unistd.h>
@@ -9,18 +8,6 @@
 #include <thread>
 
 namespace corvane::test {
-
-namespace {
-
-std::string describe(const std::optional<AnyError>& error, const std::optional<TransferResponse>& response) {
-    if (!error) return response ? std::to_string(response->statusCode) : "nothing";
-    constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut",
-                                     "network",        "unreachable",     "blocked"};
-    const auto* known = error->as<TransferError>();
-    return known ? names[known->code()] : error->what();
-}
-
-}  // namespace
 
 bool eventually(const std::function<bool()>& condition, std::chrono::milliseconds time) {
     const auto deadline = std::chrono::steady_clock::now() + time;
@@ -40,7 +27,7 @@ std::map<std::string, int> bodies(const ScriptedServer& server) {
 void SessionRecorder::note(Outcomes& where, const TransferTask& task, const std::optional<AnyError>& error,
                            const std::optional<TransferResponse>& response) {
     std::lock_guard lock(mutex_);
-    where[task.description().value_or("none")] += describe(error, response);
+    where[task.description().value_or("none")] += outcome(error, response);
     ++completed_;
     changed_.notify_all();
 }

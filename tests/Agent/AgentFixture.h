@@ -1,10 +1,11 @@
 #pragma once
 
 #include <corvane/Agent/Host/BackgroundTransferSession.h>
+#include <corvane/Testing/CapturedLog.h>
+#include <corvane/Testing/ScriptedServer.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 
-#include "tests/support/CapturedLog.h"
-#include "tests/support/ScriptedServer.h"
-#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/Files.h"
 
 #include <gtest/gtest.h>
 

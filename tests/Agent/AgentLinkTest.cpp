@@ -1,6 +1,5 @@
 #include <corvane/Agent/Host/AgentLink.h>
-
-#include "tests/support/CapturedLog.h"
+#include <corvane/Testing/CapturedLog.h>
 
 #include <fcntl.h>
 #include <gtest/gtest.h>

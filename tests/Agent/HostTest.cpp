@@ -1,13 +1,12 @@
 #include "tests/Agent/AgentFixture.h"
+#include "tests/Integration/HostProcess.h"
 #include "tests/support/Documents.h"
 
 #include <signal.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cstdio>
-#include <cstring>
 #include <future>
 #include <random>
 #include <set>
@@ -16,28 +15,14 @@
 namespace corvane::test {
 namespace {
 
-struct Outcome {
-    bool wasKilled = false, succeeded = false;
-    std::set<std::string> acknowledged;
-};
-
 class HostTest : public AgentFixture {
   protected:
-    Outcome run(const std::string& endpoint, int events, const std::string& mode, const std::string& wake = {}) {
-        std::string command = "ASAN_OPTIONS=detect_leaks=0 exec";  // it ends while its threads work and hold memory
-        for (const std::string& argument :
-             {std::string(CORVANE_BACKGROUND_HOST), std::string(CORVANE_AGENT), server.url("/" + endpoint),
-              documents.path().string(), endpoint, std::to_string(events), mode, wake}) {
-            if (!argument.empty()) command += " '" + argument + "'";
-        }
-        FILE* output = popen(command.c_str(), "re");
-        Outcome result;
-        char line[256];
-        while (fgets(line, sizeof line, output)) result.acknowledged.insert(std::string(line, strcspn(line, "\n")));
-        const int status = pclose(output);
-        result.succeeded = status == 0;
-        result.wasKilled = WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL;
-        return result;
+    HostProcess run(const std::string& endpoint, int events, const std::string& mode, const std::string& wake = {}) {
+        std::vector<std::string> command{
+            CORVANE_BACKGROUND_HOST, CORVANE_AGENT, server.url("/" + endpoint), documents.path().string(), endpoint,
+            std::to_string(events),  mode};
+        if (!wake.empty()) command.push_back(wake);
+        return HostProcess::run(command);
     }
 
     /// The events that arrived, by the path of their endpoint.
@@ -47,7 +32,7 @@ class HostTest : public AgentFixture {
             if (request.path != "/" + endpoint ||
                 std::to_string(request.body.size()) != request.header("Content-Length"))
                 continue;
-            found.merge(eventIDs({JSON(gunzip(request.body))}));
+            found.merge(eventIDs({JSON(request.content())}));
         }
         return found;
     }
@@ -68,8 +53,8 @@ TEST_F(HostTest, WhatAKilledHostHandedOverArrivesOnceAndItsNextRunLearnsOfIt) {
     for (const std::string endpoint : {"first", "second"}) {
         const auto before = server.requests().size();
         server.script(ScriptedServer::Reply::status(200).hold(), count);
-        const Outcome killed = run(endpoint, count, "kill");
-        ASSERT_TRUE(killed.wasKilled);
+        const HostProcess killed = run(endpoint, count, "kill");
+        ASSERT_TRUE(killed.wasKilled());
         ASSERT_EQ(killed.acknowledged.size(), static_cast<std::size_t>(count));
         ASSERT_TRUE(server.waitForRequests(before + 4)) << "the agent sends, though nobody is there";
         // The first next run's retry pass comes while most documents have not gone out yet, and leaves them alone; the
@@ -81,8 +66,8 @@ TEST_F(HostTest, WhatAKilledHostHandedOverArrivesOnceAndItsNextRunLearnsOfIt) {
             ASSERT_TRUE(eventually([&] { return server.requests().size() == before + count; }, 30s));
             EXPECT_EQ(payloads(endpoint), static_cast<std::size_t>(count));
         }
-        const Outcome collected = next.get();
-        EXPECT_TRUE(collected.succeeded);
+        const HostProcess collected = next.get();
+        EXPECT_TRUE(collected.succeeded());
         auto expected = each(killed.acknowledged);
         expected.insert(collected.acknowledged.begin(), collected.acknowledged.end());
         EXPECT_EQ(arrived(endpoint), expected) << "each once";
@@ -94,9 +79,9 @@ TEST_F(HostTest, TwoHostsAndTwoEndpointsAtOnceSeeTheirOwn) {
     std::map<std::string, std::set<std::string>> acknowledged;
     for (const std::string mode : {"kill", "wait"}) {
         auto other = std::async(std::launch::async, [&] { return run("second", 40, mode); });
-        Outcome first = run("first", 60, mode);
-        Outcome second = other.get();
-        EXPECT_TRUE(mode == "kill" ? first.wasKilled && second.wasKilled : first.succeeded && second.succeeded);
+        HostProcess first = run("first", 60, mode);
+        HostProcess second = other.get();
+        EXPECT_TRUE(mode == "kill" ? first.wasKilled() && second.wasKilled() : first.succeeded() && second.succeeded());
         acknowledged["first"].merge(first.acknowledged);
         acknowledged["second"].merge(second.acknowledged);
     }
@@ -110,10 +95,10 @@ TEST_F(HostTest, RunsACommandForAHostThatIsNotThereOnce) {
     const auto woken = documents / "woken", program = body("wake", "#!/bin/sh\necho \"$1\" $(umask) $(pwd) >> '" +
                                                                        (documents / "woken").string() + "'\n");
     chmod(program.c_str(), 0700);
-    const Outcome killed = run("main", 5, "kill", program);
-    ASSERT_TRUE(killed.wasKilled);
+    const HostProcess killed = run("main", 5, "kill", program);
+    ASSERT_TRUE(killed.wasKilled());
     ASSERT_TRUE(eventually([&] { return std::filesystem::exists(woken) && !readFile(woken).empty(); }));
-    EXPECT_TRUE(run("main", 1, "wait").succeeded) << "a host that is there is told, not woken";
+    EXPECT_TRUE(run("main", 1, "wait").succeeded()) << "a host that is there is told, not woken";
     FILE* own = popen("umask", "re");
     char mask[8] = {};
     EXPECT_TRUE(fgets(mask, sizeof mask, own) && pclose(own) == 0);

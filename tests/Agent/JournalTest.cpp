@@ -2,9 +2,10 @@
 #include <corvane/Agent/Daemon/TaskBook.h>
 #include <corvane/Agent/OutcomeCodec.h>
 #include <corvane/Agent/WireWriter.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Transfer/TransferError.h>
 
-#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/Files.h"
 
 #include <gtest/gtest.h>
 #include <sqlite3.h>

@@ -1,8 +1,7 @@
 #include <corvane/Agent/Host/Acknowledgements.h>
 #include <corvane/Agent/Host/BackgroundTransferCore.h>
 #include <corvane/Agent/OutcomeCodec.h>
-
-#include "tests/support/TemporaryDocuments.h"
+#include <corvane/Testing/TemporaryDocuments.h>
 
 #include <gtest/gtest.h>
 

@@ -1,9 +1,10 @@
 #include <corvane/Agent/Daemon/UploadQueue.h>
+#include <corvane/Testing/ScriptedServer.h>
+#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Transfer/TransferError.h>
 
-#include "tests/support/ScriptedServer.h"
+#include "tests/support/Files.h"
 #include "tests/support/TLSServer.h"
-#include "tests/support/TemporaryDocuments.h"
 
 #include <gtest/gtest.h>
 

@@ -19,16 +19,6 @@
 using namespace corvane;
 using namespace corvane::test;
 
-namespace {
-
-void acknowledge(const EventSubmitResult& result) {
-    if (!result.succeeded()) std::_Exit(4);
-    const std::string line = *result.event()->json()["event"]["eventID"].string() + "\n";
-    if (write(STDOUT_FILENO, line.data(), line.size()) < 0) std::_Exit(3);
-}
-
-}  // namespace
-
 int main(int argc, char** argv) {
     if (argc < 7) return 2;
     const std::string mode = argv[6];
@@ -44,16 +34,10 @@ int main(int argc, char** argv) {
     options.wakeCommand.assign(argv + 7, argv + argc);
     TransferSession::setFactory(BackgroundTransferSession::factory(options));
 
-    SessionManager sessions;
-    const auto uploads =
-        std::make_shared<UploadBatchEventProcessor>(Client{"com.example.player", "Player", "2.3", 117},
-                                                    Endpoint{argv[2], argv[4]}, UploadBatchEventConfig(1, false));
-    sessions.processorManager()->add(uploads);
-    sessions.start(Session::Kind::userEvents());
-    sessions.tracker()->push(Screen{"home"});
-    for (int i = std::atoi(argv[5]); i > 0; --i) sessions.tracker()->submit<ScreenView>(acknowledge);
-    sessions.endSync();
+    Application application(argv[2], 1, argv[4]);
+    for (int i = std::atoi(argv[5]); i > 0; --i) application.sessions.tracker()->submit<ScreenView>(acknowledge);
+    application.sessions.endSync();
     if (mode == "kill") kill(getpid(), SIGKILL);
-    const auto report = uploads->waitForDelivery(std::chrono::steady_clock::now() + 60s);
+    const auto report = application.uploads->waitForDelivery(std::chrono::steady_clock::now() + 60s);
     return report.pending.documents == 0 && report.givenUp.documents == 0 ? 0 : 1;
 }

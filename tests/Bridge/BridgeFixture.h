@@ -1,8 +1,8 @@
 #pragma once
 
 #include <corvane/Bridge/CV.h>
+#include <corvane/Testing/RecordingProcessor.h>
 
-#include "tests/support/RecordingProcessor.h"
 #include "tests/support/Testing.h"
 
 namespace corvane::test {
@@ -54,13 +54,13 @@ class BridgeTest : public ::testing::Test {
     std::string submit(const std::shared_ptr<CVTracker>& tracker, const CVEventClass& event) {
         std::string outcome = "(no completion)";
         tracker->submitEventType(event, false, keep(outcome));
-        processor->drain();
+        processor->settle();
         return outcome;
     }
     std::string submit(const std::shared_ptr<CVTracker>& tracker, const CVRawEvent& event) {
         std::string outcome = "(no completion)";
         tracker->submitRawEvent(event, false, keep(outcome));
-        processor->drain();
+        processor->settle();
         return outcome;
     }
 

@@ -55,7 +55,7 @@ TEST_F(BridgeInput, DeclarationsThatCannotBeUsedFailTheirSubmissions) {
     EXPECT_EQ(describe(refused), "Corvane.BridgeError 1: the event's name is not UTF-8");
     EXPECT_EQ(submit(root, CVEventClass("NoInit", nullptr)),
               "! Corvane.BridgeError 0: the instance of event class NoInit is missing");
-    EXPECT_TRUE(processor->events.empty());
+    EXPECT_TRUE(processor->events().empty());
 }
 
 TEST_F(BridgeInput, DataThatCannotBeUsedIsRefusedAndNeverRecorded) {
@@ -82,7 +82,8 @@ TEST_F(BridgeInput, DataThatCannotBeUsedIsRefusedAndNeverRecorded) {
     EXPECT_FALSE(sessions->pushSessionData({"deep", raw("Screen", {{"k", nested(127)}})}, {}, false, &refused));
     EXPECT_EQ(refused.code(), EncodingError::tooDeep) << "the key takes one level";
     EXPECT_EQ(submit(root, view), R"({"screen":{"name":"old"}})");
-    EXPECT_EQ(processor->calls, (std::vector<std::string>{"start", "process View"})) << "no session data came through";
+    EXPECT_EQ(processor->history(), (std::vector<std::string>{"start", "process View"}))
+        << "no session data came through";
 }
 
 TEST_F(BridgeInput, NamesAndObjectsThatCannotBeUsedChangeNothing) {
@@ -132,8 +133,7 @@ TEST_F(BridgeInput, NamesAndObjectsThatCannotBeUsedChangeNothing) {
     root->transactionWithBlock(nullptr);
     root->whenSession(nullptr);
     root->onSessionChangeWithBlock(nullptr)->disposeOnObject(nullptr);
-    processor->drain();
-    EXPECT_EQ(processor->calls, (std::vector<std::string>{"start", "end"}));
+    EXPECT_EQ(processor->history(), (std::vector<std::string>{"start", "end"}));
 }
 
 }  // namespace

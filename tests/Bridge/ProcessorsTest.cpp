@@ -48,10 +48,10 @@ TEST_F(BridgeProcessors, HearEverythingUntilTheyAreRemovedAndStopNobodyElse) {
     manager->addEventProcessor(complete);
     manager->removeEventProcessor(complete);
     sessions->startSessionForKind(CVSessionKind::userEvents);
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(complete->calls, (std::vector<std::string>{"start", "resume id", "enter g", "View 0.1.0 {} g", "leave g",
                                                          "submit", "end"}));
-    EXPECT_EQ(processor->events.size(), 1u);
+    EXPECT_EQ(processor->events().size(), 1u);
 }
 
 TEST_F(BridgeProcessors, LogInEveryFormat) {
@@ -94,9 +94,9 @@ TEST_F(BridgeProcessors, UploadBatchesThroughTheBridge) {
     root->pushDataEvent(raw("Screen", {{"name", "home"}}));
     for (int i = 0; i < 3; ++i) root->submitRawEvent({"View", {{"screen", {"Screen", required}}}});
     sessions->endSession();
-    processor->drain();
+    processor->settle();
     (void)uploads->proxyEventProcessor()->waitForDelivery(std::chrono::steady_clock::now() + 20s);
-    const auto received = documentsAt(server);
+    const auto received = server.documents();
     ASSERT_EQ(received.size(), 2u);
     for (const auto& document : received) {
         EXPECT_EQ(document["data"]["session"]["device"]["model"].string(), "M1");

@@ -62,7 +62,7 @@ TEST_F(BridgeRecording, EveryPathGivesTheSameJSON) {
         child->tracker()->push(Volume{0.5});
         std::string typed;
         child->tracker()->submit<Play>([&](const EventSubmitResult& result) { typed = result.event()->json().text(); });
-        processor->drain();
+        processor->settle();
         EXPECT_EQ(submit(child, playClass), typed) << "a class finds typed data";
         bridged->pushDataEvent(raw("Track", CVDictionary(entries)));
         bridged->pushDataEvent(raw("Volume", {{"level", 0.5}}));
@@ -79,7 +79,7 @@ TEST_F(BridgeRecording, PropertiesAreAskedForOncePerTrackerAndName) {
     EXPECT_EQ(submit(root, once), "{}");
     EXPECT_EQ(submit(root, again), "{}") << "the first class of a name defines it";
     root->transactionWithBlock([&](const auto& access) { access->submitEventType(once); });
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(*asked, 1);
     submit(root->chainWithName("child"), once);
     EXPECT_EQ(*asked, 2);
@@ -102,7 +102,7 @@ TEST_F(BridgeRecording, BuiltInRecordsReachTheClassesThatDeclareThem) {
     root->timeEventType(view, Date(1s));
     std::string outcome;
     root->explicitSubmitEvent(view, Date(2500ms), true, keep(outcome));
-    processor->drain();
+    processor->settle();
     const JSON json(outcome);
     EXPECT_EQ(json["span"].text(), R"({"startTimestamp":1000,"endTimestamp":2500,"duration":1500})");
     EXPECT_EQ(json["event"]["eventTimestamp"].integer(), 2500);
@@ -177,12 +177,11 @@ TEST_F(BridgeRecording, EveryCallReachesTheTracker) {
         {[&] { root->suspend(), root->enterGroupWithName("late"), root->resume(); }, {"enter late"}},
     };
     for (const auto& [call, expected] : cases) {
-        processor->drain();
-        processor->calls.clear();
+        processor->clear();
         call();
-        processor->drain();
-        std::sort(processor->calls.begin(), processor->calls.end());
-        EXPECT_EQ(processor->calls, expected);
+        auto history = processor->history();
+        std::sort(history.begin(), history.end());
+        EXPECT_EQ(history, expected);
     }
 }
 

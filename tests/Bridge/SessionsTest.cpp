@@ -12,8 +12,7 @@ TEST_F(BridgeSessions, KindsAndNamesGoBothWays) {
     for (const auto& [kind, name, seen] : cases) {
         sessions->endSession();
         EXPECT_TRUE(sessions->startSessionForKind(static_cast<CVSessionKind>(kind), name));
-        processor->drain();
-        const CVSession session(processor->sessions.back());
+        const CVSession session(processor->sessions().back());
         EXPECT_EQ(static_cast<int>(session.kind()), kind);
         EXPECT_EQ(session.name(), seen);
         EXPECT_EQ(session.sessionData()["sessionID"].string(), session.identifier());
@@ -26,11 +25,10 @@ TEST_F(BridgeSessions, SessionDataOfOneClassSharesAStack) {
     sessions->pushSessionData({"user2", raw("User", {{"id", 8}})}, {.onlyOnce = true});
     sessions->endSession();
     sessions->startSessionForKind(CVSessionKind::userEvents);
-    processor->drain();
-    EXPECT_EQ(processor->calls,
+    EXPECT_EQ(processor->history(),
               (std::vector<std::string>{"start", "update", "update+submit", "update", "end", "start"}));
     const auto dataOf = [&](std::size_t i) {
-        const std::string text = processor->sessions.at(i).sessionData.text();
+        const std::string text = processor->sessions().at(i).sessionData.text();
         return text.substr(text.find(',') + 1);
     };
     EXPECT_EQ(dataOf(2), R"("device":{"model":"M1"},"user":{"id":7}})");
@@ -48,7 +46,7 @@ TEST_F(BridgeSessions, HandlesWorkInTheirBlockAndRefuseElsewhere) {
         keptManager = access;
         EXPECT_TRUE(access->isActive());
         EXPECT_TRUE(access->pushSessionData({"screen", screen}));
-        EXPECT_EQ(processor->calls.back(), "update") << "done when it returns";
+        EXPECT_EQ(processor->history().back(), "update") << "done when it returns";
     });
     root->transactionWithBlock([&](const auto& access) {
         keptTracker = access;
@@ -59,7 +57,7 @@ TEST_F(BridgeSessions, HandlesWorkInTheirBlockAndRefuseElsewhere) {
         EXPECT_TRUE(access->popDataEventByName("Screen"));
         EXPECT_FALSE(access->pushDataEvent(nullptr));
     });
-    processor->drain();
+    processor->settle();
 
     CapturedLog log;
     CVError error;
@@ -82,13 +80,13 @@ TEST_F(BridgeSessions, HandlesWorkInTheirBlockAndRefuseElsewhere) {
         EXPECT_FALSE(keptManager->pushSessionData({"screen", screen})) << "in another block";
         keptTracker->submitRawEvent(view, false, keep(outcome));
     });
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(outcome, "{}") << "a tracker's handle is good in every block";
     const auto token = root->delayedSubmitRawEvent(view);
     sessions.reset();
     EXPECT_EQ(submit(root, view), "! Corvane.TrackerError 1: there is no active session");
     token->commit();
-    processor->drain();
+    processor->settle();
 }
 
 TEST_F(BridgeSessions, ObserversAreToldUntilTheirObjectGoes) {
@@ -106,7 +104,7 @@ TEST_F(BridgeSessions, ObserversAreToldUntilTheirObjectGoes) {
     root->whenSession([&](const auto&) { ++blocks; });
     sessions->endSession();
     root->whenSession([&](const auto&) { ++blocks; });
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(changes, (std::vector{CVSessionChange::willEnd, CVSessionChange::didEnd}));
     EXPECT_EQ(late, "{}");
     EXPECT_EQ(blocks, 1);
@@ -115,7 +113,7 @@ TEST_F(BridgeSessions, ObserversAreToldUntilTheirObjectGoes) {
         sessions->startSessionForKind(CVSessionKind::userEvents);
         sessions->endSession();
     }
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(changes.size(), 2u);
     EXPECT_EQ(blocks, 2);
 }

@@ -3,7 +3,10 @@
 #include <corvane/Store/DeferredStoreCore.h>
 #include <corvane/corvane.h>
 
+#include <unistd.h>
+
 #include <chrono>
+#include <cstdlib>
 #include <memory>
 #include <string>
 
@@ -20,12 +23,20 @@ struct ScreenView {
     EventProperty<Screen> screen = required;
 };
 
-/// An application as a host writes it, with the whole library behind it and an endpoint named "main".
+/// Writes the identifier of an acknowledged event to standard output, as hosts in a process of their own do.
+inline void acknowledge(const EventSubmitResult& result) {
+    if (!result.succeeded()) return;
+    const std::string line = *result.event()->json()["event"]["eventID"].string() + "\n";
+    if (write(STDOUT_FILENO, line.data(), line.size()) < 0) std::_Exit(3);
+}
+
+/// An application as a host writes it, with the whole library behind it and an endpoint named "main" unless a test says
+/// otherwise.
 struct Application {
-    explicit Application(const std::string& url, int batchSize = 50, bool debugging = false)
+    explicit Application(const std::string& url, int batchSize = 50, const std::string& endpoint = "main")
         : uploads(std::make_shared<UploadBatchEventProcessor>(Client{"com.example.player", "Player", "2.3", 117},
-                                                              Endpoint{url, "main"},
-                                                              UploadBatchEventConfig(batchSize, debugging))) {
+                                                              Endpoint{url, endpoint},
+                                                              UploadBatchEventConfig(batchSize, false))) {
         sessions.processorManager()->add(uploads);
         sessions.start(Session::Kind::userEvents());
         sessions.tracker()->push(Screen{"home"});

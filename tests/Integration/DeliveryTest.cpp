@@ -1,5 +1,6 @@
+#include <corvane/Testing/ProcessSettings.h>
+
 #include "tests/Integration/FaultFixture.h"
-#include "tests/support/ProcessSettings.h"
 
 #include <corvane/Signing/SHA1.h>
 #include <corvane/Upload/UploadService.h>
@@ -27,7 +28,7 @@ TEST_F(Delivery, ADocumentArrivesSignedCompressedAndWhole) {
     const std::string publicKey = readFile(documents / "com.veskar.corvane.signing-key.pub.pem");
     EXPECT_TRUE(verifies(publicKey, sha1Digest(request.body), request.header("X-Veskar-ActionSignature")));
 
-    const JSON document = documentsAt(server)[0];
+    const JSON document = server.documents()[0];
     const auto event = document["data"]["events"][1];
     EXPECT_EQ(event["metadata"].text(), R"({"name":"ScreenView","version":"0.1.0"})");
     EXPECT_EQ(event["data"]["event"]["eventPath"].string(), "/root");

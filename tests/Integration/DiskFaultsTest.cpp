@@ -1,5 +1,4 @@
 #include "tests/Integration/FaultFixture.h"
-#include "tests/support/ProcessSettings.h"
 
 #include <corvane/Processing/UploadBatchEntity.h>
 
@@ -159,8 +158,7 @@ TEST_F(DiskFaults, WhatIsRemovedUnderARunningApplicationIsToldOfAndMadeAnew) {
 }
 
 TEST_F(DiskFaults, ALockCostsOneTimeoutAndIsToldOfBeforeEachCompletion) {
-    ProcessSettings settings;
-    settings.setBusyTimeout(1s);
+    StoreConnection::setBusyTimeout(1s);
     constexpr int events = 100;
     {
         Application application(server.url(), 1000);

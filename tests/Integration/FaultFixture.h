@@ -27,7 +27,7 @@ struct FaultFixture {
         return Store<SignedEntity>(StoreLocation::default_("main")).fetchAll();
     }
     [[nodiscard]] std::size_t distinctEvents() const {
-        const auto arrived = eventIDs(documentsAt(server));
+        const auto arrived = eventIDs(server.documents());
         return std::set<std::string>(arrived.begin(), arrived.end()).size();
     }
     /// Runs the application once more, with nothing of its own to say, until its predecessors' documents are out.

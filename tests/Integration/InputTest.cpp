@@ -22,7 +22,7 @@ class Input : public ::testing::Test, protected FaultFixture {
     /// The attachments that have arrived, in order.
     [[nodiscard]] std::vector<std::string> arrived() const {
         std::vector<std::string> contents;
-        for (const auto& document : documentsAt(server)) {
+        for (const auto& document : server.documents()) {
             const auto events = document["data"]["events"].array().value();
             for (const auto& event : events) contents.push_back(event["data"]["attachment"]["content"].text());
         }
@@ -73,7 +73,7 @@ TEST_F(Input, LargeWideAndDeepEventsAreDeliveredAndAlsoReadBackAfterARestart) {
     EXPECT_EQ(next.wait().delivered, (DeliveryReport::Count{3, 1}));
     for (const auto& content : contents) expected.push_back(content.text());
     EXPECT_TRUE(arrived() == expected);
-    for (const auto& document : documentsAt(server)) {
+    for (const auto& document : server.documents()) {
         const JSON viewer = document["data"]["session"][std::string_view("o'clock\"\0", 9)];
         EXPECT_EQ(viewer["name"].string(), std::string("'\0\n\"", 4));
     }

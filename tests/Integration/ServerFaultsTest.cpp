@@ -1,5 +1,6 @@
+#include <corvane/Testing/ProcessSettings.h>
+
 #include "tests/Integration/FaultFixture.h"
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/TLSServer.h"
 
 #include <corvane/Transfer/InProcessTransferSession.h>

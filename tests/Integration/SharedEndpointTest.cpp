@@ -24,7 +24,7 @@ TEST(SharedEndpoint, TwoProcessorsOfOneProcessLoseNothingAndAreToldOf) {
     }
     disk.runAgain();
     EXPECT_EQ(disk.distinctEvents(), 9u);
-    EXPECT_EQ(eventIDs(documentsAt(disk.server)).size(), 12u) << "the three that went out of the open batch came twice";
+    EXPECT_EQ(eventIDs(disk.server.documents()).size(), 12u) << "the three that went out of the open batch came twice";
     EXPECT_TRUE(FaultFixture::rows().empty());
     EXPECT_TRUE(disk.payloads().empty());
 }
@@ -50,7 +50,7 @@ TEST(SharedEndpoint, ADocumentThatTwoProcessorsSendIsFinishedOnce) {
             first.abandon();
             second.abandon();
         }
-        const auto documents = documentsAt(disk.server);
+        const auto documents = disk.server.documents();
         ASSERT_EQ(documents.size(), 2u);
         EXPECT_EQ(documents[0]["metadata"]["identifier"].string(), documents[1]["metadata"]["identifier"].string());
         EXPECT_TRUE(FaultFixture::rows().empty());

@@ -44,7 +44,7 @@ TEST_F(Stall, AServerThatNeverAnswersHoldsUpNeitherTheHostNorTheEvents) {
     ScriptedServer healthy;
     Application application(healthy.url());
     EXPECT_EQ(application.wait().delivered.documents, 20) << "what was cancelled is still on disk";
-    EXPECT_EQ(eventIDs(documentsAt(healthy)).size(), 200u);
+    EXPECT_EQ(eventIDs(healthy.documents()).size(), 200u);
 }
 
 }  // namespace

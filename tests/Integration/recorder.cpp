@@ -25,12 +25,6 @@ using namespace corvane::test;
 
 namespace {
 
-void acknowledge(const EventSubmitResult& result) {
-    if (!result.succeeded()) return;
-    const std::string line = *result.event()->json()["event"]["eventID"].string() + "\n";
-    if (write(STDOUT_FILENO, line.data(), line.size()) < 0) std::_Exit(3);
-}
-
 /// Destroyed with the host's static objects, after main and between the library's exit handlers.
 struct StaticHost {
     ~StaticHost() {

@@ -101,44 +101,6 @@ TEST(Encoding, TruncatesDatesAndDurationsTowardZero) {
     EXPECT_THROW((void)decode<std::chrono::nanoseconds>(encoded(std::chrono::hours(24 * 365 * 300))), DecodingError);
 }
 
-template <class T>
-std::string failure(const T& value) {
-    try {
-        (void)toDict(value);
-    } catch (const Error& error) {
-        return error.what();
-    }
-    return "";
-}
-
-struct Node {
-    std::vector<Node> children;
-};
-
-Node chain(int depth) {
-    Node node;
-    for (int i = 1; i < depth; ++i) {
-        Node outer;
-        outer.children.push_back(std::move(node));
-        node = std::move(outer);
-    }
-    return node;
-}
-
-TEST(Encoding, RefusesWhatJSONCannotHoldAndNamesTheProperty) {
-    struct Named {
-        std::map<std::string, Track> tracks;
-    };
-    EXPECT_EQ(failure(Named{{{"k", {"\xc3\x28", {}}}}}), "tracks.k.title: the text is not UTF-8");
-    EXPECT_EQ(failure(Named{{{"k", {"", 0.0 / 0.0}}}}), "tracks.k.length: the number is infinite or not a number");
-    EXPECT_EQ(failure(Named{{{"\xff", {}}}}), "tracks.(key): the text is not UTF-8");
-    EXPECT_EQ(failure(chain(64)), "") << "an object and an array a level: 128 levels with the last, empty array";
-    EXPECT_NE(failure(chain(65)).find("nest too deep"), std::string::npos);
-    EXPECT_EQ(failure(Named{{{"a \"key\"", {"", 0.0 / 0.0}}}}),
-              "tracks.a \"key\".length: the number is infinite or not a number");
-    EXPECT_EQ(failure(Bare{}), "the data event's encoding is not a JSON object");
-}
-
 TEST(Encoding, NeverWritesBrokenTextForAnEncoderMisused) {
     const auto broken = [](auto&& use) {
         Encoder encoder;
@@ -191,19 +153,10 @@ TEST(DataEvent, IsEncodedOnceAndGivenBackByType) {
     EXPECT_THROW((void)AnyDataEvent{Bare{}}.toDict(), DataEventError);
 }
 
-namespace media {
-template <class T, class U>
-struct Pair {};
-struct Outer {
-    struct Inner {};
-};
-}  // namespace media
-
 TEST(TypeName, IsTheLastComponentOfEveryName) {
     struct Local {};
     EXPECT_EQ(typeName<Local>(), "Local");
-    EXPECT_EQ(typeName<media::Outer::Inner>(), "Inner");
-    EXPECT_EQ((typeName<media::Pair<Track, media::Pair<Local, media::Outer>>>()), "Pair<Track, Pair<Local, Outer>>");
+    EXPECT_EQ((typeName<std::pair<Track, std::pair<Local, Bare>>>()), "pair<Track, pair<Local, Bare>>");
 }
 
 }  // namespace

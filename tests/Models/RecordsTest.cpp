@@ -21,18 +21,6 @@ TEST(Records, EncodeToTheirExactJSON) {
     EXPECT_EQ(decode<TimedData>(toDict(TimedData(start, start + 2s))).duration, 2000);
 }
 
-TEST(Records, SessionDataIsOneEntryUnderItsKey) {
-    struct Viewer {
-        int id;
-    };
-    struct Bare {
-        void encode(Encoder& encoder) const { encoder.null(); }
-    };
-    EXPECT_EQ(toDict(SessionData{"user", Viewer{7}}).text(), R"({"user":{"id":7}})");
-    EXPECT_EQ(encoded(SessionData{"user", Viewer{7}}).text(), R"({"key":"user","data":{"id":7}})");
-    EXPECT_THROW((void)toDict(SessionData{"user", Bare{}}), DataEventError);
-}
-
 TEST(Client, ComesFromABundleOrNotAtAll) {
     test::CapturedLog log;
     const auto client = [](const char* build) {

@@ -2,10 +2,9 @@
 #include <corvane/Platform/Date.h>
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/Error.h>
-#include <corvane/Platform/Lazy.h>
 #include <corvane/Platform/MainQueue.h>
+#include <corvane/Testing/ProcessSettings.h>
 
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/Testing.h"
 
 #include <cmath>
@@ -73,16 +72,6 @@ TEST(TransferSession, AFactoryThatGoesMaySetAnother) {
     ProcessSettings settings;
     settings.setTransfers([held = std::make_shared<SetsAnother>()](auto&&...) { return nullptr; });
     settings.setTransfers(nullptr);
-}
-
-TEST(Lazy, LoadsOnceAndAgainOnlyAfterAFailure) {
-    int loads = 0;
-    const Lazy<int> lazy([&] {
-        if (++loads == 1) throw std::runtime_error("not yet");
-        return loads;
-    });
-    EXPECT_THROW((void)lazy.value(), std::runtime_error);
-    EXPECT_EQ(lazy.value() + lazy.value(), 4);
 }
 
 TEST(MainQueue, RunsOnTheHostsExecutorOrOnItsOwnQueueWhenThatFails) {

@@ -3,7 +3,6 @@
 #include <corvane/Processing/UserEvents.h>
 #include <corvane/Upload/UploadRequest.h>
 
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {
@@ -180,15 +179,6 @@ TEST_F(UploadBatch, ABackupThatGrewWhileItWasSentStaysForItsOwner) {
     EXPECT_EQ(rows()[0].events->count(), 2u);
 }
 
-TEST_F(UploadBatch, LogsEventsAndGroupsThatHaveNoSession) {
-    manager->queue->sync([&] {
-        batching->process(ProcessEvent("Mark", JSON("{}"), std::nullopt));
-        batching->didLeaveGroup({"g", Date()});
-    });
-    EXPECT_EQ(log.count("Failed to process event for batching, error=no session is current"), 1);
-    EXPECT_EQ(log.count("Attempt to leave group and perform upload without a current session"), 1);
-}
-
 TEST_F(UploadBatch, ADocumentThatIsUnderWayWithoutARowStaysInItsBackup) {
     sessions->start(Session::Kind::userEvents());
     drain();
@@ -270,8 +260,7 @@ TEST_F(UploadBatch, WhatIsOpenGoesOutInPlaceOfABackupThatIsBehind) {
     sessions->endSync();
     manager->refuses = false;
     // A lock keeps the row as it was, also while the next session starts.
-    ProcessSettings settings;
-    settings.setBusyTimeout(1ms);
+    StoreConnection::setBusyTimeout(1ms);
     StoreConnection other(StoreLocation::default_("main"));
     store->perform([&](Rows& table) { table.insert(outdated); });
     other.run("BEGIN IMMEDIATE;");

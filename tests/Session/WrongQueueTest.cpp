@@ -56,7 +56,7 @@ TEST_F(WrongQueueDeathTest, NothingRunsWhereItWouldRaceOrWaitForItself) {
     };
     for (const auto& [call, message] : onTheQueue) {
         const auto inside = [&, call = call](AccessSessionManager&) { call(); };
-        EXPECT_DEATH((sessions->transaction(inside), core->accessQueue()->sync(call), processor->drain()), message);
+        EXPECT_DEATH((sessions->transaction(inside), core->accessQueue()->sync(call), processor->settle()), message);
     }
 }
 

@@ -3,7 +3,6 @@
 #include <corvane/Store/VersionEntity.h>
 
 #include "tests/Store/Note.h"
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/Testing.h"
 
 namespace corvane::test {
@@ -68,8 +67,7 @@ TEST(DeferredStore, DecidesNothingByWhatAnotherProcessIsAboutToChange) {
     const auto other = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
     Store<VersionEntity> versions(other);
     versions.createTable();
-    ProcessSettings settings;
-    settings.setBusyTimeout(std::chrono::milliseconds(20));
+    StoreConnection::setBusyTimeout(std::chrono::milliseconds(20));
     other->transaction([&] {
         versions.insert({"notes", Note::schemaVersion});
         const CapturedLog log;

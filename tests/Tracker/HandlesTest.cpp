@@ -1,3 +1,4 @@
+#include <corvane/Processing/LoggingEventProcessor.h>
 #include <corvane/Tracker/SessionObserver.h>
 
 #include "tests/support/TrackingFixture.h"
@@ -17,23 +18,21 @@ TEST_F(Handles, ADelayedSubmissionCarriesTheTimeOfTheCallAndGoesOutOnce) {
     const Date after = now();
     while (now() < after + 5ms) {
     }
-    processor->drain();
-    EXPECT_TRUE(processor->events.empty());
+    EXPECT_TRUE(processor->events().empty());
     token->commit();
     token->commit();
-    processor->drain();
-    ASSERT_EQ(processor->events.size(), 1u);
-    EXPECT_LE(processor->events[0].json()["event"]["eventTimestamp"].integer(), millisecondsSince1970(after));
+    ASSERT_EQ(processor->events().size(), 1u);
+    EXPECT_LE(processor->events()[0].json()["event"]["eventTimestamp"].integer(), millisecondsSince1970(after));
 
     auto child = root->chain("child");
     std::weak_ptr<Tracker> weak = child;
     bool called = false;
     const auto orphan = child->delayedSubmit<Mark>([&](const EventSubmitResult&) { called = true; });
-    processor->drain();
+    processor->settle();
     child.reset();
     EXPECT_TRUE(weak.expired()) << "a token does not keep its tracker";
     orphan->commit();
-    processor->drain();
+    processor->settle();
     EXPECT_FALSE(called);
     EXPECT_TRUE(orphan->sealed());
 }
@@ -46,7 +45,7 @@ TEST_F(Handles, BlocksThatRunOnceLetGoOfWhatTheyHold) {
     sessions->endSync();
     root->whenSession([held](AccessTracker&) {});
     sessions->start(Session::Kind::userEvents());
-    processor->drain();
+    processor->settle();
     EXPECT_EQ(held.use_count(), 1);
 }
 
@@ -63,6 +62,7 @@ TEST_F(Handles, MayBeReleasedInEveryOrder) {
         auto observer = child->onSessionChange([](AccessTracker& access, SessionChange) { access.submit<Mark>(); });
         auto token = child->delayedSubmit<Mark>();
         auto access = std::make_unique<AccessTracker>(child);
+        const auto processors = manager->processorManager();
         const std::function<void()> releases[] = {[&] { manager.reset(); }, [&] { parent.reset(); },
                                                   [&] { child.reset(); },   [&] { observer.reset(); },
                                                   [&] { token.reset(); },   [&] { access.reset(); }};
@@ -72,11 +72,16 @@ TEST_F(Handles, MayBeReleasedInEveryOrder) {
             if (observer) observer->disposeOn(std::weak_ptr<const void>());
             if (access) (void)access->tracker();
             if (manager) manager->end();
-            if (child) child->submit<Mark>(), child->push(Screen{"x"});
+            processors->add(std::make_shared<LoggingEventProcessor>());
+            processors->remove(recorder);
+            processors->add(recorder);
+            processors->resumeBackgroundProcessing("another", {});
+            if (child) child->submit<Mark>(), child->push(Screen{"x"}), child->time<Played>(true);
+            if (child) child->whenSession([](AccessTracker&) {}), child->suspend(), child->resume();
             if (parent) parent->enterGroup("g"), parent->submit<Mark>();
         }
         // What was enqueued holds them until it has run: the queue's end is the trackers' end.
-        recorder->drain();
+        recorder->settle();
         ASSERT_TRUE(weakChild.expired() && weakParent.expired());
     } while (std::next_permutation(order.begin(), order.end()));
 }
@@ -87,7 +92,7 @@ TEST_F(Handles, LongChainsManyObserversAndDeepGroupsWork) {
     root->push(Screen{"root"});
     EXPECT_EQ(submit<ScreenView>(tracker), R"({"screen":{"name":"root"}})");
     tracker = root->chain("t");  // the others are released
-    processor->drain();
+    processor->settle();
 
     int changes = 0;
     for (int i = 0; i < 10000; ++i) root->onSessionChange([&](AccessTracker&, SessionChange) { ++changes; });
@@ -98,7 +103,7 @@ TEST_F(Handles, LongChainsManyObserversAndDeepGroupsWork) {
     for (int i = 0; i < 1000; ++i) root->enterGroup(std::to_string(i));
     for (int i = 0; i < 400; ++i) tracker->leaveGroup();
     submit<ScreenView>(tracker);
-    EXPECT_EQ(processor->events.back().groupName(), "599");
+    EXPECT_EQ(processor->events().back().groupName(), "599");
 }
 
 }  // namespace

@@ -129,7 +129,7 @@ class RandomOperations : public TrackingTest {
                         result.succeeded() ? result.event()->json().text() : "! " + std::string(result.error()->what());
                     group = result.succeeded() ? result.event()->groupName().value_or("-") : model.group(at);
                 });
-                processor->drain();
+                processor->settle();
                 EXPECT_EQ(outcome, model.submit(at, time));
                 EXPECT_EQ(group, model.group(at));
             }
@@ -146,9 +146,9 @@ TEST_F(RandomOperations, AgreeWithTheModel) {
     const unsigned seed = given ? static_cast<unsigned>(std::atol(given)) : std::random_device{}();
     std::mt19937 random(seed);
     for (int number = 0; number < 20000 && !HasFailure(); ++number) step(random, number);
-    processor->drain();
-    std::erase_if(processor->calls, [](const auto& call) { return call.starts_with("process") || call == "start"; });
-    EXPECT_TRUE(processor->calls == model.calls) << "not printed: they are many";
+    auto history = processor->history();
+    std::erase_if(history, [](const auto& call) { return call.starts_with("process") || call == "start"; });
+    EXPECT_TRUE(history == model.calls) << "not printed: they are many";
     if (HasFailure()) std::printf("reproduce with CORVANE_TEST_SEED=%u\n", seed);
 }
 

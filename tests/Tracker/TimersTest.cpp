@@ -6,7 +6,7 @@ namespace {
 class Timers : public TrackingTest {
   protected:
     std::optional<std::int64_t> duration(std::size_t index) {
-        return processor->events.at(index).json()["span"]["duration"].integer();
+        return processor->events().at(index).json()["span"]["duration"].integer();
     }
 };
 
@@ -15,18 +15,18 @@ TEST_F(Timers, DropAnOnlyIfTimedSubmissionWithoutOneInSilence) {
     bool called = false;
     const SubmitOptions options{.onlyIfTimed = true, .completion = [&](const EventSubmitResult&) { called = true; }};
     root->submit<Untimed>(options);
-    processor->drain();
+    processor->settle();
     EXPECT_FALSE(called);
     root->time<Untimed>();
     root->submit<Untimed>(options);
     root->submit<Untimed>(options);
-    processor->drain();
+    processor->settle();
     EXPECT_TRUE(called);
-    EXPECT_EQ(processor->events.size(), 2u) << "an event without TimedData leaves the timer running";
+    EXPECT_EQ(processor->events().size(), 2u) << "an event without TimedData leaves the timer running";
     sessions->endSync();
     called = false;
     root->chain("untimed")->submit<Untimed>(options);
-    processor->drain();
+    processor->settle();
     EXPECT_TRUE(called) << "without a session the submission fails before the timer is looked at";
 }
 
@@ -35,19 +35,19 @@ TEST_F(Timers, ThatRestartFollowTheSession) {
     root->time<Played>(true);
     child->time<Played>(true);
     sessions->endSync();
-    ASSERT_EQ(processor->events.size(), 1u) << "the root has no observer: its timer is a plain one";
-    EXPECT_EQ(processor->calls.back(), "end") << "the event belongs to the session that ends";
+    ASSERT_EQ(processor->events().size(), 1u) << "the root has no observer: its timer is a plain one";
+    EXPECT_EQ(processor->history().back(), "end") << "the event belongs to the session that ends";
     EXPECT_GE(*duration(0), 0);
 
     sessions->start(Session::Kind::userEvents());
-    processor->drain();
+    processor->settle();
     child->explicitSubmit<Played>(now() + 5s);
-    processor->drain();
+    processor->settle();
     EXPECT_GE(*duration(1), 4900);
     sessions->endSync();
     sessions->start(Session::Kind::userEvents());
     sessions->endSync();
-    EXPECT_EQ(processor->events.size(), 2u) << "the host's submission ended the timer for good";
+    EXPECT_EQ(processor->events().size(), 2u) << "the host's submission ended the timer for good";
 }
 
 }  // namespace

@@ -2,8 +2,8 @@
 #include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <corvane/Agent/Host/BackgroundTransferSession.h>
-#include <corvane/Transfer/TransferError.h>
 
+#include "tests/support/Outcome.h"
 #include "tests/support/TLSServer.h"
 #include "tests/support/Testing.h"
 
@@ -89,13 +89,7 @@ class InProcessTransferSessionTest : public testing::Test {
         return body();
     }
     static std::string describe(const Recorder::Completion& completion) {
-        if (const auto* error = completion.error ? completion.error->as<TransferError>() : nullptr) {
-            constexpr const char* names[] = {"invalidRequest", "bodyUnavailable", "timedOut",
-                                             "network",        "unreachable",     "blocked"};
-            return names[error->code()];
-        }
-        if (completion.error) return completion.error->what();
-        return completion.response ? std::to_string(completion.response->statusCode) : "nothing";
+        return test::outcome(completion.error, completion.response);
     }
 
     test::TemporaryDocuments documents;

@@ -1,6 +1,5 @@
 #include <corvane/Platform/Error.h>
 #include <corvane/Upload/Endpoint.h>
-#include <corvane/Upload/UploadResponse.h>
 
 #include "tests/support/Testing.h"
 
@@ -22,11 +21,6 @@ TEST(Endpoint, RefusesWhatBreaksOutOfARequestOrOfItsDirectory) {
     EXPECT_THROW(Endpoint(good, "main", {.trustedCertificates = "ca.pem"}), InvalidArgument);
     for (const std::string name : {"", " \n", "..", "a/b"}) EXPECT_THROW(Endpoint(good, name), InvalidArgument) << name;
     EXPECT_EQ(Endpoint(good, "main").sharedContainerIdentifier(), std::nullopt);
-}
-
-TEST(UploadResponse, IsWrittenAsJSON) {
-    const UploadResponse response{429, {{"Retry-After", "\"1\""}}};
-    EXPECT_EQ(response.jsonText(), R"({"statusCode":429,"headers":{"Retry-After":"\"1\""}})");
 }
 
 }  // namespace

@@ -1,6 +1,5 @@
 #include <corvane/Upload/gzip.h>
 
-#include "tests/support/Documents.h"
 #include "tests/support/Testing.h"
 
 #include <random>
@@ -16,7 +15,9 @@ TEST(GZIP, CompressesWholeInputsOfAnySizeOnceAndLeavesNothingAsItIs) {
         for (char& byte : noise) byte = static_cast<char>(random());
         noise[0] = 'n';
         const auto once = gzipCompressed(noise);
-        EXPECT_EQ(gunzip(once), noise) << size;
+        ScriptedServer::Request received;
+        received.body = once;
+        EXPECT_EQ(received.content(), noise) << size;
         EXPECT_EQ(gzipCompressed(once), once);
     }
     EXPECT_EQ(gzipCompressed(""), "");

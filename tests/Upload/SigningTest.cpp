@@ -2,12 +2,12 @@
 #include <corvane/Signing/FileSigningService.h>
 #include <corvane/Signing/SHA1.h>
 #include <corvane/Signing/SigningError.h>
+#include <corvane/Testing/ProcessSettings.h>
 #include <corvane/Upload/OstrelSigner.h>
 
 #include <sys/stat.h>
 
 #include "tests/support/Documents.h"
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/Testing.h"
 
 namespace corvane::test {

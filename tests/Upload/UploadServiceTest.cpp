@@ -1,12 +1,12 @@
+#include <corvane/Testing/ProcessSettings.h>
 #include <corvane/Upload/UploadService.h>
 
 #include <corvane/Platform/MainQueue.h>
+#include <corvane/Testing/FakeTransferSession.h>
 #include <corvane/Transfer/TransferError.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 
-#include "tests/support/FakeTransferSession.h"
-#include "tests/support/ProcessSettings.h"
 #include "tests/support/Testing.h"
 
 namespace corvane {
@@ -91,15 +91,15 @@ TEST_F(UploadServiceTest, OpensItsSessionOnFirstUseAndSubmits) {
     EXPECT_EQ(configuration.ownerKey, UploadService::ownerKey(Endpoint("https://other.example.com", " main ")));
     EXPECT_NE(configuration.ownerKey, UploadService::ownerKey(Endpoint("https://other.example.com", "second")));
 
-    ASSERT_EQ(session->made.size(), 3u);
-    const auto& first = *session->made[0];
+    ASSERT_EQ(session->made().size(), 3u);
+    const auto& first = *session->task(1);
     EXPECT_EQ(first.description(), "A");
-    EXPECT_EQ(first.now, State::running);
+    EXPECT_EQ(first.state(), State::running);
     EXPECT_EQ(first.file, documents / "A");
     EXPECT_EQ(first.request.headers[3].second, "signed body");
-    EXPECT_EQ(session->made[1]->request.headers[3].second, "SigningFailure=no  key: 1");
-    EXPECT_EQ(session->made[2]->request.headers[0].second, "text/x  Evil: 1");
-    EXPECT_TRUE(session->made[2]->request.headers[3].second.starts_with("SigningFailure=cannot read "));
+    EXPECT_EQ(session->task(2)->request.headers[3].second, "SigningFailure=no  key: 1");
+    EXPECT_EQ(session->task(3)->request.headers[0].second, "text/x  Evil: 1");
+    EXPECT_TRUE(session->task(3)->request.headers[3].second.starts_with("SigningFailure=cannot read "));
 }
 
 TEST_F(UploadServiceTest, AsksTheHostForItsHeadersAtEachHandOverAndSendsNoneInPlaceOfItsOwn) {
@@ -117,7 +117,7 @@ TEST_F(UploadServiceTest, AsksTheHostForItsHeadersAtEachHandOverAndSendsNoneInPl
     make(options);
     for (const char* identifier : {"A", "B", "C"}) service->submit(request(identifier));
     const auto added = [&](std::size_t upload) {
-        const auto& headers = session->made.at(upload)->request.headers;
+        const auto& headers = session->made().at(upload)->request.headers;
         return HTTPHeaders(headers.begin() + 4, headers.end());
     };
     EXPECT_EQ(session->configuration.trustedCertificates, "/etc/ca.pem");
@@ -131,12 +131,12 @@ TEST_F(UploadServiceTest, AsksTheHostForItsHeadersAtEachHandOverAndSendsNoneInPl
 
 TEST_F(UploadServiceTest, ReportsEveryEndingOfATask) {
     using Code = TransferError::Code;
-    const auto error = [](Code code) { return AnyError(TransferError(code, "no luck")); };
+    using Outcome = FakeTransferSession::Outcome;
     service->submit(request("A"));
-    session->complete(1, error(Code::network), std::nullopt);
-    session->complete(1, error(Code::blocked), std::nullopt);
-    session->complete(1, std::nullopt, std::nullopt);
-    session->complete(1, std::nullopt, TransferResponse{.isHTTP = false, .statusCode = 200, .headers = {}});
+    session->complete(1, Outcome::failure(Code::network, "no luck"));
+    session->complete(1, Outcome::failure(Code::blocked, "no luck"));
+    session->complete(1, Outcome{});
+    session->complete(1, Outcome{std::nullopt, TransferResponse{.isHTTP = false, .statusCode = 200, .headers = {}}});
     session->complete(1, 204, {{"A", "b"}});
     session->complete(1, 200, {{"A", "b"}, {"B", "\xff"}});
     for (const int status : {401, 404, 503, 302}) session->complete(1, status);
@@ -167,13 +167,13 @@ TEST_F(UploadServiceTest, ResubmitsWhatIsNotRunning) {
     for (const char* identifier : {"running", "suspended", "cancelling", "completed"}) {
         service->submit(request(identifier));
     }
-    session->made[1]->now = State::suspended;
-    session->made[2]->now = State::cancelling;
+    session->task(2)->setState(State::suspended);
+    session->task(3)->setState(State::cancelling);
     session->complete(4, 503);  // still pending when the listing is asked for
     service->resubmit({request("running"), request("suspended"), request("cancelling"), request("completed")});
     queue->sync([] {});
     std::vector<std::string> again;
-    for (std::size_t i = 4; i < session->made.size(); ++i) again.push_back(session->made[i]->description().value());
+    for (std::size_t i = 4; i < session->made().size(); ++i) again.push_back(session->made()[i]->description().value());
     EXPECT_EQ(again, (std::vector<std::string>{"suspended", "cancelling", "completed"}));
 }
 
@@ -190,7 +190,7 @@ TEST_F(UploadServiceTest, CallsTheCompletionsOfAWakeUpOnceInOrderOnTheMainQueue)
     };
     EXPECT_FALSE(wake(0, "other"));
     EXPECT_TRUE(wake(1) && wake(2));
-    EXPECT_EQ(session->wakeUps, 2);
+    EXPECT_EQ(session->wakeUps(), 2);
     session->signalAllEventsDelivered();
     session->signalAllEventsDelivered();
     queue->sync([] {});
@@ -218,7 +218,7 @@ TEST_F(UploadServiceTest, AFactoryThatFailsIsLoggedAndAskedAgain) {
     service->submit(request("A"));
     EXPECT_TRUE(log.has(LogLevel::error, "Upload session could not be created, error=no agent"));
     service->submit(request("A"));
-    EXPECT_EQ(session->made.size(), 1u);
+    EXPECT_EQ(session->made().size(), 1u);
 }
 
 }  // namespace

@@ -2,30 +2,10 @@
 
 #include <openssl/evp.h>
 #include <openssl/pem.h>
-#include <zlib.h>
 
-#include <cstdint>
-#include <cstring>
 #include <memory>
-#include <stdexcept>
 
 namespace corvane::test {
-
-std::string gunzip(const std::string& bytes) {
-    std::uint32_t size = 0;  // stands at the end, in the byte order of most machines
-    if (bytes.size() < sizeof size) throw std::runtime_error("not one whole gzip member");
-    std::memcpy(&size, bytes.data() + bytes.size() - sizeof size, sizeof size);
-    std::string out(size, '\0');
-    z_stream stream{};
-    stream.next_in = reinterpret_cast<Bytef*>(const_cast<char*>(bytes.data()));
-    stream.avail_in = static_cast<uInt>(bytes.size());
-    stream.next_out = reinterpret_cast<Bytef*>(out.data());
-    stream.avail_out = size;
-    const bool isWhole = inflateInit2(&stream, 15 + 16) == Z_OK && inflate(&stream, Z_FINISH) == Z_STREAM_END;
-    inflateEnd(&stream);
-    if (!isWhole || stream.avail_in > 0) throw std::runtime_error("not one whole gzip member");
-    return out;
-}
 
 bool verifies(const std::string& publicPEM, const std::string& digest, const std::string& base64) {
     unsigned char signature[72] = {};  // of 64 bytes, which are 88 characters
@@ -41,15 +21,6 @@ bool verifies(const std::string& publicPEM, const std::string& digest, const std
     return key && EVP_DigestVerifyInit(context.get(), nullptr, nullptr, nullptr, key.get()) == 1 &&
            EVP_DigestVerify(context.get(), signature, 64, reinterpret_cast<const unsigned char*>(digest.data()),
                             digest.size()) == 1;
-}
-
-std::vector<JSON> documentsAt(const ScriptedServer& server) {
-    std::vector<JSON> documents;
-    for (const auto& request : server.requests()) {
-        const bool isWhole = request.header("Content-Length") == std::to_string(request.body.size());
-        if (isWhole) documents.emplace_back(gunzip(request.body));
-    }
-    return documents;
 }
 
 std::multiset<std::string> eventIDs(const std::vector<JSON>& documents) {

@@ -1,6 +1,6 @@
 #include "tests/support/TLSServer.h"
 
-#include "tests/support/TemporaryDocuments.h"
+#include "tests/support/Files.h"
 
 #include <httplib.h>
 

@@ -2,9 +2,11 @@
 
 // What nearly every test needs.
 
-#include "tests/support/CapturedLog.h"
-#include "tests/support/ScriptedServer.h"
-#include "tests/support/TemporaryDocuments.h"
+#include <corvane/Testing/CapturedLog.h>
+#include <corvane/Testing/ScriptedServer.h>
+#include <corvane/Testing/TemporaryDocuments.h>
+
+#include "tests/support/Files.h"
 
 #include <gtest/gtest.h>
 

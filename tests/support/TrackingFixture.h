@@ -2,9 +2,9 @@
 
 #include <corvane/Models/EventData.h>
 #include <corvane/Session/SessionManager.h>
+#include <corvane/Testing/RecordingProcessor.h>
 #include <corvane/Tracker/AccessTracker.h>
 
-#include "tests/support/RecordingProcessor.h"
 #include "tests/support/Testing.h"
 
 namespace corvane::test {
@@ -43,7 +43,7 @@ class TrackingTest : public ::testing::Test {
         tracker->submit<E>([&](const EventSubmitResult& result) {
             outcome = result.succeeded() ? result.event()->json().text() : "! " + std::string(result.error()->what());
         });
-        processor->drain();
+        processor->settle();
         return outcome;
     }
 

@@ -1,12 +1,17 @@
 // The main function of every test program.
-#include "tests/support/ProcessSettings.h"
+
+#include <corvane/Store/StoreConnection.h>
+#include <corvane/Testing/ProcessSettings.h>
 
 #include <gtest/gtest.h>
 
 namespace {
 
 class RestoresSettings final : public ::testing::EmptyTestEventListener {
-    void OnTestStart(const ::testing::TestInfo&) override { corvane::test::ProcessSettings::restoreAll(); }
+    void OnTestStart(const ::testing::TestInfo&) override {
+        corvane::test::ProcessSettings::restoreAll();
+        corvane::StoreConnection::setBusyTimeout(std::chrono::seconds(5));
+    }
 };
 
 }  // namespace

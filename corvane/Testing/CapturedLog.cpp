@@ -1,4 +1,4 @@
-#include "tests/support/CapturedLog.h"
+#include <corvane/Testing/CapturedLog.h>
 
 #include <algorithm>
 #include <chrono>

@@ -3,6 +3,7 @@
 #include <corvane/Platform/Log.h>
 
 #include <condition_variable>
+#include <memory>
 #include <mutex>
 #include <string>
 #include <string_view>
@@ -10,18 +11,27 @@
 
 namespace corvane::test {
 
-/// Takes the library's log while it lives, at debug level, so that a test can look at what was
-/// written.
+/// Takes the library's log while it lives, at every level, so that a test can look at what was written. Nothing is
+/// printed meanwhile; the destructor brings the logger back, at the level of errors. One at a time in a process. All
+/// operations may be called from any thread.
+///
+///     CapturedLog log;
+///     ...
+///     EXPECT_EQ(log.count("without a completion"), 0);
 class CapturedLog {
   public:
+    /// One message, as `Log::Sink` gets it.
     struct Line {
         LogLevel level;
         std::string message;
     };
 
     CapturedLog();
+    CapturedLog(const CapturedLog&) = delete;
+    CapturedLog& operator=(const CapturedLog&) = delete;
     ~CapturedLog();
 
+    /// What was written so far, in order.
     [[nodiscard]] std::vector<Line> lines() const;
     /// How many messages hold `text`, at any level.
     [[nodiscard]] int count(std::string_view text) const;

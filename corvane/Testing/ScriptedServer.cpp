@@ -1,14 +1,17 @@
-#include "tests/support/ScriptedServer.h"
+#include <corvane/Testing/ScriptedServer.h>
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
 #include <strings.h>
 #include <sys/socket.h>
 #include <unistd.h>
+#include <zlib.h>
 
 #include <algorithm>
 #include <chrono>
+#include <cstdint>
 #include <cstdlib>
+#include <cstring>
 #include <stdexcept>
 
 namespace corvane::test {
@@ -57,6 +60,22 @@ std::string ScriptedServer::Request::header(std::string_view name) const {
         if (key.size() == name.size() && strncasecmp(key.data(), name.data(), name.size()) == 0) return value;
     }
     return {};
+}
+
+std::string ScriptedServer::Request::content() const {
+    std::uint32_t size = 0;  // stands at the end, in the byte order of most machines
+    if (body.size() < sizeof size) throw std::runtime_error("not one whole gzip member");
+    std::memcpy(&size, body.data() + body.size() - sizeof size, sizeof size);
+    std::string out(size, '\0');
+    z_stream stream{};
+    stream.next_in = reinterpret_cast<Bytef*>(const_cast<char*>(body.data()));
+    stream.avail_in = static_cast<uInt>(body.size());
+    stream.next_out = reinterpret_cast<Bytef*>(out.data());
+    stream.avail_out = size;
+    const bool isWhole = inflateInit2(&stream, 15 + 16) == Z_OK && inflate(&stream, Z_FINISH) == Z_STREAM_END;
+    inflateEnd(&stream);
+    if (!isWhole || stream.avail_in > 0) throw std::runtime_error("not one whole gzip member");
+    return out;
 }
 
 ScriptedServer::Reply ScriptedServer::Reply::status(int code, const Headers& headers, std::string_view body) {
@@ -131,6 +150,15 @@ void ScriptedServer::release(int replies) {
 std::vector<ScriptedServer::Request> ScriptedServer::requests() const {
     std::lock_guard lock(mutex_);
     return requests_;
+}
+
+std::vector<JSON> ScriptedServer::documents() const {
+    std::vector<JSON> documents;
+    for (const auto& request : requests()) {
+        const bool isWhole = request.header("Content-Length") == std::to_string(request.body.size());
+        if (isWhole) documents.emplace_back(request.content());
+    }
+    return documents;
 }
 
 bool ScriptedServer::waitForRequests(std::size_t count) const {

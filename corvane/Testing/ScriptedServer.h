@@ -1,5 +1,7 @@
 #pragma once
 
+#include <corvane/Models/JSON.h>
+
 #include <condition_variable>
 #include <cstddef>
 #include <deque>
@@ -13,29 +15,38 @@
 
 namespace corvane::test {
 
-/// A small HTTP server on a free port of the loopback address that answers as a test tells it to.
+/// A collector inside the test's process: a small HTTP server on a free port of the loopback address that keeps the
+/// documents it is sent, and answers as a test tells it to.
 ///
 /// It records every request and takes the replies in the order in which they were scripted, one per request; without a
-/// script it answers 200. Every connection has a thread of its own and serves one request after the other. The
-/// destructor closes all connections and joins all threads, also under a transfer. Callable from any thread.
+/// script it answers 200, as a collector does that has taken a document. Every connection has a thread of its own and
+/// serves one request after the other. The destructor closes all connections and joins all threads, also under a
+/// transfer. The constructor throws `std::runtime_error` when the address cannot be listened on. Callable from any
+/// thread.
 ///
 ///     ScriptedServer server;
-///     server.script(Reply::status(503));
-///     upload(server.url("/in"));
+///     server.script(ScriptedServer::Reply::status(503));   // the first document has to be sent again
+///     const Endpoint endpoint(server.url("/in"), "test");
+///     ...                                                  // the host records with an upload processor, and ends
 ///     ASSERT_TRUE(server.waitForRequests(1));
-///     EXPECT_EQ(server.requests()[0].header("Content-Encoding"), "gzip");
+///     server.documents()[0]["data"]["events"][0]["metadata"]["name"].string();   // "ScreenView"
 class ScriptedServer {
   public:
+    /// Names and values, in order.
     using Headers = std::vector<std::pair<std::string, std::string>>;
 
+    /// One request, as it was read.
     struct Request {
         std::string method;
-        std::string path;
+        std::string path;  ///< the target as it stands in the request line, with its query
         Headers headers;
         std::string body;  ///< what was read of it
 
         /// The value of the first header of this name, capitals aside; empty without one.
         [[nodiscard]] std::string header(std::string_view name) const;
+        /// What the gzip compression of the body holds. Throws `std::runtime_error` unless it is one whole member of
+        /// at most 4 GiB.
+        [[nodiscard]] std::string content() const;
     };
 
     /// What happens to one request.
@@ -61,6 +72,7 @@ class ScriptedServer {
         static Reply raw(std::string bytes) { return {.bytes = std::move(bytes), .ending = Ending::close}; }
         /// No answer at all.
         static Reply never() { return {.bytes = {}, .ending = Ending::silence}; }
+        /// The same, when `release` lets it go on.
         [[nodiscard]] Reply hold() const;
     };
 
@@ -69,6 +81,7 @@ class ScriptedServer {
     ScriptedServer& operator=(const ScriptedServer&) = delete;
     ~ScriptedServer();
 
+    /// The URL of a path on this server, for an endpoint: "http://127.0.0.1:<port><path>".
     [[nodiscard]] std::string url(std::string_view path = "/") const;
 
     /// Appends replies for the next requests.
@@ -76,7 +89,11 @@ class ScriptedServer {
     /// Lets this many held requests go on, now or when they are due.
     void release(int replies = 1);
 
+    /// What came so far, in order.
     [[nodiscard]] std::vector<Request> requests() const;
+    /// The documents that came whole, in order, whatever they were answered: a client that was killed may have sent the
+    /// beginning of one, which is left out. Throws `std::runtime_error` for a request that is whole and no document.
+    [[nodiscard]] std::vector<JSON> documents() const;
     /// Waits until this many requests have been read; false when they did not come within ten seconds.
     [[nodiscard]] bool waitForRequests(std::size_t count) const;
 
