@@ -57,8 +57,8 @@ void FakeTransferSession::Task::resume() {
 
 TransferSession::Factory FakeTransferSession::factory(std::shared_ptr<FakeTransferSession>& opened,
                                                       std::vector<Outcome> script) {
-    return [&opened, script = std::move(script)](auto configuration, auto delegate, auto queue) {
-        opened = std::make_shared<FakeTransferSession>(configuration, delegate, queue);
+    return [&opened, script = std::move(script)](auto given, auto delegate, auto queue) {
+        opened = std::make_shared<FakeTransferSession>(given, delegate, queue);
         for (const auto& outcome : script) opened->script(outcome);
         return opened;
     };
