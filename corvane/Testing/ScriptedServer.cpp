@@ -226,8 +226,8 @@ bool ScriptedServer::answer(int connection, const Reply& reply) {
         case Ending::reset: {
             sockaddr unspecified{};
             unspecified.sa_family = AF_UNSPEC;
-            connect(connection, &unspecified,
-                    sizeof unspecified);  // disconnects with a reset, and keeps the descriptor
+            // Disconnects with a reset, and keeps the descriptor.
+            static_cast<void>(connect(connection, &unspecified, sizeof unspecified));
             return false;
         }
         case Ending::endless:
