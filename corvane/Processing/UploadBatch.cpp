@@ -23,7 +23,11 @@ bool fit(const EncodedEvents& first, const EncodedEvents& second) {
 
 void UploadBatch::append(const JSON& payload, const JSON& session) {
     if (parts_.empty() || isFull(*parts_.back().events)) {
-        parts_.push_back({newUUID(), session, std::make_shared<EncodedEvents>()});
+        // A part is never empty, not even without memory: a document would have a gap.
+        Part added{newUUID(), session, std::make_shared<EncodedEvents>()};
+        added.events->append(payload);
+        parts_.push_back(std::move(added));
+        return;
     }
     Part& part = parts_.back();
     part.events->append(payload);

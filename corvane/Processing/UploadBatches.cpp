@@ -112,7 +112,13 @@ void UploadBatches::process(const ProcessEvent& processEvent) {
 }
 
 void UploadBatches::add(const UploadBatchQueueKey& key, const JSON& payload) {
-    batchQueues_[key].append(payload, currentSession_->sessionData);
+    if (const auto found = batchQueues_.find(key); found != batchQueues_.end()) {
+        found->second.append(payload, currentSession_->sessionData);
+    } else {
+        UploadBatch batch;
+        batch.append(payload, currentSession_->sessionData);
+        batchQueues_.emplace(key, std::move(batch));
+    }
     writeAtEndOfRun();
 }
 

@@ -1,3 +1,5 @@
+#include <corvane/Session/ActiveSession.h>
+
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {
@@ -77,6 +79,16 @@ TEST_F(SessionManagerTest, EndSyncDoesNothingWhileSuspended) {
     EXPECT_EQ(processor->history(), (std::vector<std::string>{"start"}));
     sessions->endSync();
     EXPECT_EQ(processor->history().back(), "end");
+}
+
+TEST(ActiveSession, KeepsItsLatestEventsAndCountsAll) {
+    ActiveSession session("id", Session::Kind::userEvents(), Date());
+    const std::size_t all = ActiveSession::keptEvents + 2;
+    for (std::size_t i = 0; i < all; ++i) session.append({std::to_string(i), JSON("{}"), std::nullopt});
+    EXPECT_EQ(session.eventCount(), all);
+    EXPECT_EQ(session.events().size(), ActiveSession::keptEvents);
+    EXPECT_EQ(session.events().front().name(), "2");
+    EXPECT_EQ(session.events().back().name(), std::to_string(all - 1));
 }
 
 }  // namespace
