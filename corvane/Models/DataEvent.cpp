@@ -48,13 +48,11 @@ void AnyDataEvent::destroy(const Base* box) noexcept {
     delete box;
 }
 
-JSON AnyDataEvent::toDict() const {
-    const AnyDataEvent held(*this);  // the host's code may replace this object
-    const Base* const box = held.box_;
-    if (const JSON* dict = box->dict.load(std::memory_order_acquire)) return *dict;
-    auto made = std::make_unique<const JSON>(box->makeDict());
+const JSON& AnyDataEvent::dict() const {
+    if (const JSON* dict = box_->dict.load(std::memory_order_acquire)) return *dict;
+    auto made = std::make_unique<const JSON>(box_->makeDict());
     const JSON* first = nullptr;
-    if (!box->dict.compare_exchange_strong(first, made.get(), std::memory_order_acq_rel)) return *first;
+    if (!box_->dict.compare_exchange_strong(first, made.get(), std::memory_order_acq_rel)) return *first;
     return *made.release();
 }
 

@@ -102,7 +102,12 @@ class CORVANE_EXPORT AnyDataEvent {
     }
 
     /// The data event as a JSON object. Throws as the free function `toDict` does, each time anew.
-    [[nodiscard]] JSON toDict() const;
+    [[nodiscard]] JSON toDict() const {
+        return AnyDataEvent(*this).dict();
+    }  // a copy: the host's code may replace this
+    /// The same without a copy. Good as long as a copy of this object.
+    /// Requires: the data event's own code does not change this object.
+    [[nodiscard]] const JSON& dict() const;
 
     [[nodiscard]] DataType type() const { return box_->type(); }
 

@@ -225,10 +225,6 @@ const std::string& JSON::text() const {
     return storage_->text;
 }
 
-JSON JSON::compacted() const {
-    return OwnJSON::is(*this) ? OwnJSON::of(text()) : fromEncodedText(text());
-}
-
 std::string JSON::description() const {
     const auto* value = storage_->value();
     return value ? jsontree::describe(*value) : "nil";

@@ -102,9 +102,6 @@ class CORVANE_EXPORT JSON {
     /// as a copy of this object.
     [[nodiscard]] const std::string& text() const;
 
-    /// The same value, sharing nothing: a tree that somebody's look into this one makes does not stay with it.
-    [[nodiscard]] JSON compacted() const;
-
     /// The value as a person reads it in a log: objects as `["key": value, ...]`, `[:]` when empty, strings in quotes.
     [[nodiscard]] std::string description() const;
 

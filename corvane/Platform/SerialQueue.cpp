@@ -379,7 +379,13 @@ bool SerialQueue::isCurrent() const noexcept {
 }
 
 void SerialQueue::assertCurrent(const char* operation) const {
-    CORVANE_REQUIRE(isCurrent(), std::string(operation) + " must run on queue " + label());
+    // By itself, without what a message takes: every step of an event asks.
+    if (!isOn(state_.get())) [[unlikely]]
+        failElsewhere(operation);
+}
+
+void SerialQueue::failElsewhere(const char* operation) const {
+    fail(std::string(operation) + " must run on queue " + label());
 }
 
 void SerialQueue::assertNotCurrent(const char* operation) const {

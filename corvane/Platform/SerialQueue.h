@@ -113,6 +113,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
         void (*call)(void*);
     };
 
+    [[noreturn]] void failElsewhere(const char* operation) const;
     void enqueue(Task&& task, bool isAhead);
     void runSync(FunctionRef function);
 

@@ -4,12 +4,10 @@
 #include <corvane/Platform/ForkMark.h>
 
 #include <unistd.h>
-#include <boost/uuid/random_generator.hpp>
 
 #include <array>
 #include <cerrno>
-#include <cstdint>
-#include <limits>
+#include <cstddef>
 
 namespace corvane {
 
@@ -19,42 +17,47 @@ namespace {
 /// of its event. A child made by fork reads anew, so that it never repeats its parent's.
 class Entropy {
   public:
-    using result_type = std::uint64_t;
-    static constexpr result_type min() { return 0; }
-    static constexpr result_type max() { return std::numeric_limits<result_type>::max(); }
+    using Bytes = std::array<unsigned char, 16>;
 
-    result_type operator()() {
-        if (used_ == words_.size() || read_.isInChild()) read();
-        return words_[used_++];
+    const Bytes& next() {
+        if (used_ == ahead_.size() || read_.isInChild()) read();
+        return ahead_[used_++];
     }
 
   private:
     void read() {
-        if (getentropy(words_.data(), sizeof words_) != 0) throw SystemError("read entropy", errno);
+        if (getentropy(ahead_.data(), sizeof ahead_) != 0) throw SystemError("read entropy", errno);
         used_ = 0;
         read_ = ForkMark();
     }
 
-    std::array<result_type, 32> words_{};  // as much as one call gives
-    std::size_t used_ = words_.size();
+    std::array<Bytes, 16> ahead_{};  // as much as one call gives
+    std::size_t used_ = ahead_.size();
     ForkMark read_;
 };
 
-thread_local Entropy entropy;
+thread_local Entropy entropy;  // nothing is destroyed with its thread, where others' last words may need it
 
 }  // namespace
 
 std::string newUUID() {
-    const boost::uuids::uuid uuid = boost::uuids::basic_random_generator<Entropy>(entropy)();
-    constexpr char digits[] = "0123456789ABCDEF";
-    std::string text(36, '-');
-    char* out = text.data();
-    for (std::size_t i = 0; i < uuid.size(); ++i) {
-        if (i == 4 || i == 6 || i == 8 || i == 10) ++out;
-        *out++ = digits[uuid.data[i] >> 4];
-        *out++ = digits[uuid.data[i] & 0xF];
-    }
+    std::string text;
+    appendUUID(text);
     return text;
+}
+
+void appendUUID(std::string& out) {
+    Entropy::Bytes bytes = entropy.next();
+    bytes[6] = static_cast<unsigned char>((bytes[6] & 0x0F) | 0x40);  // version 4: random
+    bytes[8] = static_cast<unsigned char>((bytes[8] & 0x3F) | 0x80);  // the variant of RFC 4122
+    constexpr char digits[] = "0123456789ABCDEF";
+    constexpr std::array<std::size_t, 16> places{0, 2, 4, 6, 9, 11, 14, 16, 19, 21, 24, 26, 28, 30, 32, 34};
+    char text[] = "00000000-0000-0000-0000-000000000000";
+    for (std::size_t i = 0; i < places.size(); ++i) {
+        text[places[i]] = digits[bytes[i] >> 4];
+        text[places[i] + 1] = digits[bytes[i] & 0xF];
+    }
+    out.append(text, sizeof text - 1);
 }
 
 bool isUUID(std::string_view text) noexcept {

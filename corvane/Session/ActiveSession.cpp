@@ -11,7 +11,16 @@ ActiveSession::~ActiveSession() = default;
 void ActiveSession::append(const ProcessEvent& event) {
     ++eventCount_;
     if (events_.size() == keptEvents) events_.pop_front();
-    events_.emplace_back(event.name(), event.json().compacted(), event.groupName());
+    events_.push_back({event.name(), event.json().text(), event.groupName()});
+}
+
+std::vector<ProcessEvent> ActiveSession::events() const {
+    std::vector<ProcessEvent> events;
+    events.reserve(events_.size());
+    for (const auto& [name, json, groupName] : events_) {
+        events.emplace_back(name, JSON::fromEncodedText(json), groupName);
+    }
+    return events;
 }
 
 }  // namespace corvane

@@ -7,7 +7,9 @@
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <optional>
 #include <string>
+#include <vector>
 
 namespace corvane {
 
@@ -27,18 +29,25 @@ class ActiveSession final : public ActiveSessionType {
     static constexpr std::size_t keptEvents = 10'000;
 
     /// The latest ones, in hand-over order.
-    [[nodiscard]] const std::deque<ProcessEvent>& events() const { return events_; }
+    [[nodiscard]] std::vector<ProcessEvent> events() const;
     /// How many there were, those included that are not kept any more.
     [[nodiscard]] std::uint64_t eventCount() const { return eventCount_; }
 
-    /// Keeps an event in its compact form, in place of the oldest one when there are too many.
+    /// Keeps an event, in place of the oldest one when there are too many.
     void append(const ProcessEvent& event);
 
   private:
+    /// Text of its own: what somebody's look into an event's JSON makes does not stay with the session.
+    struct KeptEvent {
+        std::string name;
+        std::string json;
+        std::optional<std::string> groupName;
+    };
+
     const std::string identifier_;
     const Session::Kind kind_;
     const Date startDate_;
-    std::deque<ProcessEvent> events_;
+    std::deque<KeptEvent> events_;
     std::uint64_t eventCount_ = 0;
 };
 

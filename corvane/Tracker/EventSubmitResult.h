@@ -35,8 +35,8 @@ class DelayedToken {
 /// The outcome of a submission: the event that was handed on, or the error that stopped it.
 class EventSubmitResult {
   public:
-    [[nodiscard]] static EventSubmitResult success(ProcessEvent event) { return EventSubmitResult(std::move(event)); }
-    [[nodiscard]] static EventSubmitResult failed(AnyError error) { return EventSubmitResult(std::move(error)); }
+    [[nodiscard]] static EventSubmitResult success(ProcessEvent event) { return {std::in_place, std::move(event)}; }
+    [[nodiscard]] static EventSubmitResult failed(AnyError error) { return {std::in_place, std::move(error)}; }
 
     [[nodiscard]] bool succeeded() const { return event() != nullptr; }
     /// The event of a success, or nullptr.
@@ -47,7 +47,7 @@ class EventSubmitResult {
 
   private:
     template <class V>
-    explicit EventSubmitResult(V value) : value_(std::move(value)) {}
+    EventSubmitResult(std::in_place_t, V&& value) : value_(std::forward<V>(value)) {}
 
     std::variant<ProcessEvent, AnyError> value_;
 };

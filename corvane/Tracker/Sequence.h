@@ -1,21 +1,27 @@
 #pragma once
 
 #include <corvane/Models/DataEvent.h>
+#include <corvane/Tracker/EventIdentity.h>
 
+#include <boost/container/small_vector.hpp>
+
+#include <memory>
+#include <optional>
 #include <string_view>
-#include <vector>
 
 namespace corvane {
 
 /// A property of an event with the data that fills it. The name is the declaration's, which must outlive the entry.
 struct SequenceEntry {
     std::string_view name;
-    AnyDataEvent data;
+    std::optional<AnyDataEvent> data;  ///< nothing stands for the event's own identity
 };
 
 /// A resolved event: its entries in declaration order.
 struct Sequence {
-    std::vector<SequenceEntry> entries;
+    boost::container::small_vector<SequenceEntry, 8> entries;
+    std::shared_ptr<const EventIdentity> identity;  ///< where an entry stands for it
+    Date submitTime;
 };
 
 /// The event's JSON: one object, flat at its top, with the object of each entry under the entry's name. Of two entries

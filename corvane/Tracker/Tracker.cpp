@@ -4,7 +4,6 @@
 #include <corvane/Models/EventMirrorStore.h>
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/StringMap.h>
-#include <corvane/Platform/UUID.h>
 #include <corvane/Snapshot/Snapshot.h>
 #include <corvane/Tracker/AccessTracker.h>
 #include <corvane/Tracker/ActiveSessionType.h>
@@ -24,7 +23,7 @@ struct Tracker::Scope {
     StringMap<EventSubmit> restartTimers;
     DataEventStacks dataStacks;
     std::vector<Group> groupStack;
-    std::string eventPath;  // made with the first event
+    std::shared_ptr<const EventIdentity> identity;  // of the session that the latest event was in
 };
 
 Tracker::Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue,
@@ -88,10 +87,11 @@ std::vector<std::string> Tracker::path() const {
 void Tracker::submit(EventSubmit event, Date submitTime, SubmitOptions options) {
     accessQueue_->asyncInRun(
         [self = shared_from_this(), event = std::move(event), submitTime, options = std::move(options)]() mutable {
-            auto result = self->performSubmit(event, submitTime, options.onlyIfTimed);
-            if (!result || !options.completion) return;
+            if (options.onlyIfTimed && self->isUntimed(event)) return;
+            auto result = self->performSubmit(event, submitTime);
+            if (!options.completion) return;
             self->accessQueue_->atEndOfRun(SerialQueue::RunEnd::report,
-                                           [completion = std::move(options.completion), result = *std::move(result)] {
+                                           [completion = std::move(options.completion), result = std::move(result)] {
                                                callHost("submit completion", [&] { completion(result); });
                                            });
         });
@@ -169,58 +169,60 @@ void Tracker::resume() {
     if (const auto delegate = delegate_.lock()) delegate->resume();
 }
 
-std::optional<EventSubmitResult> Tracker::performSubmit(const EventSubmit& event, Date submitTime, bool onlyIfTimed) {
+bool Tracker::isUntimed(const EventSubmit& event) const {
     accessQueue_->assertCurrent("Tracker submission");
     const auto delegate = delegate_.lock();
-    if (delegate && delegate->activeSession() && onlyIfTimed && !scope_->timers.contains(event.name())) {
-        return std::nullopt;
-    }
-    return process(event, submitTime, delegate.get());
+    return delegate && delegate->activeSession() && !scope_->timers.contains(event.name());
 }
 
 void Tracker::submitNow(const EventSubmit& event, Date submitTime, const SubmitOptions& options) {
     accessQueue_->assertCurrent("Tracker submission");
     accessQueue_->endRun();  // what was submitted before is told before
-    const auto result = performSubmit(event, submitTime, options.onlyIfTimed);
+    if (options.onlyIfTimed && isUntimed(event)) return;
+    const auto result = performSubmit(event, submitTime);
     accessQueue_->endRun();
-    if (result && options.completion) callHost("submit completion", [&] { options.completion(*result); });
+    if (options.completion) callHost("submit completion", [&] { options.completion(result); });
 }
 
-EventSubmitResult Tracker::process(const EventSubmit& event, Date submitTime, TrackerDelegate* delegate) {
+EventSubmitResult Tracker::performSubmit(const EventSubmit& event, Date submitTime) {
+    const auto delegate = delegate_.lock();
     const ActiveSessionType* session = delegate ? delegate->activeSession() : nullptr;
     if (!session) return EventSubmitResult::failed(AnyError(TrackerError::withoutSession()));
     try {
-        // A document could not say what the event is called, and the event would be lost behind its success.
-        if (!jsontext::isUTF8(event.name())) throw EncodingError(EncodingError::notUTF8, "metadata.name");
-        const EventMirrorProperties properties = event.properties(*eventMirrorStore_);
-        const Sequence sequence = resolve(*properties, event, submitTime, session->identifier());
-        ProcessEvent processEvent(std::string(event.name()), encode(sequence), groupName());
-        delegate->process(processEvent);
-        return EventSubmitResult::success(std::move(processEvent));
+        return EventSubmitResult::success(process(event, submitTime, *delegate, session->identifier()));
     } catch (...) {
         return EventSubmitResult::failed(AnyError::current());
     }
 }
 
+ProcessEvent Tracker::process(const EventSubmit& event, Date submitTime, TrackerDelegate& delegate,
+                              const std::string& sessionID) {
+    // A document could not say what the event is called, and the event would be lost behind its success.
+    if (!jsontext::isUTF8(event.name())) throw EncodingError(EncodingError::notUTF8, "metadata.name");
+    const EventMirrorProperties properties = event.properties(*eventMirrorStore_);
+    ProcessEvent processEvent(std::string(event.name()), encode(resolve(*properties, event, submitTime, sessionID)),
+                              groupName());
+    delegate.process(processEvent);
+    return processEvent;
+}
+
 Sequence Tracker::resolve(const std::vector<EventMirrorProperty>& properties, const EventSubmit& event, Date submitTime,
                           const std::string& sessionID) {
-    Sequence sequence;
+    Sequence sequence{{}, {}, submitTime};
     std::vector<TrackerError::MissingData> missing;
-    std::optional<AnyDataEvent> identity;
-    sequence.entries.reserve(properties.size());
     for (const auto& [name, property] : properties) {
-        std::optional<AnyDataEvent> data;
-        if (!property->isOptional() && property->isDataType(DataType::of<EventData>())) {
-            if (!identity) identity.emplace(EventData{newUUID(), submitTime, eventPath(), sessionID});
-            data = identity;
-        } else if (!property->isOptional()) {
-            data = span(*property, event, submitTime);
+        const bool isRequired = !property->isOptional();
+        if (isRequired && property->isDataType(DataType::of<EventData>())) {
+            sequence.identity = identity(sessionID);
+            sequence.entries.push_back({name, std::nullopt});
+            continue;
         }
+        auto data = isRequired ? span(*property, event, submitTime) : std::nullopt;
         if (!data) data = lookup(property->dataKey());
         if (data && !property->isDataType(data->type())) reportOtherType(name, *property, data->type());
         if (data) {
-            sequence.entries.push_back({name, *std::move(data)});
-        } else if (!property->isOptional()) {
+            sequence.entries.push_back({name, std::move(data)});
+        } else if (isRequired) {
             missing.push_back({name, property->dataType(), std::string(property->dataKey())});
         }
     }
@@ -273,12 +275,14 @@ std::optional<std::string> Tracker::groupName() {
     return std::nullopt;
 }
 
-const std::string& Tracker::eventPath() {
-    accessQueue_->assertCurrent("Tracker path");
-    if (scope_->eventPath.empty()) {
-        for (const auto& component : path()) scope_->eventPath += "/" + component;
+std::shared_ptr<const EventIdentity> Tracker::identity(const std::string& sessionID) {
+    accessQueue_->assertCurrent("Tracker identity");
+    if (!scope_->identity || scope_->identity->sessionID() != sessionID) {
+        std::string eventPath;
+        for (const auto& component : path()) eventPath += "/" + component;
+        scope_->identity = std::make_shared<const EventIdentity>(eventPath, sessionID);
     }
-    return scope_->eventPath;
+    return scope_->identity;
 }
 
 void Tracker::performTime(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession) {
@@ -367,7 +371,7 @@ void Tracker::react(SessionChange change) {
         if (change == SessionChange::didStart) {
             performTime(event, now(), true);
         } else {
-            static_cast<void>(performSubmit(event, now(), true));
+            if (!isUntimed(event)) performSubmit(event, now());
             scope_->restartTimers.insert_or_assign(name, event);
         }
     }

@@ -26,6 +26,7 @@ namespace corvane {
 class AccessTracker;
 class SessionObserver;
 class TrackerDelegate;
+class EventIdentity;
 struct Sequence;
 struct SnapshotLevel;
 struct TrackerTimer;
@@ -163,9 +164,10 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     static void release(Tracker* tracker) noexcept;
 
     // On the queue.
-    /// Resolves, validates and hands on. Nothing, where `onlyIfTimed` asks for a timer that does not run.
-    [[nodiscard]] std::optional<EventSubmitResult> performSubmit(const EventSubmit& event, Date submitTime,
-                                                                 bool onlyIfTimed);
+    /// Whether a session is active and no timer runs that the submission asks for.
+    [[nodiscard]] bool isUntimed(const EventSubmit& event) const;
+    /// Resolves, validates and hands on.
+    EventSubmitResult performSubmit(const EventSubmit& event, Date submitTime);
     /// The whole submission in one piece, with its writes and its completion.
     void submitNow(const EventSubmit& event, Date submitTime, const SubmitOptions& options);
     void performTime(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession);
@@ -177,14 +179,15 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     void react(SessionChange change);
     [[nodiscard]] std::vector<SnapshotLevel> levels(SnapshotPolicy policy);
 
-    EventSubmitResult process(const EventSubmit& event, Date submitTime, TrackerDelegate* delegate);
+    ProcessEvent process(const EventSubmit& event, Date submitTime, TrackerDelegate& delegate,
+                         const std::string& sessionID);
     Sequence resolve(const std::vector<EventMirrorProperty>& properties, const EventSubmit& event, Date submitTime,
                      const std::string& sessionID);
     std::optional<AnyDataEvent> span(const EventPropertyType& property, const EventSubmit& event, Date submitTime);
     std::optional<AnyDataEvent> lookup(std::string_view key);
     void reportOtherType(std::string_view name, const EventPropertyType& property, DataType found);
     std::optional<std::string> groupName();
-    const std::string& eventPath();
+    std::shared_ptr<const EventIdentity> identity(const std::string& sessionID);
 
     const std::string name_;
     const std::shared_ptr<SerialQueue> accessQueue_;
