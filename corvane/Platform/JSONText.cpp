@@ -137,12 +137,13 @@ bool appendString(std::string& out, std::string_view text) {
 bool isUTF8(std::string_view text) {
     const auto* s = reinterpret_cast<const unsigned char*>(text.data());
     const auto* const end = s + text.size();
-    while (s != end) {
+    for (;;) {
+        s = endOfPlain(s, end);
+        if (s == end) return true;
         const std::size_t length = *s < 0x80 ? 1 : sequenceLength(s, end);
         if (length == 0) return false;
         s += length;
     }
-    return true;
 }
 
 bool appendDouble(std::string& out, double number) {

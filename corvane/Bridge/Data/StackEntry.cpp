@@ -11,22 +11,24 @@ namespace corvane::bridge {
 
 namespace {
 
-/// Converted data, with the texts that its entry refers to.
-struct Converted {
+/// What was asked of a data event, with the texts that its entry refers to.
+struct Asked {
     JSON toDict() const {
         if (const auto* error = std::get_if<AnyError>(&dict)) error->rethrow();
+        if (const auto* plain = std::get_if<HostValue::Dictionary>(&dict)) return detail::toJsonObject(*plain);
         return std::get<JSON>(dict);
     }
     static constexpr bool isEncodedByLibrary = true;
 
     std::string key;
     std::optional<std::string> file;
-    std::variant<JSON, AnyError> dict;
+    /// A dictionary whose conversion cannot fail and asks nobody is left to the first event that needs it.
+    std::variant<HostValue::Dictionary, JSON, AnyError> dict;
 };
 
-AnyDataEventEntry entryOf(Converted converted, DataEventTraits traits, const char* file, std::uint_least32_t line) {
-    AnyDataEvent data(std::move(converted));
-    const auto* held = data.as<Converted>();
+AnyDataEventEntry entryOf(Asked asked, DataEventTraits traits, const char* file, std::uint_least32_t line) {
+    AnyDataEvent data(std::move(asked));
+    const auto* held = data.as<Asked>();
     const std::string_view key = held->key;
     if (held->file) file = held->file->c_str();
     return {key, std::move(data), traits, file, line};
@@ -43,18 +45,23 @@ std::string nameOf(const std::shared_ptr<const BridgedDataEventType>& data) {
 
 AnyDataEventEntry stackEntry(const std::shared_ptr<const BridgedDataEventType>& data, BridgedDataEventTraits traits,
                              Place place, std::optional<AnyError>& failure) {
-    Converted converted{nameOf(data), std::move(place.ownFile), JSON::fromEncodedText({})};
+    Asked asked{nameOf(data), std::move(place.ownFile), {}};
     try {
-        converted.dict = BridgedDataEvent(data).toDict();
+        auto dictionary = data->toDict();
+        if (detail::isPlain(dictionary)) {
+            asked.dict = std::move(dictionary);
+        } else {
+            asked.dict = detail::toJsonObject(dictionary);
+        }
     } catch (...) {
         failure = AnyError::current();
-        converted.dict = *failure;
+        asked.dict = *failure;
     }
-    return entryOf(std::move(converted), traits.traits(), place.file, place.line);
+    return entryOf(std::move(asked), traits.traits(), place.file, place.line);
 }
 
 DataType stackEntryType() {
-    return DataType::of<Converted>();
+    return DataType::of<Asked>();
 }
 
 AnyDataEventEntry sessionEntry(const BridgedSessionData& data, BridgedDataEventTraits traits) {

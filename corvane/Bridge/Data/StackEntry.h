@@ -22,8 +22,8 @@ struct Place {
     std::uint_least32_t line = 0;
 };
 
-/// An entry for a tracker's stack, converted here and now: the host's object is asked on the caller's thread, and never
-/// again. Throws `BridgeError` when there is no data or its name cannot be used. Data that cannot become JSON gives an
+/// An entry for a tracker's stack, asked for here and now: the host's objects are asked on the caller's thread, and
+/// never again. Throws `BridgeError` when there is no data or its name cannot be used. Data that cannot become JSON gives an
 /// entry all the same, with its error in `failure`: it takes its place on the stack and fails the events that find it,
 /// as typed data does, since events must not go out with the data that it was to hide.
 [[nodiscard]] AnyDataEventEntry stackEntry(const std::shared_ptr<const BridgedDataEventType>& data,

@@ -5,6 +5,7 @@
 #include <corvane/Models/Encoder.h>
 
 #include <algorithm>
+#include <cmath>
 #include <string_view>
 #include <unordered_map>
 #include <utility>
@@ -169,6 +170,35 @@ class Converter {
     int objects_ = 0;  // whose conversion is under way
 };
 
+bool isPlainValue(const HostValue& value, int depth);
+
+/// @param depth the levels that there may be, this one counted
+bool isPlainDictionary(const HostValue::Dictionary& dictionary, int depth) {
+    const auto& entries = dictionary.entries();
+    return depth > 0 && std::all_of(entries.begin(), entries.end(), [&](const auto& entry) {
+               const std::string* key = entry.key.string();
+               return key && jsontext::isUTF8(*key) && isPlainValue(entry.value, depth - 1);
+           });
+}
+
+bool isPlainValue(const HostValue& value, int depth) {
+    switch (value.kind()) {
+        case HostValue::Kind::real:
+            return std::isfinite(*value.double_());
+        case HostValue::Kind::string:
+            return jsontext::isUTF8(*value.string());
+        case HostValue::Kind::array:
+            return depth > 0 && std::all_of(value.array()->begin(), value.array()->end(),
+                                            [&](const auto& element) { return isPlainValue(element, depth - 1); });
+        case HostValue::Kind::dictionary:
+            return isPlainDictionary(*value.dictionary(), depth);
+        case HostValue::Kind::object:
+            return false;
+        default:
+            return true;
+    }
+}
+
 }  // namespace
 
 JSON toJsonValue(const HostValue& value) {
@@ -193,6 +223,10 @@ std::optional<std::string> toDataWithOptions(const JSON& json, JSONWritingOption
         if (error) *error = BridgedError::of(AnyError::current());
         return std::nullopt;
     }
+}
+
+bool detail::isPlain(const HostValue::Dictionary& dictionary) {
+    return isPlainDictionary(dictionary, jsontext::maximumDepth);
 }
 
 JSON detail::toJsonObject(const HostValue::Dictionary& dictionary) {

@@ -156,6 +156,8 @@ namespace detail {
 /// The dictionary of an object-facing data event. As `toJsonValue`, but its values are what JSON knows or objects that
 /// convert themselves: a data event among them throws `DataEventError::dataNotSerializable`.
 [[nodiscard]] JSON toJsonObject(const HostValue::Dictionary& dictionary);
+/// Whether that is known to succeed without asking any object, so that it may as well be done later, on another thread.
+[[nodiscard]] bool isPlain(const HostValue::Dictionary& dictionary);
 }  // namespace detail
 
 }  // namespace corvane
