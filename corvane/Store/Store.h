@@ -58,19 +58,6 @@ class Store {
     [[nodiscard]] std::vector<Entity> fetchWhere(std::string_view column, const StorableValue& value) {
         return fetch(table().selectSQL(column, value));
     }
-    /// All records that can be read; of each other one `unreadable` is told the error, and it stays where it is.
-    template <class Unreadable>
-    [[nodiscard]] std::vector<Entity> fetchReadable(Unreadable&& unreadable) {
-        std::vector<Entity> entities;
-        connection_->query(table().selectSQL(), [&](StoreStepper& stepper) {
-            try {
-                entities.push_back(Entity::read(stepper));
-            } catch (const StoreStepperError& error) {
-                unreadable(error);
-            }
-        });
-        return entities;
-    }
     /// The key of every record as text, in the order in which they were written last. Reads nothing else of them.
     [[nodiscard]] std::vector<std::string> keys() {
         std::vector<std::string> keys;

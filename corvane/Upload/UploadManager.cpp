@@ -128,33 +128,66 @@ UploadTaken UploadManager::record(const SignedEntity& entity, const UploadReques
 void UploadManager::requeueCancelledRequests() {
     if (std::exchange(retriedIncompleteRequests_, true)) return;
     try {
+        listStoredRequests();
         retryStoredRequests();
     } catch (...) {
         Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", AnyError::current().what());
     }
 }
 
-void UploadManager::retryStoredRequests() {
-    auto entities = deferredStore_->perform([](Rows& rows) {
-        return rows.fetchReadable([](const StoreStepperError& error) {
-            Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", error.what());
-        });
+// Whoever waits for delivery waits for all of them, so that all are entered here.
+void UploadManager::listStoredRequests() {
+    const auto stored = deferredStore_->perform([](Rows& rows) { return rows.keys(); });
+    if (ledger_) {
+        for (const auto& identifier : stored) ledger_->addEarlier(identifier);
+    }
+    backlog_.add(stored);
+    queue_.async([weak = weak_from_this()] {
+        if (const auto manager = weak.lock()) manager->removeOrphans();
     });
-    removeOrphans();
-    std::vector<SignedEntity> kept;
-    for (auto& entity : entities) {
-        if (ledger_) ledger_->addEarlier(entity.identifier);
-        if (entity.retries > maximumRetries) {
-            dropExceeded(entity);
+}
+
+void UploadManager::retryStoredRequests() {
+    const auto identifiers = backlog_.take();
+    std::vector<PreparedUploadRequest> requests;
+    bool isMoreReady = false;
+    for (const auto& identifier : identifiers) {
+        const auto row = storedRow(identifier);
+        auto request = row ? retryRequest(*row) : std::nullopt;
+        if (request) {
+            requests.push_back(*std::move(request));
         } else {
-            kept.push_back(std::move(entity));
+            isMoreReady = backlog_.end(identifier);
         }
     }
-    std::vector<PreparedUploadRequest> requests;
-    for (const auto& entity : kept) {
-        if (auto request = preparedRequest(entity)) requests.push_back(*std::move(request));
-    }
     service_->resubmit(std::move(requests));
+    if (isMoreReady) retryStoredRequestsLater();
+}
+
+void UploadManager::retryStoredRequestsLater() {
+    queue_.async([weak = weak_from_this()] {
+        const auto manager = weak.lock();
+        if (!manager) return;
+        manager->queue_.assertCurrent("UploadManager::retryStoredRequests");
+        manager->retryStoredRequests();
+    });
+}
+
+std::optional<SignedEntity> UploadManager::storedRow(const std::string& identifier) {
+    try {
+        auto found = deferredStore_->perform([&](Rows& rows) { return rows.fetchWhere("identifier", identifier); });
+        if (!found.empty()) return std::move(found.front());
+    } catch (...) {
+        Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", AnyError::current().what());
+    }
+    if (ledger_) ledger_->remove(identifier);  // another process's, or nobody's
+    return std::nullopt;
+}
+
+std::optional<PreparedUploadRequest> UploadManager::retryRequest(const SignedEntity& entity) {
+    if (entity.retries <= maximumRetries) return preparedRequest(entity);
+    dropExceeded(entity);
+    return std::nullopt;
 }
 
 void UploadManager::removeOrphans() {
@@ -222,6 +255,7 @@ void UploadManager::uploadService(UploadServiceType&, const UploadResult& result
     } else if (const auto* failed = std::get_if<UploadResult::Failed>(&result.value)) {
         didFinish(failed->identifier, failed->response, Outcome::givenUp);
     }
+    if (backlog_.end(result.identifier())) retryStoredRequestsLater();
 }
 
 void UploadManager::didFinish(const std::string& identifier, const UploadResponse& response, Outcome outcome) {
@@ -273,6 +307,7 @@ bool UploadManager::markRetry(const UploadResult::Retry& retry) {
 void UploadManager::uploadEndedElsewhere(const UploadResult& result) {
     const auto& identifier = result.identifier();
     forgetUnrecorded(identifier);
+    if (backlog_.end(identifier)) retryStoredRequestsLater();
     if (std::holds_alternative<UploadResult::Success>(result.value)) return settle(identifier, Outcome::delivered);
     const bool goesOutAgain = std::holds_alternative<UploadResult::Retry>(result.value) && hasRow(identifier);
     settle(identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp);

@@ -3,6 +3,7 @@
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Store/DeferredStore.h>
+#include <corvane/Upload/Backlog.h>
 #include <corvane/Upload/DeliveryLedger.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/SignedEntity.h>
@@ -28,8 +29,8 @@ namespace corvane {
 ///
 /// One per batching processor, which owns it; the service holds it weakly as its delegate, and what ends after it has
 /// gone is found by the next manager. Rows and files outlive the process. An upload that ends with a retry stays, and
-/// goes out again when a manager for its endpoint is next opened; one that was retried more than four times, or whose
-/// file has gone or lost its contents, is dropped then.
+/// goes out again when a manager for its endpoint is next opened, a portion at a time; one that was retried more than
+/// four times, or whose file has gone or lost its contents, is dropped then.
 ///
 /// `open` and `upload` run on the manager's own queue, in the caller's time, and use the deferred store from there;
 /// results are handled where they arrive. States: built, opened (what was left over has been sent again, once), closed;
@@ -71,7 +72,14 @@ class UploadManager final : public UploadManagerType,
     /// Writes the document's row, and has its backup removed, both or neither.
     [[nodiscard]] UploadTaken record(const SignedEntity& entity, const UploadRequest& request);
     void requeueCancelledRequests() CORVANE_REQUIRES(queue_);
+    void listStoredRequests() CORVANE_REQUIRES(queue_);
+    /// Sends the next portion of what is stored again. Goes on with what ends.
     void retryStoredRequests() CORVANE_REQUIRES(queue_);
+    void retryStoredRequestsLater();
+    /// The stored row, or nothing when it has gone or cannot be read.
+    [[nodiscard]] std::optional<SignedEntity> storedRow(const std::string& identifier);
+    /// What is to be sent of a stored row, or nothing when it is dropped.
+    [[nodiscard]] std::optional<PreparedUploadRequest> retryRequest(const SignedEntity& entity);
     /// Deletes the row and the file of an upload that was retried too often.
     void dropExceeded(const SignedEntity& entity);
     /// The row's request, or nothing when its payload file has gone or is empty; the row is then deleted.
@@ -99,6 +107,8 @@ class UploadManager final : public UploadManagerType,
 
     SerialQueue queue_{"com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background};
     bool retriedIncompleteRequests_ CORVANE_GUARDED_BY(queue_) = false;
+
+    Backlog backlog_;
 
     Mutex mutex_;
     std::set<std::string> unrecorded_ CORVANE_GUARDED_BY(mutex_);  // documents that are under way without a row

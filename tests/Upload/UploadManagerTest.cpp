@@ -138,6 +138,34 @@ TEST(UploadManager, ARetrysWholeLife) {
     EXPECT_TRUE(run.rows().empty());
 }
 
+TEST(UploadManager, SendsWhatIsStoredAPortionAtATimeAndEachOnce) {
+    const TemporaryDocuments documents;
+    const CapturedLog log;
+    ProcessRun run;
+    const auto name = [](std::size_t i) { return "I" + std::to_string(i); };
+    const std::size_t all = 3 * Backlog::portion;
+    std::vector<std::string> sent;
+    for (std::size_t i = 0; i < all; ++i) {
+        run.insert(row(name(i), i % 7 ? 0 : 9));  // every seventh is dropped
+        run.dropbox->write(name(i), "x", TextResource(name(i)));
+        if (i % 7 && i + 1 != all) sent.push_back(name(i));
+    }
+    run.manager->open();
+    EXPECT_LE(run.resubmitted().size(), Backlog::portion);
+    EXPECT_EQ(run.ledger->report().pending.documents + run.ledger->report().givenUp.documents, all);
+    // One ends before its turn, as an earlier run's transfer may, and some while their portion is under way.
+    run.service->complete(UploadResult::success(name(all - 1), {200}));
+    for (std::size_t ended = 0; ended < run.resubmitted().size(); ++ended) {
+        run.service->complete(UploadResult::success(run.resubmitted()[ended], {200}));
+        run.manager->open();  // what it has left to its queue is done
+        EXPECT_LE(run.resubmitted().size() - ended, 2 * Backlog::portion);
+    }
+    EXPECT_EQ(run.resubmitted(), sent);
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{{0, std::ssize(sent) + 1}, {}, {0, 14}}));
+    EXPECT_TRUE(run.rows().empty());
+    EXPECT_EQ(log.count("Failed"), 0);
+}
+
 TEST(UploadManager, RemovesOldPayloadsThatNobodyHas) {
     const TemporaryDocuments documents;
     const CapturedLog log;
@@ -156,9 +184,11 @@ TEST(UploadManager, RemovesOldPayloadsThatNobodyHas) {
     {
         ProcessRun inMemory(std::nullopt);  // knows of no rows
         inMemory.manager->open();
+        inMemory.manager->open();
     }
     EXPECT_NE(run.dropbox->existingFile(name + "1"), std::nullopt);
     run.manager->open();
+    run.manager->open();  // what the first has left to its queue is done
     EXPECT_EQ(run.dropbox->existingFile(name + "1"), std::nullopt);
     EXPECT_EQ(log.count("Payload without a row was removed"), 1);
 }
