@@ -8,13 +8,17 @@
 
 namespace {
 
-std::atomic<std::int64_t> allocated{0}, bytesUsed{0};
+std::atomic<std::int64_t> allocated{0}, bytesUsed{0}, mostUsed{0};
 
 void* allocate(std::size_t size) {
     void* block = std::malloc(size);
     if (!block) throw std::bad_alloc();
     allocated.fetch_add(1, std::memory_order_relaxed);
-    bytesUsed.fetch_add(static_cast<std::int64_t>(malloc_usable_size(block) + 8), std::memory_order_relaxed);
+    const auto taken = static_cast<std::int64_t>(malloc_usable_size(block) + 8);
+    const auto used = bytesUsed.fetch_add(taken, std::memory_order_relaxed) + taken;
+    for (auto most = mostUsed.load(std::memory_order_relaxed);
+         used > most && !mostUsed.compare_exchange_weak(most, used, std::memory_order_relaxed);) {
+    }
     return block;
 }
 
@@ -47,7 +51,11 @@ void operator delete[](void* block, std::size_t) noexcept {
 namespace corvane::bench {
 
 Allocations Allocations::now() {
-    return {allocated.load(), bytesUsed.load()};
+    return {allocated.load(), bytesUsed.load(), mostUsed.load()};
+}
+
+void Allocations::restartPeak() {
+    mostUsed = bytesUsed.load();
 }
 
 }  // namespace corvane::bench

@@ -8,8 +8,10 @@ namespace corvane::bench {
 struct Allocations {
     std::int64_t count = 0;
     std::int64_t inUse = 0;  ///< bytes not given back, as the allocator rounds them
+    std::int64_t peak = 0;   ///< the most of them since `restartPeak`
 
     static Allocations now();
+    static void restartPeak();
 };
 
 }  // namespace corvane::bench

@@ -1,20 +1,24 @@
 // Start and end of sessions.
 
+#include "benchmarks/Allocations.h"
 #include "benchmarks/BareSQLite.h"
 #include "benchmarks/Host.h"
 #include "benchmarks/Samples.h"
 #include "benchmarks/Suites.h"
 #include "benchmarks/Table.h"
 
+#include "tests/support/Files.h"
+
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Upload/SignedEntity.h>
+#include <corvane/Upload/UploadDropbox.h>
 
 namespace corvane::bench {
 
 namespace {
 
-constexpr int waitingRows = 10'000;
+constexpr int waitingRows = 10'000, waitingDocuments = 100'000;
 
 /// An endpoint that no row can be sent to at once: what waits is looked at and stays.
 std::shared_ptr<UploadBatchEventProcessor> uploads(const std::string& name) {
@@ -46,14 +50,14 @@ Figures start(const std::string& endpoint) {
     return figures;
 }
 
-/// Rows of uploads that failed before, with payload files that are gone: the first start looks at and drops them all.
-void leaveRows(const std::string& endpoint) {
+/// Rows of uploads that failed before.
+void leaveRows(const std::string& endpoint, int count) {
     DeferredStore<SignedEntity> store(endpoint);
-    store.perform([](Store<SignedEntity>& rows) {
+    store.perform([count](Store<SignedEntity>& rows) {
         rows.open();
         rows.createTable();
         rows.transaction([&] {
-            for (int i = 0; i < waitingRows; ++i) {
+            for (int i = 0; i < count; ++i) {
                 SignedEntity row;
                 row.identifier = "document " + std::to_string(i);
                 rows.insert(row);
@@ -61,6 +65,15 @@ void leaveRows(const std::string& endpoint) {
         });
         rows.close();
     });
+}
+
+/// ... with their payloads.
+void leaveDocuments(const std::string& endpoint, int count) {
+    leaveRows(endpoint, count);
+    const UploadDropbox dropbox(endpoint, false);
+    std::filesystem::create_directories(dropbox.baseURL());
+    const std::string payload(400, 'x');
+    for (int i = 0; i < count; ++i) test::writeFile(dropbox.baseURL() / ("document " + std::to_string(i)), payload);
 }
 
 }  // namespace
@@ -78,13 +91,25 @@ void addLifecycleBenchmarks() {
         return Figures{{"ms to first durable event", millisecondsSince(before)}};
     });
     add(
-        "session/start with 10000 rows waiting",
+        "session/start with 10000 rows, payloads gone",
         [] {
             const test::TemporaryDocuments documents;
-            leaveRows("waiting");
+            leaveRows("waiting", waitingRows);
             return start("waiting");
         },
         3);
+    add(
+        "session/start with 100000 documents waiting",
+        [] {
+            const test::TemporaryDocuments documents;
+            leaveDocuments("waiting", waitingDocuments);
+            Allocations::restartPeak();
+            const auto before = Allocations::now();
+            Figures figures = start("waiting");
+            figures["MB allocated at most"] = static_cast<double>(Allocations::now().peak - before.inUse) / 1e6;
+            return figures;
+        },
+        1);
     add("session/first store use after an end", [] {
         const test::TemporaryDocuments documents;
         start("reopened");

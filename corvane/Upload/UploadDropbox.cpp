@@ -78,7 +78,7 @@ std::vector<std::string> UploadDropbox::abandonedPayloads(const std::set<std::st
     for (std::filesystem::directory_iterator entry(baseURL(), failed), end; !failed && entry != end;
          entry.increment(failed)) {
         auto name = entry->path().filename().string();
-        if (recorded.contains(name) || !isUUID(name)) continue;
+        if (!isUUID(name) || recorded.contains(name)) continue;
         std::error_code unseen;
         if (entry->last_write_time(unseen) < oldest && !unseen) abandoned.push_back(std::move(name));
     }

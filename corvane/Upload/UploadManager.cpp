@@ -5,6 +5,7 @@
 #include <corvane/Upload/UploadRequest.h>
 #include <corvane/Upload/gzip.h>
 
+#include <iterator>
 #include <utility>
 
 namespace corvane {
@@ -83,6 +84,10 @@ void UploadManager::close() {
 }
 
 void UploadManager::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
+    {
+        const Lock lock(mutex_);
+        accessQueue_ = queue;
+    }
     service_->registerAccessQueue(std::move(queue));
 }
 
@@ -137,13 +142,19 @@ void UploadManager::requeueCancelledRequests() {
 
 // Whoever waits for delivery waits for all of them, so that all are entered here.
 void UploadManager::listStoredRequests() {
-    const auto stored = deferredStore_->perform([](Rows& rows) { return rows.keys(); });
+    bool isMemory = false;
+    auto stored = deferredStore_->perform([&](Rows& rows) {
+        isMemory = rows.connection()->location().isMemory();
+        return rows.keys();
+    });
     if (ledger_) {
         for (const auto& identifier : stored) ledger_->addEarlier(identifier);
     }
     backlog_.add(stored);
-    queue_.async([weak = weak_from_this()] {
-        if (const auto manager = weak.lock()) manager->removeOrphans();
+    if (isMemory) return;  // it knows nothing of the rows on disk
+    queue_.async([weak = weak_from_this(), stored = std::move(stored)]() mutable {
+        const auto manager = weak.lock();
+        if (manager) manager->removeOrphans({std::move_iterator(stored.begin()), std::move_iterator(stored.end())});
     });
 }
 
@@ -164,13 +175,24 @@ void UploadManager::retryStoredRequests() {
     if (isMoreReady) retryStoredRequestsLater();
 }
 
+// Behind the submissions that wait: results overtake them, so that a backlog that ends quickly would keep them waiting.
 void UploadManager::retryStoredRequestsLater() {
-    queue_.async([weak = weak_from_this()] {
+    const auto retry = [weak = weak_from_this()] {
         const auto manager = weak.lock();
         if (!manager) return;
-        manager->queue_.assertCurrent("UploadManager::retryStoredRequests");
-        manager->retryStoredRequests();
-    });
+        manager->queue_.async([weak] {
+            const auto still = weak.lock();
+            if (!still) return;
+            still->queue_.assertCurrent("UploadManager::retryStoredRequests");
+            still->retryStoredRequests();
+        });
+    };
+    std::shared_ptr<SerialQueue> accessQueue;
+    {
+        const Lock lock(mutex_);
+        accessQueue = accessQueue_;
+    }
+    accessQueue ? accessQueue->async(retry) : retry();
 }
 
 std::optional<SignedEntity> UploadManager::storedRow(const std::string& identifier) {
@@ -190,15 +212,9 @@ std::optional<PreparedUploadRequest> UploadManager::retryRequest(const SignedEnt
     return std::nullopt;
 }
 
-void UploadManager::removeOrphans() {
-    // A store in memory knows nothing of the rows on disk.
-    const auto recorded = deferredStore_->perform([](Rows& rows) -> std::optional<std::set<std::string>> {
-        if (rows.connection()->location().isMemory()) return std::nullopt;
-        const auto keys = rows.keys();
-        return std::set<std::string>(keys.begin(), keys.end());
-    });
-    if (!recorded) return;
-    auto orphans = dropbox_->abandonedPayloads(*recorded);
+// Rows that are written meanwhile have payloads that are new.
+void UploadManager::removeOrphans(const std::set<std::string>& recorded) {
+    auto orphans = dropbox_->abandonedPayloads(recorded);
     if (orphans.empty()) return;
     service_->inFlight([weak = weak_from_this(), orphans = std::move(orphans)](const std::set<std::string>& inFlight) {
         if (const auto manager = weak.lock()) manager->removeOrphans(orphans, inFlight);

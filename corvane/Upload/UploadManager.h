@@ -93,7 +93,8 @@ class UploadManager final : public UploadManagerType,
     bool forgetUnrecorded(const std::string& identifier);
     /// Removes the payloads that are old, of which there is no row, and which nobody has under way: a process was
     /// killed between payload and row, and the events went out, or will, from their batch's backup.
-    void removeOrphans();
+    /// @param recorded what there are rows of
+    void removeOrphans(const std::set<std::string>& recorded);
     void removeOrphans(const std::vector<std::string>& orphans, const std::set<std::string>& inFlight);
     [[nodiscard]] bool hasRow(const std::string& identifier);
 
@@ -111,6 +112,7 @@ class UploadManager final : public UploadManagerType,
     Backlog backlog_;
 
     Mutex mutex_;
+    std::shared_ptr<SerialQueue> accessQueue_ CORVANE_GUARDED_BY(mutex_);
     std::set<std::string> unrecorded_ CORVANE_GUARDED_BY(mutex_);  // documents that are under way without a row
 };
 
