@@ -97,8 +97,9 @@ struct SerialQueue::State {
     std::atomic<bool> hasAhead = false;
 
     // Of whoever runs tasks: what was left to the end of the run.
-    std::deque<Task> writes;
-    std::deque<Task> reports;
+    TaskList writes;
+    TaskList reports;
+    std::size_t reportCount = 0;
     Clock::time_point runEndsBy;
     bool isReporting = false;
 
@@ -212,11 +213,12 @@ void SerialQueue::State::runAhead() {
 
 void SerialQueue::State::leave(RunEnd part, Task task) {
     if (writes.empty() && reports.empty()) runEndsBy = Clock::now() + longestWait;
-    (part == RunEnd::write ? writes : reports).push_back(std::move(task));
+    (part == RunEnd::write ? writes : reports).push(std::move(task));
+    if (part == RunEnd::report) ++reportCount;
 }
 
 bool SerialQueue::State::isRunLong() const {
-    return reports.size() >= longestRun || (!(writes.empty() && reports.empty()) && Clock::now() >= runEndsBy);
+    return reportCount >= longestRun || (!(writes.empty() && reports.empty()) && Clock::now() >= runEndsBy);
 }
 
 // What is left meanwhile is done too. A report that ends the run anew, for what it has done itself, is not to run those
@@ -225,9 +227,8 @@ void SerialQueue::State::endRun() noexcept {
     const bool isNested = isReporting;
     while (!writes.empty() || !(isNested || reports.empty())) {
         isReporting = isNested || writes.empty();
-        auto& part = writes.empty() ? reports : writes;
-        Task task = std::move(part.front());
-        part.pop_front();
+        if (writes.empty()) --reportCount;
+        Task task = (writes.empty() ? reports : writes).pop();
         runGuarded(task, label);
     }
     isReporting = isNested;
