@@ -15,7 +15,7 @@ namespace corvane {
 /// own, and a valid batch by itself. Not thread-safe. Internal.
 class UploadBatch {
   public:
-    static constexpr std::size_t eventsOfPart = 64;
+    static constexpr std::size_t eventsOfPart = 50;
     static constexpr std::size_t bytesOfPart = std::size_t{64} * 1024;
 
     struct Part {
