@@ -10,6 +10,7 @@ void addCallerBenchmarks(const std::string& serverURL);
 void addPipelineBenchmarks();
 void addDurableBenchmarks();
 void addUploadBenchmarks(const std::string& serverURL);
+void addEndToEndBenchmarks(const std::string& serverURL);
 void addLifecycleBenchmarks();
 void addMemoryBenchmarks();
 void addGrowthBenchmarks();

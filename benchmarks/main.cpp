@@ -29,6 +29,7 @@ int main(int argc, char** argv) {
     addPipelineBenchmarks();
     addDurableBenchmarks();
     addUploadBenchmarks(server.url());
+    addEndToEndBenchmarks(server.url());
     addLifecycleBenchmarks();
     addMemoryBenchmarks();
     addGrowthBenchmarks();
