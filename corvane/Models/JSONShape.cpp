@@ -1,53 +1,35 @@
 #include <corvane/Models/JSONShape.h>
 
-#include <boost/json/basic_parser_impl.hpp>
-
-#include <cmath>
-#include <string>
+#include <corvane/Models/JSONParser.h>
 
 namespace corvane::jsonshape {
 
 namespace {
 
-namespace json = boost::json;
+constexpr int maximumDepth = 512;
 
 // Counts what the parser reports; nothing is kept of it.
-class Counter {
+class Counter final : public JSONListener {
   public:
-    static constexpr std::size_t max_object_size = static_cast<std::size_t>(-1);
-    static constexpr std::size_t max_array_size = static_cast<std::size_t>(-1);
-    static constexpr std::size_t max_key_size = static_cast<std::size_t>(-1);
-    static constexpr std::size_t max_string_size = static_cast<std::size_t>(-1);
-
-    bool on_document_begin(json::error_code&) { return true; }
-    bool on_document_end(json::error_code&) { return true; }
-    bool on_object_begin(json::error_code&) {
+    void beginObject() override {
         if (depth_ == elements) ++objects_;
         ++depth_;
-        return true;
     }
-    bool on_object_end(std::size_t, json::error_code&) { return --depth_, true; }
-    bool on_array_begin(json::error_code&) { return beginOther(), ++depth_, true; }
-    bool on_array_end(std::size_t, json::error_code&) { return --depth_, true; }
-    bool on_key_part(json::string_view, std::size_t, json::error_code&) { return true; }
-    bool on_key(json::string_view, std::size_t, json::error_code&) {
-        if (depth_ == 1) ++keys_;
-        return true;
-    }
-    bool on_string_part(json::string_view, std::size_t, json::error_code&) { return true; }
-    bool on_string(json::string_view, std::size_t, json::error_code&) { return beginOther(), true; }
-    bool on_number_part(json::string_view, json::error_code&) { return true; }
-    bool on_int64(std::int64_t, json::string_view, json::error_code&) { return beginOther(), true; }
-    bool on_uint64(std::uint64_t, json::string_view, json::error_code&) { return beginOther(), true; }
-    bool on_double(double number, json::string_view, json::error_code&) {
+    void endObject(std::size_t) override { --depth_; }
+    void beginArray() override {
         beginOther();
-        if (std::isinf(number)) isExact_ = false;  // beyond the range: no JSON reader agrees on what it is
-        return true;
+        ++depth_;
     }
-    bool on_bool(bool, json::error_code&) { return beginOther(), true; }
-    bool on_null(json::error_code&) { return beginOther(), true; }
-    bool on_comment_part(json::string_view, json::error_code&) { return true; }
-    bool on_comment(json::string_view, json::error_code&) { return true; }
+    void endArray(std::size_t) override { --depth_; }
+    void key(std::string_view) override {
+        if (depth_ == 1) ++keys_;
+    }
+    void string(std::string_view) override { beginOther(); }
+    void integer(std::int64_t) override { beginOther(); }
+    void unsignedInteger(std::uint64_t) override { beginOther(); }
+    void number(double) override { beginOther(); }
+    void boolean(bool) override { beginOther(); }
+    void null() override { beginOther(); }
 
     [[nodiscard]] std::optional<std::size_t> objects() const {
         if (!isExact_ || keys_ != 1) return std::nullopt;
@@ -73,13 +55,9 @@ std::optional<std::size_t> objectsBetween(std::string_view text, std::string_vie
     if (text.size() < opening.size() + closing.size() || !text.starts_with(opening) || !text.ends_with(closing)) {
         return std::nullopt;
     }
-    json::parse_options options;
-    options.max_depth = 512;
-    json::basic_parser<Counter> parser(options);
-    json::error_code error;
-    const std::size_t used = parser.write_some(false, text.data(), text.size(), error);
-    if (error || used != text.size() || !parser.done()) return std::nullopt;
-    return parser.handler().objects();
+    Counter counter;
+    if (!parseJSON(text, maximumDepth, counter)) return std::nullopt;
+    return counter.objects();
 }
 
 }  // namespace corvane::jsonshape

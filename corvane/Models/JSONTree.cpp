@@ -1,13 +1,11 @@
 #include <corvane/Models/JSONTree.h>
 
+#include <corvane/Models/JSONParser.h>
 #include <corvane/Platform/JSONText.h>
 
-#include <boost/json/basic_parser_impl.hpp>
 #include <boost/json/value_stack.hpp>
 
 #include <algorithm>
-#include <charconv>
-#include <cmath>
 #include <vector>
 
 namespace corvane::jsontree {
@@ -16,61 +14,25 @@ namespace {
 
 namespace json = boost::json;
 
-// Builds a tree from the parser's events. The library's own handler rounds some doubles to a neighbour, so a number
-// would not come back as it was written; this one keeps the text of a number and converts it exactly.
-class Builder {
+class Builder final : public JSONListener {
   public:
-    static constexpr std::size_t max_object_size = json::object::max_size();
-    static constexpr std::size_t max_array_size = json::array::max_size();
-    static constexpr std::size_t max_key_size = json::string::max_size();
-    static constexpr std::size_t max_string_size = json::string::max_size();
-
     Builder() { stack_.reset(); }
     json::value take() { return stack_.release(); }
 
-    bool on_document_begin(json::error_code&) { return true; }
-    bool on_document_end(json::error_code&) { return true; }
-    bool on_object_begin(json::error_code&) { return true; }
-    bool on_object_end(std::size_t count, json::error_code&) { return stack_.push_object(count), true; }
-    bool on_array_begin(json::error_code&) { return true; }
-    bool on_array_end(std::size_t count, json::error_code&) { return stack_.push_array(count), true; }
-    bool on_key_part(json::string_view part, std::size_t, json::error_code&) { return stack_.push_chars(part), true; }
-    bool on_key(json::string_view part, std::size_t, json::error_code&) { return stack_.push_key(part), true; }
-    bool on_string_part(json::string_view part, std::size_t, json::error_code&) {
-        return stack_.push_chars(part), true;
-    }
-    bool on_string(json::string_view part, std::size_t, json::error_code&) { return stack_.push_string(part), true; }
-    bool on_number_part(json::string_view part, json::error_code&) {
-        number_.append(part.data(), part.size());
-        return true;
-    }
-    bool on_int64(std::int64_t number, json::string_view, json::error_code&) {
-        number_.clear();
-        return stack_.push_int64(number), true;
-    }
-    bool on_uint64(std::uint64_t number, json::string_view, json::error_code&) {
-        number_.clear();
-        return stack_.push_uint64(number), true;
-    }
-    bool on_double(double approximation, json::string_view part, json::error_code& error) {
-        number_.append(part.data(), part.size());
-        double exact = approximation;
-        std::from_chars(number_.data(), number_.data() + number_.size(), exact);
-        number_.clear();
-        if (!std::isfinite(exact)) {  // beyond the range: a number that nothing here can hold
-            error = json::error::exponent_overflow;
-            return false;
-        }
-        return stack_.push_double(exact), true;
-    }
-    bool on_bool(bool value, json::error_code&) { return stack_.push_bool(value), true; }
-    bool on_null(json::error_code&) { return stack_.push_null(), true; }
-    bool on_comment_part(json::string_view, json::error_code&) { return true; }
-    bool on_comment(json::string_view, json::error_code&) { return true; }
+    void endObject(std::size_t members) override { stack_.push_object(members); }
+    void endArray(std::size_t elements) override { stack_.push_array(elements); }
+    void keyPart(std::string_view part) override { stack_.push_chars({part.data(), part.size()}); }
+    void key(std::string_view lastPart) override { stack_.push_key({lastPart.data(), lastPart.size()}); }
+    void stringPart(std::string_view part) override { stack_.push_chars({part.data(), part.size()}); }
+    void string(std::string_view lastPart) override { stack_.push_string({lastPart.data(), lastPart.size()}); }
+    void integer(std::int64_t number) override { stack_.push_int64(number); }
+    void unsignedInteger(std::uint64_t number) override { stack_.push_uint64(number); }
+    void number(double number) override { stack_.push_double(number); }
+    void boolean(bool value) override { stack_.push_bool(value); }
+    void null() override { stack_.push_null(); }
 
   private:
     json::value_stack stack_;
-    std::string number_;
 };
 
 std::string_view view(json::string_view text) {
@@ -197,13 +159,9 @@ void appendDescription(std::string& out, const json::value& value) {
 }  // namespace
 
 std::optional<json::value> parse(std::string_view text, int maximumDepth) {
-    json::parse_options options;
-    options.max_depth = static_cast<std::size_t>(maximumDepth);
-    json::basic_parser<Builder> parser(options);
-    json::error_code error;
-    const std::size_t used = parser.write_some(false, text.data(), text.size(), error);
-    if (error || used != text.size() || !parser.done()) return std::nullopt;
-    return parser.handler().take();
+    Builder builder;
+    if (!parseJSON(text, maximumDepth, builder)) return std::nullopt;
+    return builder.take();
 }
 
 std::string write(const json::value& value, JSONWritingOptions options) {
