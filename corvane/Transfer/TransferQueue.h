@@ -2,7 +2,7 @@
 
 #include <corvane/Transfer/TransferScheduler.h>
 
-#include <deque>
+#include <list>
 #include <map>
 #include <set>
 #include <string>
@@ -38,7 +38,7 @@ class TransferQueue {
     };
     struct Host {
         std::vector<Ticket> running;
-        std::deque<Waiting> waiting;
+        std::list<Waiting> waiting;
     };
 
     void startWaiting();

@@ -6,7 +6,7 @@ namespace corvane {
 
 void Backlog::add(const std::vector<std::string>& identifiers) {
     const Lock lock(mutex_);
-    waiting_.insert(waiting_.end(), identifiers.begin(), identifiers.end());
+    for (const auto& identifier : identifiers) waiting_.push_back(identifier);
 }
 
 std::vector<std::string> Backlog::take() {
