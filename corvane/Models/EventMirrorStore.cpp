@@ -18,6 +18,11 @@ EventMirrorProperties detail::storedProperties(EventMirrorStore& store, std::str
     return store.properties(eventName, mirror);
 }
 
+void detail::addProperty(std::vector<EventMirrorProperty>& properties, std::string_view name,
+                         std::unique_ptr<const EventPropertyType> property) {
+    properties.push_back({std::string(name), std::move(property)});
+}
+
 bool EventMirrorStore::isNews(DataType declared, DataType found) {
     const WriteLock lock(mutex_);
     return otherTypes_.emplace(declared.qualifiedName(), found.qualifiedName()).second;

@@ -41,6 +41,9 @@ namespace detail {
 /// The properties under a name, read once for a store and then kept there.
 CORVANE_EXPORT EventMirrorProperties storedProperties(EventMirrorStore& store, std::string_view eventName,
                                                       std::vector<EventMirrorProperty> (*mirror)());
+/// Adds a property. Not in the header: a host would have the code of it for each of its declarations.
+CORVANE_EXPORT void addProperty(std::vector<EventMirrorProperty>& properties, std::string_view name,
+                                std::unique_ptr<const EventPropertyType> property);
 }  // namespace detail
 
 #pragma GCC visibility push(hidden)
@@ -61,9 +64,7 @@ struct PropertyCollector {
     template <class T>
     CORVANE_LOCAL void operator()(std::string_view name, const T& field) const {
         if constexpr (std::derived_from<T, EventPropertyType>) {
-            // Owned under the name of its base alone: see AnyDataEvent.
-            properties.push_back({std::string(name), std::shared_ptr<const EventPropertyType>(
-                                                         static_cast<const EventPropertyType*>(new T(field)))});
+            addProperty(properties, name, std::make_unique<const T>(field));
         }
     }
     std::vector<EventMirrorProperty>& properties;
