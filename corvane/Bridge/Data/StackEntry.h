@@ -23,9 +23,9 @@ struct Place {
 };
 
 /// An entry for a tracker's stack, asked for here and now: the host's objects are asked on the caller's thread, and
-/// never again. Throws `BridgeError` when there is no data or its name cannot be used. Data that cannot become JSON gives an
-/// entry all the same, with its error in `failure`: it takes its place on the stack and fails the events that find it,
-/// as typed data does, since events must not go out with the data that it was to hide.
+/// never again. Throws `BridgeError` when there is no data or its name cannot be used. Data that cannot become JSON
+/// gives an entry all the same, with its error in `failure`: it takes its place on the stack and fails the events that
+/// find it, as typed data does, since events must not go out with the data that it was to hide.
 [[nodiscard]] AnyDataEventEntry stackEntry(const std::shared_ptr<const BridgedDataEventType>& data,
                                            BridgedDataEventTraits traits, Place place,
                                            std::optional<AnyError>& failure);
