@@ -2,11 +2,13 @@
 
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
+#include <corvane/Transfer/CompletionsTogether.h>
 #include <corvane/Transfer/SessionTask.h>
 #include <corvane/Transfer/TransferOutcome.h>
 #include <corvane/Transfer/TransferSession.h>
 
 #include <cstdint>
+#include <deque>
 #include <functional>
 #include <memory>
 #include <vector>
@@ -23,6 +25,8 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     /// How the delegate is told of an end: by which of its callbacks.
     using Ending = void (TransferSessionDelegate::*)(const TransferTask&, const std::optional<AnyError>&,
                                                      const std::optional<TransferResponse>&);
+    /// What follows an end that was enqueued, on the queue. `told` as `reportEnd` returns it.
+    using Afterwards = std::function<void(bool told)>;
     /// Lists the session's tasks that are not completed.
     using List = std::function<std::vector<std::shared_ptr<TransferTask>>()>;
 
@@ -40,6 +44,10 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     /// backlog of events must not keep documents on disk that are delivered.
     void enqueue(Task report);
 
+    /// Enqueues what tells of a task's end. A delegate that takes completions together gets those that are at hand by
+    /// then in one call.
+    void enqueueEnd(std::shared_ptr<SessionTask> task, Ending ending, TransferOutcome outcome, Afterwards afterwards);
+
     /// Tells of a task's end, once, and completes the task when the callback has come back, whatever it throws: until
     /// then the task counts as running. On the queue. Returns whether the delegate was told; a task of which nobody was
     /// told is not completed.
@@ -55,10 +63,24 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     void signalDelivered();
 
   private:
+    /// An end that waits in the queue.
+    struct Waiting {
+        std::shared_ptr<SessionTask> task;
+        Ending ending;
+        TransferOutcome outcome;
+        Afterwards afterwards;
+    };
+
+    /// Reports the next end that waits, with those behind it that the delegate takes together with it.
+    void reportNext();
+    [[nodiscard]] std::vector<Waiting> takeNext(bool together);
+    void reportTogether(CompletionsTogether& delegate, const std::vector<Waiting>& ends);
+
     const std::weak_ptr<TransferSessionDelegate> delegate_;
     const std::shared_ptr<SerialQueue> queue_;
 
     mutable Mutex mutex_;
+    std::deque<Waiting> ends_ CORVANE_GUARDED_BY(mutex_);
     bool closed_ CORVANE_GUARDED_BY(mutex_) = false;
 };
 

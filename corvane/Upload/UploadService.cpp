@@ -265,6 +265,16 @@ void UploadService::taskDidComplete(const TransferTask& task, const std::optiona
     if (const auto delegate = noteEnd(task)) delegate->uploadService(*this, ending);
 }
 
+void UploadService::tasksDidComplete(const std::vector<Completion>& completions) {
+    std::shared_ptr<UploadServiceDelegate> delegate;
+    std::vector<UploadResult> results;
+    for (const auto& [task, outcome] : completions) {
+        results.push_back(result(task, outcome.get().error, outcome.get().response));
+        delegate = noteEnd(task);
+    }
+    if (delegate) delegate->uploadServiceTogether(*this, results);
+}
+
 void UploadService::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
                                         const std::optional<TransferResponse>& response) {
     const UploadResult ending = result(task, error, response);

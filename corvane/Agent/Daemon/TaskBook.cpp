@@ -21,7 +21,6 @@ void TaskBook::load(const std::function<void(std::int64_t number, const Transfer
 void TaskBook::failUnreadable(std::int64_t number) {
     if (!tasks_.contains(number)) {
         unforgotten_.push_back(number);
-        settle();
     } else if (tasks_.at(number).owner->open.contains(number)) {
         complete(number, unreadableOutcome());
     }
@@ -76,12 +75,7 @@ void TaskBook::index(std::int64_t number, std::int64_t accepted, const TransferS
 }
 
 void TaskBook::complete(std::int64_t number, const TransferOutcome& outcome) {
-    std::string bytes = encodeOutcome(outcome);
-    try {
-        journal_.complete(number, bytes);
-    } catch (const JournalError&) {
-        unwritten_[number] = std::move(bytes);
-    }
+    unwritten_[number] = encodeOutcome(outcome);
     Owner& by = *tasks_.at(number).owner;
     by.open.erase(number);
     by.over.emplace(number, 0);
@@ -95,11 +89,29 @@ void TaskBook::forget(std::int64_t number) {
     found->second.owner->over.erase(number);
     numbers_.erase(found->second.token);
     tasks_.erase(found);
-    settle();
 }
 
-// What was reported goes first: its room is what the rest may need.
+// What was reported goes first, and by itself where there is no room for all: its room is what the rest may need.
 bool TaskBook::settle() {
+    return settleTogether() || settleOneByOne();
+}
+
+bool TaskBook::settleTogether() {
+    if (isSettled()) return true;
+    try {
+        journal_.together([this] {
+            for (const auto number : unforgotten_) journal_.forget(number);
+            for (const auto& [number, outcome] : unwritten_) journal_.complete(number, outcome);
+        });
+    } catch (const JournalError&) {
+        return false;
+    }
+    unforgotten_.clear();
+    unwritten_.clear();
+    return true;
+}
+
+bool TaskBook::settleOneByOne() {
     try {
         for (; !unforgotten_.empty(); unforgotten_.pop_back()) journal_.forget(unforgotten_.back());
         for (; !unwritten_.empty(); unwritten_.erase(unwritten_.begin())) {
