@@ -39,6 +39,7 @@ namespace corvane::bench {
 namespace {
 
 constexpr int documents = 400, eventsEach = 50;
+constexpr const char* sessionText = R"({"sessionID":"7E7C6B0E-0000-4000-8000-000000000001"})";
 
 void writeNewFile(const std::string& path, std::string_view contents) {
     const Descriptor file(open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
@@ -105,7 +106,7 @@ class Uploads {
 
     const Endpoint endpoint_;
     const Client client_{"com.example.bench", "Bench", "1.0", 1};
-    const JSON session_{R"({"sessionID":"7E7C6B0E-0000-4000-8000-000000000001"})"};
+    const JSON session_{sessionText};
     const std::shared_ptr<const EncodedEvents> events_ = makeEvents();
     const std::shared_ptr<DeliveryLedger> ledger_ = std::make_shared<DeliveryLedger>();
     const std::shared_ptr<SerialQueue> queue_ = std::make_shared<SerialQueue>("bench");
@@ -125,10 +126,11 @@ Figures bareUploads(const std::string& url, bool survives) {
     BareSQLite database(directory / "bare.db");
     const std::string payload = directory / "payload", partial = directory / "partial";
     BareUpload bare(url);
-    const std::string text =
-        UserEvents(JSON(R"({"sessionID":"7E7C6B0E"})"), {makeEvents()}, "document").jsonObject().text();
+    std::string text = UserEvents(JSON(sessionText), {makeEvents()}, newUUID()).jsonObject().text();
+    const auto identifier = text.find(R"("identifier":")") + 14;
     return perDocument(cpuNanoseconds, [&] {
         for (int i = 0; i < documents; ++i) {
+            text.replace(identifier, 36, newUUID());
             const auto body = bare.gzip(text);
             if (survives) {
                 writeNewFile(partial, body);

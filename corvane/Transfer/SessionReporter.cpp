@@ -28,6 +28,7 @@ class Completed {
 
 SessionReporter::SessionReporter(std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue)
     : delegate_(std::move(delegate)),
+      isOwn_(dynamic_cast<OwnDelegate*>(delegate_.lock().get()) != nullptr),
       queue_(queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session")) {}
 
 void SessionReporter::close() {
@@ -65,9 +66,8 @@ void SessionReporter::enqueueEnd(std::shared_ptr<SessionTask> task, Ending endin
 
 void SessionReporter::reportNext() {
     const auto told = delegate();
-    auto* together = dynamic_cast<CompletionsTogether*>(told.get());
-    const auto ends = takeNext(together != nullptr);
-    if (ends.size() > 1) return reportTogether(*together, ends);
+    const auto ends = takeNext(isOwn_ && told);
+    if (ends.size() > 1) return reportTogether(dynamic_cast<OwnDelegate&>(*told), ends);
     for (const auto& [task, ending, outcome, afterwards] : ends) {
         const bool isTold = reportEnd(*task, ending, outcome);
         if (afterwards) afterwards(isTold);
@@ -91,9 +91,9 @@ std::vector<SessionReporter::Waiting> SessionReporter::takeNext(bool together) {
     return taken;
 }
 
-void SessionReporter::reportTogether(CompletionsTogether& delegate, const std::vector<Waiting>& ends) {
+void SessionReporter::reportTogether(OwnDelegate& delegate, const std::vector<Waiting>& ends) {
     std::deque<Completed> completed;
-    std::vector<CompletionsTogether::Completion> completions;
+    std::vector<OwnDelegate::Completion> completions;
     std::vector<bool> isTold;
     for (const auto& one : ends) {
         isTold.push_back(one.task->state() != TransferTask::State::completed);
@@ -114,7 +114,7 @@ void SessionReporter::enqueue(Task report) {
 }
 
 void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected) {
-    if (!task->note(total, expected)) return;
+    if (!wantsProgress() || !task->note(total, expected)) return;
     enqueue([self = shared_from_this(), task = std::move(task)] {
         const auto progress = task->takeProgress();
         const auto told = self->delegate();

@@ -2,7 +2,7 @@
 
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
-#include <corvane/Transfer/CompletionsTogether.h>
+#include <corvane/Transfer/OwnDelegate.h>
 #include <corvane/Transfer/SessionTask.h>
 #include <corvane/Transfer/TransferOutcome.h>
 #include <corvane/Transfer/TransferSession.h>
@@ -53,7 +53,9 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     /// told is not completed.
     bool reportEnd(SessionTask& task, Ending ending, const TransferOutcome& outcome);
 
-    /// Enqueues a report of how much has gone out, unless one waits already.
+    /// Whether anybody wants to know how much of a body has gone out.
+    [[nodiscard]] bool wantsProgress() const { return !isOwn_ || OwnDelegate::wantsProgress(); }
+    /// Enqueues a report of how much has gone out, unless one waits already or nobody wants to know.
     void reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected);
 
     /// Answers a question for the session's tasks through the queue, behind the completions that wait there.
@@ -74,9 +76,10 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     /// Reports the next end that waits, with those behind it that the delegate takes together with it.
     void reportNext();
     [[nodiscard]] std::vector<Waiting> takeNext(bool together);
-    void reportTogether(CompletionsTogether& delegate, const std::vector<Waiting>& ends);
+    void reportTogether(OwnDelegate& delegate, const std::vector<Waiting>& ends);
 
     const std::weak_ptr<TransferSessionDelegate> delegate_;
+    const bool isOwn_;  // the delegate is an OwnDelegate
     const std::shared_ptr<SerialQueue> queue_;
 
     mutable Mutex mutex_;

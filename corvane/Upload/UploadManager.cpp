@@ -101,7 +101,9 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     const auto& resource = *request.resource;
     auto identifier = resource.identifier();
     Log::shared().default_("Creating upload task, identifier=%{public}@", identifier);
-    auto file = dropbox_->write(identifier, gzipCompressed(resource.jsonObject().toData()), resource);
+    const auto json = resource.jsonObject();
+    const auto body = json.isObject() ? gzipCompressed(json.text()) : gzipCompressed(json.toData());
+    auto file = dropbox_->write(identifier, body, resource);
     const auto entity = newEntity(request, std::move(identifier));
     const auto taken = record(entity, request);
     service_->submit(prepared(entity, std::move(file)));

@@ -2,7 +2,7 @@
 
 #include <corvane/Platform/Lazy.h>
 #include <corvane/Platform/Mutex.h>
-#include <corvane/Transfer/CompletionsTogether.h>
+#include <corvane/Transfer/OwnDelegate.h>
 #include <corvane/Transfer/TransferSession.h>
 #include <corvane/Upload/Endpoint.h>
 #include <corvane/Upload/SignerType.h>
@@ -36,7 +36,7 @@ namespace corvane {
 ///     service->submit(request);            // later: manager->uploadService(*service, result) on the queue
 class UploadService final : public UploadServiceType,
                             public TransferSessionDelegate,
-                            public CompletionsTogether,
+                            public OwnDelegate,
                             public std::enable_shared_from_this<UploadService> {
   public:
     /// The session's identifier, which is its description too. Every service uses this one; the owner key tells their

@@ -65,7 +65,8 @@ std::int64_t TaskBook::accept(const TransferSubmission& submission, std::int64_t
 
 void TaskBook::index(std::int64_t number, std::int64_t accepted, const TransferSubmission& submission, bool isOver) {
     Owner& by = owner(submission.session, submission.owner);
-    tasks_.emplace(number, Task{submission.token, &by, accepted + submission.patience.count()});
+    tasks_.emplace(number,
+                   Task{submission.token, &by, accepted + submission.patience.count(), submission.wantsProgress()});
     numbers_.emplace(submission.token, number);
     if (isOver) {
         by.over.emplace(number, 0);

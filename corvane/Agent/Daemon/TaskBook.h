@@ -43,6 +43,7 @@ class TaskBook {
         std::string token;
         Owner* owner = nullptr;
         std::int64_t expires = 0;     ///< when it stops waiting for its server, in milliseconds since 1970
+        bool wantsProgress = true;    ///< of its body
         std::uint64_t submitter = 0;  ///< the client that asked for it to be taken, or 0
     };
 
