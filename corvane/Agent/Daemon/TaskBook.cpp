@@ -16,6 +16,7 @@ void TaskBook::load(const std::function<void(std::int64_t number, const Transfer
         if (task.isReadable && !task.isOver) visit(task.number, task.submission);
     });
     for (const auto number : unreadable) failUnreadable(number);
+    settle();
 }
 
 void TaskBook::failUnreadable(std::int64_t number) {
