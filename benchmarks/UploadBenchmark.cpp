@@ -10,6 +10,7 @@
 #include "tests/support/Files.h"
 
 #include <corvane/Agent/Host/BackgroundTransferSession.h>
+#include <corvane/Platform/Date.h>
 #include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/UUID.h>
 #include <corvane/Processing/EncodedEvents.h>
@@ -33,6 +34,7 @@
 #include <stdexcept>
 #include <string_view>
 #include <utility>
+#include <vector>
 
 namespace corvane::bench {
 
@@ -119,11 +121,28 @@ Figures inProcess(const std::string& url) {
     return perDocument(cpuNanoseconds, [&] { uploads.send(documents); });
 }
 
+/// The text of a document's row, and of its deletion.
+std::pair<std::string, std::string> statements() {
+    const auto& table = Store<SignedEntity>::table();
+    const SignedEntity entity{.identifier = newUUID(),
+                              .createdDate = now(),
+                              .contentType = "application/vnd.veskar.user-events+json; version=0.1.0",
+                              .userAgent = "com.example.bench/1.0.1",
+                              .retries = 0,
+                              .retryAfterDate = now(),
+                              .signature = ""};
+    std::vector<StorableValue> values;
+    for (const auto& column : table.columns()) values.push_back(entity.storableValue(column.name));
+    return {table.insertSQL(values), table.deleteSQL("identifier", entity.identifier)};
+}
+
 /// @param survives write the compressed document to a file and a row to a database first, and remove both afterwards,
 ///                 as whoever wants to send it again after a crash must.
 Figures bareUploads(const std::string& url, bool survives) {
     const test::TemporaryDocuments directory;
     BareSQLite database(directory / "bare.db");
+    database.run(Store<SignedEntity>::table().createSQL());
+    const auto [insertion, deletion] = statements();
     const std::string payload = directory / "payload", partial = directory / "partial";
     BareUpload bare(url);
     std::string text = UserEvents(JSON(sessionText), {makeEvents()}, newUUID()).jsonObject().text();
@@ -135,11 +154,11 @@ Figures bareUploads(const std::string& url, bool survives) {
             if (survives) {
                 writeNewFile(partial, body);
                 std::rename(partial.c_str(), payload.c_str());
-                database.run(BareSQLite::rowOf("7B7D"));
+                database.run(insertion);
             }
             if (!bare.send(body)) throw std::runtime_error("a document was not delivered");
             if (survives) {
-                database.run(BareSQLite::deletionOfRow());
+                database.run(deletion);
                 std::remove(payload.c_str());
             }
         }
