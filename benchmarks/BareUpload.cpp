@@ -4,80 +4,95 @@
 #include <openssl/evp.h>
 #include <zlib.h>
 
+#include <algorithm>
 #include <cstring>
 #include <stdexcept>
 
 namespace corvane::bench {
 
-namespace {
-
-struct Source {
-    const std::string* body;
+struct BareUpload::State {
+    z_stream stream{};
+    std::string compressed;
+    EVP_MD* sha1 = EVP_MD_fetch(nullptr, "SHA1", nullptr);
+    EVP_PKEY* key = EVP_PKEY_Q_keygen(nullptr, nullptr, "ED25519");
+    EVP_MD_CTX* context = EVP_MD_CTX_new();
+    unsigned char signature[64]{};
+    CURL* curl = curl_easy_init();
+    curl_slist* headers = nullptr;
+    std::string_view body;
     std::size_t sent = 0;
 };
 
-std::size_t readBody(char* buffer, std::size_t size, std::size_t count, void* context) {
-    auto& source = *static_cast<Source*>(context);
-    const std::size_t n = std::min(size * count, source.body->size() - source.sent);
-    std::memcpy(buffer, source.body->data() + source.sent, n);
-    source.sent += n;
+std::size_t BareUpload::readBody(char* buffer, std::size_t size, std::size_t count, void* context) {
+    auto& state = *static_cast<State*>(context);
+    const std::size_t n = std::min(size * count, state.body.size() - state.sent);
+    std::memcpy(buffer, state.body.data() + state.sent, n);
+    state.sent += n;
     return n;
 }
 
-}  // namespace
-
-BareUpload::BareUpload() : curl_(curl_easy_init()), key_(EVP_PKEY_Q_keygen(nullptr, nullptr, "ED25519")) {
-    if (!curl_ || !key_) throw std::runtime_error("neither curl nor a key");
+BareUpload::BareUpload(const std::string& url) : state_(std::make_unique<State>()) {
+    State& state = *state_;
+    const int zlib = deflateInit2(&state.stream, Z_BEST_COMPRESSION, Z_DEFLATED, 31, 9, Z_DEFAULT_STRATEGY);
+    if (zlib != Z_OK || !state.sha1 || !state.key || !state.context || !state.curl) {
+        throw std::runtime_error("no zlib, no key or no curl");
+    }
+    for (const char* header :
+         {"Expect:", "Content-Type: application/json; version=2", "User-Agent: com.example/1.0",
+          "Content-Encoding: gzip", "X-Signature: MDEyMzQ1Njc4OTAxMjM0NTY3ODkwMTIzNDU2Nzg5MDEyMzQ1Njc4OTAxMjM="}) {
+        state.headers = curl_slist_append(state.headers, header);
+    }
+    curl_easy_setopt(state.curl, CURLOPT_URL, url.c_str());
+    curl_easy_setopt(state.curl, CURLOPT_NOSIGNAL, 1L);
+    curl_easy_setopt(state.curl, CURLOPT_UPLOAD, 1L);
+    curl_easy_setopt(state.curl, CURLOPT_READFUNCTION, readBody);
+    curl_easy_setopt(state.curl, CURLOPT_READDATA, state_.get());
+    curl_easy_setopt(state.curl, CURLOPT_HTTPHEADER, state.headers);
 }
 
 BareUpload::~BareUpload() {
-    curl_easy_cleanup(curl_);
-    EVP_PKEY_free(static_cast<EVP_PKEY*>(key_));
+    deflateEnd(&state_->stream);
+    EVP_MD_free(state_->sha1);
+    EVP_PKEY_free(state_->key);
+    EVP_MD_CTX_free(state_->context);
+    curl_easy_cleanup(state_->curl);
+    curl_slist_free_all(state_->headers);
 }
 
-std::string BareUpload::gzip(const std::string& text) {
-    z_stream stream{};
-    std::string out(compressBound(text.size()) + 64, '\0');
-    deflateInit2(&stream, Z_BEST_COMPRESSION, Z_DEFLATED, 31, 8, Z_DEFAULT_STRATEGY);
+std::string_view BareUpload::gzip(std::string_view text) {
+    z_stream& stream = state_->stream;
+    std::string& out = state_->compressed;
+    deflateReset(&stream);
+    out.resize(std::max<std::size_t>(out.size(), deflateBound(&stream, static_cast<uLong>(text.size()))));
     stream.next_in = reinterpret_cast<Bytef*>(const_cast<char*>(text.data()));
     stream.avail_in = static_cast<uInt>(text.size());
     stream.next_out = reinterpret_cast<Bytef*>(out.data());
     stream.avail_out = static_cast<uInt>(out.size());
-    deflate(&stream, Z_FINISH);
-    out.resize(stream.total_out);
-    deflateEnd(&stream);
-    return out;
+    if (deflate(&stream, Z_FINISH) != Z_STREAM_END) throw std::runtime_error("a document was not compressed");
+    return std::string_view(out).substr(0, stream.total_out);
 }
 
-std::string BareUpload::sign(const std::string& body) const {
+void BareUpload::sign(std::string_view body) {
+    State& state = *state_;
     unsigned char digest[EVP_MAX_MD_SIZE];
     unsigned length = 0;
-    EVP_Digest(body.data(), body.size(), digest, &length, EVP_sha1(), nullptr);
-    EVP_MD_CTX* context = EVP_MD_CTX_new();
-    std::string signature(64, '\0');
-    std::size_t size = signature.size();
-    EVP_DigestSignInit(context, nullptr, nullptr, nullptr, static_cast<EVP_PKEY*>(key_));
-    EVP_DigestSign(context, reinterpret_cast<unsigned char*>(signature.data()), &size, digest, length);
-    EVP_MD_CTX_free(context);
-    return signature;
+    std::size_t size = sizeof state.signature;
+    EVP_Digest(body.data(), body.size(), digest, &length, state.sha1, nullptr);
+    EVP_DigestSignInit(state.context, nullptr, nullptr, nullptr, state.key);
+    if (EVP_DigestSign(state.context, state.signature, &size, digest, length) != 1) {
+        throw std::runtime_error("a document was not signed");
+    }
 }
 
-bool BareUpload::send(const std::string& url, const std::string& body) {
-    static_cast<void>(sign(body));
-    Source source{&body};
-    curl_slist* headers = curl_slist_append(nullptr, "Expect:");
-    headers = curl_slist_append(headers, "Content-Encoding: gzip");
-    headers = curl_slist_append(headers, "X-Signature: MDEyMzQ1Njc4OTAxMjM0NTY3ODkwMTIzNDU2Nzg5MDEyMzQ1Njc4OTAxMjM=");
-    curl_easy_setopt(curl_, CURLOPT_URL, url.c_str());
-    curl_easy_setopt(curl_, CURLOPT_UPLOAD, 1L);
-    curl_easy_setopt(curl_, CURLOPT_READFUNCTION, readBody);
-    curl_easy_setopt(curl_, CURLOPT_READDATA, &source);
-    curl_easy_setopt(curl_, CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(body.size()));
-    curl_easy_setopt(curl_, CURLOPT_HTTPHEADER, headers);
-    const CURLcode code = curl_easy_perform(curl_);
-    curl_slist_free_all(headers);
+bool BareUpload::send(std::string_view body) {
+    State& state = *state_;
+    sign(body);
+    state.body = body;
+    state.sent = 0;
+    curl_easy_setopt(state.curl, CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(body.size()));
     long status = 0;
-    curl_easy_getinfo(curl_, CURLINFO_RESPONSE_CODE, &status);
+    const CURLcode code = curl_easy_perform(state.curl);
+    curl_easy_getinfo(state.curl, CURLINFO_RESPONSE_CODE, &status);
     return code == CURLE_OK && status == 200;
 }
 

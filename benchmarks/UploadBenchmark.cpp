@@ -9,6 +9,10 @@
 
 #include "tests/support/Files.h"
 
+#include <corvane/Agent/Host/BackgroundTransferSession.h>
+#include <corvane/Platform/Date.h>
+#include <corvane/Platform/Descriptor.h>
+#include <corvane/Platform/UUID.h>
 #include <corvane/Processing/EncodedEvents.h>
 #include <corvane/Processing/UserEvents.h>
 #include <corvane/Store/DeferredStore.h>
@@ -20,13 +24,31 @@
 #include <corvane/Upload/UploadRequest.h>
 #include <corvane/Upload/UploadService.h>
 
+#include <fcntl.h>
+#include <signal.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <ctime>
 #include <stdexcept>
+#include <string_view>
+#include <utility>
+#include <vector>
 
 namespace corvane::bench {
 
 namespace {
 
 constexpr int documents = 400, eventsEach = 50;
+constexpr const char* sessionText = R"({"sessionID":"7E7C6B0E-0000-4000-8000-000000000001"})";
+
+void writeNewFile(const std::string& path, std::string_view contents) {
+    const Descriptor file(open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+    if (!file || write(file.get(), contents.data(), contents.size()) != static_cast<ssize_t>(contents.size())) {
+        throw std::runtime_error("no file was written");
+    }
+}
 
 std::shared_ptr<const EncodedEvents> makeEvents() {
     Host host;
@@ -37,47 +59,81 @@ std::shared_ptr<const EncodedEvents> makeEvents() {
     return events;
 }
 
-template <class Work>
-Figures perDocument(Work&& work) {
+/// @param cpu the nanoseconds of CPU time that count
+template <class CPU, class Work>
+Figures perDocument(CPU&& cpu, Work&& work) {
     const auto before = nanoseconds();
-    const double cpu = cpuNanoseconds();
+    const double cpuBefore = cpu();
     work();
     const double elapsed = static_cast<double>(nanoseconds() - before);
-    return {{"documents/s", documents * 1e9 / elapsed},
-            {"CPU us/document", (cpuNanoseconds() - cpu) / 1e3 / documents}};
+    return {{"documents/s", documents * 1e9 / elapsed}, {"CPU us/document", (cpu() - cpuBefore) / 1e3 / documents}};
 }
 
-/// From the finished batch to the server's answer, with the row and the payload file written and removed.
-Figures throughManager(const std::string& url) {
+/// What takes documents over from a batching processor, and the session's queue.
+class Uploads {
+  public:
+    explicit Uploads(const std::string& url, TransferSession::Factory factory = {}) : endpoint_{url, "upload"} {
+        manager_ = UploadManager::create(
+            std::make_shared<UploadService>(endpoint_, std::make_shared<OstrelSigner>(), std::move(factory)),
+            std::make_shared<DeferredStore<SignedEntity>>(endpoint_.name()),
+            std::make_shared<UploadDropbox>(endpoint_.name(), false), ledger_);
+        queue_->sync([this] {
+            manager_->registerAccessQueue(queue_);
+            manager_->open();
+        });
+        send(10);  // so that everything is there that is made once
+    }
+    Uploads(const Uploads&) = delete;
+    Uploads& operator=(const Uploads&) = delete;
+    ~Uploads() {
+        queue_->sync([this] { manager_->close(); });
+    }
+
+    /// From the finished batches to the server's answers, with row and payload written and removed, all on the
+    /// session's queue, as a processor does it.
+    void send(int count) {
+        const auto before = ledger_->wait(std::chrono::steady_clock::now()).delivered.documents;
+        for (int i = 0; i < count; ++i) queue_->async([this] { upload(); });
+        queue_->sync([] {});
+        const auto report = ledger_->wait(std::chrono::steady_clock::now() + std::chrono::seconds(60));
+        if (report.delivered.documents != before + count) throw std::runtime_error("documents were not delivered");
+    }
+
+  private:
+    void upload() {
+        const auto document = std::make_shared<UserEvents>(session_, UserEvents::Events{events_}, newUUID());
+        ledger_->add(document->identifier(), eventsEach);
+        manager_->upload(UploadRequest{client_, document});
+    }
+
+    const Endpoint endpoint_;
+    const Client client_{"com.example.bench", "Bench", "1.0", 1};
+    const JSON session_{sessionText};
+    const std::shared_ptr<const EncodedEvents> events_ = makeEvents();
+    const std::shared_ptr<DeliveryLedger> ledger_ = std::make_shared<DeliveryLedger>();
+    const std::shared_ptr<SerialQueue> queue_ = std::make_shared<SerialQueue>("bench");
+    std::shared_ptr<UploadManager> manager_;
+};
+
+Figures inProcess(const std::string& url) {
     const test::TemporaryDocuments directory;
-    const Endpoint endpoint{url, "upload"};
-    const auto ledger = std::make_shared<DeliveryLedger>();
-    const auto queue = std::make_shared<SerialQueue>("bench");
-    const auto manager =
-        UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
-                              std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
-                              std::make_shared<UploadDropbox>(endpoint.name(), false), ledger);
-    const auto events = makeEvents();
-    const Client client{"com.example.bench", "Bench", "1.0", 1};
-    const JSON session(R"({"sessionID":"7E7C6B0E-0000-4000-8000-000000000001"})");
-    queue->sync([&] {
-        manager->registerAccessQueue(queue);
-        manager->open();
-    });
-    auto figures = perDocument([&] {
-        for (int i = 0; i < documents; ++i) {
-            queue->sync([&] {
-                const auto document =
-                    std::make_shared<UserEvents>(session, UserEvents::Events{events}, "document " + std::to_string(i));
-                ledger->add(document->identifier(), eventsEach);
-                manager->upload(UploadRequest{client, document});
-            });
-        }
-        const auto report = ledger->wait(std::chrono::steady_clock::now() + std::chrono::seconds(60));
-        if (report.delivered.documents != documents) throw std::runtime_error("documents were not delivered");
-    });
-    queue->sync([&] { manager->close(); });
-    return figures;
+    Uploads uploads(url);
+    return perDocument(cpuNanoseconds, [&] { uploads.send(documents); });
+}
+
+/// The text of a document's row, and of its deletion.
+std::pair<std::string, std::string> statements() {
+    const auto& table = Store<SignedEntity>::table();
+    const SignedEntity entity{.identifier = newUUID(),
+                              .createdDate = now(),
+                              .contentType = "application/vnd.veskar.user-events+json; version=0.1.0",
+                              .userAgent = "com.example.bench/1.0.1",
+                              .retries = 0,
+                              .retryAfterDate = now(),
+                              .signature = ""};
+    std::vector<StorableValue> values;
+    for (const auto& column : table.columns()) values.push_back(entity.storableValue(column.name));
+    return {table.insertSQL(values), table.deleteSQL("identifier", entity.identifier)};
 }
 
 /// @param survives write the compressed document to a file and a row to a database first, and remove both afterwards,
@@ -85,38 +141,89 @@ Figures throughManager(const std::string& url) {
 Figures bareUploads(const std::string& url, bool survives) {
     const test::TemporaryDocuments directory;
     BareSQLite database(directory / "bare.db");
-    const auto payload = directory / "payload", partial = directory / "partial";
-    BareUpload bare;
-    const std::string text =
-        UserEvents(JSON(R"({"sessionID":"7E7C6B0E"})"), {makeEvents()}, "document").jsonObject().text();
-    return perDocument([&] {
+    database.run(Store<SignedEntity>::table().createSQL());
+    const auto [insertion, deletion] = statements();
+    const std::string payload = directory / "payload", partial = directory / "partial";
+    BareUpload bare(url);
+    std::string text = UserEvents(JSON(sessionText), {makeEvents()}, newUUID()).jsonObject().text();
+    const auto identifier = text.find(R"("identifier":")") + 14;
+    return perDocument(cpuNanoseconds, [&] {
         for (int i = 0; i < documents; ++i) {
-            const std::string body = BareUpload::gzip(text);
+            text.replace(identifier, 36, newUUID());
+            const auto body = bare.gzip(text);
             if (survives) {
-                test::writeFile(partial, body);
-                std::filesystem::rename(partial, payload);
-                database.run(BareSQLite::rowOf("7B7D"));
+                writeNewFile(partial, body);
+                std::rename(partial.c_str(), payload.c_str());
+                database.run(insertion);
             }
-            if (!bare.send(url, body)) throw std::runtime_error("a document was not delivered");
+            if (!bare.send(body)) throw std::runtime_error("a document was not delivered");
             if (survives) {
-                database.run(BareSQLite::deletionOfRow());
-                std::filesystem::remove(payload);
+                database.run(deletion);
+                std::remove(payload.c_str());
             }
         }
     });
 }
 
+#ifdef CORVANE_AGENT
+/// An agent with a directory of its own, which is started by the first session and killed at the end.
+class Agent {
+  public:
+    ~Agent() {
+        if (const pid_t running = process()) kill(running, SIGKILL);
+    }
+
+    [[nodiscard]] TransferSession::Factory sessions() const {
+        return
+            [options = options_](const TransferSessionConfiguration& configuration,
+                                 std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue) {
+                return std::make_shared<BackgroundTransferSession>(configuration, std::move(delegate), std::move(queue),
+                                                                   options);
+            };
+    }
+    [[nodiscard]] double cpuNanoseconds() const {
+        clockid_t clock{};
+        timespec time{};
+        if (clock_getcpuclockid(process(), &clock) != 0 || clock_gettime(clock, &time) != 0) {
+            throw std::runtime_error("there is no agent");
+        }
+        return static_cast<double>(time.tv_sec) * 1e9 + static_cast<double>(time.tv_nsec);
+    }
+
+  private:
+    [[nodiscard]] pid_t process() const {
+        return static_cast<pid_t>(std::atol(test::readFile(options_.directory / "agent.lock").c_str()));
+    }
+
+    const test::TemporaryDocuments documents_;
+    const TransferAgentOptions options_{.program = CORVANE_AGENT, .directory = documents_ / "agent"};
+};
+
+/// What the host and the agent take together.
+Figures withAgent(const std::string& url) {
+    const Agent agent;
+    Uploads uploads(url, agent.sessions());
+    return perDocument([&] { return cpuNanoseconds() + agent.cpuNanoseconds(); }, [&] { uploads.send(documents); });
+}
+#endif
+
 }  // namespace
 
 void addUploadBenchmarks(const std::string& serverURL) {
-    const std::string name = "upload/document of 50 events", url = serverURL + "/in";
-    add(
-        name, [=] { return throughManager(url); }, 3);
-    add(
-        name + "~gzip, SHA-1, signature, libcurl", [=] { return bareUploads(url, false); }, 3);
-    add(
-        name + "~the same, a file and a row", [=] { return bareUploads(url, true); }, 3);
-    setBar(name + "~gzip, SHA-1, signature, libcurl", "CPU us/document", 1.25);
+    const std::string url = serverURL + "/in", survives = "~the same, a file and a row";
+    const auto addWith = [&](const std::string& name, Figures (*measure)(const std::string&), double bar) {
+        add(
+            name, [=] { return measure(url); }, 3);
+        add(
+            name + "~gzip, SHA-1, signature, libcurl", [=] { return bareUploads(url, false); }, 3);
+        add(
+            name + survives, [=] { return bareUploads(url, true); }, 3);
+        setBar(name + survives, "CPU us/document", bar);
+    };
+    addWith("upload/document of 50 events", inProcess, 1.25);
+#ifdef CORVANE_AGENT
+    addWith("upload/document with the agent", withAgent, 2.5);
+#endif
 }
 
 }  // namespace corvane::bench

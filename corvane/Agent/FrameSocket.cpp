@@ -32,6 +32,7 @@ bool FrameSocket::receive() {
         if (count > 0) {
             in_.append(buffer, static_cast<std::size_t>(count));
             total += static_cast<std::size_t>(count);
+            if (static_cast<std::size_t>(count) < sizeof buffer) return true;  // that was all, or there is a next time
         } else if (count == 0) {
             return false;
         } else if (errno != EINTR) {

@@ -31,6 +31,12 @@ bool TransferSubmission::isToken(std::string_view text) noexcept {
            });
 }
 
+bool TransferSubmission::wantsProgress() const noexcept {
+    return std::none_of(extras.begin(), extras.end(), [](const auto& extra) {
+        return extra.first == withoutProgress.first && extra.second == withoutProgress.second;
+    });
+}
+
 std::string TransferSubmission::encoded() const {
     WireWriter write;
     write(magic, version, token, session, owner, description, request.url, request.method, request.headers, bodyPath);

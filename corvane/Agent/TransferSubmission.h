@@ -39,6 +39,10 @@ struct TransferSubmission {
     /// Whatever else a later library has to say, by name. What an agent does not know it leaves alone.
     std::vector<std::pair<std::string, std::string>> extras = {};
 
+    /// In `extras`: nobody wants to know how much of the body has gone out.
+    static constexpr std::pair<std::string_view, std::string_view> withoutProgress = {"progress", "none"};
+    [[nodiscard]] bool wantsProgress() const noexcept;
+
     [[nodiscard]] std::string encoded() const;
     /// Reads what version 1 wrote, too. Throws `FormatError` for bytes that are no submission, and for values that
     /// cannot be right.

@@ -32,8 +32,7 @@ bool writeAll(int descriptor, std::string_view contents) {
 /// A file beside `target` that holds `contents`; removed at the end unless it was renamed.
 class PartialFile {
   public:
-    PartialFile(const std::filesystem::path& target, std::string_view contents)
-        : path_(target.parent_path() / ("." + target.filename().string() + "." + newUUID()).append(partialExtension)) {
+    PartialFile(const std::filesystem::path& target, std::string_view contents) : path_(partialPath(target.native())) {
         Descriptor descriptor(::open(path_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
         if (descriptor.get() < 0) throw SystemError("create file " + target.string(), errno);
         if (!writeAll(descriptor.get(), contents) || !descriptor.close()) {
@@ -52,7 +51,18 @@ class PartialFile {
     void keep() { path_.clear(); }
 
   private:
-    std::filesystem::path path_;
+    // Each step between text and path would take the name apart anew.
+    [[nodiscard]] static std::string partialPath(const std::string& target) {
+        const auto name = target.rfind('/') + 1;  // 0 where there is none
+        return target.substr(0, name)
+            .append(".")
+            .append(target, name)
+            .append(".")
+            .append(newUUID())
+            .append(partialExtension);
+    }
+
+    std::string path_;
 };
 
 }  // namespace

@@ -12,6 +12,7 @@
 #include <cstdio>
 #include <new>
 #include <system_error>
+#include <utility>
 
 namespace corvane {
 
@@ -45,11 +46,11 @@ void CurlTransfer::HeaderListDeleter::operator()(void* list) const noexcept {
     curl_slist_free_all(static_cast<curl_slist*>(list));
 }
 
-CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
+CurlTransfer::CurlTransfer(const HTTPTransfer& transfer, Easy spare)
     : limits_(transfer.limits),
       didSend_(transfer.didSend),
       deadline_(Clock::now() + limits_.timeWithoutProgress),
-      easy_(curl_easy_init()) {
+      easy_(spare ? std::move(spare) : Easy(curl_easy_init())) {
     if (!easy_) throw std::bad_alloc();
     if (transfer.bodyPath) openBody(*transfer.bodyPath, transfer.bodyMustBeOwn);
     setHeaders(transfer.request);
@@ -57,6 +58,11 @@ CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
 }
 
 CurlTransfer::~CurlTransfer() = default;
+
+CurlTransfer::Easy CurlTransfer::takeHandle() {
+    curl_easy_reset(easy_.get());
+    return std::move(easy_);
+}
 
 void CurlTransfer::openBody(const std::filesystem::path& file, bool mustBeOwn) {
     // Not to wait for the other end where somebody put a pipe in the file's place.

@@ -24,13 +24,22 @@ class CurlTransfer {
   public:
     using Clock = std::chrono::steady_clock;
 
-    /// Opens the body file and sets the handle up. Throws `TransferError`.
-    explicit CurlTransfer(const HTTPTransfer& transfer);
+    struct EasyDeleter {
+        void operator()(void* easy) const noexcept;
+    };
+    /// A handle as libcurl makes it, or as one that has done its work is set back.
+    using Easy = std::unique_ptr<void, EasyDeleter>;
+
+    /// Opens the body file and sets a handle up: `spare`, or one of its own. Throws `TransferError`.
+    explicit CurlTransfer(const HTTPTransfer& transfer, Easy spare = nullptr);
     CurlTransfer(const CurlTransfer&) = delete;
     CurlTransfer& operator=(const CurlTransfer&) = delete;
     ~CurlTransfer();
 
     [[nodiscard]] void* handle() const { return easy_.get(); }
+
+    /// Gives the handle away, for the next transfer. Requires: curl has let go of it; nothing else is called any more.
+    [[nodiscard]] Easy takeHandle();
 
     /// Looks at how far the transfer has come: reports what was sent, and moves the deadline when a byte went either
     /// way.
@@ -46,9 +55,6 @@ class CurlTransfer {
     [[nodiscard]] std::optional<TransferResponse> response() const;
 
   private:
-    struct EasyDeleter {
-        void operator()(void* easy) const noexcept;
-    };
     struct HeaderListDeleter {
         void operator()(void* list) const noexcept;
     };
@@ -90,7 +96,7 @@ class CurlTransfer {
     bool capReached_ = false;
     char errorText_[256] = {};
 
-    std::unique_ptr<void, EasyDeleter> easy_;  // the last member: it uses the others to its end
+    Easy easy_;  // the last member: it uses the others to its end
 };
 
 }  // namespace corvane

@@ -52,7 +52,6 @@ class InProcessTransferSession::UploadTask final : public SessionTask, public st
 
   private:
     HTTPTransfer transfer(const Core& core) CORVANE_REQUIRES(mutex_);
-    void ended(Core& core, const TransferOutcome& outcome);
 
     const std::weak_ptr<Core> core_;
 
@@ -100,16 +99,14 @@ HTTPTransfer InProcessTransferSession::UploadTask::transfer(const Core& core) {
         auto owner = weakCore.lock();
         if (!task || !owner) return;
         const auto reporter = owner->reporter;  // the session may be gone before the call is back
-        reporter->enqueue([task = std::move(task), owner = std::move(owner), outcome = std::move(outcome)] {
-            task->ended(*owner, outcome);
-        });
+        // Nobody else would ever end a task whose delegate has gone.
+        auto afterwards = [task, owner = std::move(owner)](bool isTold) {
+            if (!isTold) task->complete();
+        };
+        reporter->enqueueEnd(std::move(task), &TransferSessionDelegate::taskDidComplete, std::move(outcome),
+                             std::move(afterwards));
     };
     return transfer;
-}
-
-// Nobody else would ever end a task whose delegate has gone.
-void InProcessTransferSession::UploadTask::ended(Core& core, const TransferOutcome& outcome) {
-    if (!core.reporter->reportEnd(*this, &TransferSessionDelegate::taskDidComplete, outcome)) complete();
 }
 
 std::shared_ptr<InProcessTransferSession::UploadTask> InProcessTransferSession::Core::add(TransferRequest request,

@@ -2,11 +2,15 @@
 
 #include <corvane/Platform/HostCall.h>
 
+#include <algorithm>
 #include <utility>
 
 namespace corvane {
 
 namespace {
+
+// So that no transaction of the delegate's takes long.
+constexpr std::size_t mostTogether = 64;
 
 // Completes a task at its end, however the delegate comes back.
 class Completed {
@@ -24,6 +28,7 @@ class Completed {
 
 SessionReporter::SessionReporter(std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue)
     : delegate_(std::move(delegate)),
+      isOwn_(dynamic_cast<OwnDelegate*>(delegate_.lock().get()) != nullptr),
       queue_(queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session")) {}
 
 void SessionReporter::close() {
@@ -49,16 +54,71 @@ bool SessionReporter::reportEnd(SessionTask& task, Ending ending, const Transfer
     return true;
 }
 
+void SessionReporter::enqueueEnd(std::shared_ptr<SessionTask> task, Ending ending, TransferOutcome outcome,
+                                 Afterwards afterwards) {
+    {
+        const Lock lock(mutex_);
+        ends_.push_back({std::move(task), ending, std::move(outcome), std::move(afterwards)});
+    }
+    // One for each, though the first may take all: a queue that is suspended by a callback calls no other.
+    enqueue([self = shared_from_this()] { self->reportNext(); });
+}
+
+void SessionReporter::reportNext() {
+    const auto told = delegate();
+    const auto ends = takeNext(isOwn_ && told);
+    if (ends.size() > 1) return reportTogether(dynamic_cast<OwnDelegate&>(*told), ends);
+    for (const auto& [task, ending, outcome, afterwards] : ends) {
+        const bool isTold = reportEnd(*task, ending, outcome);
+        if (afterwards) afterwards(isTold);
+    }
+}
+
+std::vector<SessionReporter::Waiting> SessionReporter::takeNext(bool together) {
+    const auto completes = [](const Waiting& one) { return one.ending == &TransferSessionDelegate::taskDidComplete; };
+    const Lock lock(mutex_);
+    std::size_t count = ends_.empty() ? 0 : 1;
+    while (together && count < std::min(ends_.size(), mostTogether) && completes(ends_[count - 1]) &&
+           completes(ends_[count])) {
+        ++count;
+    }
+    std::vector<Waiting> taken;
+    taken.reserve(count);
+    for (; count > 0; --count) {
+        taken.push_back(std::move(ends_.front()));
+        ends_.pop_front();
+    }
+    return taken;
+}
+
+void SessionReporter::reportTogether(OwnDelegate& delegate, const std::vector<Waiting>& ends) {
+    std::deque<Completed> completed;
+    std::vector<OwnDelegate::Completion> completions;
+    std::vector<bool> isTold;
+    for (const auto& one : ends) {
+        isTold.push_back(one.task->state() != TransferTask::State::completed);
+        if (!isTold.back()) continue;
+        completed.emplace_back(*one.task);
+        completions.push_back({*one.task, one.outcome});
+    }
+    callHost("transfer session delegate", [&] { delegate.tasksDidComplete(completions); });
+    completed.clear();
+    for (std::size_t i = 0; i < ends.size(); ++i) {
+        if (ends[i].afterwards) ends[i].afterwards(isTold[i]);
+    }
+}
+
 void SessionReporter::enqueue(Task report) {
     const auto queue = queue_;  // what is enqueued may hold the last reference to this object
     queue->asyncAhead(std::move(report));
 }
 
 void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected) {
-    if (!task->note(total, expected)) return;
+    if (!wantsProgress() || !task->note(total, expected)) return;
     enqueue([self = shared_from_this(), task = std::move(task)] {
         const auto progress = task->takeProgress();
         const auto told = self->delegate();
+        if (task->state() == TransferTask::State::completed) return;  // its end was told together with an earlier one
         if (told && progress.step > 0) {
             told->taskDidSendBodyData(*task, progress.step, progress.total, progress.expected);
         }

@@ -2,11 +2,13 @@
 
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
+#include <corvane/Transfer/OwnDelegate.h>
 #include <corvane/Transfer/SessionTask.h>
 #include <corvane/Transfer/TransferOutcome.h>
 #include <corvane/Transfer/TransferSession.h>
 
 #include <cstdint>
+#include <deque>
 #include <functional>
 #include <memory>
 #include <vector>
@@ -23,6 +25,8 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     /// How the delegate is told of an end: by which of its callbacks.
     using Ending = void (TransferSessionDelegate::*)(const TransferTask&, const std::optional<AnyError>&,
                                                      const std::optional<TransferResponse>&);
+    /// What follows an end that was enqueued, on the queue. `told` as `reportEnd` returns it.
+    using Afterwards = std::function<void(bool told)>;
     /// Lists the session's tasks that are not completed.
     using List = std::function<std::vector<std::shared_ptr<TransferTask>>()>;
 
@@ -40,12 +44,18 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     /// backlog of events must not keep documents on disk that are delivered.
     void enqueue(Task report);
 
+    /// Enqueues what tells of a task's end. A delegate that takes completions together gets those that are at hand by
+    /// then in one call.
+    void enqueueEnd(std::shared_ptr<SessionTask> task, Ending ending, TransferOutcome outcome, Afterwards afterwards);
+
     /// Tells of a task's end, once, and completes the task when the callback has come back, whatever it throws: until
     /// then the task counts as running. On the queue. Returns whether the delegate was told; a task of which nobody was
     /// told is not completed.
     bool reportEnd(SessionTask& task, Ending ending, const TransferOutcome& outcome);
 
-    /// Enqueues a report of how much has gone out, unless one waits already.
+    /// Whether anybody wants to know how much of a body has gone out.
+    [[nodiscard]] bool wantsProgress() const { return !isOwn_ || OwnDelegate::wantsProgress(); }
+    /// Enqueues a report of how much has gone out, unless one waits already or nobody wants to know.
     void reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected);
 
     /// Answers a question for the session's tasks through the queue, behind the completions that wait there.
@@ -55,10 +65,25 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     void signalDelivered();
 
   private:
+    /// An end that waits in the queue.
+    struct Waiting {
+        std::shared_ptr<SessionTask> task;
+        Ending ending;
+        TransferOutcome outcome;
+        Afterwards afterwards;
+    };
+
+    /// Reports the next end that waits, with those behind it that the delegate takes together with it.
+    void reportNext();
+    [[nodiscard]] std::vector<Waiting> takeNext(bool together);
+    void reportTogether(OwnDelegate& delegate, const std::vector<Waiting>& ends);
+
     const std::weak_ptr<TransferSessionDelegate> delegate_;
+    const bool isOwn_;  // the delegate is an OwnDelegate
     const std::shared_ptr<SerialQueue> queue_;
 
     mutable Mutex mutex_;
+    std::deque<Waiting> ends_ CORVANE_GUARDED_BY(mutex_);
     bool closed_ CORVANE_GUARDED_BY(mutex_) = false;
 };
 

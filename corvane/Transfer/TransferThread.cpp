@@ -88,6 +88,7 @@ Ticket Engine::start(HTTPTransfer transfer) {
         Lock lock(mutex_);
         ticket = ++lastTicket_;
         if (!stopping_) arrived_.push_back({ticket, std::move(transfer)});
+        if (arrived_.size() > 1) return ticket;  // it has been woken for the first
     }
     queue_.wakeUp();
     return ticket;

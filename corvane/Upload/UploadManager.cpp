@@ -106,7 +106,9 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     const auto& resource = *request.resource;
     auto identifier = resource.identifier();
     Log::shared().default_("Creating upload task, identifier=%{public}@", identifier);
-    auto file = dropbox_->write(identifier, gzipCompressed(resource.jsonObject().toData()), resource);
+    const auto json = resource.jsonObject();
+    const auto body = json.isObject() ? gzipCompressed(json.text()) : gzipCompressed(json.toData());
+    auto file = dropbox_->write(identifier, body, resource);
     const auto entity = newEntity(request, std::move(identifier));
     const auto taken = record(entity, request);
     service_->submit(prepared(entity, std::move(file)));
@@ -116,9 +118,10 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
 UploadTaken UploadManager::record(const SignedEntity& entity, const UploadRequest& request) {
     try {
         deferredStore_->perform([&](Rows& rows) {
+            if (!request.removeBackup) return rows.insert(entity);
             rows.transaction([&] {
                 rows.insert(entity);
-                if (request.removeBackup) request.removeBackup(rows.connection());
+                request.removeBackup(rows.connection());
             });
         });
         return UploadTaken::recorded;
@@ -263,28 +266,45 @@ std::optional<PreparedUploadRequest> UploadManager::preparedRequest(const Signed
     return std::nullopt;
 }
 
-void UploadManager::uploadService(UploadServiceType&, const UploadResult& result) {
-    if (const auto* retry = std::get_if<UploadResult::Retry>(&result.value)) {
-        didFailForNow(*retry);
-    } else if (const auto* success = std::get_if<UploadResult::Success>(&result.value)) {
-        didFinish(success->identifier, success->response, Outcome::delivered);
-    } else if (const auto* failed = std::get_if<UploadResult::Failed>(&result.value)) {
-        didFinish(failed->identifier, failed->response, Outcome::givenUp);
-    }
-    if (backlog_.end(result.identifier())) retryStoredRequestsLater();
+void UploadManager::uploadService(UploadServiceType& service, const UploadResult& result) {
+    uploadServiceTogether(service, {result});
 }
 
-void UploadManager::didFinish(const std::string& identifier, const UploadResponse& response, Outcome outcome) {
+void UploadManager::uploadServiceTogether(UploadServiceType&, const std::vector<UploadResult>& results) {
+    std::vector<std::string> over;
+    for (const auto& result : results) {
+        if (!std::holds_alternative<UploadResult::Retry>(result.value)) over.push_back(result.identifier());
+    }
+    const auto rowProblem = deleteRows(over);
+    bool isMoreReady = false;
+    for (const auto& result : results) {
+        if (const auto* retry = std::get_if<UploadResult::Retry>(&result.value)) {
+            didFailForNow(*retry);
+        } else {
+            didFinish(result, rowProblem);
+        }
+        isMoreReady = backlog_.end(result.identifier());
+    }
+    if (isMoreReady) retryStoredRequestsLater();
+}
+
+void UploadManager::didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem) {
+    const auto& identifier = result.identifier();
+    const auto* success = std::get_if<UploadResult::Success>(&result.value);
     forgetUnrecorded(identifier);
+    auto problem = rowProblem;
     try {
-        deleteRow(identifier);
-        dropbox_->finish(identifier, response);
+        const auto& response = success ? success->response : std::get<UploadResult::Failed>(result.value).response;
+        if (!problem) dropbox_->finish(identifier, response);
     } catch (...) {
+        problem = AnyError::current();
+    }
+    if (problem) {
         Log::shared().error(
             "Completed upload but failed to cleanup tracking data, identifier=%{public}@, error=%{public}@", identifier,
-            AnyError::current().what());
+            problem->what());
     }
-    settle(identifier, outcome);
+    settle(identifier, success ? Outcome::delivered : Outcome::givenUp);
 }
 
 // Without a row nothing is left to send again, unless the row could not be written: then the contents stayed where they
@@ -341,6 +361,23 @@ bool UploadManager::hasRow(const std::string& identifier) {
 
 void UploadManager::deleteRow(const std::string& identifier) {
     deferredStore_->perform([&](Rows& rows) { rows.deleteWhere("identifier", identifier); });
+}
+
+std::optional<AnyError> UploadManager::deleteRows(const std::vector<std::string>& identifiers) noexcept {
+    try {
+        if (identifiers.size() == 1) {
+            deleteRow(identifiers.front());
+        } else if (!identifiers.empty()) {
+            deferredStore_->perform([&](Rows& rows) {
+                rows.transaction([&] {
+                    for (const auto& identifier : identifiers) rows.deleteWhere("identifier", identifier);
+                });
+            });
+        }
+        return std::nullopt;
+    } catch (...) {
+        return AnyError::current();
+    }
 }
 
 void UploadManager::settle(const std::string& identifier, Outcome outcome) {

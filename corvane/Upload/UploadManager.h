@@ -60,6 +60,8 @@ class UploadManager final : public UploadManagerType,
 
     /// Deletes row and file of an upload that is over, or counts a retry.
     void uploadService(UploadServiceType& service, const UploadResult& result) override;
+    /// The same, with the rows deleted in one transaction.
+    void uploadServiceTogether(UploadServiceType& service, const std::vector<UploadResult>& results) override;
     /// Strikes the upload out of the ledger; its row and its file are the other process's.
     void uploadEndedElsewhere(const UploadResult& result) override;
 
@@ -85,7 +87,8 @@ class UploadManager final : public UploadManagerType,
     /// The row's request, or nothing when its payload file has gone or is empty; the row is then deleted.
     [[nodiscard]] std::optional<PreparedUploadRequest> preparedRequest(const SignedEntity& entity);
 
-    void didFinish(const std::string& identifier, const UploadResponse& response, DeliveryLedger::Outcome outcome);
+    /// Removes the payload of an upload that is over, unless its row could not be deleted.
+    void didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem);
     void didFailForNow(const UploadResult::Retry& retry);
     /// Counts a retry in the row. Returns false when there is no row.
     bool markRetry(const UploadResult::Retry& retry);
@@ -99,6 +102,8 @@ class UploadManager final : public UploadManagerType,
     [[nodiscard]] bool hasRow(const std::string& identifier);
 
     void deleteRow(const std::string& identifier);
+    /// Deletes all of them or none, in which case it returns why.
+    [[nodiscard]] std::optional<AnyError> deleteRows(const std::vector<std::string>& identifiers) noexcept;
     void settle(const std::string& identifier, DeliveryLedger::Outcome outcome);
 
     const std::shared_ptr<UploadServiceType> service_;

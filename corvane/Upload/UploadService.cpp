@@ -178,6 +178,7 @@ void UploadService::startTask(TransferSession& session, const PreparedUploadRequ
                                          request.dataFileURL);
     task->setDescription(request.identifier);
     task->resume();
+    if (!Log::shared().isEnabled(LogLevel::default_)) return;  // the text of its values takes longer than the rest
     Log::shared().default_("Upload task submitted, identifier=%{public}@, urlSessionTaskID=%{public}@, signature=%@",
                            request.identifier, urlSessionTaskID(*task), signatureText);
 }
@@ -265,6 +266,16 @@ void UploadService::taskDidComplete(const TransferTask& task, const std::optiona
     if (const auto delegate = noteEnd(task)) delegate->uploadService(*this, ending);
 }
 
+void UploadService::tasksDidComplete(const std::vector<Completion>& completions) {
+    std::shared_ptr<UploadServiceDelegate> delegate;
+    std::vector<UploadResult> results;
+    for (const auto& [task, outcome] : completions) {
+        results.push_back(result(task, outcome.get().error, outcome.get().response));
+        delegate = noteEnd(task);
+    }
+    if (delegate) delegate->uploadServiceTogether(*this, results);
+}
+
 void UploadService::taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
                                         const std::optional<TransferResponse>& response) {
     const UploadResult ending = result(task, error, response);
@@ -297,7 +308,7 @@ UploadResult UploadService::result(const TransferTask& task, const std::optional
 UploadResult UploadService::result(const std::string& identifier, const std::string& taskID, UploadResponse response) {
     auto& log = Log::shared();
     const auto status = response.statusCode;
-    const auto text = response.description();
+    const auto text = log.isEnabled(LogLevel::default_) ? response.description() : std::string();
     switch (classify(status)) {
         case Verdict::delivered:
             log.default_(

@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Lazy.h>
 #include <corvane/Platform/Mutex.h>
+#include <corvane/Transfer/OwnDelegate.h>
 #include <corvane/Transfer/TransferSession.h>
 #include <corvane/Upload/Endpoint.h>
 #include <corvane/Upload/SignerType.h>
@@ -35,6 +36,7 @@ namespace corvane {
 ///     service->submit(request);            // later: manager->uploadService(*service, result) on the queue
 class UploadService final : public UploadServiceType,
                             public TransferSessionDelegate,
+                            public OwnDelegate,
                             public std::enable_shared_from_this<UploadService> {
   public:
     /// The session's identifier, which is its description too. Every service uses this one; the owner key tells their
@@ -76,6 +78,7 @@ class UploadService final : public UploadServiceType,
                              std::int64_t expected) override;
     void taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                          const std::optional<TransferResponse>& response) override;
+    void tasksDidComplete(const std::vector<Completion>& completions) override;
     void taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
                              const std::optional<TransferResponse>& response) override;
     void allEventsDelivered() override;

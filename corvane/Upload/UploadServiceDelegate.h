@@ -1,9 +1,12 @@
 #pragma once
 
+#include <corvane/Upload/UploadResult.h>
+
+#include <vector>
+
 namespace corvane {
 
 class UploadServiceType;
-struct UploadResult;
 
 /// Whoever keeps the books of an upload service's uploads: the upload manager. The service holds it weakly.
 class UploadServiceDelegate {
@@ -13,6 +16,12 @@ class UploadServiceDelegate {
     /// Called once for every upload that ended, on the queue that was registered with the service. It runs its database
     /// work where it is called, and reports failures to the log; it does not throw.
     virtual void uploadService(UploadServiceType& service, const UploadResult& result) = 0;
+
+    /// Called in place of the one above for uploads of which several ended together, in their order. Calls it for each
+    /// by default.
+    virtual void uploadServiceTogether(UploadServiceType& service, const std::vector<UploadResult>& results) {
+        for (const auto& result : results) uploadService(service, result);
+    }
 
     /// Called, on the same queue, for an upload whose end the delegate of another process was told of, which keeps the
     /// books of it. Does nothing by default.

@@ -13,7 +13,8 @@ namespace corvane {
 namespace {
 
 constexpr std::size_t outputStep = 16384;
-constexpr int gzipWindowBits = 15 + 16;  // the largest window, in the gzip wrapper
+constexpr std::size_t mostKept = 16 * outputStep;  // of the output of a document that was large
+constexpr int gzipWindowBits = 15 + 16;            // the largest window, in the gzip wrapper
 constexpr int memoryLevel = 9;
 
 /// A compression that is set up.
@@ -30,28 +31,30 @@ class Deflater {
 
     [[nodiscard]] std::string compress(std::string_view bytes);
     /// Makes it ready for the next input; false when it cannot be used any more.
-    [[nodiscard]] bool reset() noexcept { return deflateReset(&stream_) == Z_OK; }
+    [[nodiscard]] bool reset() noexcept {
+        if (output_.size() > mostKept) std::string().swap(output_);
+        return deflateReset(&stream_) == Z_OK;
+    }
 
   private:
     z_stream stream_{};
+    std::string output_;
 };
 
 std::string Deflater::compress(std::string_view bytes) {
     z_stream& stream = stream_;
     stream.next_in = reinterpret_cast<Bytef*>(const_cast<char*>(bytes.data()));
     stream.avail_in = static_cast<uInt>(bytes.size());
-    std::string output;
     int status = Z_OK;
     do {
-        if (stream.total_out >= output.size()) output.resize(output.size() + outputStep);
-        stream.next_out = reinterpret_cast<Bytef*>(output.data()) + stream.total_out;
-        stream.avail_out = static_cast<uInt>(output.size() - stream.total_out);
+        if (stream.total_out >= output_.size()) output_.resize(output_.size() + outputStep);
+        stream.next_out = reinterpret_cast<Bytef*>(output_.data()) + stream.total_out;
+        stream.avail_out = static_cast<uInt>(output_.size() - stream.total_out);
         status = deflate(&stream, Z_FINISH);
     } while (status == Z_OK && stream.avail_out == 0);
     // A payload that is cut short would be signed, sent and refused like a whole one.
     if (status != Z_STREAM_END) throw GZIPError(GZIPError::failed, status);
-    output.resize(stream.total_out);
-    return output;
+    return output_.substr(0, stream.total_out);
 }
 
 /// The one that the next document uses: making its state, a quarter of a megabyte, takes as long as compressing a

@@ -173,7 +173,7 @@ TEST_F(DiskFaults, ALockCostsOneTimeoutAndIsToldOfBeforeEachCompletion) {
         application.abandon();
     }
     EXPECT_EQ(unsaid_, 0);
-    EXPECT_EQ(runAgain().delivered.documents, 2) << "one for each row";
+    EXPECT_EQ(runAgain().delivered.documents, 3) << "one for each row";
     EXPECT_EQ(distinctEvents(), static_cast<std::size_t>(events) + 2);
 
     StoreConnection other(StoreLocation::default_("main"));

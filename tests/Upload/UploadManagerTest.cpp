@@ -78,6 +78,30 @@ TEST(UploadManager, TakesADocumentOverAndForgetsItOnceTheCollectorHasAnswered) {
     EXPECT_EQ(log.count("Failed"), 0);
 }
 
+TEST(UploadManager, DocumentsThatEndTogetherGoTogether) {
+    const TemporaryDocuments documents;
+    const CapturedLog log;
+    ProcessRun run;
+    run.manager->open();
+    const std::vector<UploadResult> results{UploadResult::success("1", {200}), UploadResult::retry("2", now()),
+                                            UploadResult::failed("3", {404})};
+    for (const auto* identifier : {"1", "2", "3"}) run.upload(identifier);
+    StoreConnection other(StoreLocation::default_("main"));
+    other.run(
+        "CREATE TRIGGER full BEFORE DELETE ON signed_requests WHEN OLD.identifier = '3' "
+        "BEGIN SELECT RAISE(FAIL, 'full'); END;");
+    run.manager->uploadServiceTogether(*run.service, results);
+    EXPECT_EQ(run.rows().size(), 3u) << "all or none";
+    for (const auto* identifier : {"1", "2", "3"}) EXPECT_TRUE(run.dropbox->existingFile(identifier));
+    EXPECT_EQ(log.count("Completed upload but failed to cleanup tracking data"), 2);
+    other.run("DROP TRIGGER full;");
+    run.manager->uploadServiceTogether(*run.service, results);
+    ASSERT_EQ(run.rows().size(), 1u);
+    EXPECT_EQ(run.rows().at(0).identifier + std::to_string(run.rows().at(0).retries), "22");
+    for (const auto* identifier : {"1", "3"}) EXPECT_FALSE(run.dropbox->existingFile(identifier));
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{.delivered = {10, 1}, .pending = {10, 1}, .givenUp = {10, 1}}));
+}
+
 TEST(UploadManager, WhatEndedElsewhereIsWaitedForNoLongerAndLeftToWhoeverWasTold) {
     const TemporaryDocuments documents;
     ProcessRun run;

@@ -92,15 +92,18 @@ void Agent::waitForNews() {
     }
 }
 
+// A mark stays until the journal has let go of its task: an agent that is killed in between finds it.
 void Agent::dropWithdrawn() {
-    for (const auto& token : directory_.withdrawn()) {
+    const auto withdrawn = directory_.withdrawn();
+    for (const auto& token : withdrawn) {
         if (const auto number = book_.find(token)) {
             queue_.remove(*number);
             desk_.withdraw(*number);
         }
         unlink(directory_.submissionPath(token).c_str());
-        directory_.removeMark(token);
     }
+    if (!book_.settle()) return;
+    for (const auto& token : withdrawn) directory_.removeMark(token);
 }
 
 // --- For the upload queue. -------------------------------------------------------------------------------------------

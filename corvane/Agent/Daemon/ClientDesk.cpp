@@ -143,6 +143,7 @@ void ClientDesk::reportProgress() {
     for (const auto& progress : queue_.takeProgress()) {
         if (!book_.contains(progress.number)) continue;
         const auto& task = book_.task(progress.number);
+        if (!task.wantsProgress) continue;
         Client* client = addressee(*task.owner, progress.number);
         if (client && client->socket.unsent() < mostUnreadForMore) {
             client->send(agent::Progress{task.token, progress.total, progress.expected});

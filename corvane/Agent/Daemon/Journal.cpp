@@ -51,53 +51,66 @@ std::filesystem::path moveAside(const std::filesystem::path& path) {
 void Journal::Close::operator()(sqlite3* database) const noexcept {
     sqlite3_close_v2(database);
 }
+void Journal::Finalize::operator()(sqlite3_stmt* statement) const noexcept {
+    sqlite3_finalize(statement);
+}
 
 void Journal::fail(int code) {
     isDamaged_ = isDamaged_ || (code & 0xFF) == SQLITE_CORRUPT || (code & 0xFF) == SQLITE_NOTADB;
     throw JournalError(std::string("the journal cannot be used: ") + sqlite3_errmsg(database_.get()));
 }
 
-/// A statement with its arguments, for one use.
+/// A statement with its arguments, for one use. What was prepared is kept for the next of the same text, a literal:
+/// every document takes the same few.
 class Journal::Statement {
   public:
-    Statement(Journal& journal, const char* sql) : journal_(journal) {
-        const int result = sqlite3_prepare_v2(journal.database_.get(), sql, -1, &statement_, nullptr);
+    Statement(Journal& journal, const char* sql) : journal_(journal), kept_(journal.prepared_[sql]) {
+        prepared_ = std::move(kept_);
+        if (prepared_) return;
+        sqlite3_stmt* prepared = nullptr;
+        const int result = sqlite3_prepare_v2(journal.database_.get(), sql, -1, &prepared, nullptr);
+        prepared_.reset(prepared);
         if (result != SQLITE_OK) journal.fail(result);
     }
     Statement(const Statement&) = delete;
     Statement& operator=(const Statement&) = delete;
-    ~Statement() { sqlite3_finalize(statement_); }
+    ~Statement() {
+        sqlite3_reset(prepared_.get());
+        sqlite3_clear_bindings(prepared_.get());
+        kept_ = std::move(prepared_);
+    }
 
     Statement& number(std::int64_t value) {
-        sqlite3_bind_int64(statement_, ++bound_, value);
+        sqlite3_bind_int64(prepared_.get(), ++bound_, value);
         return *this;
     }
     Statement& text(std::string_view value) {
-        sqlite3_bind_text(statement_, ++bound_, value.data(), static_cast<int>(value.size()), SQLITE_TRANSIENT);
+        sqlite3_bind_text(prepared_.get(), ++bound_, value.data(), static_cast<int>(value.size()), SQLITE_TRANSIENT);
         return *this;
     }
     Statement& bytes(std::string_view value) {
-        sqlite3_bind_blob(statement_, ++bound_, value.data(), static_cast<int>(value.size()), SQLITE_TRANSIENT);
+        sqlite3_bind_blob(prepared_.get(), ++bound_, value.data(), static_cast<int>(value.size()), SQLITE_TRANSIENT);
         return *this;
     }
 
     /// Whether there is a row, or another one.
     bool step() {
-        const int result = sqlite3_step(statement_);
+        const int result = sqlite3_step(prepared_.get());
         if (result != SQLITE_ROW && result != SQLITE_DONE) journal_.fail(result);
         return result == SQLITE_ROW;
     }
-    [[nodiscard]] bool isNull(int column) { return sqlite3_column_type(statement_, column) == SQLITE_NULL; }
-    [[nodiscard]] std::int64_t integer(int column) { return sqlite3_column_int64(statement_, column); }
+    [[nodiscard]] bool isNull(int column) { return sqlite3_column_type(prepared_.get(), column) == SQLITE_NULL; }
+    [[nodiscard]] std::int64_t integer(int column) { return sqlite3_column_int64(prepared_.get(), column); }
     [[nodiscard]] std::string contents(int column) {
-        const auto* start = static_cast<const char*>(sqlite3_column_blob(statement_, column));
-        return start ? std::string(start, static_cast<std::size_t>(sqlite3_column_bytes(statement_, column)))
+        const auto* start = static_cast<const char*>(sqlite3_column_blob(prepared_.get(), column));
+        return start ? std::string(start, static_cast<std::size_t>(sqlite3_column_bytes(prepared_.get(), column)))
                      : std::string();
     }
 
   private:
     Journal& journal_;
-    sqlite3_stmt* statement_ = nullptr;
+    Prepared& kept_;
+    Prepared prepared_;
     int bound_ = 0;
 };
 
@@ -107,6 +120,7 @@ Journal::Journal(const std::filesystem::path& path, std::string& problem) {
     } catch (const JournalError& damaged) {
         if (!isDamaged_) throw;
         isDamaged_ = false;
+        prepared_.clear();
         database_.reset();
         const auto aside = moveAside(path);
         open(path);
@@ -187,6 +201,17 @@ std::int64_t Journal::accept(const TransferSubmission& submission, std::int64_t 
     if (submission.description) insert.text(*submission.description);
     insert.step();
     return sqlite3_last_insert_rowid(database_.get());
+}
+
+void Journal::together(const std::function<void()>& changes) {
+    Statement(*this, "BEGIN IMMEDIATE;").step();
+    try {
+        changes();
+        Statement(*this, "COMMIT;").step();
+    } catch (...) {
+        sqlite3_exec(database_.get(), "ROLLBACK;", nullptr, nullptr, nullptr);
+        throw;
+    }
 }
 
 void Journal::complete(std::int64_t number, std::string_view outcome) {

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <functional>
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
@@ -12,6 +13,7 @@
 #include <vector>
 
 struct sqlite3;
+struct sqlite3_stmt;
 
 namespace corvane::transferd {
 
@@ -47,6 +49,8 @@ class Journal {
     void forEach(const std::function<void(Task)>& visit);
     /// Keeps a task, and gives it its number.
     std::int64_t accept(const TransferSubmission& submission, std::int64_t accepted);
+    /// Calls `changes`: what they do here is done all or not at all. What they throw undoes them and comes through.
+    void together(const std::function<void()>& changes);
     void complete(std::int64_t number, std::string_view outcome);
     void forget(std::int64_t number);
     void describe(std::int64_t number, const std::string& description);
@@ -67,6 +71,10 @@ class Journal {
     struct Close {
         void operator()(sqlite3* database) const noexcept;
     };
+    struct Finalize {
+        void operator()(sqlite3_stmt* statement) const noexcept;
+    };
+    using Prepared = std::unique_ptr<sqlite3_stmt, Finalize>;
 
     void open(const std::filesystem::path& path);
     /// Makes a new file's tables, or an earlier version's into this one's.
@@ -78,6 +86,7 @@ class Journal {
     [[noreturn]] void fail(int code);
 
     std::unique_ptr<sqlite3, Close> database_;
+    std::map<std::string_view, Prepared> prepared_;  // by their text, while they are not in use
     bool isDamaged_ = false;
 };
 

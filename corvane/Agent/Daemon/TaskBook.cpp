@@ -16,12 +16,12 @@ void TaskBook::load(const std::function<void(std::int64_t number, const Transfer
         if (task.isReadable && !task.isOver) visit(task.number, task.submission);
     });
     for (const auto number : unreadable) failUnreadable(number);
+    settle();
 }
 
 void TaskBook::failUnreadable(std::int64_t number) {
     if (!tasks_.contains(number)) {
         unforgotten_.push_back(number);
-        settle();
     } else if (tasks_.at(number).owner->open.contains(number)) {
         complete(number, unreadableOutcome());
     }
@@ -66,7 +66,8 @@ std::int64_t TaskBook::accept(const TransferSubmission& submission, std::int64_t
 
 void TaskBook::index(std::int64_t number, std::int64_t accepted, const TransferSubmission& submission, bool isOver) {
     Owner& by = owner(submission.session, submission.owner);
-    tasks_.emplace(number, Task{submission.token, &by, accepted + submission.patience.count()});
+    tasks_.emplace(number,
+                   Task{submission.token, &by, accepted + submission.patience.count(), submission.wantsProgress()});
     numbers_.emplace(submission.token, number);
     if (isOver) {
         by.over.emplace(number, 0);
@@ -76,12 +77,7 @@ void TaskBook::index(std::int64_t number, std::int64_t accepted, const TransferS
 }
 
 void TaskBook::complete(std::int64_t number, const TransferOutcome& outcome) {
-    std::string bytes = encodeOutcome(outcome);
-    try {
-        journal_.complete(number, bytes);
-    } catch (const JournalError&) {
-        unwritten_[number] = std::move(bytes);
-    }
+    unwritten_[number] = encodeOutcome(outcome);
     Owner& by = *tasks_.at(number).owner;
     by.open.erase(number);
     by.over.emplace(number, 0);
@@ -95,11 +91,29 @@ void TaskBook::forget(std::int64_t number) {
     found->second.owner->over.erase(number);
     numbers_.erase(found->second.token);
     tasks_.erase(found);
-    settle();
 }
 
-// What was reported goes first: its room is what the rest may need.
+// What was reported goes first, and by itself where there is no room for all: its room is what the rest may need.
 bool TaskBook::settle() {
+    return settleTogether() || settleOneByOne();
+}
+
+bool TaskBook::settleTogether() {
+    if (isSettled()) return true;
+    try {
+        journal_.together([this] {
+            for (const auto number : unforgotten_) journal_.forget(number);
+            for (const auto& [number, outcome] : unwritten_) journal_.complete(number, outcome);
+        });
+    } catch (const JournalError&) {
+        return false;
+    }
+    unforgotten_.clear();
+    unwritten_.clear();
+    return true;
+}
+
+bool TaskBook::settleOneByOne() {
     try {
         for (; !unforgotten_.empty(); unforgotten_.pop_back()) journal_.forget(unforgotten_.back());
         for (; !unwritten_.empty(); unwritten_.erase(unwritten_.begin())) {

@@ -22,8 +22,8 @@ namespace corvane::transferd {
 ///     accept -> open -> complete -> over -> forget
 ///                 +---------------------------^      withdrawn by its host
 ///
-/// `complete` and `forget` never fail: what the journal does not take at once is kept for `settle`. A kill before that
-/// leaves an open task, which is sent again, or one that is over, which is reported again.
+/// `complete` and `forget` never fail: they are kept for `settle`, which comes back to what the journal does not take.
+/// A kill before that leaves an open task, which is sent again, or one that is over, which is reported again.
 class TaskBook {
   public:
     /// Beyond this many tasks no more are taken, so that a host that runs wild fills neither memory nor disk.
@@ -43,6 +43,7 @@ class TaskBook {
         std::string token;
         Owner* owner = nullptr;
         std::int64_t expires = 0;     ///< when it stops waiting for its server, in milliseconds since 1970
+        bool wantsProgress = true;    ///< of its body
         std::uint64_t submitter = 0;  ///< the client that asked for it to be taken, or 0
     };
 
@@ -60,11 +61,13 @@ class TaskBook {
     /// Takes a task into the journal, and gives it its number. `now` is in milliseconds since 1970. Throws
     /// `JournalError` also for one too many.
     std::int64_t accept(const TransferSubmission& submission, std::int64_t now);
-    /// A task whose end the journal cannot be told of is over all the same; see `settle`.
+    /// The task is over; the journal is told by `settle`.
     void complete(std::int64_t number, const TransferOutcome& outcome);
-    /// A row that the journal cannot remove goes later; see `settle`.
+    /// The task is no more; its row goes with `settle`.
     void forget(std::int64_t number);
-    /// Tells the journal what it could not take, when its disk was full, say. Returns whether nothing is left to tell.
+    /// Tells the journal what was completed and forgotten, together, since each turn of its pages costs as much as any
+    /// other: before anybody else is told, and again when it could not take all, as on a full disk. Returns whether
+    /// nothing is left to tell.
     bool settle();
     [[nodiscard]] bool isSettled() const { return unwritten_.empty() && unforgotten_.empty(); }
     [[nodiscard]] bool isDamaged() const { return journal_.isDamaged(); }
@@ -81,6 +84,8 @@ class TaskBook {
     [[nodiscard]] std::string outcome(std::int64_t number);
 
   private:
+    bool settleTogether();
+    bool settleOneByOne();
     /// Ends a task whose submission cannot be read. Its host sends it again. Nobody can be told of one that is
     /// nobody's; the host misses it in the list.
     void failUnreadable(std::int64_t number);

@@ -246,11 +246,11 @@ void AgentConversation::take(const agent::Completed& reply) {
 // Without memory for the report it is as if the agent had said nothing; it does so again on the next connection. One
 // that nobody was told of stays for the next session.
 void AgentConversation::reportCompletion(std::shared_ptr<Task> task, TransferOutcome outcome) {
-    reporter_->enqueue([self = shared_from_this(), task, outcome = std::move(outcome)] {
-        if (!self->reporter_->reportEnd(*task, &TransferSessionDelegate::taskDidComplete, outcome)) return;
-        self->post([token = task->token()](AgentConversation& on)
-                       CORVANE_REQUIRES(agentThread) { on.acknowledge(token); });
-    });
+    auto afterwards = [self = shared_from_this(), token = task->token()](bool isTold) {
+        if (!isTold) return;
+        self->post([token](AgentConversation& on) CORVANE_REQUIRES(agentThread) { on.acknowledge(token); });
+    };
+    reporter_->enqueueEnd(task, &TransferSessionDelegate::taskDidComplete, std::move(outcome), std::move(afterwards));
     task->advanceTo(Stage::reporting);
 }
 
@@ -274,13 +274,14 @@ void AgentConversation::take(const agent::Elsewhere& reply) {
 }
 
 void AgentConversation::reportEndElsewhere(std::shared_ptr<Task> task, TransferOutcome outcome) {
-    reporter_->enqueue([self = shared_from_this(), task, outcome = std::move(outcome)] {
-        self->reporter_->reportEnd(*task, &TransferSessionDelegate::taskDidEndElsewhere, outcome);
-        self->post([token = task->token()](AgentConversation& on) CORVANE_REQUIRES(agentThread) {
+    auto afterwards = [self = shared_from_this(), token = task->token()](bool) {
+        self->post([token](AgentConversation& on) CORVANE_REQUIRES(agentThread) {
             on.tasks_->remove(token);
             on.watch();
         });
-    });
+    };
+    reporter_->enqueueEnd(task, &TransferSessionDelegate::taskDidEndElsewhere, std::move(outcome),
+                          std::move(afterwards));
     task->advanceTo(Stage::reporting);
 }
 

@@ -97,6 +97,8 @@ bool BackgroundTransferCore::spool(const Task& task) {
 }
 
 std::string BackgroundTransferCore::submission(const Task& task) const {
+    std::vector<std::pair<std::string, std::string>> extras;
+    if (!reporter_->wantsProgress()) extras.emplace_back(TransferSubmission::withoutProgress);
     return TransferSubmission{.token = task.token(),
                               .session = configuration_.identifier,
                               .owner = configuration_.ownerKey,
@@ -107,7 +109,8 @@ std::string BackgroundTransferCore::submission(const Task& task) const {
                               .patience = options_.patience,
                               .wakeCommand = wakeCommand(),
                               .trustedCertificates = configuration_.trustedCertificates.string(),
-                              .proxy = TransferProxy::ofEnvironment(task.request().url)}
+                              .proxy = TransferProxy::ofEnvironment(task.request().url),
+                              .extras = std::move(extras)}
         .encoded();
 }
 
