@@ -83,6 +83,7 @@ void addBridgeBenchmarks() {
     addTyped("bridge/submit, class~typed", [](Host& host) { host.tracker->submit<ScreenView>(); });
     addBridged("bridge/push", [](BridgedHost& host) { host.tracker->pushDataEvent(std::make_shared<ScreenObject>()); });
     addTyped("bridge/push~typed", [](Host& host) { host.tracker->push(home); });
+    setBar("bridge/push~typed", "mean ns", 2);
 }
 
 }  // namespace corvane::bench

@@ -1,5 +1,7 @@
 // What a host has that uses the library as it comes: events in batches of 50, backed up, delivered to a server.
 
+#include "benchmarks/AgentProcess.h"
+#include "benchmarks/BareDocuments.h"
 #include "benchmarks/Host.h"
 #include "benchmarks/Samples.h"
 #include "benchmarks/Suites.h"
@@ -70,14 +72,37 @@ Figures logged(int events) {
     });
 }
 
+/// What cannot be done without: the pipeline, and a document for each fifty events.
+Figures bareSum(const std::string& url) {
+    Host host;
+    Figures figures = perEvent(together, cpuNanoseconds, [&] {
+        for (int i = 0; i < together; ++i) host.tracker->submit<ScreenView>();
+        host.drain();
+        return Figures();
+    });
+    return {{"CPU us/event", figures["CPU us/event"] + bareDocuments(url, true)["CPU us/document"] / 50}};
+}
+
+#ifdef CORVANE_AGENT
+Figures deliveredByAgent(const std::string& url, int events) {
+    const AgentProcess agent;
+    TransferSession::setFactory(agent.sessions());
+    const auto cpu = [&] { return cpuNanoseconds() + agent.cpuNanoseconds(); };
+    const auto figures = delivered(url, events, cpu);
+    TransferSession::setFactory(InProcessTransferSession::factory());
+    return figures;
+}
+#endif
+
 }  // namespace
 
 void addEndToEndBenchmarks(const std::string& serverURL) {
+    const std::string url = serverURL + "/in";
     for (const int events : {together, aMillisecond}) {
         const std::string how = events == together ? "burst of 20000" : "one a millisecond";
         const std::string name = "end to end/" + how;
         add(
-            name, [=] { return delivered(serverURL + "/in", events, cpuNanoseconds); }, 3);
+            name, [=] { return delivered(url, events, cpuNanoseconds); }, 3);
         add(
             name + "~do-nothing processor",
             [=] {
@@ -89,8 +114,19 @@ void addEndToEndBenchmarks(const std::string& serverURL) {
                 });
             },
             3);
+        if (events == together) {
+            add(
+                name + "~that, and bare documents", [=] { return bareSum(url); }, 3);
+            setBar(name + "~that, and bare documents", "CPU us/event", 1.5);
+        }
         add(
             name + "~spdlog async, to a file", [=] { return logged(events); }, 3);
+#ifdef CORVANE_AGENT
+        add(
+            name + ", agent", [=] { return deliveredByAgent(url, events); }, 3);
+        add(
+            name + ", agent~spdlog async, to a file", [=] { return logged(events); }, 3);
+#endif
     }
 }
 

@@ -1,6 +1,6 @@
 // Fixed work whose instructions scripts/check-instructions counts:
 //
-//   corvane_instructions submit|encode|durable|burst COUNT
+//   corvane_instructions submit|encode|durable COUNT
 
 #include <corvane/Testing/TemporaryDocuments.h>
 
@@ -16,7 +16,7 @@ using namespace corvane::bench;
 
 int main(int argc, char** argv) {
     if (argc != 3) {
-        std::fputs("usage: corvane_instructions submit|encode|durable|burst COUNT\n", stderr);
+        std::fputs("usage: corvane_instructions submit|encode|durable COUNT\n", stderr);
         return 2;
     }
     const std::string_view path = argv[1];
@@ -41,15 +41,6 @@ int main(int argc, char** argv) {
         host.onQueue([&](AccessTracker& access) {
             for (int i = 0; i < count; ++i) access.submit<ScreenView>();
         });
-        std::_Exit(0);
-    }
-    if (path == "burst") {  // the same when all are at hand
-        Host host(backupOnly("instructions", 50));
-        host.drain();
-        host.tracker->suspend();
-        for (int i = 0; i < count; ++i) host.tracker->submit<ScreenView>();
-        host.tracker->resume();
-        host.drain();
         std::_Exit(0);
     }
     return 2;

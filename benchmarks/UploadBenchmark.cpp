@@ -1,5 +1,7 @@
 // Documents to a server on the loopback address.
 
+#include "benchmarks/AgentProcess.h"
+#include "benchmarks/BareDocuments.h"
 #include "benchmarks/BareSQLite.h"
 #include "benchmarks/BareUpload.h"
 #include "benchmarks/Host.h"
@@ -9,7 +11,6 @@
 
 #include "tests/support/Files.h"
 
-#include <corvane/Agent/Host/BackgroundTransferSession.h>
 #include <corvane/Platform/Date.h>
 #include <corvane/Platform/Descriptor.h>
 #include <corvane/Platform/UUID.h>
@@ -25,12 +26,9 @@
 #include <corvane/Upload/UploadService.h>
 
 #include <fcntl.h>
-#include <signal.h>
 #include <unistd.h>
 
 #include <cstdio>
-#include <cstdlib>
-#include <ctime>
 #include <stdexcept>
 #include <string_view>
 #include <utility>
@@ -136,9 +134,18 @@ std::pair<std::string, std::string> statements() {
     return {table.insertSQL(values), table.deleteSQL("identifier", entity.identifier)};
 }
 
-/// @param survives write the compressed document to a file and a row to a database first, and remove both afterwards,
-///                 as whoever wants to send it again after a crash must.
-Figures bareUploads(const std::string& url, bool survives) {
+#ifdef CORVANE_AGENT
+/// What the host and the agent take together.
+Figures withAgent(const std::string& url) {
+    const AgentProcess agent;
+    Uploads uploads(url, agent.sessions());
+    return perDocument([&] { return cpuNanoseconds() + agent.cpuNanoseconds(); }, [&] { uploads.send(documents); });
+}
+#endif
+
+}  // namespace
+
+Figures bareDocuments(const std::string& url, bool survives) {
     const test::TemporaryDocuments directory;
     BareSQLite database(directory / "bare.db");
     database.run(Store<SignedEntity>::table().createSQL());
@@ -165,59 +172,15 @@ Figures bareUploads(const std::string& url, bool survives) {
     });
 }
 
-#ifdef CORVANE_AGENT
-/// An agent with a directory of its own, which is started by the first session and killed at the end.
-class Agent {
-  public:
-    ~Agent() {
-        if (const pid_t running = process()) kill(running, SIGKILL);
-    }
-
-    [[nodiscard]] TransferSession::Factory sessions() const {
-        return
-            [options = options_](const TransferSessionConfiguration& configuration,
-                                 std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue) {
-                return std::make_shared<BackgroundTransferSession>(configuration, std::move(delegate), std::move(queue),
-                                                                   options);
-            };
-    }
-    [[nodiscard]] double cpuNanoseconds() const {
-        clockid_t clock{};
-        timespec time{};
-        if (clock_getcpuclockid(process(), &clock) != 0 || clock_gettime(clock, &time) != 0) {
-            throw std::runtime_error("there is no agent");
-        }
-        return static_cast<double>(time.tv_sec) * 1e9 + static_cast<double>(time.tv_nsec);
-    }
-
-  private:
-    [[nodiscard]] pid_t process() const {
-        return static_cast<pid_t>(std::atol(test::readFile(options_.directory / "agent.lock").c_str()));
-    }
-
-    const test::TemporaryDocuments documents_;
-    const TransferAgentOptions options_{.program = CORVANE_AGENT, .directory = documents_ / "agent"};
-};
-
-/// What the host and the agent take together.
-Figures withAgent(const std::string& url) {
-    const Agent agent;
-    Uploads uploads(url, agent.sessions());
-    return perDocument([&] { return cpuNanoseconds() + agent.cpuNanoseconds(); }, [&] { uploads.send(documents); });
-}
-#endif
-
-}  // namespace
-
 void addUploadBenchmarks(const std::string& serverURL) {
     const std::string url = serverURL + "/in", survives = "~the same, a file and a row";
     const auto addWith = [&](const std::string& name, Figures (*measure)(const std::string&), double bar) {
         add(
             name, [=] { return measure(url); }, 3);
         add(
-            name + "~gzip, SHA-1, signature, libcurl", [=] { return bareUploads(url, false); }, 3);
+            name + "~gzip, SHA-1, signature, libcurl", [=] { return bareDocuments(url, false); }, 3);
         add(
-            name + survives, [=] { return bareUploads(url, true); }, 3);
+            name + survives, [=] { return bareDocuments(url, true); }, 3);
         setBar(name + survives, "CPU us/document", bar);
     };
     addWith("upload/document of 50 events", inProcess, 1.25);

@@ -1,30 +1,18 @@
 #include <corvane/Tracker/Tracker.h>
 
-#include <corvane/Models/EventData.h>
 #include <corvane/Models/EventMirrorStore.h>
 #include <corvane/Platform/HostCall.h>
-#include <corvane/Platform/StringMap.h>
 #include <corvane/Snapshot/Snapshot.h>
 #include <corvane/Tracker/AccessTracker.h>
-#include <corvane/Tracker/ActiveSessionType.h>
-#include <corvane/Tracker/DataEventStacks.h>
-#include <corvane/Tracker/Sequence.h>
 #include <corvane/Tracker/SessionObserver.h>
 #include <corvane/Tracker/TrackerDelegate.h>
+#include <corvane/Tracker/TrackerScope.h>
 
 #include <algorithm>
 #include <set>
 #include <utility>
 
 namespace corvane {
-
-struct Tracker::Scope {
-    TrackerTimers timers;
-    StringMap<EventSubmit> restartTimers;
-    DataEventStacks dataStacks;
-    std::vector<Group> groupStack;
-    std::shared_ptr<const EventIdentity> identity;  // of the session that the latest event was in
-};
 
 Tracker::Tracker(std::string name, std::shared_ptr<SerialQueue> accessQueue,
                  std::shared_ptr<EventMirrorStore> mirrorStore, std::shared_ptr<Tracker> parent,
@@ -84,19 +72,6 @@ std::vector<std::string> Tracker::path() const {
     return names;
 }
 
-void Tracker::submit(EventSubmit event, Date submitTime, SubmitOptions options) {
-    accessQueue_->asyncInRun(
-        [self = shared_from_this(), event = std::move(event), submitTime, options = std::move(options)]() mutable {
-            if (options.onlyIfTimed && self->isUntimed(event)) return;
-            auto result = self->performSubmit(event, submitTime);
-            if (!options.completion) return;
-            self->accessQueue_->atEndOfRun(SerialQueue::RunEnd::report,
-                                           [completion = std::move(options.completion), result = std::move(result)] {
-                                               callHost("submit completion", [&] { completion(result); });
-                                           });
-        });
-}
-
 std::shared_ptr<DelayedToken> Tracker::delayedSubmit(EventSubmit event, SubmitOptions options) {
     return std::make_shared<DelayedToken>(
         [weak = weak_from_this(), event = std::move(event), submitTime = now(), options = std::move(options)] {
@@ -121,18 +96,6 @@ std::shared_ptr<const SnapshotType> Tracker::snapshot(SnapshotPolicy policy) {
     accessQueue_->assertNotCurrent("Tracker::snapshot");
     return accessQueue_->sync(
         [&] { return std::make_shared<const Snapshot>(policy, levels(policy), eventMirrorStore_); });
-}
-
-void Tracker::time(EventSubmit event, Date startTime, bool submitAndRestartWithSession) {
-    accessQueue_->asyncInRun(
-        [self = shared_from_this(), event = std::move(event), startTime, submitAndRestartWithSession] {
-            self->performTime(event, startTime, submitAndRestartWithSession);
-        });
-}
-
-void Tracker::push(AnyDataEventEntry entry) {
-    accessQueue_->asyncInRun(
-        [self = shared_from_this(), entry = std::move(entry)]() mutable { self->performPush(std::move(entry)); });
 }
 
 void Tracker::pop(std::string_view key, DataType type) {
@@ -169,92 +132,6 @@ void Tracker::resume() {
     if (const auto delegate = delegate_.lock()) delegate->resume();
 }
 
-bool Tracker::isUntimed(const EventSubmit& event) const {
-    accessQueue_->assertCurrent("Tracker submission");
-    const auto delegate = delegate_.lock();
-    return delegate && delegate->activeSession() && !scope_->timers.contains(event.name());
-}
-
-void Tracker::submitNow(const EventSubmit& event, Date submitTime, const SubmitOptions& options) {
-    accessQueue_->assertCurrent("Tracker submission");
-    accessQueue_->endRun();  // what was submitted before is told before
-    if (options.onlyIfTimed && isUntimed(event)) return;
-    const auto result = performSubmit(event, submitTime);
-    accessQueue_->endRun();
-    if (options.completion) callHost("submit completion", [&] { options.completion(result); });
-}
-
-EventSubmitResult Tracker::performSubmit(const EventSubmit& event, Date submitTime) {
-    const auto delegate = delegate_.lock();
-    const ActiveSessionType* session = delegate ? delegate->activeSession() : nullptr;
-    if (!session) return EventSubmitResult::failed(AnyError(TrackerError::withoutSession()));
-    try {
-        return EventSubmitResult::success(process(event, submitTime, *delegate, session->identifier()));
-    } catch (...) {
-        return EventSubmitResult::failed(AnyError::current());
-    }
-}
-
-ProcessEvent Tracker::process(const EventSubmit& event, Date submitTime, TrackerDelegate& delegate,
-                              const std::string& sessionID) {
-    // A document could not say what the event is called, and the event would be lost behind its success.
-    if (!jsontext::isUTF8(event.name())) throw EncodingError(EncodingError::notUTF8, "metadata.name");
-    const EventMirrorProperties properties = event.properties(*eventMirrorStore_);
-    ProcessEvent processEvent(std::string(event.name()), encode(resolve(*properties, event, submitTime, sessionID)),
-                              groupName());
-    delegate.process(processEvent);
-    return processEvent;
-}
-
-Sequence Tracker::resolve(const std::vector<EventMirrorProperty>& properties, const EventSubmit& event, Date submitTime,
-                          const std::string& sessionID) {
-    Sequence sequence{{}, {}, submitTime};
-    std::vector<TrackerError::MissingData> missing;
-    for (const auto& [name, property] : properties) {
-        const bool isRequired = !property->isOptional();
-        if (isRequired && property->isDataType(DataType::of<EventData>())) {
-            sequence.identity = identity(sessionID);
-            sequence.entries.push_back({name, std::nullopt});
-            continue;
-        }
-        auto data = isRequired ? span(*property, event, submitTime) : std::nullopt;
-        if (!data) data = lookup(property->dataKey());
-        if (data && !property->isDataType(data->type())) reportOtherType(name, *property, data->type());
-        if (data) {
-            sequence.entries.push_back({name, std::move(data)});
-        } else if (isRequired) {
-            missing.push_back({name, property->dataType(), std::string(property->dataKey())});
-        }
-    }
-    if (!missing.empty()) throw TrackerError::missing(std::move(missing));
-    return sequence;
-}
-
-/// The span of an event whose timer runs, which ends the timer.
-std::optional<AnyDataEvent> Tracker::span(const EventPropertyType& property, const EventSubmit& event,
-                                          Date submitTime) {
-    accessQueue_->assertCurrent("Tracker submission");
-    if (property.trait() == EventPropertyTrait::data && property.isDataType(DataType::of<TimedData>())) {
-        if (const auto timer = scope_->timers.find(event.name()); timer != scope_->timers.end()) {
-            const TimedData span(timer->second.startTime, submitTime);
-            scope_->timers.erase(timer);
-            if (const auto restart = scope_->restartTimers.find(event.name()); restart != scope_->restartTimers.end()) {
-                scope_->restartTimers.erase(restart);
-            }
-            return AnyDataEvent(span);
-        }
-    }
-    return std::nullopt;
-}
-
-std::optional<AnyDataEvent> Tracker::lookup(std::string_view key) {
-    for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
-        tracker->accessQueue_->assertCurrent("Tracker lookup");
-        if (auto data = tracker->scope_->dataStacks.take(key)) return data;
-    }
-    return std::nullopt;
-}
-
 /// Two types of one name share their data, which a host seldom means. Declarations and data that are known by name only
 /// have no type, and mean it.
 void Tracker::reportOtherType(std::string_view name, const EventPropertyType& property, DataType found) {
@@ -267,34 +144,11 @@ void Tracker::reportOtherType(std::string_view name, const EventPropertyType& pr
         name, declared.qualifiedName(), found.qualifiedName());
 }
 
-std::optional<std::string> Tracker::groupName() {
-    for (Tracker* tracker = this; tracker; tracker = tracker->parentTracker_.get()) {
-        tracker->accessQueue_->assertCurrent("Tracker group");
-        if (!tracker->scope_->groupStack.empty()) return tracker->scope_->groupStack.back().name;
-    }
-    return std::nullopt;
-}
-
-std::shared_ptr<const EventIdentity> Tracker::identity(const std::string& sessionID) {
-    accessQueue_->assertCurrent("Tracker identity");
-    if (!scope_->identity || scope_->identity->sessionID() != sessionID) {
-        std::string eventPath;
-        for (const auto& component : path()) eventPath += "/" + component;
-        scope_->identity = std::make_shared<const EventIdentity>(eventPath, sessionID);
-    }
-    return scope_->identity;
-}
-
 void Tracker::performTime(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession) {
     accessQueue_->assertCurrent("Tracker timer");
     if (scope_->timers.contains(event.name())) return;
     scope_->timers.emplace(std::string(event.name()), Timer{startTime});
     if (submitAndRestartWithSession) scope_->restartTimers.insert_or_assign(std::string(event.name()), event);
-}
-
-void Tracker::performPush(AnyDataEventEntry entry) {
-    accessQueue_->assertCurrent("Tracker push");
-    scope_->dataStacks.push(std::move(entry));
 }
 
 void Tracker::performPop(std::string_view key, DataType type) {
