@@ -15,6 +15,7 @@
 #include <condition_variable>
 #include <future>
 #include <mutex>
+#include <stdexcept>
 #include <thread>
 
 namespace corvane::bench {
@@ -71,14 +72,18 @@ class BareQueue {
 class AsyncLogger {
   public:
     explicit AsyncLogger(spdlog::sink_ptr sink = std::make_shared<spdlog::sinks::basic_file_sink_mt>("/dev/null"))
-        : logger_("bench", std::move(sink), pool_, spdlog::async_overflow_policy::block) {}
+        : logger_(std::make_shared<spdlog::async_logger>("bench", std::move(sink), pool_,
+                                                         spdlog::async_overflow_policy::block)) {
+        // An error is no line: the figure would be that of the error.
+        logger_->set_error_handler([](const std::string& message) { throw std::runtime_error(message); });
+    }
 
-    void log(int i) { logger_.info("screen={} depth={} viewer={} plan={}", home.name, i, viewer.id, *viewer.plan); }
+    void log(int i) { logger_->info("screen={} depth={} viewer={} plan={}", home.name, i, viewer.id, *viewer.plan); }
 
   private:
     std::shared_ptr<spdlog::details::thread_pool> pool_ =
         std::make_shared<spdlog::details::thread_pool>(4 * burstCalls, 1);
-    spdlog::async_logger logger_;
+    std::shared_ptr<spdlog::async_logger> logger_;
 };
 
 /// Holds up the logger's thread with the first line, until it is released.

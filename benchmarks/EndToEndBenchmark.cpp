@@ -66,9 +66,10 @@ Figures logged(int events) {
     return perEvent(events, cpuNanoseconds, [&] {
         // Writes the last line before it ends.
         const auto pool = std::make_shared<spdlog::details::thread_pool>(2 * together, 1);
-        spdlog::async_logger logger(
+        const auto logger = std::make_shared<spdlog::async_logger>(
             "bench", std::make_shared<spdlog::sinks::basic_file_sink_mt>((documents / "log").string()), pool);
-        return calls(events, [&](int) { logger.info("{}", text); });
+        logger->set_error_handler([](const std::string& message) { throw std::runtime_error(message); });
+        return calls(events, [&](int) { logger->info("{}", text); });
     });
 }
 

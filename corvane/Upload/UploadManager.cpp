@@ -155,9 +155,12 @@ void UploadManager::listStoredRequests() {
     }
     backlog_.add(stored);
     if (isMemory) return;  // it knows nothing of the rows on disk
-    queue_.async([weak = weak_from_this(), stored = std::move(stored)]() mutable {
-        const auto manager = weak.lock();
-        if (manager) manager->removeOrphans({std::move_iterator(stored.begin()), std::move_iterator(stored.end())});
+    // Later where it takes long: an ordinary start needs no thread for it.
+    const bool isMuch = stored.size() > Backlog::portion;
+    std::set<std::string> recorded(std::move_iterator(stored.begin()), std::move_iterator(stored.end()));
+    if (!isMuch) return removeOrphans(recorded);
+    queue_.async([weak = weak_from_this(), recorded = std::move(recorded)] {
+        if (const auto manager = weak.lock()) manager->removeOrphans(recorded);
     });
 }
 
