@@ -9,6 +9,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
 #include <cstdlib>
 #include <utility>
@@ -20,6 +21,7 @@ namespace {
 struct Choice {
     Mutex mutex;
     std::filesystem::path directory CORVANE_GUARDED_BY(mutex);
+    std::atomic<unsigned> setting = 1;
 };
 
 Choice& choice() {
@@ -57,6 +59,11 @@ bool isSpace(char c) {
 void DocumentsDirectory::set(std::filesystem::path directory) {
     const Lock lock(choice().mutex);
     choice().directory = std::move(directory);
+    if (++choice().setting == 0) ++choice().setting;
+}
+
+unsigned DocumentsDirectory::setting() noexcept {
+    return choice().setting.load(std::memory_order_acquire);
 }
 
 std::filesystem::path DocumentsDirectory::path() {

@@ -1,6 +1,7 @@
 #include <corvane/Session/SessionCore.h>
 
 #include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Platform/UUID.h>
 
 #include <algorithm>
@@ -48,6 +49,7 @@ void SessionCore::resume() {
 void SessionCore::start(Session::Kind kind, Date startDate) {
     accessQueue_->assertCurrent("SessionManager start");
     if (isActive()) return;
+    RecordingSwitch::shared().look();
     announce(SessionChange::willStart);
     state_ = std::make_unique<ActiveSession>(newUUID(), std::move(kind), startDate);
     processorManager_->didStartSession(*currentSession());

@@ -1,7 +1,13 @@
 #include <corvane/Session/SessionManager.h>
 
 #include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/Log.h>
+#include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Session/SessionCore.h>
+#include <corvane/Store/DeferredStoreCore.h>
+
+#include <optional>
+#include <utility>
 
 namespace corvane {
 
@@ -50,6 +56,27 @@ void SessionManager::push(AnyDataEventEntry entry, bool submitEventQueues) {
     core_->accessQueue()->async([core = core_, entry = std::move(entry), submitEventQueues]() mutable {
         core->push(std::move(entry), submitEventQueues);
     });
+}
+
+void SessionManager::setRecording(bool isOn, std::function<void(const AnyError*)> completion) {
+    RecordingSwitch::shared().set(isOn);
+    DeferredStoreCore::queue().async([queue = core_->accessQueue(), completion = std::move(completion)]() mutable {
+        std::optional<AnyError> error;
+        try {
+            RecordingSwitch::shared().save();
+        } catch (...) {
+            error = AnyError::current();
+            Log::shared().error("Failed to keep whether to record, error=%{public}@", error->what());
+        }
+        if (!completion) return;
+        queue->async([completion = std::move(completion), error = std::move(error)] {
+            callHost("setRecording completion", [&] { completion(error ? &*error : nullptr); });
+        });
+    });
+}
+
+bool SessionManager::isRecording() const {
+    return RecordingSwitch::shared().isOn();
 }
 
 void SessionManager::transaction(std::function<void(AccessSessionManager&)> block) {

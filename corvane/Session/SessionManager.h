@@ -62,6 +62,19 @@ class CORVANE_EXPORT SessionManager {
         }
     }
 
+    /// Switches recording on or off, for every session manager of this process at once, and in the documents directory
+    /// as it is set now: for every process that uses it, as soon as that next looks at its database or starts a
+    /// session, and for later runs. It is on until this is called for the first time. Events submitted or processed
+    /// while it is off fail with `TrackerError::notRecording` and consume nothing; data may be pushed, and sessions go
+    /// on. What was recorded before stays, and is sent.
+    ///
+    /// The completion, if any, is called on the queue once the choice is on disk, with nullptr, or with the reason why
+    /// it could not be written, which is logged too; it holds in this process all the same. Any thread; waits for
+    /// nothing.
+    void setRecording(bool isOn, std::function<void(const AnyError* error)> completion = {});
+    /// Whether events are recorded now. Any thread.
+    [[nodiscard]] bool isRecording() const;
+
     /// Runs a block on the queue. What it throws is logged.
     void transaction(std::function<void(AccessSessionManager&)> block);
 

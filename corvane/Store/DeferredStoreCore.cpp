@@ -1,6 +1,7 @@
 #include <corvane/Store/DeferredStoreCore.h>
 
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Store/Store.h>
 #include <corvane/Store/VersionEntity.h>
 
@@ -102,6 +103,7 @@ const std::shared_ptr<StoreConnection>& DeferredStoreCore::connection() {
     queue().assertCurrent("DeferredStoreCore::connection");
     if (!connection_) throw DeferredStoreError(DeferredStoreError::noStore);
     lost_.reset();
+    RecordingSwitch::shared().look();
     if (connection_->hasLostItsFile()) {
         lost_ = connection_->location();
         makeAnew();

@@ -167,7 +167,8 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
     /// Whether a session is active and no timer runs that the submission asks for.
     [[nodiscard]] bool isUntimed(const EventSubmit& event) const;
     /// Resolves, validates and hands on.
-    EventSubmitResult performSubmit(const EventSubmit& event, Date submitTime);
+    /// @param isRecorded whether recording was on when the event was submitted
+    EventSubmitResult performSubmit(const EventSubmit& event, Date submitTime, bool isRecorded = true);
     /// The whole submission in one piece, with its writes and its completion.
     void submitNow(const EventSubmit& event, Date submitTime, const SubmitOptions& options);
     void performTime(const EventSubmit& event, Date startTime, bool submitAndRestartWithSession);

@@ -20,4 +20,8 @@ TrackerError TrackerError::withoutSession() {
     return {noSession, "there is no active session", {}};
 }
 
+TrackerError TrackerError::withoutRecording() {
+    return {notRecording, "recording is off", {}};
+}
+
 }  // namespace corvane

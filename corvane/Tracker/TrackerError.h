@@ -15,6 +15,7 @@ class CORVANE_EXPORT TrackerError : public Error {
     enum Code {
         eventMissingData = 0,  ///< required properties have no data: push it, or declare them optional
         noSession,             ///< no session is active, or the session manager is gone: start one
+        notRecording,          ///< recording is off, or was when the event was submitted
     };
 
     struct MissingData {
@@ -27,6 +28,7 @@ class CORVANE_EXPORT TrackerError : public Error {
     /// `eventMissingData` with every missing property, in declaration order.
     [[nodiscard]] static TrackerError missing(std::vector<MissingData> missingData);
     [[nodiscard]] static TrackerError withoutSession();
+    [[nodiscard]] static TrackerError withoutRecording();
     TrackerError(const TrackerError&) = default;
     TrackerError& operator=(const TrackerError&) = default;
     ~TrackerError() override;

@@ -5,6 +5,7 @@
 #include <corvane/Models/EventData.h>
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/JSONText.h>
+#include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Tracker/ActiveSessionType.h>
 #include <corvane/Tracker/Sequence.h>
 #include <corvane/Tracker/TrackerDelegate.h>
@@ -15,16 +16,16 @@
 namespace corvane {
 
 void Tracker::submit(EventSubmit event, Date submitTime, SubmitOptions options) {
-    accessQueue_->asyncInRun(
-        [self = shared_from_this(), event = std::move(event), submitTime, options = std::move(options)]() mutable {
-            if (options.onlyIfTimed && self->isUntimed(event)) return;
-            auto result = self->performSubmit(event, submitTime);
-            if (!options.completion) return;
-            self->accessQueue_->atEndOfRun(SerialQueue::RunEnd::report,
-                                           [completion = std::move(options.completion), result = std::move(result)] {
-                                               callHost("submit completion", [&] { completion(result); });
-                                           });
-        });
+    accessQueue_->asyncInRun([self = shared_from_this(), event = std::move(event), submitTime,
+                              options = std::move(options), isRecorded = RecordingSwitch::shared().isOn()]() mutable {
+        if (options.onlyIfTimed && self->isUntimed(event)) return;
+        auto result = self->performSubmit(event, submitTime, isRecorded);
+        if (!options.completion) return;
+        self->accessQueue_->atEndOfRun(SerialQueue::RunEnd::report,
+                                       [completion = std::move(options.completion), result = std::move(result)] {
+                                           callHost("submit completion", [&] { completion(result); });
+                                       });
+    });
 }
 
 void Tracker::time(EventSubmit event, Date startTime, bool submitAndRestartWithSession) {
@@ -54,10 +55,13 @@ void Tracker::submitNow(const EventSubmit& event, Date submitTime, const SubmitO
     if (options.completion) callHost("submit completion", [&] { options.completion(result); });
 }
 
-EventSubmitResult Tracker::performSubmit(const EventSubmit& event, Date submitTime) {
+EventSubmitResult Tracker::performSubmit(const EventSubmit& event, Date submitTime, bool isRecorded) {
     const auto delegate = delegate_.lock();
     const ActiveSessionType* session = delegate ? delegate->activeSession() : nullptr;
     if (!session) return EventSubmitResult::failed(AnyError(TrackerError::withoutSession()));
+    if (!isRecorded || !RecordingSwitch::shared().isOn()) {
+        return EventSubmitResult::failed(AnyError(TrackerError::withoutRecording()));
+    }
     try {
         return EventSubmitResult::success(process(event, submitTime, *delegate, session->identifier()));
     } catch (...) {

@@ -59,6 +59,18 @@ void BridgedSessionManager::endSessionWithCompletion(std::function<void()> compl
     sessionManager_->end(std::move(completion));
 }
 
+void BridgedSessionManager::setRecording(bool isOn, std::function<void(const BridgedError*)> completion) {
+    if (!completion) return sessionManager_->setRecording(isOn);
+    sessionManager_->setRecording(isOn, [completion = std::move(completion)](const AnyError* error) {
+        const std::optional<BridgedError> bridged = error ? std::optional(BridgedError::of(*error)) : std::nullopt;
+        completion(bridged ? &*bridged : nullptr);
+    });
+}
+
+bool BridgedSessionManager::isRecording() const {
+    return sessionManager_->isRecording();
+}
+
 bool BridgedSessionManager::pushSessionData(const BridgedSessionData& data, BridgedDataEventTraits traits,
                                             bool submitEventQueues, BridgedError* error) {
     return bridge::attempt("pushSessionData", error,

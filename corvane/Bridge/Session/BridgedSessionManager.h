@@ -104,6 +104,11 @@ class CORVANE_EXPORT BridgedSessionManager {
     /// The completion, if any, is called on the queue, also when there was nothing to end.
     void endSessionWithCompletion(std::function<void()> completion);
 
+    /// As `SessionManager::setRecording`. The completion, if any, gets nullptr or the reason why the choice could not be
+    /// written.
+    void setRecording(bool isOn, std::function<void(const BridgedError*)> completion = {});
+    [[nodiscard]] bool isRecording() const;
+
     /// Puts data into this and later sessions, under its key. It is converted before the call returns, on the caller's
     /// thread. Refused, with no effect: a missing object, a name or key that is not UTF-8, data that cannot become
     /// JSON. Data events of one class share a stack, of which a session carries the newest.
