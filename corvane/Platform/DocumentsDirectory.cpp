@@ -3,13 +3,13 @@
 #include <corvane/Platform/Bundle.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/Mutex.h>
+#include <corvane/Platform/RecordingSwitch.h>
 
 #include <pwd.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <atomic>
 #include <cerrno>
 #include <cstdlib>
 #include <utility>
@@ -21,7 +21,6 @@ namespace {
 struct Choice {
     Mutex mutex;
     std::filesystem::path directory CORVANE_GUARDED_BY(mutex);
-    std::atomic<unsigned> setting = 1;
 };
 
 Choice& choice() {
@@ -57,13 +56,11 @@ bool isSpace(char c) {
 }  // namespace
 
 void DocumentsDirectory::set(std::filesystem::path directory) {
-    const Lock lock(choice().mutex);
-    choice().directory = std::move(directory);
-    if (++choice().setting == 0) ++choice().setting;
-}
-
-unsigned DocumentsDirectory::setting() noexcept {
-    return choice().setting.load(std::memory_order_acquire);
+    {
+        const Lock lock(choice().mutex);
+        choice().directory = std::move(directory);
+    }
+    RecordingSwitch::leaveDirectory();
 }
 
 std::filesystem::path DocumentsDirectory::path() {

@@ -26,9 +26,6 @@ class CORVANE_EXPORT DocumentsDirectory {
     /// directory set nor a home.
     [[nodiscard]] static std::filesystem::path path();
 
-    /// A number that `set` changes, and that is never 0: whether the directory is still the same. One load.
-    [[nodiscard]] static unsigned setting() noexcept;
-
     /// The directory, created with mode 0700 if it is missing. Throws `SystemError` or
     /// `InvalidArgument`.
     static std::filesystem::path create();

@@ -49,7 +49,7 @@ void SessionCore::resume() {
 void SessionCore::start(Session::Kind kind, Date startDate) {
     accessQueue_->assertCurrent("SessionManager start");
     if (isActive()) return;
-    RecordingSwitch::shared().look();
+    RecordingSwitch::look();
     announce(SessionChange::willStart);
     state_ = std::make_unique<ActiveSession>(newUUID(), std::move(kind), startDate);
     processorManager_->didStartSession(*currentSession());

@@ -59,11 +59,11 @@ void SessionManager::push(AnyDataEventEntry entry, bool submitEventQueues) {
 }
 
 void SessionManager::setRecording(bool isOn, std::function<void(const AnyError*)> completion) {
-    RecordingSwitch::shared().set(isOn);
+    RecordingSwitch::set(isOn);
     DeferredStoreCore::queue().async([queue = core_->accessQueue(), completion = std::move(completion)]() mutable {
         std::optional<AnyError> error;
         try {
-            RecordingSwitch::shared().save();
+            RecordingSwitch::save();
         } catch (...) {
             error = AnyError::current();
             Log::shared().error("Failed to keep whether to record, error=%{public}@", error->what());
@@ -76,7 +76,7 @@ void SessionManager::setRecording(bool isOn, std::function<void(const AnyError*)
 }
 
 bool SessionManager::isRecording() const {
-    return RecordingSwitch::shared().isOn();
+    return RecordingSwitch::isOn();
 }
 
 void SessionManager::transaction(std::function<void(AccessSessionManager&)> block) {

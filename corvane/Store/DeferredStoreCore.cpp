@@ -103,7 +103,7 @@ const std::shared_ptr<StoreConnection>& DeferredStoreCore::connection() {
     queue().assertCurrent("DeferredStoreCore::connection");
     if (!connection_) throw DeferredStoreError(DeferredStoreError::noStore);
     lost_.reset();
-    RecordingSwitch::shared().look();
+    RecordingSwitch::look();
     if (connection_->hasLostItsFile()) {
         lost_ = connection_->location();
         makeAnew();

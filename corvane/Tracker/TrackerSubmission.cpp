@@ -17,7 +17,7 @@ namespace corvane {
 
 void Tracker::submit(EventSubmit event, Date submitTime, SubmitOptions options) {
     accessQueue_->asyncInRun([self = shared_from_this(), event = std::move(event), submitTime,
-                              options = std::move(options), isRecorded = RecordingSwitch::shared().isOn()]() mutable {
+                              options = std::move(options), isRecorded = RecordingSwitch::isOn()]() mutable {
         if (options.onlyIfTimed && self->isUntimed(event)) return;
         auto result = self->performSubmit(event, submitTime, isRecorded);
         if (!options.completion) return;
@@ -59,7 +59,7 @@ EventSubmitResult Tracker::performSubmit(const EventSubmit& event, Date submitTi
     const auto delegate = delegate_.lock();
     const ActiveSessionType* session = delegate ? delegate->activeSession() : nullptr;
     if (!session) return EventSubmitResult::failed(AnyError(TrackerError::withoutSession()));
-    if (!isRecorded || !RecordingSwitch::shared().isOn()) {
+    if (!isRecorded || !RecordingSwitch::isOn()) {
         return EventSubmitResult::failed(AnyError(TrackerError::withoutRecording()));
     }
     try {

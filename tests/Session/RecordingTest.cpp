@@ -89,7 +89,7 @@ TEST_F(Recording, AnotherProcesssWordCountsAndOneThatCannotBeReadIsNo) {
     EXPECT_EQ(next("on 7 and what a later version has to say\n"), "recorded");
     EXPECT_EQ(log.count("Nothing is recorded"), 0);
     EXPECT_EQ(next(""), "recording is off");
-    EXPECT_EQ(log.count("Nothing is recorded: whether to record cannot be read"), 1);
+    EXPECT_EQ(log.count("Nothing is recorded: whether to record is not known"), 1);
     std::filesystem::remove(file);
     std::filesystem::create_directory(file);
     EXPECT_EQ(submit<Identified>(), "recording is off");
