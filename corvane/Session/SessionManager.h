@@ -7,6 +7,7 @@
 #include <corvane/Session/AccessSessionManager.h>
 #include <corvane/Tracker/Tracker.h>
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 #include <source_location>
@@ -61,6 +62,12 @@ class CORVANE_EXPORT SessionManager {
                  submitEventQueues);
         }
     }
+
+    /// How many calls wait in memory: those of this manager, its trackers and its processor manager that were enqueued
+    /// and have not begun to run. Exact at no moment, since others call and the queue works meanwhile; good for a
+    /// producer that slows down. Any thread, blocks on the queue too; it waits for nothing, and may be asked before
+    /// every call. In a child made by `fork` it is 0.
+    [[nodiscard]] std::uint64_t waitingCount() const;
 
     /// Runs a block on the queue. What it throws is logged.
     void transaction(std::function<void(AccessSessionManager&)> block);
