@@ -17,8 +17,10 @@
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/MainQueue.h>
+#include <corvane/Processing/FilteringEventProcessor.h>
 #include <corvane/Processing/LoggingEventProcessor.h>
 #include <corvane/Processing/ProcessorManager.h>
+#include <corvane/Processing/SamplingEventProcessor.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 #include <corvane/Session/SessionManager.h>
 #include <corvane/Signing/SigningError.h>

@@ -20,6 +20,8 @@
 #include <corvane/Bridge/Models/BridgedEventData.h>
 #include <corvane/Bridge/Models/HostValue.h>
 #include <corvane/Bridge/Session/BridgedSessionManager.h>
+#include <corvane/Bridge/Session/BridgingFilteringEventProcessor.h>
+#include <corvane/Bridge/Session/BridgingSamplingEventProcessor.h>
 #include <corvane/Bridge/Upload/BridgedUploadBatchEventProcessor.h>
 
 namespace corvane {
@@ -44,6 +46,8 @@ using CVUploadBatchEventProcessor = BridgedUploadBatchEventProcessor;
 using CVUploadBatchEventConfig = UploadBatchEventConfig;
 using CVLoggingEventProcessor = BridgingLoggingEventProcessor;
 using CVLoggingEventProcessorFormat = BridgedLoggingEventProcessorFormat;
+using CVSamplingEventProcessor = BridgingSamplingEventProcessor;
+using CVFilteringEventProcessor = BridgingFilteringEventProcessor;
 using CVClient = Client;
 using CVEndpoint = Endpoint;
 

@@ -10,6 +10,7 @@
 #include <atomic>
 #include <chrono>
 #include <condition_variable>
+#include <cstdint>
 #include <deque>
 #include <exception>
 #include <utility>
@@ -87,8 +88,9 @@ struct SerialQueue::State {
     std::condition_variable syncDone;  // callers of sync() wait here
     TaskList waiting CORVANE_GUARDED_BY(mutex);
     TaskList waitingAhead CORVANE_GUARDED_BY(mutex);
-    bool running CORVANE_GUARDED_BY(mutex) = false;  // somebody, the worker or an inline sync(), is running tasks
-    bool asleep CORVANE_GUARDED_BY(mutex) = false;   // the worker waits for `wake`
+    std::uint64_t enqueued CORVANE_GUARDED_BY(mutex) = 0;  // how many tasks there ever were
+    bool running CORVANE_GUARDED_BY(mutex) = false;        // somebody, the worker or an inline sync(), is running tasks
+    bool asleep CORVANE_GUARDED_BY(mutex) = false;         // the worker waits for `wake`
     bool workerStarted CORVANE_GUARDED_BY(mutex) = false;
     bool startFailed CORVANE_GUARDED_BY(mutex) = false;  // there was no thread to be had, which has been logged
     bool closed CORVANE_GUARDED_BY(mutex) = false;  // the last reference is gone; the worker ends when nothing is left
@@ -102,6 +104,8 @@ struct SerialQueue::State {
     std::size_t reportCount = 0;
     Clock::time_point runEndsBy;
     bool isReporting = false;
+    // How many of `enqueued` were begun. Written by whoever runs tasks, and read from any thread.
+    std::atomic<std::uint64_t> begun = 0;
 
     bool suspended() const noexcept { return suspensions.load(std::memory_order_relaxed) > 0; }
 
@@ -109,6 +113,7 @@ struct SerialQueue::State {
     void work();
     void workUntil(const bool& done, Lock& lock) CORVANE_REQUIRES(mutex);
     void runTaken(TaskList& taken);
+    [[nodiscard]] Task begin(TaskList& taken) noexcept;
     void waitWhileSuspended();
     void runAhead();
     void leave(RunEnd part, Task task);
@@ -181,11 +186,17 @@ void SerialQueue::State::runTaken(TaskList& taken) {
     while (!taken.empty()) {
         waitWhileSuspended();
         runAhead();
-        Task task = taken.pop();
+        Task task = begin(taken);
         if (!task.isInRun() || isRunLong()) endRun();
         runGuarded(task, label);
     }
     endRun();
+}
+
+// One thread at a time runs tasks, so nothing is lost between the load and the store.
+Task SerialQueue::State::begin(TaskList& taken) noexcept {
+    begun.store(begun.load(std::memory_order_relaxed) + 1, std::memory_order_relaxed);
+    return taken.pop();
 }
 
 void SerialQueue::State::waitWhileSuspended() {
@@ -205,7 +216,7 @@ void SerialQueue::State::runAhead() {
         }
         while (!taken.empty()) {
             waitWhileSuspended();
-            Task task = taken.pop();
+            Task task = begin(taken);
             runGuarded(task, label);
         }
     }
@@ -284,6 +295,7 @@ void SerialQueue::enqueue(Task&& task, bool isAhead) {
     {
         const Lock lock(state.mutex);
         (isAhead ? state.waitingAhead : state.waiting).push(std::move(task));
+        ++state.enqueued;
         if (isAhead) state.hasAhead = true;
         if (!state.workerStarted) {
             state.workerStarted = start = true;
@@ -348,6 +360,7 @@ void SerialQueue::runSync(FunctionRef function) {
         call.done = true;
         state.syncDone.notify_all();
     });
+    ++state.enqueued;
     const bool start = !state.workerStarted;
     state.workerStarted = true;
     const bool wake = state.asleep && !state.running && !state.suspended();
@@ -373,6 +386,12 @@ void SerialQueue::resume() {
     }
     state_->wake.notify_all();  // the worker, or a caller that works in its place
     state_->syncDone.notify_all();
+}
+
+std::uint64_t SerialQueue::waitingCount() const {
+    if (state_->born.isInChild()) return 0;
+    const Lock lock(state_->mutex);
+    return state_->enqueued - state_->begun.load(std::memory_order_relaxed);
 }
 
 bool SerialQueue::isCurrent() const noexcept {

@@ -15,7 +15,8 @@ class SerialQueue;
 /// Receives what a session manager records. Held by shared pointer and told apart by identity.
 ///
 /// All callbacks but the first run on the access queue, one at a time, in the order of the host's calls. A callback
-/// must not wait for that queue; what it throws is logged and the next processor is called.
+/// must not wait for that queue; what it throws is logged and the next processor is called. What wraps another
+/// processor derives from `ForwardingEventProcessor`, which hands every callback on.
 class CORVANE_EXPORT EventProcessorType {
   public:
     virtual ~EventProcessorType() = default;

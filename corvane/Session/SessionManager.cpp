@@ -79,6 +79,10 @@ bool SessionManager::isRecording() const {
     return RecordingSwitch::isOn();
 }
 
+std::uint64_t SessionManager::waitingCount() const {
+    return core_->accessQueue()->waitingCount();
+}
+
 void SessionManager::transaction(std::function<void(AccessSessionManager&)> block) {
     core_->accessQueue()->async([core = core_, block = std::move(block)] {
         AccessSessionManager access(core);

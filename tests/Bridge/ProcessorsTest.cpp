@@ -71,6 +71,34 @@ TEST_F(BridgeProcessors, LogInEveryFormat) {
     EXPECT_EQ(log.count("Started session"), 3) << "as it was running when they were added";
 }
 
+TEST_F(BridgeProcessors, AreSampledAndFilteredAndWhatWaitsIsCounted) {
+    const auto wrapped = std::make_shared<Complete>();
+    wrapped->refuses = false;
+    const auto filter = std::make_shared<CVFilteringEventProcessor>(
+        std::make_shared<CVSamplingEventProcessor>(wrapped, 1), [](const CVProcessEvent& event) {
+            if (event.name() == "Secret") return std::optional<CVProcessEvent>();
+            return std::optional(CVProcessEvent({"Seen", event.json(), "g"}));
+        });
+    EXPECT_THROW(CVSamplingEventProcessor(nullptr, 1), BridgeError);
+    EXPECT_THROW(CVFilteringEventProcessor(wrapped, {}), BridgeError);
+    CapturedLog log;
+    sessions->processorManager()->addEventProcessor(filter);
+    processor->settle();
+    root->suspend();
+    root->submitRawEvent({"Secret", {}});
+    root->submitRawEvent({"View", {}});
+    EXPECT_EQ(sessions->waitingCount(), 2u);
+    root->resume();
+    sessions->endSession();
+    sessions->processorManager()->removeEventProcessor(filter);
+    sessions->startSessionForKind(CVSessionKind::userEvents);
+    processor->settle();
+    EXPECT_EQ(sessions->waitingCount(), 0u);
+    EXPECT_EQ(wrapped->calls, (std::vector<std::string>{"start", "Seen 0.1.0 {} g", "end"}));
+    EXPECT_EQ(filter->proxyEventProcessor()->droppedEvents(), 1u);
+    EXPECT_EQ(filter->proxyEventProcessor()->failures(), 0u) << "what the processor throws is not the filter's";
+}
+
 /// An endpoint that a host computes.
 struct ComputedEndpoint final : CVEndpointType {
     explicit ComputedEndpoint(std::string url) : target(std::move(url)) {}

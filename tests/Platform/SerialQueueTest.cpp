@@ -14,6 +14,7 @@ TEST(SerialQueue, RunsTasksInOrderFromManyThreadsWithoutOverlap) {
     std::vector<int> last(threads, -1);
     int inside = 0;
     bool ordered = true;
+    std::atomic<std::uint64_t> mostWaiting = 0;
     std::vector<std::thread> callers;
     for (int t = 0; t < threads; ++t) {
         callers.emplace_back([&, t] {
@@ -24,6 +25,7 @@ TEST(SerialQueue, RunsTasksInOrderFromManyThreadsWithoutOverlap) {
                     --inside;
                 });
                 if (i % 500 == 0) queue.sync([&] { ordered = ordered && last[t] == i; });
+                mostWaiting = std::max(mostWaiting.load(), queue.waitingCount());
             }
         });
     }
@@ -31,6 +33,8 @@ TEST(SerialQueue, RunsTasksInOrderFromManyThreadsWithoutOverlap) {
     queue.sync([] {});
     EXPECT_TRUE(ordered);
     EXPECT_EQ(last, std::vector<int>(threads, each - 1));
+    EXPECT_LE(mostWaiting, threads * (each + 1)) << "never below nothing";
+    EXPECT_EQ(queue.waitingCount(), 0u);
 }
 
 TEST(SerialQueue, SyncReturnsResultsAndRethrowsOnBothPaths) {
@@ -140,8 +144,10 @@ TEST(SerialQueue, TasksAheadOvertakeOthersKeepTheirOrderAndObeySuspensions) {
     notes.inRun("b");
     notes.inRun("c");
     notes.queue.asyncAhead(notes.note("1"));
+    EXPECT_EQ(notes.queue.waitingCount(), 4u);
     notes.queue.asyncAhead([&] {
         notes.text += "2";
+        EXPECT_EQ(notes.queue.waitingCount(), 3u) << "what runs waits no more";
         notes.queue.asyncAhead(notes.note("3"));
         notes.queue.suspend();
         suspended.set_value();
@@ -248,7 +254,7 @@ TEST(SerialQueueDeathTest, SyncRunsWhatWaitsItselfWhenThereIsNoThreadToBeHad) {
             return caller == std::this_thread::get_id();
         });
         queue.sync([&] { order += 'd'; });
-        std::_Exit(order == "abcd" && same ? 0 : 1);
+        std::_Exit(order == "abcd" && same && queue.waitingCount() == 0 ? 0 : 1);
     };
     EXPECT_EXIT(withoutThreads(), ::testing::ExitedWithCode(0), "Failed to start thread, queue=com.example.q");
 }

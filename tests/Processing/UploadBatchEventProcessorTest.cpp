@@ -1,5 +1,7 @@
 #include <corvane/Processing/UploadBatches.h>
 
+#include <corvane/Processing/FilteringEventProcessor.h>
+#include <corvane/Processing/SamplingEventProcessor.h>
 #include <corvane/Processing/UserEvents.h>
 #include <corvane/Upload/UploadRequest.h>
 
@@ -349,6 +351,43 @@ TEST_F(UploadBatch, TextThatOnlyClaimsToBeJSONReachesNeitherRowNorDocument) {
     ASSERT_EQ(rows().size(), 1u);
     EXPECT_EQ(rows()[0].events->count(), 1u);
     EXPECT_EQ(rows()[0].session.text(), "{}");
+}
+
+TEST_F(UploadBatch, WrappedItRecoversInADroppedSessionAndWritesWhatItAcknowledges) {
+    sessions->start(Session::Kind::userEvents());
+    submit(2);
+    launch();
+    sessions->processorManager()->remove(batching);
+    int asked = 0;
+    const auto filter = std::make_shared<FilteringEventProcessor>(batching, [&](const ProcessEvent& event) {
+        return ++asked == 2 ? std::nullopt : std::optional(ProcessEvent("Seen", event.json(), event.groupName()));
+    });
+    sessions->processorManager()->add(std::make_shared<SamplingEventProcessor>(filter, 1));
+    sessions->start(Session::Kind::userEvents());
+    std::vector<std::string> onDisk;
+    const auto look = [&](const EventSubmitResult& result) {
+        EXPECT_EQ(result.event()->name(), "Mark") << "as it was submitted";
+        onDisk.push_back(std::to_string(asked) + ": " + rows().at(0).events->text());
+    };
+    for (int i = 0; i < 2; ++i) {
+        root->submit<Mark>(look);
+        drain();
+    }
+    EXPECT_EQ(manager->sizes(), std::vector<std::size_t>{2});
+    const std::string seen = R"({"data":{},"metadata":{"name":"Seen","version":"0.1.0"}})";
+    EXPECT_EQ(onDisk, (std::vector<std::string>{"1: " + seen, "2: " + seen}));
+    EXPECT_EQ(filter->droppedEvents(), 1u);
+
+    // Left open, that batch goes out from a session of which nothing is kept.
+    launch();
+    sessions->processorManager()->remove(batching);
+    const auto sampling = std::make_shared<SamplingEventProcessor>(batching, std::numeric_limits<int>::max());
+    sessions->processorManager()->add(sampling);
+    sessions->start(Session::Kind::userEvents());
+    submit(5);
+    EXPECT_EQ(manager->sizes(), std::vector<std::size_t>{1});
+    EXPECT_EQ(sampling->droppedEvents(), 5u);
+    EXPECT_TRUE(rows().empty());
 }
 
 TEST_F(UploadBatch, WaitsForDeliveryNoLongerThanAsked) {

@@ -2,6 +2,7 @@
 
 #include <corvane/Bridge/Models/BridgedError.h>
 
+#include <memory>
 #include <utility>
 
 namespace corvane {
@@ -37,29 +38,7 @@ LoggingEventProcessorFormat libraryFormat(BridgedLoggingEventProcessorFormat for
 
 BridgingLoggingEventProcessor::BridgingLoggingEventProcessor(BridgedLoggingEventProcessorFormat format,
                                                              Formatter formatter)
-    : proxyEventProcessor_(libraryFormat(format, std::move(formatter))) {}
+    : BridgingEventProcessor(std::make_shared<LoggingEventProcessor>(libraryFormat(format, std::move(formatter)))) {}
 BridgingLoggingEventProcessor::~BridgingLoggingEventProcessor() = default;
-
-void BridgingLoggingEventProcessor::registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) {
-    proxyEventProcessor_.registerAccessQueue(std::move(accessQueue));
-}
-void BridgingLoggingEventProcessor::processEvent(const BridgedProcessEvent& event) {
-    proxyEventProcessor_.process(event.processEvent());
-}
-void BridgingLoggingEventProcessor::didEnterGroup(const Group& group) {
-    proxyEventProcessor_.didEnterGroup(group);
-}
-void BridgingLoggingEventProcessor::didLeaveGroup(const Group& group) {
-    proxyEventProcessor_.didLeaveGroup(group);
-}
-void BridgingLoggingEventProcessor::didStartSession(const BridgedSession& session) {
-    proxyEventProcessor_.didStartSession(session.session());
-}
-void BridgingLoggingEventProcessor::didUpdateSession(const BridgedSession& session, bool submitEventQueues) {
-    proxyEventProcessor_.didUpdateSession(session.session(), submitEventQueues);
-}
-void BridgingLoggingEventProcessor::didEndSession(const BridgedSession& session, Date endDate) {
-    proxyEventProcessor_.didEndSession(session.session(), endDate);
-}
 
 }  // namespace corvane

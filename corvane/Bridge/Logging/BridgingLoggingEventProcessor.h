@@ -1,6 +1,6 @@
 #pragma once
 
-#include <corvane/Bridge/Session/BridgedEventProcessorType.h>
+#include <corvane/Bridge/Session/BridgingEventProcessor.h>
 #include <corvane/Export.h>
 #include <corvane/Processing/LoggingEventProcessor.h>
 
@@ -19,7 +19,7 @@ enum class BridgedLoggingEventProcessorFormat : int {
 
 /// The logging processor for object-facing hosts, which add it like one of their own. Callers see it as
 /// `CVLoggingEventProcessor`. Shared by the host.
-class CORVANE_EXPORT BridgingLoggingEventProcessor final : public BridgedEventProcessorType {
+class CORVANE_EXPORT BridgingLoggingEventProcessor final : public BridgingEventProcessor {
   public:
     /// Turns an event into its line. Called on the session manager's queue; what it throws is logged instead.
     using Formatter = std::function<std::string(const BridgedProcessEvent&)>;
@@ -31,17 +31,6 @@ class CORVANE_EXPORT BridgingLoggingEventProcessor final : public BridgedEventPr
         Formatter formatter = {});
     BridgingLoggingEventProcessor(const BridgingLoggingEventProcessor&) = default;
     ~BridgingLoggingEventProcessor() override;
-
-    void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override;
-    void processEvent(const BridgedProcessEvent& event) override;
-    void didEnterGroup(const Group& group) override;
-    void didLeaveGroup(const Group& group) override;
-    void didStartSession(const BridgedSession& session) override;
-    void didUpdateSession(const BridgedSession& session, bool submitEventQueues) override;
-    void didEndSession(const BridgedSession& session, Date endDate) override;
-
-  private:
-    LoggingEventProcessor proxyEventProcessor_;
 };
 
 }  // namespace corvane

@@ -77,6 +77,10 @@ bool BridgedSessionManager::pushSessionData(const BridgedSessionData& data, Brid
                            [&] { sessionManager_->push(bridge::sessionEntry(data, traits), submitEventQueues); });
 }
 
+std::uint64_t BridgedSessionManager::waitingCount() const {
+    return sessionManager_->waitingCount();
+}
+
 void BridgedSessionManager::transaction(AccessBlock block) {
     if (!block) return;
     sessionManager_->transaction([block = std::move(block)](AccessSessionManager& access) {

@@ -10,6 +10,7 @@
 #include <corvane/Session/AccessSessionManager.h>
 #include <corvane/Session/SessionManager.h>
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -114,6 +115,8 @@ class CORVANE_EXPORT BridgedSessionManager {
     /// JSON. Data events of one class share a stack, of which a session carries the newest.
     bool pushSessionData(const BridgedSessionData& data, BridgedDataEventTraits traits = {},
                          bool submitEventQueues = false, BridgedError* error = nullptr);
+    /// How many calls wait in memory: see `SessionManager::waitingCount`. Any thread.
+    [[nodiscard]] std::uint64_t waitingCount() const;
     /// Runs a block on the queue. What it throws is logged.
     void transaction(AccessBlock block);
 

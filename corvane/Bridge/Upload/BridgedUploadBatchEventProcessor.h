@@ -1,17 +1,16 @@
 #pragma once
 
-#include <corvane/Bridge/Session/BridgedEventProcessorType.h>
+#include <corvane/Bridge/Session/BridgingEventProcessor.h>
 #include <corvane/Export.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 
 #include <memory>
-#include <string>
 
 namespace corvane {
 
 /// The batching processor for object-facing hosts, which add it like one of their own. Callers see it as
 /// `CVUploadBatchEventProcessor`. Shared by the host.
-class CORVANE_EXPORT BridgedUploadBatchEventProcessor final : public BridgedEventProcessorType {
+class CORVANE_EXPORT BridgedUploadBatchEventProcessor final : public BridgingEventProcessor {
   public:
     /// See `UploadBatchEventProcessor`. Throws `InvalidArgument` for an endpoint that cannot be used, and what the
     /// members of the host's own `endpoint` throw.
@@ -25,17 +24,9 @@ class CORVANE_EXPORT BridgedUploadBatchEventProcessor final : public BridgedEven
         return proxyEventProcessor_;
     }
 
-    void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override;
-    void processEvent(const BridgedProcessEvent& event) override;
-    void didEnterGroup(const Group& group) override;
-    void didLeaveGroup(const Group& group) override;
-    void didStartSession(const BridgedSession& session) override;
-    void didUpdateSession(const BridgedSession& session, bool submitEventQueues) override;
-    void didEndSession(const BridgedSession& session, Date endDate) override;
-    bool resumeBackgroundProcessingForIdentifier(const std::string& identifier,
-                                                 const std::function<void()>& completion) override;
-
   private:
+    explicit BridgedUploadBatchEventProcessor(std::shared_ptr<UploadBatchEventProcessor> eventProcessor);
+
     const std::shared_ptr<UploadBatchEventProcessor> proxyEventProcessor_;
 };
 
