@@ -78,9 +78,10 @@ class CORVANE_EXPORT SessionManager {
 
     /// How many calls wait in memory: those of this manager, its trackers and its processor manager that were enqueued
     /// and have not begun to run. Exact at no moment, since others call and the queue works meanwhile; good for a
-    /// producer that slows down. It does not fall while the queue is suspended, nor in a process that has no thread left
-    /// for it, until the next call tries again: slow down for a while, and not until it has fallen. Any thread, blocks on
-    /// the queue too; it waits for nothing, and may be asked before every call. In a child made by `fork` it is 0.
+    /// producer that slows down. It does not fall while the queue is suspended, nor in a process that has no thread
+    /// left for it, until the next call tries again: slow down for a while, and not until it has fallen. Any thread,
+    /// blocks on the queue too; it waits for nothing, and may be asked before every call. In a child made by `fork` it
+    /// is 0.
     [[nodiscard]] std::uint64_t waitingCount() const;
 
     /// Runs a block on the queue. What it throws is logged.
