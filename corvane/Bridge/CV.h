@@ -44,6 +44,10 @@ using CVUploadBatchEventProcessor = BridgedUploadBatchEventProcessor;
 using CVUploadBatchEventConfig = UploadBatchEventConfig;
 using CVLoggingEventProcessor = BridgingLoggingEventProcessor;
 using CVLoggingEventProcessorFormat = BridgedLoggingEventProcessorFormat;
+using CVDeliveryUpdate = DeliveryUpdate;
+using CVDeliveryObserver = DeliveryObserver;
+using CVDeliveryReport = DeliveryReport;
+using CVDeliveryWaitOptions = DeliveryWaitOptions;
 using CVClient = Client;
 using CVEndpoint = Endpoint;
 

@@ -12,6 +12,11 @@ namespace {
 // So that no transaction of the delegate's takes long.
 constexpr std::size_t mostTogether = 64;
 
+std::shared_ptr<const std::atomic<bool>> progressInterest(const std::weak_ptr<TransferSessionDelegate>& delegate) {
+    const auto own = std::dynamic_pointer_cast<OwnDelegate>(delegate.lock());
+    return own ? own->progressIsWanted() : nullptr;
+}
+
 // Completes a task at its end, however the delegate comes back.
 class Completed {
   public:
@@ -29,6 +34,7 @@ class Completed {
 SessionReporter::SessionReporter(std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue)
     : delegate_(std::move(delegate)),
       isOwn_(dynamic_cast<OwnDelegate*>(delegate_.lock().get()) != nullptr),
+      progressIsWanted_(progressInterest(delegate_)),
       queue_(queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session")) {}
 
 void SessionReporter::close() {
@@ -113,6 +119,10 @@ void SessionReporter::enqueue(Task report) {
     queue->asyncAhead(std::move(report));
 }
 
+bool SessionReporter::wantsProgress() const {
+    return !isOwn_ || OwnDelegate::logsProgress() || (progressIsWanted_ && *progressIsWanted_);
+}
+
 void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected) {
     if (!wantsProgress() || !task->note(total, expected)) return;
     enqueue([self = shared_from_this(), task = std::move(task)] {
@@ -122,6 +132,13 @@ void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int
         if (told && progress.step > 0) {
             told->taskDidSendBodyData(*task, progress.step, progress.total, progress.expected);
         }
+    });
+}
+
+void SessionReporter::reportHoldUp(const std::string& server, bool lasts) {
+    enqueue([self = shared_from_this(), server, lasts] {
+        const auto own = std::dynamic_pointer_cast<OwnDelegate>(self->delegate());
+        if (own) own->serverIsHeldUp(server, lasts);
     });
 }
 

@@ -9,6 +9,16 @@ BridgedUploadBatchEventProcessor::BridgedUploadBatchEventProcessor(Client client
     : proxyEventProcessor_(std::make_shared<UploadBatchEventProcessor>(std::move(client), endpoint, config)) {}
 BridgedUploadBatchEventProcessor::~BridgedUploadBatchEventProcessor() = default;
 
+DeliveryReport BridgedUploadBatchEventProcessor::waitForDelivery(std::chrono::steady_clock::time_point deadline,
+                                                                 const DeliveryWaitOptions& options) const {
+    return proxyEventProcessor_->waitForDelivery(deadline, options);
+}
+void BridgedUploadBatchEventProcessor::flush() {
+    proxyEventProcessor_->flush();
+}
+void BridgedUploadBatchEventProcessor::setDeliveryObserver(DeliveryObserver observer) {
+    proxyEventProcessor_->setDeliveryObserver(std::move(observer));
+}
 void BridgedUploadBatchEventProcessor::registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) {
     proxyEventProcessor_->registerAccessQueue(std::move(accessQueue));
 }
