@@ -41,11 +41,12 @@ class CORVANE_EXPORT UploadBatchEventConfig {
 /// Turns events into uploads: collects them per session, or per group within a session, keeps a backup of every open
 /// batch on disk, and hands each finished batch to the upload manager as one user-events document.
 ///
-/// A session's batch is finished when it holds `batchSize` events, a group's when the group is left, and all of them
-/// when the session ends. Backups that an earlier run left behind are sent when a session starts, a few at a time, so
-/// that the new session's events need not wait for all of them; one that cannot be read is logged, and stays. While the
-/// database is on disk and reports no error, an event whose submission succeeded is on disk before its completion is
-/// called; hand-over is at least once. Failures are logged, and never reach the code that submitted the event.
+/// A session's batch is finished when it holds `batchSize` events or is flushed, a group's when the group is left, and
+/// all of them when the session ends. Backups that an earlier run left behind are sent when a session starts, a few at
+/// a time, so that the new session's events need not wait for all of them; one that cannot be read is logged, and
+/// stays. While the database is on disk and reports no error, an event whose submission succeeded is on disk before its
+/// completion is called; hand-over is at least once. Failures are logged, and never reach the code that submitted the
+/// event.
 ///
 /// The host makes it and adds it to one processor manager, which shares it. Its state lives on the access queue. When
 /// it is released, uploads in this process are cancelled; what is not delivered stays on disk for the next run.

@@ -32,7 +32,7 @@ class OwnDelegate {
 
     /// Whether anything comes of telling it how much of a body has gone out, beside a line in the log. Asked once, when
     /// the session is opened, and looked at on any thread; by default, with nullptr, nothing ever does.
-    [[nodiscard]] virtual std::shared_ptr<const std::atomic<bool>> progressIsWanted() const { return nullptr; }
+    [[nodiscard]] virtual std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept { return nullptr; }
     /// Whether it has a line in the log for that.
     [[nodiscard]] static bool logsProgress() noexcept { return Log::shared().isEnabled(LogLevel::default_); }
 };

@@ -12,11 +12,6 @@ namespace {
 // So that no transaction of the delegate's takes long.
 constexpr std::size_t mostTogether = 64;
 
-std::shared_ptr<const std::atomic<bool>> progressInterest(const std::weak_ptr<TransferSessionDelegate>& delegate) {
-    const auto own = std::dynamic_pointer_cast<OwnDelegate>(delegate.lock());
-    return own ? own->progressIsWanted() : nullptr;
-}
-
 // Completes a task at its end, however the delegate comes back.
 class Completed {
   public:
@@ -33,9 +28,11 @@ class Completed {
 
 SessionReporter::SessionReporter(std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue)
     : delegate_(std::move(delegate)),
-      isOwn_(dynamic_cast<OwnDelegate*>(delegate_.lock().get()) != nullptr),
-      progressIsWanted_(progressInterest(delegate_)),
-      queue_(queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session")) {}
+      queue_(queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session")) {
+    const auto own = std::dynamic_pointer_cast<OwnDelegate>(delegate_.lock());
+    isOwn_ = own != nullptr;
+    if (own) progressIsWanted_ = own->progressIsWanted();
+}
 
 void SessionReporter::close() {
     Lock lock(mutex_);

@@ -84,9 +84,10 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     void reportTogether(OwnDelegate& delegate, const std::vector<Waiting>& ends);
 
     const std::weak_ptr<TransferSessionDelegate> delegate_;
-    const bool isOwn_;  // the delegate is an OwnDelegate
-    const std::shared_ptr<const std::atomic<bool>> progressIsWanted_;
     const std::shared_ptr<SerialQueue> queue_;
+    // Constant after construction.
+    bool isOwn_ = false;  // the delegate is an OwnDelegate
+    std::shared_ptr<const std::atomic<bool>> progressIsWanted_;
 
     mutable Mutex mutex_;
     std::deque<Waiting> ends_ CORVANE_GUARDED_BY(mutex_);

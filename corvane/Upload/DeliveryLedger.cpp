@@ -41,15 +41,7 @@ Step stepOf(DeliveryLedger::Outcome outcome) {
 
 }  // namespace
 
-void DeliveryLedger::add(std::string_view identifier, std::int64_t events) {
-    enter(identifier, events);
-}
-
-void DeliveryLedger::addEarlier(std::string_view identifier) {
-    enter(identifier, std::nullopt);
-}
-
-void DeliveryLedger::enter(std::string_view identifier, std::optional<std::int64_t> events) {
+void DeliveryLedger::add(std::string_view identifier, std::optional<std::int64_t> events) {
     const Lock lock(mutex_);
     if (onTheirWay_.try_emplace(std::string(identifier), Document{events, lastNumber_ + 1}).second) ++lastNumber_;
 }

@@ -36,11 +36,11 @@ class DeliveryLedger {
     };
 
     /// Enters a document that is about to be handed over. Entering one again changes nothing.
-    void add(std::string_view identifier, std::int64_t events);
+    void add(std::string_view identifier, std::optional<std::int64_t> events);
     /// Strikes out a document whose hand-over was refused. Harmless for one that is not there.
     void remove(std::string_view identifier);
     /// Enters a document of an earlier run, whose number of events is not known.
-    void addEarlier(std::string_view identifier);
+    void addEarlier(std::string_view identifier) { add(identifier, std::nullopt); }
     /// Notes that a document's transfer has been started, or is found to be under way. Harmless when it was noted, or
     /// for one that is not there, and so is the next.
     void begin(std::string_view identifier);
@@ -83,7 +83,6 @@ class DeliveryLedger {
     };
     using Documents = std::map<std::string, Document, std::less<>>;
 
-    void enter(std::string_view identifier, std::optional<std::int64_t> events);
     /// Puts an update in line for the observer, if there is one.
     /// @param document what is known of it; nullptr for one that was not entered here
     void tell(DeliveryUpdate::Step step, std::string_view identifier, const Document* document,

@@ -3,14 +3,14 @@
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/MainQueue.h>
 
-#include <algorithm>
+#include <cstddef>
 #include <utility>
 
 namespace corvane {
 
 void DeliveryNews::setObserver(DeliveryObserver observer) {
     auto shared = observer ? std::make_shared<const DeliveryObserver>(std::move(observer)) : nullptr;
-    std::deque<DeliveryUpdate> line;
+    std::list<DeliveryUpdate> line;
     const Lock lock(mutex_);
     isWanted_ = shared != nullptr;
     observer_.swap(shared);  // the old one, which is the host's, goes behind the lock
@@ -19,12 +19,11 @@ void DeliveryNews::setObserver(DeliveryObserver observer) {
 
 // What goes out side by side is near the end of the line.
 DeliveryUpdate* DeliveryNews::waitingProgress(const std::string& document) {
-    constexpr std::size_t farthest = 64;
-    const auto end = line_.rbegin() + static_cast<std::ptrdiff_t>(std::min(line_.size(), farthest));
-    const auto found = std::find_if(line_.rbegin(), end, [&](const DeliveryUpdate& one) {
-        return one.step == DeliveryUpdate::Step::progress && one.document == document;
-    });
-    return found == end ? nullptr : &*found;
+    int left = 64;
+    for (auto one = line_.rbegin(); one != line_.rend() && left > 0; ++one, --left) {
+        if (one->step == DeliveryUpdate::Step::progress && one->document == document) return &*one;
+    }
+    return nullptr;
 }
 
 void DeliveryNews::add(DeliveryUpdate update) {
@@ -70,15 +69,14 @@ void DeliveryNews::deliver() {
     }
     for (; count > 0; --count) {
         std::shared_ptr<const DeliveryObserver> observer;
-        DeliveryUpdate update;
+        std::list<DeliveryUpdate> next;
         {
             const Lock lock(mutex_);
             if (line_.empty()) return;
             observer = observer_;
-            update = std::move(line_.front());
-            line_.pop_front();
+            next.splice(next.begin(), line_, line_.begin());
         }
-        callHost("delivery observer", [&] { (*observer)(update); });
+        callHost("delivery observer", [&] { (*observer)(next.front()); });
     }
 }
 

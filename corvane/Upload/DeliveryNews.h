@@ -4,7 +4,7 @@
 #include <corvane/Upload/DeliveryUpdate.h>
 
 #include <atomic>
-#include <deque>
+#include <list>
 #include <memory>
 #include <string>
 
@@ -40,8 +40,8 @@ class DeliveryNews : public std::enable_shared_from_this<DeliveryNews> {
 
     Mutex mutex_;
     std::shared_ptr<const DeliveryObserver> observer_ CORVANE_GUARDED_BY(mutex_);
-    std::deque<DeliveryUpdate> line_ CORVANE_GUARDED_BY(mutex_);  // empty without an observer
-    bool isDue_ CORVANE_GUARDED_BY(mutex_) = false;               // something was put in line since the last `post`
+    std::list<DeliveryUpdate> line_ CORVANE_GUARDED_BY(mutex_);  // empty without an observer
+    bool isDue_ CORVANE_GUARDED_BY(mutex_) = false;              // something was put in line since the last `post`
     bool isLost_ CORVANE_GUARDED_BY(mutex_) = false;
 };
 

@@ -367,7 +367,7 @@ void UploadManager::uploadsAreHeldUp(bool lasts) {
     if (ledger_) ledger_->holdUp(lasts);
 }
 
-std::shared_ptr<const std::atomic<bool>> UploadManager::progressIsWanted() const {
+std::shared_ptr<const std::atomic<bool>> UploadManager::progressIsWanted() const noexcept {
     if (!ledger_) return nullptr;
     return {ledger_->news(), &ledger_->news()->isWanted()};
 }

@@ -68,7 +68,7 @@ class UploadManager final : public UploadManagerType,
     void uploadEndedElsewhere(const UploadResult& result) override;
     void uploadDidSend(const std::string& identifier, std::int64_t sent, std::int64_t expected) override;
     void uploadsAreHeldUp(bool lasts) override;
-    [[nodiscard]] std::shared_ptr<const std::atomic<bool>> progressIsWanted() const override;
+    [[nodiscard]] std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept override;
 
   private:
     UploadManager(std::shared_ptr<UploadServiceType> service,

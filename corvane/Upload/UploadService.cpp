@@ -300,7 +300,7 @@ void UploadService::serverIsHeldUp(const std::string& server, bool lasts) {
     if (const auto told = delegate()) told->uploadsAreHeldUp(lasts);
 }
 
-std::shared_ptr<const std::atomic<bool>> UploadService::progressIsWanted() const {
+std::shared_ptr<const std::atomic<bool>> UploadService::progressIsWanted() const noexcept {
     const auto told = delegate();
     return told ? told->progressIsWanted() : nullptr;
 }

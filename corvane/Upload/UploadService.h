@@ -84,7 +84,7 @@ class UploadService final : public UploadServiceType,
                              const std::optional<TransferResponse>& response) override;
     void allEventsDelivered() override;
     void serverIsHeldUp(const std::string& server, bool lasts) override;
-    [[nodiscard]] std::shared_ptr<const std::atomic<bool>> progressIsWanted() const override;
+    [[nodiscard]] std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept override;
 
   private:
     using Completions = std::vector<std::function<void()>>;

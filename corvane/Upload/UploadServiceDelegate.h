@@ -41,7 +41,7 @@ class UploadServiceDelegate {
 
     /// Whether anything comes of `uploadDidSend`; it may change at any time. Asked once. By default, with nullptr,
     /// nothing ever does.
-    [[nodiscard]] virtual std::shared_ptr<const std::atomic<bool>> progressIsWanted() const { return nullptr; }
+    [[nodiscard]] virtual std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept { return nullptr; }
 };
 
 }  // namespace corvane

@@ -297,7 +297,8 @@ void AgentConversation::take(const agent::Trouble& reply) {
 }
 
 void AgentConversation::forgetTroubles() {
-    for (const auto& server : std::exchange(troubles_, {})) reporter_->reportHoldUp(server, false);
+    for (const auto& server : troubles_) reporter_->reportHoldUp(server, false);
+    troubles_.clear();
 }
 
 // --- The agent itself. -----------------------------------------------------------------------------------------------
