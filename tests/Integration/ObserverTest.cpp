@@ -104,7 +104,7 @@ TEST_F(Observer, HearsOfEachDocumentInOrderOnTheMainQueueUntilItIsRemoved) {
     application.submit(2);
     ASSERT_EQ(tasks(), 6u);
     EXPECT_GT(posted(), 0u);
-    application.uploads->setDeliveryObserver([this, record = recorder(), &application](const DeliveryUpdate& update) {
+    application.uploads->setDeliveryObserver([record = recorder(), &application](const DeliveryUpdate& update) {
         record(update);
         if (update.step == DeliveryUpdate::Step::givenUp) application.uploads->setDeliveryObserver({});
         throw std::runtime_error("the host's");
