@@ -48,6 +48,10 @@ using CVLoggingEventProcessor = BridgingLoggingEventProcessor;
 using CVLoggingEventProcessorFormat = BridgedLoggingEventProcessorFormat;
 using CVSamplingEventProcessor = BridgingSamplingEventProcessor;
 using CVFilteringEventProcessor = BridgingFilteringEventProcessor;
+using CVDeliveryUpdate = DeliveryUpdate;
+using CVDeliveryObserver = DeliveryObserver;
+using CVDeliveryReport = DeliveryReport;
+using CVDeliveryWaitOptions = DeliveryWaitOptions;
 using CVClient = Client;
 using CVEndpoint = Endpoint;
 

@@ -22,10 +22,19 @@ UploadBatchEventProcessor::UploadBatchEventProcessor(Client client, const Endpoi
     : UploadBatchEventProcessor(UploadBatches::make(std::move(client), Endpoint::copyOf(endpoint), config)) {}
 UploadBatchEventProcessor::UploadBatchEventProcessor(std::shared_ptr<UploadBatches> batches)
     : batches_(std::move(batches)) {}
-UploadBatchEventProcessor::~UploadBatchEventProcessor() = default;
+UploadBatchEventProcessor::~UploadBatchEventProcessor() {
+    batches_->setDeliveryObserver({});
+}
 
-DeliveryReport UploadBatchEventProcessor::waitForDelivery(std::chrono::steady_clock::time_point deadline) const {
-    return batches_->waitForDelivery(deadline);
+DeliveryReport UploadBatchEventProcessor::waitForDelivery(std::chrono::steady_clock::time_point deadline,
+                                                          const DeliveryWaitOptions& options) const {
+    return batches_->waitForDelivery(deadline, options);
+}
+void UploadBatchEventProcessor::flush() {
+    batches_->flush();
+}
+void UploadBatchEventProcessor::setDeliveryObserver(DeliveryObserver observer) {
+    batches_->setDeliveryObserver(std::move(observer));
 }
 void UploadBatchEventProcessor::registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) {
     batches_->registerAccessQueue(std::move(accessQueue));

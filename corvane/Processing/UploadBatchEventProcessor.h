@@ -4,6 +4,7 @@
 #include <corvane/Models/Client.h>
 #include <corvane/Processing/EventProcessorType.h>
 #include <corvane/Upload/DeliveryReport.h>
+#include <corvane/Upload/DeliveryUpdate.h>
 #include <corvane/Upload/Endpoint.h>
 
 #include <chrono>
@@ -40,11 +41,12 @@ class CORVANE_EXPORT UploadBatchEventConfig {
 /// Turns events into uploads: collects them per session, or per group within a session, keeps a backup of every open
 /// batch on disk, and hands each finished batch to the upload manager as one user-events document.
 ///
-/// A session's batch is finished when it holds `batchSize` events, a group's when the group is left, and all of them
-/// when the session ends. Backups that an earlier run left behind are sent when a session starts, a few at a time, so
-/// that the new session's events need not wait for all of them; one that cannot be read is logged, and stays. While the
-/// database is on disk and reports no error, an event whose submission succeeded is on disk before its completion is
-/// called; hand-over is at least once. Failures are logged, and never reach the code that submitted the event.
+/// A session's batch is finished when it holds `batchSize` events or is flushed, a group's when the group is left, and
+/// all of them when the session ends. Backups that an earlier run left behind are sent when a session starts, a few at
+/// a time, so that the new session's events need not wait for all of them; one that cannot be read is logged, and
+/// stays. While the database is on disk and reports no error, an event whose submission succeeded is on disk before its
+/// completion is called; hand-over is at least once. Failures are logged, and never reach the code that submitted the
+/// event.
 ///
 /// The host makes it and adds it to one processor manager, which shares it. Its state lives on the access queue. When
 /// it is released, uploads in this process are cancelled; what is not delivered stays on disk for the next run.
@@ -70,7 +72,28 @@ class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType
     /// In a child made by `fork` it returns an empty report at once.
     ///
     /// Requires: any thread but the library's queues (the process is stopped with a message).
-    DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline) const;
+    /// @param options what not to wait for
+    DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline,
+                                   const DeliveryWaitOptions& options = {}) const;
+
+    /// Hands the session's open batch over now, full or not; the session goes on, and groups that are not left keep
+    /// theirs. Returns at once: it takes effect behind what was submitted before, and a `waitForDelivery` that is
+    /// called next waits for it. Does nothing while there is no session, or nothing in its batch; a batch that cannot
+    /// be handed over stays open, which is logged. Any thread.
+    void flush();
+
+    /// Has `observer` told of every document of the endpoint as it happens, from now on and in order, in place of an
+    /// observer that was set before; an empty one ends that. Documents that earlier runs have left are told of, too.
+    ///
+    /// It is called on the main queue (see `MainQueue`), never inside a call of the host's; what it throws is logged.
+    /// One that is removed or replaced on the main queue is not called any more once that call has returned; removed
+    /// elsewhere, a call of it that runs at this moment comes to its end. It is removed with the processor. What the
+    /// host puts on the main queue when `waitForDelivery` has returned runs behind all that it has waited for.
+    ///
+    /// While the main queue is busy, the updates wait for it, of a document's progress the latest alone. The transfer
+    /// agent reports the progress of documents that were handed over while an observer was set. Any thread, also from
+    /// inside the observer.
+    void setDeliveryObserver(DeliveryObserver observer);
 
     /// Throws `InvalidArgument` when the processor was added to another session manager before: its batches are that
     /// one's.

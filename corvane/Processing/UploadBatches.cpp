@@ -59,7 +59,8 @@ std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint
                                            std::move(ledger), std::make_shared<const EndpointUse>(endpoint));
 }
 
-DeliveryReport UploadBatches::waitForDelivery(std::chrono::steady_clock::time_point deadline) const {
+DeliveryReport UploadBatches::waitForDelivery(std::chrono::steady_clock::time_point deadline,
+                                              const DeliveryWaitOptions& options) const {
     if (born_.isInChild()) return {};
     DeferredStoreCore::queue().assertNotCurrent("UploadBatchEventProcessor::waitForDelivery");
     const auto queue = registeredQueue();
@@ -67,10 +68,20 @@ DeliveryReport UploadBatches::waitForDelivery(std::chrono::steady_clock::time_po
         queue->assertNotCurrent("UploadBatchEventProcessor::waitForDelivery");
         waitForQueue(*queue, deadline);
     }
-    const auto report = ledger_->wait(deadline);
+    const auto report = ledger_->wait(deadline, options.onlyWhileReachable);
     // What is settled inside a callback is acknowledged behind it: a host that exits now must not be told again.
     if (queue) waitForQueue(*queue, deadline);
     return report;
+}
+
+void UploadBatches::flush() {
+    const auto queue = registeredQueue();
+    if (!queue || born_.isInChild()) return;
+    queue->async([self = shared_from_this()] {
+        self->assertOnQueue("UploadBatchEventProcessor::flush");
+        if (self->currentSession_)
+            self->handOver(UploadBatchQueueKey::session(self->currentSession_->identifier), true);
+    });
 }
 
 std::shared_ptr<SerialQueue> UploadBatches::registeredQueue() const {

@@ -23,6 +23,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 
 namespace corvane {
 
@@ -45,7 +46,10 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     [[nodiscard]] static std::shared_ptr<UploadBatches> make(Client client, const Endpoint& endpoint,
                                                              const UploadBatchEventConfig& config);
 
-    DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline) const;
+    DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline,
+                                   const DeliveryWaitOptions& options) const;
+    void flush();
+    void setDeliveryObserver(DeliveryObserver observer) { ledger_->news()->setObserver(std::move(observer)); }
     void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue);
     bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion);
 

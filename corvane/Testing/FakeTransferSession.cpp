@@ -93,6 +93,16 @@ void FakeTransferSession::complete(std::int64_t identifier, std::int64_t statusC
     complete(identifier, Outcome::status(statusCode, std::move(headers)));
 }
 
+void FakeTransferSession::progress(std::int64_t identifier, std::int64_t total, std::int64_t expected) {
+    const auto running = task(identifier);
+    const auto sent = total - running->sent_.exchange(total);
+    queue_->async([session = weak_from_this(), running, sent, total, expected] {
+        const auto open = session.lock();
+        const auto delegate = open ? open->delegate_.lock() : nullptr;
+        if (delegate) delegate->taskDidSendBodyData(*running, sent, total, expected);
+    });
+}
+
 void FakeTransferSession::signalAllEventsDelivered() {
     queue_->async([delegate = delegate_] {
         if (const auto told = delegate.lock()) told->allEventsDelivered();

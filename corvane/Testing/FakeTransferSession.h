@@ -3,6 +3,7 @@
 #include <corvane/Transfer/TransferError.h>
 #include <corvane/Transfer/TransferSession.h>
 
+#include <atomic>
 #include <condition_variable>
 #include <deque>
 #include <memory>
@@ -58,11 +59,14 @@ class FakeTransferSession final : public TransferSession, public std::enable_sha
         const std::filesystem::path file;
 
       private:
+        friend class FakeTransferSession;
+
         const std::weak_ptr<FakeTransferSession> session_;
         const std::int64_t number_;
         mutable std::mutex mutex_;
         State state_ = State::suspended;
         std::optional<std::string> description_;
+        std::atomic<std::int64_t> sent_ = 0;  // as was reported
     };
 
     /// Opens sessions that begin with this script, and puts the newest into `opened`, which must outlive the factory's
@@ -78,6 +82,9 @@ class FakeTransferSession final : public TransferSession, public std::enable_sha
     /// was not made.
     void complete(std::int64_t identifier, Outcome outcome);
     void complete(std::int64_t identifier, std::int64_t statusCode, std::map<std::string, std::string> headers = {});
+    /// Tells the delegate that so much of a running task's body has gone out since the task began. Throws
+    /// `std::out_of_range` for a task that was not made.
+    void progress(std::int64_t identifier, std::int64_t total, std::int64_t expected);
     /// Tells the delegate that what was pending at a wake-up is delivered.
     void signalAllEventsDelivered();
 

@@ -4,7 +4,10 @@
 #include <corvane/Transfer/TransferOutcome.h>
 #include <corvane/Transfer/TransferSession.h>
 
+#include <atomic>
 #include <functional>
+#include <memory>
+#include <string>
 #include <vector>
 
 namespace corvane {
@@ -23,9 +26,15 @@ class OwnDelegate {
     /// As `taskDidComplete` for each, in this order: several at once are cheaper than one after the other.
     virtual void tasksDidComplete(const std::vector<Completion>& completions) = 0;
 
-    /// Whether anything comes of telling it how much of a body has gone out. The same for every delegate of its kind,
-    /// on any thread.
-    [[nodiscard]] static bool wantsProgress() noexcept { return Log::shared().isEnabled(LogLevel::default_); }
+    /// The session holds all uploads to a server ("example.com:443") up because it cannot be reached or the way to it
+    /// is blocked, or they go on. Sessions outside the process only. Does nothing by default.
+    virtual void serverIsHeldUp(const std::string& /*server*/, bool /*lasts*/) {}
+
+    /// Whether anything comes of telling it how much of a body has gone out, beside a line in the log. Asked once, when
+    /// the session is opened, and looked at on any thread; by default, with nullptr, nothing ever does.
+    [[nodiscard]] virtual std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept { return nullptr; }
+    /// Whether it has a line in the log for that.
+    [[nodiscard]] static bool logsProgress() noexcept { return Log::shared().isEnabled(LogLevel::default_); }
 };
 
 }  // namespace corvane

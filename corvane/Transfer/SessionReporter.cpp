@@ -28,8 +28,11 @@ class Completed {
 
 SessionReporter::SessionReporter(std::weak_ptr<TransferSessionDelegate> delegate, std::shared_ptr<SerialQueue> queue)
     : delegate_(std::move(delegate)),
-      isOwn_(dynamic_cast<OwnDelegate*>(delegate_.lock().get()) != nullptr),
-      queue_(queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session")) {}
+      queue_(queue ? std::move(queue) : std::make_shared<SerialQueue>("com.veskar.corvane.transfer-session")) {
+    const auto own = std::dynamic_pointer_cast<OwnDelegate>(delegate_.lock());
+    isOwn_ = own != nullptr;
+    if (own) progressIsWanted_ = own->progressIsWanted();
+}
 
 void SessionReporter::close() {
     Lock lock(mutex_);
@@ -113,6 +116,10 @@ void SessionReporter::enqueue(Task report) {
     queue->asyncAhead(std::move(report));
 }
 
+bool SessionReporter::wantsProgress() const {
+    return !isOwn_ || OwnDelegate::logsProgress() || (progressIsWanted_ && *progressIsWanted_);
+}
+
 void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected) {
     if (!wantsProgress() || !task->note(total, expected)) return;
     enqueue([self = shared_from_this(), task = std::move(task)] {
@@ -122,6 +129,13 @@ void SessionReporter::reportProgress(std::shared_ptr<SessionTask> task, std::int
         if (told && progress.step > 0) {
             told->taskDidSendBodyData(*task, progress.step, progress.total, progress.expected);
         }
+    });
+}
+
+void SessionReporter::reportHoldUp(const std::string& server, bool lasts) {
+    enqueue([self = shared_from_this(), server, lasts] {
+        const auto own = std::dynamic_pointer_cast<OwnDelegate>(self->delegate());
+        if (own) own->serverIsHeldUp(server, lasts);
     });
 }
 

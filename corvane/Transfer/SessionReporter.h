@@ -7,10 +7,12 @@
 #include <corvane/Transfer/TransferOutcome.h>
 #include <corvane/Transfer/TransferSession.h>
 
+#include <atomic>
 #include <cstdint>
 #include <deque>
 #include <functional>
 #include <memory>
+#include <string>
 #include <vector>
 
 namespace corvane {
@@ -54,9 +56,12 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     bool reportEnd(SessionTask& task, Ending ending, const TransferOutcome& outcome);
 
     /// Whether anybody wants to know how much of a body has gone out.
-    [[nodiscard]] bool wantsProgress() const { return !isOwn_ || OwnDelegate::wantsProgress(); }
+    [[nodiscard]] bool wantsProgress() const;
     /// Enqueues a report of how much has gone out, unless one waits already or nobody wants to know.
     void reportProgress(std::shared_ptr<SessionTask> task, std::int64_t total, std::int64_t expected);
+
+    /// Enqueues the word that all uploads to a server are held up, or go on, for a delegate of the library's own.
+    void reportHoldUp(const std::string& server, bool lasts);
 
     /// Answers a question for the session's tasks through the queue, behind the completions that wait there.
     void answer(TransferSession::Listing listing, List list);
@@ -79,8 +84,10 @@ class SessionReporter : public std::enable_shared_from_this<SessionReporter> {
     void reportTogether(OwnDelegate& delegate, const std::vector<Waiting>& ends);
 
     const std::weak_ptr<TransferSessionDelegate> delegate_;
-    const bool isOwn_;  // the delegate is an OwnDelegate
     const std::shared_ptr<SerialQueue> queue_;
+    // Constant after construction.
+    bool isOwn_ = false;  // the delegate is an OwnDelegate
+    std::shared_ptr<const std::atomic<bool>> progressIsWanted_;
 
     mutable Mutex mutex_;
     std::deque<Waiting> ends_ CORVANE_GUARDED_BY(mutex_);

@@ -1,45 +1,124 @@
 #include <corvane/Upload/DeliveryLedger.h>
 
+#include <algorithm>
+#include <limits>
+#include <utility>
+
 namespace corvane {
 
 namespace {
 
-void addTo(DeliveryReport::Count& count, std::int64_t events) {
-    count.events += events;
+using Step = DeliveryUpdate::Step;
+
+void addTo(DeliveryReport::Count& count, std::optional<std::int64_t> events) {
+    count.events += events.value_or(0);
     ++count.documents;
+}
+
+DeliveryReport::Count& countOf(DeliveryReport& totals, DeliveryLedger::Outcome outcome) {
+    switch (outcome) {
+        case DeliveryLedger::Outcome::delivered:
+            return totals.delivered;
+        case DeliveryLedger::Outcome::pending:
+            return totals.pending;
+        case DeliveryLedger::Outcome::givenUp:
+            break;
+    }
+    return totals.givenUp;
+}
+
+Step stepOf(DeliveryLedger::Outcome outcome) {
+    switch (outcome) {
+        case DeliveryLedger::Outcome::delivered:
+            return Step::delivered;
+        case DeliveryLedger::Outcome::pending:
+            return Step::deferred;
+        case DeliveryLedger::Outcome::givenUp:
+            break;
+    }
+    return Step::givenUp;
 }
 
 }  // namespace
 
-void DeliveryLedger::add(std::string_view identifier, std::int64_t events) {
+void DeliveryLedger::add(std::string_view identifier, std::optional<std::int64_t> events) {
     const Lock lock(mutex_);
-    onTheirWay_.emplace(identifier, events);
+    if (onTheirWay_.try_emplace(std::string(identifier), Document{events, lastNumber_ + 1}).second) ++lastNumber_;
 }
 
 void DeliveryLedger::remove(std::string_view identifier) {
     const Lock lock(mutex_);
-    if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) onTheirWay_.erase(found);
-    if (onTheirWay_.empty()) settled_.notify_all();
+    if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) strikeOut(found);
 }
 
-void DeliveryLedger::settle(std::string_view identifier, Outcome outcome) {
-    const Lock lock(mutex_);
-    const auto found = onTheirWay_.find(identifier);
-    if (found == onTheirWay_.end()) return;
-    switch (outcome) {
-        case Outcome::delivered:
-            addTo(totals_.delivered, found->second);
-            break;
-        case Outcome::pending:
-            addTo(totals_.pending, found->second);
-            break;
-        case Outcome::givenUp:
-            addTo(totals_.givenUp, found->second);
-            break;
+void DeliveryLedger::strikeOut(Documents::iterator document) {
+    onTheirWay_.erase(document);
+    if (onTheirWay_.empty()) heldUpTo_ = 0;
+    settled_.notify_all();
+}
+
+void DeliveryLedger::begin(std::string_view identifier) {
+    {
+        const Lock lock(mutex_);
+        const auto found = onTheirWay_.find(identifier);
+        if (found == onTheirWay_.end() || std::exchange(found->second.isUnderWay, true)) return;
+        tell(Step::underWay, identifier, &found->second);
     }
-    onTheirWay_.erase(found);
-    if (const auto followed = followed_.find(identifier); followed != followed_.end()) followed->second = outcome;
-    if (onTheirWay_.empty()) settled_.notify_all();
+    news_->post();
+}
+
+void DeliveryLedger::progress(std::string_view identifier, std::int64_t sent, std::int64_t expected) {
+    {
+        const Lock lock(mutex_);
+        const auto found = onTheirWay_.find(identifier);
+        if (found == onTheirWay_.end()) return;
+        heldUpTo_ = 0;
+        tell(Step::progress, identifier, &found->second, {}, sent, expected);
+    }
+    news_->post();
+}
+
+void DeliveryLedger::settle(std::string_view identifier, Outcome outcome, const DeliveryUpdate::Cause& cause) {
+    {
+        const Lock lock(mutex_);
+        noteServer(cause.reason);
+        const auto found = onTheirWay_.find(identifier);
+        const bool isHere = found != onTheirWay_.end();
+        tell(stepOf(outcome), identifier, isHere ? &found->second : nullptr, cause);
+        if (isHere) {
+            addTo(countOf(totals_, outcome), found->second.events);
+            strikeOut(found);
+            const auto followed = followed_.find(identifier);
+            if (followed != followed_.end()) followed->second = outcome;
+        }
+    }
+    news_->post();
+}
+
+void DeliveryLedger::noteServer(DeliveryUpdate::Reason reason) {
+    using Reason = DeliveryUpdate::Reason;
+    if (reason == Reason::answer) {
+        heldUpTo_ = 0;
+    } else if (reason == Reason::unreachable || reason == Reason::blocked) {
+        heldUpTo_ = std::max(heldUpTo_, lastNumber_);
+        settled_.notify_all();
+    }
+}
+
+void DeliveryLedger::holdUp(bool lasts) {
+    const Lock lock(mutex_);
+    heldUpTo_ = lasts ? std::numeric_limits<std::uint64_t>::max() : 0;
+    settled_.notify_all();
+}
+
+void DeliveryLedger::tell(Step step, std::string_view identifier, const Document* document,
+                          const DeliveryUpdate::Cause& cause, std::int64_t sent, std::int64_t expected) noexcept {
+    if (!news_->isWanted()) return;
+    try {
+        news_->add({step, std::string(identifier), document ? document->events : std::nullopt, cause, sent, expected});
+    } catch (...) {
+        news_->addLoss();
+    }
 }
 
 bool DeliveryLedger::follow(std::string_view identifier) {
@@ -65,7 +144,7 @@ std::optional<DeliveryLedger::Outcome> DeliveryLedger::takeOutcome(std::string_v
 
 DeliveryReport DeliveryLedger::reportLocked() const {
     auto report = totals_;
-    for (const auto& [identifier, events] : onTheirWay_) addTo(report.pending, events);
+    for (const auto& [identifier, document] : onTheirWay_) addTo(report.pending, document.events);
     return report;
 }
 
@@ -74,10 +153,21 @@ DeliveryReport DeliveryLedger::report() const {
     return reportLocked();
 }
 
-DeliveryReport DeliveryLedger::wait(std::chrono::steady_clock::time_point deadline) const {
+DeliveryReport DeliveryLedger::wait(std::chrono::steady_clock::time_point deadline, bool onlyWhileReachable) const {
     Lock lock(mutex_);
-    while (!onTheirWay_.empty() && lock.waitUntil(settled_, deadline)) continue;
+    while (!isSettledLocked(onlyWhileReachable) && lock.waitUntil(settled_, deadline)) continue;
     return reportLocked();
+}
+
+bool DeliveryLedger::isSettled(bool onlyWhileReachable) const {
+    const Lock lock(mutex_);
+    return isSettledLocked(onlyWhileReachable);
+}
+
+bool DeliveryLedger::isSettledLocked(bool onlyWhileReachable) const {
+    if (!onlyWhileReachable || heldUpTo_ == 0) return onTheirWay_.empty();
+    return std::all_of(onTheirWay_.begin(), onTheirWay_.end(),
+                       [to = heldUpTo_](const auto& one) { return one.second.number <= to; });
 }
 
 }  // namespace corvane

@@ -19,4 +19,16 @@ struct DeliveryReport {
     bool operator==(const DeliveryReport&) const = default;
 };
 
+/// What a wait for delivery waits for. A value.
+struct DeliveryWaitOptions {
+    /// Do not wait for documents that wait for a server which is known to be unreachable: a transfer to the endpoint
+    /// has ended, since they were handed over, for want of a connection or because the way to the server is blocked
+    /// (`TransferError` unreachable or blocked), or the transfer agent has said that it holds the endpoint's uploads up
+    /// for that reason. That is forgotten when the server answers, whatever it says, when part of a document goes out,
+    /// and when the agent says that it goes on or is lost; a document that is handed over later is waited for until it
+    /// fails, too, unless the agent holds it up. A server that takes the connection and says nothing is not
+    /// unreachable.
+    bool onlyWhileReachable = false;
+};
+
 }  // namespace corvane

@@ -112,6 +112,7 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     const auto entity = newEntity(request, std::move(identifier));
     const auto taken = record(entity, request);
     service_->submit(prepared(entity, std::move(file)));
+    if (ledger_) ledger_->begin(entity.identifier);
     return taken;
 }
 
@@ -176,6 +177,9 @@ void UploadManager::retryStoredRequests() {
         } else {
             isMoreReady = backlog_.end(identifier);
         }
+    }
+    for (const auto& request : requests) {
+        if (ledger_) ledger_->begin(request.identifier);
     }
     service_->resubmit(std::move(requests));
     if (isMoreReady) retryStoredRequestsLater();
@@ -250,7 +254,7 @@ void UploadManager::dropExceeded(const SignedEntity& entity) {
             "Failed to cleanup request that exceeded allowed attempts, identifier=%{public}@, error=%{public}@",
             entity.identifier, AnyError::current().what());
     }
-    settle(entity.identifier, Outcome::givenUp);
+    settle(entity.identifier, Outcome::givenUp, {.reason = DeliveryUpdate::Reason::tooManyAttempts});
 }
 
 std::optional<PreparedUploadRequest> UploadManager::preparedRequest(const SignedEntity& entity) {
@@ -265,7 +269,7 @@ std::optional<PreparedUploadRequest> UploadManager::preparedRequest(const Signed
             "Failed to cleanup request from db missing upload file, identifier=%{public}@, error=%{public}@",
             entity.identifier, AnyError::current().what());
     }
-    settle(entity.identifier, Outcome::givenUp);
+    settle(entity.identifier, Outcome::givenUp, {.reason = DeliveryUpdate::Reason::payloadMissing});
     return std::nullopt;
 }
 
@@ -307,7 +311,7 @@ void UploadManager::didFinish(const UploadResult& result, const std::optional<An
             "Completed upload but failed to cleanup tracking data, identifier=%{public}@, error=%{public}@", identifier,
             problem->what());
     }
-    settle(identifier, success ? Outcome::delivered : Outcome::givenUp);
+    settle(identifier, success ? Outcome::delivered : Outcome::givenUp, result.cause());
 }
 
 // Without a row nothing is left to send again, unless the row could not be written: then the contents stayed where they
@@ -321,7 +325,7 @@ void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
         Log::shared().error("Failed to mark retry, identifier=%{public}@, error=%{public}@", retry.identifier,
                             AnyError::current().what());
     }
-    settle(retry.identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp);
+    settle(retry.identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp, retry.cause);
 }
 
 bool UploadManager::forgetUnrecorded(const std::string& identifier) {
@@ -347,9 +351,25 @@ void UploadManager::uploadEndedElsewhere(const UploadResult& result) {
     const auto& identifier = result.identifier();
     forgetUnrecorded(identifier);
     if (backlog_.end(identifier)) retryStoredRequestsLater();
-    if (std::holds_alternative<UploadResult::Success>(result.value)) return settle(identifier, Outcome::delivered);
+    const auto cause = result.cause();
+    if (std::holds_alternative<UploadResult::Success>(result.value)) {
+        return settle(identifier, Outcome::delivered, cause);
+    }
     const bool goesOutAgain = std::holds_alternative<UploadResult::Retry>(result.value) && hasRow(identifier);
-    settle(identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp);
+    settle(identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp, cause);
+}
+
+void UploadManager::uploadDidSend(const std::string& identifier, std::int64_t sent, std::int64_t expected) {
+    if (ledger_) ledger_->progress(identifier, sent, expected);
+}
+
+void UploadManager::uploadsAreHeldUp(bool lasts) {
+    if (ledger_) ledger_->holdUp(lasts);
+}
+
+std::shared_ptr<const std::atomic<bool>> UploadManager::progressIsWanted() const noexcept {
+    if (!ledger_) return nullptr;
+    return {ledger_->news(), &ledger_->news()->isWanted()};
 }
 
 bool UploadManager::hasRow(const std::string& identifier) {
@@ -383,8 +403,8 @@ std::optional<AnyError> UploadManager::deleteRows(const std::vector<std::string>
     }
 }
 
-void UploadManager::settle(const std::string& identifier, Outcome outcome) {
-    if (ledger_) ledger_->settle(identifier, outcome);
+void UploadManager::settle(const std::string& identifier, Outcome outcome, const DeliveryUpdate::Cause& cause) {
+    if (ledger_) ledger_->settle(identifier, outcome, cause);
 }
 
 }  // namespace corvane

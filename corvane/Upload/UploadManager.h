@@ -13,6 +13,8 @@
 #include <corvane/Upload/UploadServiceDelegate.h>
 #include <corvane/Upload/UploadServiceType.h>
 
+#include <atomic>
+#include <cstdint>
 #include <filesystem>
 #include <functional>
 #include <memory>
@@ -64,6 +66,9 @@ class UploadManager final : public UploadManagerType,
     void uploadServiceTogether(UploadServiceType& service, const std::vector<UploadResult>& results) override;
     /// Strikes the upload out of the ledger; its row and its file are the other process's.
     void uploadEndedElsewhere(const UploadResult& result) override;
+    void uploadDidSend(const std::string& identifier, std::int64_t sent, std::int64_t expected) override;
+    void uploadsAreHeldUp(bool lasts) override;
+    [[nodiscard]] std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept override;
 
   private:
     UploadManager(std::shared_ptr<UploadServiceType> service,
@@ -104,7 +109,7 @@ class UploadManager final : public UploadManagerType,
     void deleteRow(const std::string& identifier);
     /// Deletes all of them or none, in which case it returns why.
     [[nodiscard]] std::optional<AnyError> deleteRows(const std::vector<std::string>& identifiers) noexcept;
-    void settle(const std::string& identifier, DeliveryLedger::Outcome outcome);
+    void settle(const std::string& identifier, DeliveryLedger::Outcome outcome, const DeliveryUpdate::Cause& cause);
 
     const std::shared_ptr<UploadServiceType> service_;
     const std::shared_ptr<DeferredStore<SignedEntity>> deferredStore_;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Platform/Date.h>
+#include <corvane/Upload/DeliveryUpdate.h>
 #include <corvane/Upload/UploadResponse.h>
 
 #include <string>
@@ -25,6 +26,7 @@ struct [[nodiscard]] UploadResult {
         std::string identifier;
         Date after;             ///< the date from which it may be sent again
         bool isCounted = true;  ///< not when it is certain that nothing of the document was sent
+        DeliveryUpdate::Cause cause = {};
         bool operator==(const Retry&) const = default;
     };
     /// The collector will never take the document: forget it.
@@ -39,8 +41,9 @@ struct [[nodiscard]] UploadResult {
     static UploadResult success(std::string identifier, UploadResponse response) {
         return {Success{std::move(identifier), std::move(response)}};
     }
-    static UploadResult retry(std::string identifier, Date after, bool isCounted = true) {
-        return {Retry{std::move(identifier), after, isCounted}};
+    static UploadResult retry(std::string identifier, Date after, bool isCounted = true,
+                              DeliveryUpdate::Cause cause = {}) {
+        return {Retry{std::move(identifier), after, isCounted, std::move(cause)}};
     }
     static UploadResult failed(std::string identifier, UploadResponse response) {
         return {Failed{std::move(identifier), std::move(response)}};
@@ -48,6 +51,14 @@ struct [[nodiscard]] UploadResult {
 
     [[nodiscard]] const std::string& identifier() const {
         return std::visit([](const auto& ending) -> const std::string& { return ending.identifier; }, value);
+    }
+
+    /// What decided on it: the server's answer, or whatever came in place of one.
+    [[nodiscard]] DeliveryUpdate::Cause cause() const {
+        if (const auto* again = std::get_if<Retry>(&value)) return again->cause;
+        const auto* success = std::get_if<Success>(&value);
+        const auto& response = success ? success->response : std::get<Failed>(value).response;
+        return {.reason = DeliveryUpdate::Reason::answer, .status = response.statusCode};
     }
 
     bool operator==(const UploadResult&) const = default;

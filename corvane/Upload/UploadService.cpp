@@ -10,6 +10,7 @@
 #include <corvane/Platform/MainQueue.h>
 #include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/Require.h>
+#include <corvane/Transfer/HTTPURL.h>
 #include <corvane/Transfer/TransferError.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
@@ -71,6 +72,15 @@ std::set<std::string> identifiersOfRunning(const std::vector<std::shared_ptr<Tra
 bool isBlocked(const AnyError& error) {
     const auto* known = error.as<TransferError>();
     return known && known->value() == TransferError::Code::blocked;
+}
+
+DeliveryUpdate::Cause causeOf(const AnyError& error, const std::optional<TransferResponse>& response) {
+    using Reason = DeliveryUpdate::Reason;
+    const auto* known = error.as<TransferError>();
+    const bool isUnreachable = known && known->value() == TransferError::Code::unreachable;
+    const Reason reason = isUnreachable ? Reason::unreachable : isBlocked(error) ? Reason::blocked : Reason::failed;
+    const bool isAnswered = response && response->isHTTP;
+    return {reason, isAnswered ? std::optional(response->statusCode) : std::nullopt, error.what()};
 }
 
 bool isGone(const std::filesystem::path& file) {
@@ -254,10 +264,12 @@ void UploadService::startMissing(const std::vector<PreparedUploadRequest>& reque
 
 void UploadService::taskDidSendBodyData(const TransferTask& task, std::int64_t sent, std::int64_t total,
                                         std::int64_t expected) {
+    const std::string identifier = task.description().value_or(unknown);
+    if (const auto told = delegate()) told->uploadDidSend(identifier, total, expected);
+    if (!logsProgress()) return;
     Log::shared().default_(
         "Upload sent data, identifier=%{public}@, urlSessionTaskID=%{public}@, sent=%@, total=%@, expected=%@",
-        task.description().value_or(unknown), urlSessionTaskID(task), std::to_string(sent), std::to_string(total),
-        std::to_string(expected));
+        identifier, urlSessionTaskID(task), std::to_string(sent), std::to_string(total), std::to_string(expected));
 }
 
 void UploadService::taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
@@ -282,6 +294,22 @@ void UploadService::taskDidEndElsewhere(const TransferTask& task, const std::opt
     if (const auto delegate = noteEnd(task)) delegate->uploadEndedElsewhere(ending);
 }
 
+// An upload of another server's is an earlier run's, whose endpoint had another URL.
+void UploadService::serverIsHeldUp(const std::string& server, bool lasts) {
+    if (server != HTTPURL::parse(endpoint_.url()).server()) return;
+    if (const auto told = delegate()) told->uploadsAreHeldUp(lasts);
+}
+
+std::shared_ptr<const std::atomic<bool>> UploadService::progressIsWanted() const noexcept {
+    const auto told = delegate();
+    return told ? told->progressIsWanted() : nullptr;
+}
+
+std::shared_ptr<UploadServiceDelegate> UploadService::delegate() const {
+    const Lock lock(mutex_);
+    return delegate_.lock();
+}
+
 std::shared_ptr<UploadServiceDelegate> UploadService::noteEnd(const TransferTask& task) {
     const Lock lock(mutex_);
     if (pendingListings_ > 0) endedMeanwhile_.insert(task.description().value_or(unknown));
@@ -295,12 +323,13 @@ UploadResult UploadService::result(const TransferTask& task, const std::optional
     if (error) {
         Log::shared().error("Upload failed, identifier=%{public}@, urlSessionTaskID=%{public}@, error=%{public}@",
                             identifier, taskID, error->what());
-        return UploadResult::retry(identifier, now(), !isBlocked(*error));
+        return UploadResult::retry(identifier, now(), !isBlocked(*error), causeOf(*error, response));
     }
     if (!response || !response->isHTTP) {
         Log::shared().default_("Upload unknown state, identifier=%{public}@, urlSessionTaskID=%{public}@", identifier,
                                taskID);
-        return UploadResult::retry(identifier, now());
+        return UploadResult::retry(identifier, now(), true,
+                                   {.reason = DeliveryUpdate::Reason::failed, .problem = "the answer is none of HTTP"});
     }
     return result(identifier, taskID, uploadResponse(*response));
 }
@@ -309,6 +338,7 @@ UploadResult UploadService::result(const std::string& identifier, const std::str
     auto& log = Log::shared();
     const auto status = response.statusCode;
     const auto text = log.isEnabled(LogLevel::default_) ? response.description() : std::string();
+    const DeliveryUpdate::Cause answer{.reason = DeliveryUpdate::Reason::answer, .status = status};
     switch (classify(status)) {
         case Verdict::delivered:
             log.default_(
@@ -321,7 +351,7 @@ UploadResult UploadService::result(const std::string& identifier, const std::str
                 "Upload HTTP failed authorization, and will retry, identifier=%{public}@, "
                 "urlSessionTaskID=%{public}@, status=%ld, uploadResponse=%@",
                 identifier, taskID, status, text);
-            return UploadResult::retry(identifier, now());
+            return UploadResult::retry(identifier, now(), true, answer);
         case Verdict::refused:
             log.default_(
                 "Upload HTTP failed and won't retry, identifier=%{public}@, urlSessionTaskID=%{public}@, "
@@ -331,7 +361,7 @@ UploadResult UploadService::result(const std::string& identifier, const std::str
         case Verdict::unavailable:
             log.default_("Upload HTTP failed, identifier=%{public}@, urlSessionTaskID=%{public}@, statusCode=%ld",
                          identifier, taskID, status);
-            return UploadResult::retry(identifier, now());
+            return UploadResult::retry(identifier, now(), true, answer);
         case Verdict::unhandled:
             break;
     }

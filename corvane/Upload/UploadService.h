@@ -9,6 +9,7 @@
 #include <corvane/Upload/UploadResult.h>
 #include <corvane/Upload/UploadServiceType.h>
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <functional>
@@ -82,6 +83,8 @@ class UploadService final : public UploadServiceType,
     void taskDidEndElsewhere(const TransferTask& task, const std::optional<AnyError>& error,
                              const std::optional<TransferResponse>& response) override;
     void allEventsDelivered() override;
+    void serverIsHeldUp(const std::string& server, bool lasts) override;
+    [[nodiscard]] std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept override;
 
   private:
     using Completions = std::vector<std::function<void()>>;
@@ -99,6 +102,7 @@ class UploadService final : public UploadServiceType,
     std::string signature(const std::filesystem::path& file);
     /// Asks the host for its headers, and adds those that may be sent.
     void appendHostHeaders(HTTPHeaders& headers) const;
+    [[nodiscard]] std::shared_ptr<UploadServiceDelegate> delegate() const;
     /// Remembers the end of an upload for the listings that are under way. Returns who is to be told of it.
     std::shared_ptr<UploadServiceDelegate> noteEnd(const TransferTask& task);
     /// What the end of a task means for its upload; logs it.
@@ -116,7 +120,7 @@ class UploadService final : public UploadServiceType,
     const TransferSession::Factory factory_;
     const Lazy<std::shared_ptr<TransferSession>> lazyURLSession_;
 
-    Mutex mutex_;  // never held while calling out
+    mutable Mutex mutex_;  // never held while calling out
     std::weak_ptr<UploadServiceDelegate> delegate_ CORVANE_GUARDED_BY(mutex_);
     std::shared_ptr<SerialQueue> accessQueue_ CORVANE_GUARDED_BY(mutex_);
     Completions backgroundCompletions_ CORVANE_GUARDED_BY(mutex_);

@@ -2,6 +2,10 @@
 
 #include <corvane/Upload/UploadResult.h>
 
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <string>
 #include <vector>
 
 namespace corvane {
@@ -26,6 +30,18 @@ class UploadServiceDelegate {
     /// Called, on the same queue, for an upload whose end the delegate of another process was told of, which keeps the
     /// books of it. Does nothing by default.
     virtual void uploadEndedElsewhere(const UploadResult& /*result*/) {}
+
+    /// Called, on the same queue, when part of an upload's body has gone out: so many bytes of so many. Reports may be
+    /// left out while `progressIsWanted` says no. Does nothing by default.
+    virtual void uploadDidSend(const std::string& /*identifier*/, std::int64_t /*sent*/, std::int64_t /*expected*/) {}
+
+    /// Called, on the same queue, when all uploads begin to wait because their server cannot be reached, or the way to
+    /// it is blocked, and when they go on. Does nothing by default.
+    virtual void uploadsAreHeldUp(bool /*lasts*/) {}
+
+    /// Whether anything comes of `uploadDidSend`; it may change at any time. Asked once. By default, with nullptr,
+    /// nothing ever does.
+    [[nodiscard]] virtual std::shared_ptr<const std::atomic<bool>> progressIsWanted() const noexcept { return nullptr; }
 };
 
 }  // namespace corvane

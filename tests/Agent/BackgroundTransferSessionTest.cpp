@@ -1,4 +1,7 @@
+#include <corvane/Testing/ProcessSettings.h>
+
 #include "tests/Agent/AgentFixture.h"
+#include "tests/Integration/Application.h"
 
 #include <signal.h>
 #include <unistd.h>
@@ -207,6 +210,44 @@ TEST_F(BackgroundTransferSessionTest, WaitsForAServerWhileThereIsAHostAndThePati
     session = open(recorder);
     EXPECT_EQ(running(*session), std::vector<std::string>{"a"});
     EXPECT_TRUE(eventually([&] { return log.count(waits) == 3; })) << "and it goes on";
+}
+
+TEST_F(BackgroundTransferSessionTest, TellsAnObserverOfProgressAndAWaitingHostOfAServerThatIsNotThere) {
+    ProcessSettings settings;
+    settings.setTransfers(BackgroundTransferSession::factory(options));
+    const auto soon = std::chrono::steady_clock::now() + 20s;
+    std::mutex mutex;
+    std::vector<DeliveryUpdate> heard;
+    const auto observer = [&](const DeliveryUpdate& update) {
+        const std::lock_guard lock(mutex);
+        heard.push_back(update);
+    };
+    {
+        Application application(server.url(), 50, "there", observer);
+        for (const int delivered : {1, 2}) {  // the agent may be through with the first before it knows its host
+            application.submit();
+            application.uploads->flush();
+            EXPECT_EQ(application.uploads->waitForDelivery(soon).delivered.events, delivered);
+        }
+        MainQueue::async([] { Log::shared().error("behind what was waited for"); });
+        ASSERT_TRUE(log.waitFor("behind what was waited for"));
+    }
+    using Step = DeliveryUpdate::Step;
+    ASSERT_GE(heard.size(), 5u);
+    const auto* const second = &*heard.end() - 3;
+    EXPECT_TRUE(second[0].step == Step::underWay && second[1].step == Step::progress);
+    EXPECT_EQ(second[1].bytesSent, std::ssize(server.requests().at(1).body));
+    EXPECT_TRUE(second[2].step == Step::delivered && second[2].cause.status == 200);
+
+    Application application(nowhere, 1, "nowhere");
+    application.submit();
+    for (const int count : {1, 2}) {  // the agent says it once, and holds the second up, too
+        const auto report =
+            application.uploads->waitForDelivery(soon + std::chrono::hours(1), {.onlyWhileReachable = true});
+        EXPECT_EQ(report.pending.documents, count);
+        application.submit();
+    }
+    EXPECT_EQ(log.count(waits), 1);
 }
 
 }  // namespace

@@ -1,6 +1,11 @@
 #include "tests/Bridge/BridgeFixture.h"
 #include "tests/support/Documents.h"
 
+#include <corvane/Platform/MainQueue.h>
+
+#include <atomic>
+#include <future>
+
 namespace corvane::test {
 namespace {
 
@@ -120,10 +125,20 @@ TEST_F(BridgeProcessors, UploadBatchesThroughTheBridge) {
     EXPECT_EQ(error.domain(), "Corvane.InvalidArgument") << "its batches are the first manager's";
     sessions->pushSessionData({"device", raw("Device", {{"model", "M1"}})});
     root->pushDataEvent(raw("Screen", {{"name", "home"}}));
+    std::atomic<int> delivered = 0;
+    uploads->setDeliveryObserver([&](const CVDeliveryUpdate& update) {
+        if (update.step == CVDeliveryUpdate::Step::delivered) ++delivered;
+    });
     for (int i = 0; i < 3; ++i) root->submitRawEvent({"View", {{"screen", {"Screen", required}}}});
+    uploads->flush();
+    const auto report = uploads->waitForDelivery(std::chrono::steady_clock::now() + 20s, {.onlyWhileReachable = true});
+    EXPECT_EQ(report.delivered, (CVDeliveryReport::Count{3, 2}));
+    std::promise<void> heard;
+    MainQueue::async([&] { heard.set_value(); });
+    heard.get_future().wait();
+    EXPECT_EQ(delivered, 2) << "before what is put on the main queue behind the wait";
+    uploads->setDeliveryObserver({});
     sessions->endSession();
-    processor->settle();
-    (void)uploads->proxyEventProcessor()->waitForDelivery(std::chrono::steady_clock::now() + 20s);
     const auto received = server.documents();
     ASSERT_EQ(received.size(), 2u);
     for (const auto& document : received) {

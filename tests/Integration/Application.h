@@ -33,10 +33,12 @@ inline void acknowledge(const EventSubmitResult& result) {
 /// An application as a host writes it, with the whole library behind it and an endpoint named "main" unless a test says
 /// otherwise.
 struct Application {
-    explicit Application(const std::string& url, int batchSize = 50, const std::string& endpoint = "main")
+    explicit Application(const std::string& url, int batchSize = 50, const std::string& endpoint = "main",
+                         DeliveryObserver observer = {})
         : uploads(std::make_shared<UploadBatchEventProcessor>(Client{"com.example.player", "Player", "2.3", 117},
                                                               Endpoint{url, endpoint},
                                                               UploadBatchEventConfig(batchSize, false))) {
+        uploads->setDeliveryObserver(std::move(observer));
         sessions.processorManager()->add(uploads);
         sessions.start(Session::Kind::userEvents());
         sessions.tracker()->push(Screen{"home"});

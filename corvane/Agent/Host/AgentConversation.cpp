@@ -286,6 +286,8 @@ void AgentConversation::reportEndElsewhere(std::shared_ptr<Task> task, TransferO
 }
 
 void AgentConversation::take(const agent::Trouble& reply) {
+    const bool isNews = reply.lasts ? troubles_.insert(reply.server).second : troubles_.erase(reply.server) > 0;
+    if (isNews) reporter_->reportHoldUp(reply.server, reply.lasts);
     if (reply.lasts) {
         Log::shared().error("Uploads wait for their server and are tried again, server=%{public}@, reason=%{public}@",
                             reply.server, reply.reason);
@@ -294,9 +296,15 @@ void AgentConversation::take(const agent::Trouble& reply) {
     }
 }
 
+void AgentConversation::forgetTroubles() {
+    for (const auto& server : troubles_) reporter_->reportHoldUp(server, false);
+    troubles_.clear();
+}
+
 // --- The agent itself. -----------------------------------------------------------------------------------------------
 
 void AgentConversation::agentIsReady() {
+    forgetTroubles();
     for (const auto& task : tasks_->open()) submit(*task);
     questions_.askAgain();
     ask();
@@ -319,6 +327,7 @@ void AgentConversation::agentFailed() {
         usable_ = false;
         restUntil_ = Clock::now() + holdOff_;
     }
+    forgetTroubles();
     for (const auto& task : tasks_->open()) {  // one that there is no memory for stays the agent's
         callHost("transfer agent link", [&] {
             agentThread.assertCurrent("AgentConversation::takeBack");

@@ -12,6 +12,7 @@
 #include <chrono>
 #include <memory>
 #include <optional>
+#include <set>
 #include <string>
 
 namespace corvane {
@@ -94,6 +95,8 @@ class AgentConversation final : public AgentLink::Listener, public std::enable_s
     /// The same of one that another process has told of: the row and the payload are that one's business, and whoever
     /// waits here is to wait no longer.
     void reportEndElsewhere(std::shared_ptr<Task> task, TransferOutcome outcome) CORVANE_REQUIRES(agentThread);
+    /// Takes back what the agent has said of servers that it cannot reach: another one finds out for itself.
+    void forgetTroubles() CORVANE_REQUIRES(agentThread);
     /// While an end is waited for, an agent that hangs must not go unnoticed.
     void watch() CORVANE_REQUIRES(agentThread);
 
@@ -125,6 +128,8 @@ class AgentConversation final : public AgentLink::Listener, public std::enable_s
     Clock::time_point restUntil_ CORVANE_GUARDED_BY(mutex_);
 
     AgentQuestions questions_ CORVANE_GUARDED_BY(agentThread);
+    // The servers that the agent cannot reach, or that the way to is blocked.
+    std::set<std::string> troubles_ CORVANE_GUARDED_BY(agentThread);
 };
 
 }  // namespace corvane

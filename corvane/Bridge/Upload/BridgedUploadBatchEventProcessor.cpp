@@ -13,4 +13,15 @@ BridgedUploadBatchEventProcessor::BridgedUploadBatchEventProcessor(
     : BridgingEventProcessor(eventProcessor), proxyEventProcessor_(std::move(eventProcessor)) {}
 BridgedUploadBatchEventProcessor::~BridgedUploadBatchEventProcessor() = default;
 
+DeliveryReport BridgedUploadBatchEventProcessor::waitForDelivery(std::chrono::steady_clock::time_point deadline,
+                                                                 const DeliveryWaitOptions& options) const {
+    return proxyEventProcessor_->waitForDelivery(deadline, options);
+}
+void BridgedUploadBatchEventProcessor::flush() {
+    proxyEventProcessor_->flush();
+}
+void BridgedUploadBatchEventProcessor::setDeliveryObserver(DeliveryObserver observer) {
+    proxyEventProcessor_->setDeliveryObserver(std::move(observer));
+}
+
 }  // namespace corvane

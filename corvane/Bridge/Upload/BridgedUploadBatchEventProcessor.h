@@ -4,6 +4,7 @@
 #include <corvane/Export.h>
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 
+#include <chrono>
 #include <memory>
 
 namespace corvane {
@@ -19,7 +20,13 @@ class CORVANE_EXPORT BridgedUploadBatchEventProcessor final : public BridgingEve
     BridgedUploadBatchEventProcessor(const BridgedUploadBatchEventProcessor&) = default;
     ~BridgedUploadBatchEventProcessor() override;
 
-    /// The library's own processor: what `waitForDelivery` is called on before a program exits.
+    /// See the members of these names of `UploadBatchEventProcessor`.
+    DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline,
+                                   const DeliveryWaitOptions& options = {}) const;
+    void flush();
+    void setDeliveryObserver(DeliveryObserver observer);
+
+    /// The library's own processor.
     [[nodiscard]] const std::shared_ptr<UploadBatchEventProcessor>& proxyEventProcessor() const {
         return proxyEventProcessor_;
     }
