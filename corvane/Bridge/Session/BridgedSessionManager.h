@@ -105,8 +105,8 @@ class CORVANE_EXPORT BridgedSessionManager {
     /// The completion, if any, is called on the queue, also when there was nothing to end.
     void endSessionWithCompletion(std::function<void()> completion);
 
-    /// As `SessionManager::setRecording`. The completion, if any, gets nullptr or the reason why the choice could not be
-    /// written.
+    /// As `SessionManager::setRecording`. The completion, if any, gets nullptr or the reason why the choice could not
+    /// be written.
     void setRecording(bool isOn, std::function<void(const BridgedError*)> completion = {});
     [[nodiscard]] bool isRecording() const;
 
