@@ -215,6 +215,7 @@ TEST_F(BackgroundTransferSessionTest, WaitsForAServerWhileThereIsAHostAndThePati
 TEST_F(BackgroundTransferSessionTest, TellsAnObserverOfProgressAndAWaitingHostOfAServerThatIsNotThere) {
     ProcessSettings settings;
     settings.setTransfers(BackgroundTransferSession::factory(options));
+    Log::shared().setLevel(LogLevel::error);  // which wants no progress of its own
     const auto soon = std::chrono::steady_clock::now() + 20s;
     std::mutex mutex;
     std::vector<DeliveryUpdate> heard;
