@@ -147,6 +147,11 @@ TEST_F(BridgeProcessors, UploadBatchesThroughTheBridge) {
                   R"({"data":{"screen":{"name":"home"}},"metadata":{"name":"View","version":"0.1.0"}})");
     }
     EXPECT_FALSE(uploads->resumeBackgroundProcessingForIdentifier("not mine", [] {}));
+
+    std::promise<bool> isKept;
+    sessions->setRecording(false, [&](const CVError* kept) { isKept.set_value(!kept); });
+    EXPECT_TRUE(isKept.get_future().get());
+    EXPECT_FALSE(sessions->isRecording());
 }
 
 }  // namespace
