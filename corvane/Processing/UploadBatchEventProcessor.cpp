@@ -8,8 +8,10 @@
 namespace corvane {
 
 UploadBatchEventConfig::UploadBatchEventConfig(int batchSize, bool batchDebugging)
-    : batchSize_(static_cast<std::size_t>(batchSize)), batchDebugging_(batchDebugging) {
-    if (batchSize < 1) throw InvalidArgument("the batch size must be at least 1");
+    : UploadBatchEventConfig(UploadBatchEventOptions{batchSize, batchDebugging}) {}
+
+UploadBatchEventConfig::UploadBatchEventConfig(const UploadBatchEventOptions& options) : options_(options) {
+    if (options.batchSize < 1) throw InvalidArgument("the batch size must be at least 1");
 }
 
 const UploadBatchEventConfig& UploadBatchEventConfig::default_() {

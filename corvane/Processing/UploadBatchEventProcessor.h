@@ -17,11 +17,21 @@ namespace corvane {
 
 class UploadBatches;
 
+/// What can be set of the batching processor, by name. A value.
+struct UploadBatchEventOptions {
+    int batchSize = 50;           ///< how many events of a session make a document that is sent; at least 1
+    bool batchDebugging = false;  ///< whether readable copies of documents and responses are kept beside the payloads
+};
+
 /// How the batching processor batches. A value.
+///
+///     UploadBatchEventConfig config({.batchSize = 20});
 class CORVANE_EXPORT UploadBatchEventConfig {
   public:
     /// The default values: batches of 50, no debugging copies.
     UploadBatchEventConfig() = default;
+    /// Throws `InvalidArgument` for what the options do not allow.
+    explicit UploadBatchEventConfig(const UploadBatchEventOptions& options);
     /// @param batchSize how many events of a session make a document that is sent; at least 1
     /// @param batchDebugging whether readable copies of documents and responses are kept beside the payload files
     /// Throws `InvalidArgument` for a batch size below 1.
@@ -30,12 +40,12 @@ class CORVANE_EXPORT UploadBatchEventConfig {
     /// The one shared instance of the default values.
     [[nodiscard]] static const UploadBatchEventConfig& default_();
 
-    [[nodiscard]] std::size_t batchSize() const { return batchSize_; }
-    [[nodiscard]] bool batchDebugging() const { return batchDebugging_; }
+    [[nodiscard]] std::size_t batchSize() const { return static_cast<std::size_t>(options_.batchSize); }
+    [[nodiscard]] bool batchDebugging() const { return options_.batchDebugging; }
+    [[nodiscard]] const UploadBatchEventOptions& options() const { return options_; }
 
   private:
-    std::size_t batchSize_ = 50;
-    bool batchDebugging_ = false;
+    UploadBatchEventOptions options_;
 };
 
 /// Turns events into uploads: collects them per session, or per group within a session, keeps a backup of every open

@@ -3,19 +3,18 @@
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Store/DeferredStore.h>
-#include <corvane/Upload/Backlog.h>
 #include <corvane/Upload/DeliveryLedger.h>
-#include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/SignedEntity.h>
+#include <corvane/Upload/StoredUploads.h>
 #include <corvane/Upload/UploadDropboxType.h>
 #include <corvane/Upload/UploadManagerType.h>
 #include <corvane/Upload/UploadResult.h>
+#include <corvane/Upload/UploadRows.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 #include <corvane/Upload/UploadServiceType.h>
 
 #include <atomic>
 #include <cstdint>
-#include <filesystem>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -41,10 +40,8 @@ class UploadManager final : public UploadManagerType,
                             public UploadServiceDelegate,
                             public std::enable_shared_from_this<UploadManager> {
   public:
-    /// An upload whose row counts more retries than this is not sent again.
-    static constexpr std::int64_t maximumRetries = 4;
-
-    /// Makes a manager and sets it as the service's delegate. No argument but `ledger` may be empty.
+    /// Makes a manager and sets it as the service's delegate. No argument but `ledger` may be empty; it then has one
+    /// of its own.
     [[nodiscard]] static std::shared_ptr<UploadManager> create(
         std::shared_ptr<UploadServiceType> service, std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
         std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger = nullptr);
@@ -75,54 +72,27 @@ class UploadManager final : public UploadManagerType,
                   std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                   std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger);
 
-    UploadTaken uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(queue_);
+    UploadTaken uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(*queue_);
     /// Writes the document's row, and has its backup removed, both or neither.
     [[nodiscard]] UploadTaken record(const SignedEntity& entity, const UploadRequest& request);
-    void requeueCancelledRequests() CORVANE_REQUIRES(queue_);
-    void listStoredRequests() CORVANE_REQUIRES(queue_);
-    /// Sends the next portion of what is stored again. Goes on with what ends.
-    void retryStoredRequests() CORVANE_REQUIRES(queue_);
-    void retryStoredRequestsLater();
-    /// The stored row, or nothing when it has gone or cannot be read.
-    [[nodiscard]] std::optional<SignedEntity> storedRow(const std::string& identifier);
-    /// What is to be sent of a stored row, or nothing when it is dropped.
-    [[nodiscard]] std::optional<PreparedUploadRequest> retryRequest(const SignedEntity& entity);
-    /// Deletes the row and the file of an upload that was retried too often.
-    void dropExceeded(const SignedEntity& entity);
-    /// The row's request, or nothing when its payload file has gone or is empty; the row is then deleted.
-    [[nodiscard]] std::optional<PreparedUploadRequest> preparedRequest(const SignedEntity& entity);
-
     /// Removes the payload of an upload that is over, unless its row could not be deleted.
     void didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem);
     void didFailForNow(const UploadResult::Retry& retry);
-    /// Counts a retry in the row. Returns false when there is no row.
-    bool markRetry(const UploadResult::Retry& retry);
     /// Notes the end of an upload. Returns whether it was under way without a row.
     bool forgetUnrecorded(const std::string& identifier);
-    /// Removes the payloads that are old, of which there is no row, and which nobody has under way: a process was
-    /// killed between payload and row, and the events went out, or will, from their batch's backup.
-    /// @param recorded what there are rows of
-    void removeOrphans(const std::set<std::string>& recorded);
-    void removeOrphans(const std::vector<std::string>& orphans, const std::set<std::string>& inFlight);
     [[nodiscard]] bool hasRow(const std::string& identifier);
 
-    void deleteRow(const std::string& identifier);
-    /// Deletes all of them or none, in which case it returns why.
-    [[nodiscard]] std::optional<AnyError> deleteRows(const std::vector<std::string>& identifiers) noexcept;
-    void settle(const std::string& identifier, DeliveryLedger::Outcome outcome, const DeliveryUpdate::Cause& cause);
-
     const std::shared_ptr<UploadServiceType> service_;
-    const std::shared_ptr<DeferredStore<SignedEntity>> deferredStore_;
+    const std::shared_ptr<UploadRows> rows_;
     const std::shared_ptr<UploadDropboxType> dropbox_;
     const std::shared_ptr<DeliveryLedger> ledger_;
 
-    SerialQueue queue_{"com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background};
-    bool retriedIncompleteRequests_ CORVANE_GUARDED_BY(queue_) = false;
-
-    Backlog backlog_;
+    const std::shared_ptr<SerialQueue> queue_ =
+        std::make_shared<SerialQueue>("com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background);
+    const std::shared_ptr<StoredUploads> stored_;
+    bool hasSentStored_ CORVANE_GUARDED_BY(*queue_) = false;
 
     Mutex mutex_;
-    std::shared_ptr<SerialQueue> accessQueue_ CORVANE_GUARDED_BY(mutex_);
     std::set<std::string> unrecorded_ CORVANE_GUARDED_BY(mutex_);  // documents that are under way without a row
 };
 

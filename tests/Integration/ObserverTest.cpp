@@ -132,7 +132,7 @@ TEST_F(Observer, HearsOfWhatEarlierRunsHaveLeft) {
     settled = std::make_shared<RecordingProcessor>();
     auto left = rows();
     std::filesystem::remove(dropbox() / left.at(0).identifier);
-    left.at(1).retries = UploadManager::maximumRetries + 1;
+    left.at(1).retries = StoredUploads::maximumRetries + 1;
     Store<SignedEntity>(StoreLocation::default_("main")).insert(left.at(1));
     Application application(url, 1, "main", recorder());
     application.sessions.processorManager()->add(settled);

@@ -1,0 +1,175 @@
+#include <corvane/Upload/StoredUploads.h>
+
+#include <corvane/Platform/Log.h>
+
+#include <filesystem>
+#include <iterator>
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+// A payload never is; a file that lost its contents would be taken for delivered by a server that accepts anything.
+bool isEmpty(const std::filesystem::path& file) {
+    std::error_code failed;
+    return std::filesystem::file_size(file, failed) == 0 && !failed;
+}
+
+}  // namespace
+
+StoredUploads::StoredUploads(std::shared_ptr<SerialQueue> queue, std::shared_ptr<UploadServiceType> service,
+                             std::shared_ptr<UploadRows> rows, std::shared_ptr<UploadDropboxType> dropbox,
+                             std::shared_ptr<DeliveryLedger> ledger)
+    : queue_(std::move(queue)),
+      service_(std::move(service)),
+      rows_(std::move(rows)),
+      dropbox_(std::move(dropbox)),
+      ledger_(std::move(ledger)) {}
+
+void StoredUploads::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
+    const Lock lock(mutex_);
+    accessQueue_ = std::move(queue);
+}
+
+void StoredUploads::begin() {
+    try {
+        list();
+        sendPortion();
+    } catch (...) {
+        Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", AnyError::current().what());
+    }
+}
+
+// Whoever waits for delivery waits for all of them, so that all are entered here.
+void StoredUploads::list() {
+    auto [stored, isInMemory] = rows_->stored();
+    for (const auto& identifier : stored) ledger_->addEarlier(identifier);
+    backlog_.add(stored);
+    if (isInMemory) return;
+    // Later where it takes long: an ordinary start needs no thread for it.
+    const bool isMuch = stored.size() > Backlog::portion;
+    std::set<std::string> recorded(std::move_iterator(stored.begin()), std::move_iterator(stored.end()));
+    if (!isMuch) return removeOrphans(recorded);
+    queue_->async([weak = weak_from_this(), recorded = std::move(recorded)] {
+        if (const auto self = weak.lock()) self->removeOrphans(recorded);
+    });
+}
+
+void StoredUploads::sendPortion() {
+    const auto identifiers = backlog_.take();
+    std::vector<PreparedUploadRequest> requests;
+    bool isMoreReady = false;
+    for (const auto& identifier : identifiers) {
+        const auto row = storedRow(identifier);
+        auto request = row ? retryRequest(*row) : std::nullopt;
+        if (request) {
+            requests.push_back(*std::move(request));
+        } else {
+            isMoreReady = backlog_.end(identifier);
+        }
+    }
+    for (const auto& request : requests) ledger_->begin(request.identifier);
+    service_->resubmit(std::move(requests));
+    if (isMoreReady) sendPortionLater();
+}
+
+void StoredUploads::end(const std::vector<std::string>& identifiers) {
+    bool isMoreReady = false;
+    for (const auto& identifier : identifiers) isMoreReady = backlog_.end(identifier);
+    if (isMoreReady) sendPortionLater();
+}
+
+// Behind the submissions that wait: results overtake them, so that a backlog that ends quickly would keep them waiting.
+void StoredUploads::sendPortionLater() {
+    const auto retry = [weak = weak_from_this()] {
+        const auto self = weak.lock();
+        if (!self) return;
+        self->queue_->async([weak] {
+            const auto still = weak.lock();
+            if (!still) return;
+            still->queue_->assertCurrent("StoredUploads::sendPortion");
+            still->sendPortion();
+        });
+    };
+    std::shared_ptr<SerialQueue> accessQueue;
+    {
+        const Lock lock(mutex_);
+        accessQueue = accessQueue_;
+    }
+    accessQueue ? accessQueue->async(retry) : retry();
+}
+
+std::optional<SignedEntity> StoredUploads::storedRow(const std::string& identifier) {
+    try {
+        if (auto found = rows_->find(identifier)) return found;
+    } catch (...) {
+        Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", AnyError::current().what());
+    }
+    ledger_->remove(identifier);  // another process's, or nobody's
+    return std::nullopt;
+}
+
+std::optional<PreparedUploadRequest> StoredUploads::retryRequest(const SignedEntity& entity) {
+    if (entity.retries <= maximumRetries) return preparedRequest(entity);
+    dropExceeded(entity);
+    return std::nullopt;
+}
+
+void StoredUploads::dropExceeded(const SignedEntity& entity) {
+    Log::shared().default_("Retry dropped for exceeding allowed attempts, identifier=%{public}@", entity.identifier);
+    try {
+        rows_->remove(entity.identifier);
+        dropbox_->finish(entity.identifier, std::nullopt);
+    } catch (...) {
+        Log::shared().error(
+            "Failed to cleanup request that exceeded allowed attempts, identifier=%{public}@, error=%{public}@",
+            entity.identifier, AnyError::current().what());
+    }
+    giveUp(entity.identifier, DeliveryUpdate::Reason::tooManyAttempts);
+}
+
+std::optional<PreparedUploadRequest> StoredUploads::preparedRequest(const SignedEntity& entity) {
+    auto file = dropbox_->existingFile(entity.identifier);
+    if (file && !isEmpty(*file))
+        return PreparedUploadRequest{entity.identifier, entity.contentType, entity.userAgent, *std::move(file)};
+    Log::shared().default_("Retry dropped for missing upload file, identifier=%{public}@", entity.identifier);
+    try {
+        rows_->remove(entity.identifier);
+        if (file) dropbox_->finish(entity.identifier, std::nullopt);
+    } catch (...) {
+        Log::shared().error(
+            "Failed to cleanup request from db missing upload file, identifier=%{public}@, error=%{public}@",
+            entity.identifier, AnyError::current().what());
+    }
+    giveUp(entity.identifier, DeliveryUpdate::Reason::payloadMissing);
+    return std::nullopt;
+}
+
+void StoredUploads::giveUp(const std::string& identifier, DeliveryUpdate::Reason reason) {
+    ledger_->settle(identifier, DeliveryLedger::Outcome::givenUp, {.reason = reason});
+}
+
+// Rows that are written meanwhile have payloads that are new.
+void StoredUploads::removeOrphans(const std::set<std::string>& recorded) {
+    auto orphans = dropbox_->abandonedPayloads(recorded);
+    if (orphans.empty()) return;
+    service_->inFlight([weak = weak_from_this(), orphans = std::move(orphans)](const std::set<std::string>& inFlight) {
+        if (const auto self = weak.lock()) self->removeOrphans(orphans, inFlight);
+    });
+}
+
+void StoredUploads::removeOrphans(const std::vector<std::string>& orphans, const std::set<std::string>& inFlight) {
+    for (const auto& identifier : orphans) {
+        if (inFlight.contains(identifier) || !dropbox_->existingFile(identifier)) continue;
+        try {
+            dropbox_->finish(identifier, std::nullopt);
+            Log::shared().default_("Payload without a row was removed, identifier=%{public}@", identifier);
+        } catch (...) {
+            Log::shared().error("Failed to remove a payload without a row, identifier=%{public}@, error=%{public}@",
+                                identifier, AnyError::current().what());
+        }
+    }
+}
+
+}  // namespace corvane
