@@ -20,6 +20,7 @@ class Backlog {
     void add(const std::vector<std::string>& identifiers);
     /// The next ones, which are under way from now on. None while a portion or more is.
     [[nodiscard]] std::vector<std::string> take();
+    void clear();
     /// Notes that a document needs no sending (any more). Returns whether there is something to take.
     bool end(const std::string& identifier);
 

@@ -80,6 +80,10 @@ void StoredUploads::end(const std::vector<std::string>& identifiers) {
     if (isMoreReady) sendPortionLater();
 }
 
+void StoredUploads::forget() {
+    backlog_.clear();
+}
+
 // Behind the submissions that wait: results overtake them, so that a backlog that ends quickly would keep them waiting.
 void StoredUploads::sendPortionLater() {
     const auto retry = [weak = weak_from_this()] {
@@ -119,7 +123,7 @@ std::optional<PreparedUploadRequest> StoredUploads::retryRequest(const SignedEnt
 void StoredUploads::dropExceeded(const SignedEntity& entity) {
     Log::shared().default_("Retry dropped for exceeding allowed attempts, identifier=%{public}@", entity.identifier);
     try {
-        rows_->remove(entity.identifier);
+        rows_->end({entity.identifier, LedgerEntry::givenUpAttempts});
         dropbox_->finish(entity.identifier, std::nullopt);
     } catch (...) {
         Log::shared().error(
@@ -135,7 +139,7 @@ std::optional<PreparedUploadRequest> StoredUploads::preparedRequest(const Signed
         return PreparedUploadRequest{entity.identifier, entity.contentType, entity.userAgent, *std::move(file)};
     Log::shared().default_("Retry dropped for missing upload file, identifier=%{public}@", entity.identifier);
     try {
-        rows_->remove(entity.identifier);
+        rows_->end({entity.identifier, LedgerEntry::givenUpPayloadMissing});
         if (file) dropbox_->finish(entity.identifier, std::nullopt);
     } catch (...) {
         Log::shared().error(

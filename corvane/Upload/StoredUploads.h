@@ -37,6 +37,8 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     void begin() CORVANE_REQUIRES(*queue_);
     /// Uploads have ended here or elsewhere, of whichever run: the next portion may be due. Any thread.
     void end(const std::vector<std::string>& identifiers);
+    /// Sends nothing more of what was listed. Any thread.
+    void forget();
 
   private:
     void list() CORVANE_REQUIRES(*queue_);
