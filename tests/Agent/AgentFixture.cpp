@@ -4,19 +4,7 @@
 #include <signal.h>
 #include <unistd.h>
 
-#include <future>
-#include <thread>
-
 namespace corvane::test {
-
-bool eventually(const std::function<bool()>& condition, std::chrono::milliseconds time) {
-    const auto deadline = std::chrono::steady_clock::now() + time;
-    while (!condition()) {
-        if (std::chrono::steady_clock::now() >= deadline) return false;
-        std::this_thread::sleep_for(2ms);
-    }
-    return true;
-}
 
 std::map<std::string, int> bodies(const ScriptedServer& server) {
     std::map<std::string, int> counts;

@@ -18,7 +18,7 @@ class AgentLinkTest : public testing::Test, public AgentLink::Listener {
   protected:
     void agentIsReady() override { heard += "ready "; }
     void agentSaid(const agent::Reply& reply) override { heard += agent::encode(reply)[0]; }
-    void agentFailed() override { heard += "failed "; }
+    void agentFailed(const std::string&) override { heard += "failed "; }
     void processEnds() override {}
     void onThread() const CORVANE_ASSERT_CAPABILITY(agentThread) {}
 

@@ -320,6 +320,45 @@ TEST_F(InProcessTransferSessionTest, SignalsAWakeUpOnceAndBehindWhatIsPending) {
     EXPECT_EQ(recorder->completedAtSignal, (std::vector<std::size_t>{0, 1}));
 }
 
+TEST_F(InProcessTransferSessionTest, ACancelledTaskStopsWhereverItIsAndCompletesOnce) {
+    constexpr std::size_t whole = 1'000'000;
+    body(std::string(whole, 'b'));
+    Reply slow = Reply::status(200).hold();
+    slow.bodyLimit = 10;
+    for (const auto& reply : {Reply::status(200), slow, Reply::never()}) server.script(reply);
+    std::promise<void> release;
+    queue->async([gate = release.get_future().share()] { gate.wait(); });
+    auto session = open({.transfersPerHost = 2});
+    const auto over = start(*session, server.url());
+    ASSERT_TRUE(server.waitForRequests(1));
+    const auto sending = start(*session, server.url());
+    ASSERT_TRUE(server.waitForRequests(2));
+    const auto unanswered = start(*session, server.url());
+    ASSERT_TRUE(server.waitForRequests(3)) << "the first is over, and its completion waits";
+    const auto queued = start(*session, server.url());
+    const auto idle = session->uploadTask({.url = server.url(), .method = "PUT", .headers = {}}, body());
+    for (const auto& task : {over, sending, unanswered, queued, idle}) {
+        task->cancel();
+        task->cancel();
+        EXPECT_EQ(task->state(), State::cancelling);
+    }
+    idle->resume();
+    EXPECT_EQ(recorder->completed(), 0u) << "no callback inside the call";
+    release.set_value();
+    for (const auto& task : {over, sending, unanswered, queued, idle}) {
+        const auto completion = recorder->wait(*task);
+        EXPECT_EQ(describe(completion), task == over ? "200" : "cancelled") << task->identifier();
+        EXPECT_EQ(completion.state, State::cancelling);
+    }
+    queue->sync([] {});
+    idle->cancel();
+    EXPECT_EQ(idle->state(), State::completed);
+    server.release();  // it reads what there is
+    EXPECT_TRUE(test::eventually([&] { return server.requests().at(1).body.size() > 10; }));
+    EXPECT_LT(server.requests().at(1).body.size(), whole) << "nor does the system send what it was given";
+    EXPECT_EQ(server.requests().size(), 3u);
+}
+
 TEST_F(InProcessTransferSessionTest, CancelsItsTransfersWhenItGoes) {
     server.script(Reply::never(), 4);
     auto session = open();
