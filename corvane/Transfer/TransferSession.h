@@ -77,8 +77,9 @@ class CORVANE_EXPORT TransferSessionDelegate {
     virtual void taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                                  const std::optional<TransferResponse>& response) = 0;
 
-    /// A task is over, and the session of another process, of the same owner, was told by `taskDidComplete`: nothing is
-    /// left to do for it here. Sessions outside the process only. Does nothing by default.
+    /// A task is over, and the session of another process, of the same owner, was told by `taskDidComplete`, or what it
+    /// sent was discarded: nothing is left to do for it here. Sessions outside the process only. Does nothing by
+    /// default.
     /// @param error also when how the task ended is not known here, because that process has taken it over.
     virtual void taskDidEndElsewhere(const TransferTask& /*task*/, const std::optional<AnyError>& /*error*/,
                                      const std::optional<TransferResponse>& /*response*/) {}

@@ -77,6 +77,14 @@ TEST(FakeTransfers, EndAsTheyWereScripted) {
     EXPECT_EQ(report.delivered.documents, 1u);
     EXPECT_EQ(report.givenUp.documents, 1u);
     EXPECT_EQ(report.pending.documents, 1u);
+
+    transfers->scriptCancel(std::nullopt);
+    const auto task = transfers->uploadTask({}, "none");
+    task->cancel();
+    EXPECT_TRUE(transfers->made().back()->wasCancelled() && !transfers->task(1)->wasCancelled());
+    EXPECT_EQ(task->state(), TransferTask::State::cancelling);
+    transfers->complete(task->identifier(), 200);
+    EXPECT_TRUE(eventually([&] { return task->state() == TransferTask::State::completed; }));
 }
 
 }  // namespace

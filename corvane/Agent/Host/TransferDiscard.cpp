@@ -32,20 +32,16 @@ Known& known() {
     return instance;
 }
 
-// The agents' directories. That of the documents directory may be another process's alone.
-Deadlines directories() {
-    Deadlines all;
-    {
-        Lock lock(known().mutex);
-        all = known().deadlines;
-    }
-    callHost("documents directory", [&] {
-        const auto usual = DocumentsDirectory::path() / AgentDirectory::usualName;
-        if (std::filesystem::is_directory(usual)) {
-            all.try_emplace(std::filesystem::canonical(usual), TransferAgentOptions().deadline);
-        }
-    });
-    return all;
+Deadlines used() {
+    Lock lock(known().mutex);
+    return known().deadlines;
+}
+
+// The agent of the documents directory may be another process's alone.
+void addUsual(Deadlines& all) {
+    std::error_code missing;
+    const auto usual = std::filesystem::canonical(DocumentsDirectory::path() / AgentDirectory::usualName, missing);
+    if (!missing) all.try_emplace(usual, TransferAgentOptions().deadline);
 }
 
 // One call for all agents: tells what they made of it when the last of them has let go.
@@ -63,7 +59,6 @@ class Round {
         result_.dropped += one.dropped;
         if (!one.problem.empty()) result_.problem = one.problem;
     }
-    void fail(const std::string& why) { note({Status::failed, 0, why}); }
 
   private:
     const std::function<void(DiscardResult)> done_;
@@ -125,13 +120,21 @@ void TransferDiscard::start(std::filesystem::path bodiesBeneath, std::function<v
     AgentThread::shared().post([beneath = std::filesystem::absolute(bodiesBeneath).string(), done = std::move(done)] {
         agentThread.assertCurrent("TransferDiscard");
         const auto round = std::make_shared<Round>(done);
-        for (const auto& [directory, deadline] : directories()) {
+        const auto tryTo = [&](const auto& work) {
             try {
-                if (!std::filesystem::is_directory(directory)) continue;
-                std::make_shared<Question>(beneath, round)->ask(AgentDirectory(directory), deadline);
+                work();
             } catch (const std::exception& error) {
-                round->fail(error.what());
+                round->note({Status::failed, 0, error.what()});
             }
+        };
+        auto all = used();
+        tryTo([&] { addUsual(all); });
+        for (const auto& [directory, deadline] : all) {
+            tryTo([&] {
+                agentThread.assertCurrent("TransferDiscard");
+                if (!std::filesystem::is_directory(directory)) return;
+                std::make_shared<Question>(beneath, round)->ask(AgentDirectory(directory), deadline);
+            });
         }
     });
 }
