@@ -61,9 +61,9 @@ std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<Sessio
 }
 
 std::shared_ptr<TransferTask> AgentFixture::upload(TransferSession& session, const std::string& url,
-                                                   const std::string& description) {
+                                                   const std::string& description, const std::string& contents) {
     auto task = session.uploadTask({.url = url, .method = "PUT", .headers = {{"X-Task", description}}},
-                                   body("body " + description, description));
+                                   body("body " + description, contents.empty() ? description : contents));
     task->setDescription(description);
     task->resume();
     return task;

@@ -67,7 +67,7 @@ class AgentFixture : public ::testing::Test {
     std::shared_ptr<TransferSession> open(const std::shared_ptr<SessionRecorder>& recorder,
                                           TransferSessionConfiguration configuration);
     std::shared_ptr<TransferTask> upload(TransferSession& session, const std::string& url,
-                                         const std::string& description);
+                                         const std::string& description, const std::string& contents = {});
     /// Descriptions of the running tasks.
     [[nodiscard]] static std::vector<std::string> running(TransferSession& session);
     std::filesystem::path body(const std::string& name, const std::string& contents = "the body");

@@ -1,16 +1,12 @@
 #include <corvane/Agent/Host/AgentLink.h>
-#include <corvane/Testing/CapturedLog.h>
+
+#include "tests/support/Testing.h"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <sys/socket.h>
-
-#include <cerrno>
 
 namespace corvane::test {
 namespace {
-
-using namespace std::chrono_literals;
 
 // A link whose agent is the test: at the other end of a socket pair, and of the pipe of a program that is started. The
 // test's thread stands in for the agent's, and the time is what the test says.
