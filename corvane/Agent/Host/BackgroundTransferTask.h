@@ -59,8 +59,9 @@ class BackgroundTransferTask final : public SessionTask, public std::enable_shar
     [[nodiscard]] const std::filesystem::path& bodyPath() const { return bodyPath_; }
     [[nodiscard]] bool isOfThisRun() const { return isOfThisRun_; }
 
-    /// Whether it is to stop. It goes its way to its end all the same: from `inside` as what runs there does; otherwise
-    /// with the agent's word that it has no such task any more, after the mark that takes it back was made.
+    /// Whether it is to stop. It goes its way to its end all the same: from `inside` as what runs there does; with the
+    /// agent's word that it has no such task any more, after the mark that takes it back was made; at once when it was
+    /// never resumed, or when there is no agent to be had.
     [[nodiscard]] bool isCancelled() const { return isCancelled_; }
 
     [[nodiscard]] Stage stage() const { return stage_; }
