@@ -8,10 +8,14 @@
 namespace corvane {
 
 UploadBatchEventConfig::UploadBatchEventConfig(int batchSize, bool batchDebugging)
-    : UploadBatchEventConfig(UploadBatchEventOptions{batchSize, batchDebugging}) {}
+    : UploadBatchEventConfig(UploadBatchEventOptions{.batchSize = batchSize, .batchDebugging = batchDebugging}) {}
 
 UploadBatchEventConfig::UploadBatchEventConfig(const UploadBatchEventOptions& options) : options_(options) {
     if (options.batchSize < 1) throw InvalidArgument("the batch size must be at least 1");
+    if (options.maximumBytesOnDisk < 1) throw InvalidArgument("the maximum of bytes on disk must be at least 1");
+    if (options.maximumAge && options.maximumAge->count() < 1) {
+        throw InvalidArgument("the maximum age must be at least 1 millisecond");
+    }
 }
 
 const UploadBatchEventConfig& UploadBatchEventConfig::default_() {

@@ -10,8 +10,10 @@
 
 #include <chrono>
 #include <cstddef>
+#include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace corvane {
@@ -22,6 +24,15 @@ class UploadBatches;
 struct UploadBatchEventOptions {
     int batchSize = 50;           ///< how many events of a session make a document that is sent; at least 1
     bool batchDebugging = false;  ///< whether readable copies of documents and responses are kept beside the payloads
+
+    /// How many bytes the endpoint may have on disk, in payloads and in the text of open batches; SQLite's files do not
+    /// shrink, and are not counted. When there are more, the oldest documents are given up, each under `givenUp.size`
+    /// in the ledger; open batches never are, and a document that is under way is withdrawn first, and may get through
+    /// yet. At least 1. What other processes store counts as of the first session's start.
+    std::int64_t maximumBytesOnDisk = std::int64_t{1} << 30;
+    /// How old a stored document may get, in milliseconds since it was handed over, by the wall clock; at least 1. An
+    /// older one is given up, as above, when the first session begins or another document is stored. Nothing: any age.
+    std::optional<std::chrono::milliseconds> maximumAge = std::nullopt;
 };
 
 /// How the batching processor batches. A value.

@@ -57,7 +57,8 @@ std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint
     auto manager =
         UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
                               std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
-                              std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()), ledger, book);
+                              std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()), ledger, book,
+                              {config.options().maximumBytesOnDisk, config.options().maximumAge});
     return std::make_shared<UploadBatches>(
         std::move(client), std::move(manager), std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name()),
         config, std::move(ledger), std::move(book), std::make_shared<const EndpointUse>(endpoint));
@@ -489,7 +490,6 @@ bool UploadBatches::isOpen(const std::string& identifier) {
 
 void UploadBatches::readStored() {
     try {
-
         auto sizes = deferredStore_->perform([](Rows& rows) { return UploadBatchEntity::sizes(*rows.connection()); });
         Ledger::Count count;
         std::int64_t bytes = 0;

@@ -36,6 +36,11 @@ std::int64_t LedgerBook::bytesOnDisk() const {
     return stored_.waitingBytes + openBytesOfOthers_ + batches_.openBytes;
 }
 
+std::int64_t LedgerBook::waitingBytes() const {
+    const Lock lock(mutex_);
+    return stored_.waitingBytes;
+}
+
 void LedgerBook::setBatches(const Batches& batches) {
     const Lock lock(mutex_);
     batches_ = batches;

@@ -37,6 +37,8 @@ class LedgerBook {
     void setBatches(const Batches& batches);
     /// What is on disk now, but for batches.
     void setStored(const Changes& stored);
+    /// Of payloads alone.
+    [[nodiscard]] std::int64_t waitingBytes() const;
     /// How much the bytes that wait differ from what was counted.
     void correctWaitingBytes(std::int64_t difference);
     /// What there is in batches of earlier runs and other processes, and what has come to it or, negative, gone.

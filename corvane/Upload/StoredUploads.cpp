@@ -20,12 +20,13 @@ bool isEmpty(const std::filesystem::path& file) {
 
 StoredUploads::StoredUploads(std::shared_ptr<SerialQueue> queue, std::shared_ptr<UploadServiceType> service,
                              std::shared_ptr<UploadRows> rows, std::shared_ptr<UploadDropboxType> dropbox,
-                             std::shared_ptr<DeliveryLedger> ledger)
+                             std::shared_ptr<DeliveryLedger> ledger, std::shared_ptr<StorageBounds> bounds)
     : queue_(std::move(queue)),
       service_(std::move(service)),
       rows_(std::move(rows)),
       dropbox_(std::move(dropbox)),
-      ledger_(std::move(ledger)) {}
+      ledger_(std::move(ledger)),
+      bounds_(std::move(bounds)) {}
 
 void StoredUploads::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
     const Lock lock(mutex_);
@@ -35,6 +36,7 @@ void StoredUploads::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
 void StoredUploads::begin() {
     try {
         list();
+        bounds_->begin();  // what is given up is not sent before
         sendPortion();
     } catch (...) {
         Log::shared().error("Failed to requeue cancelled requests, error=%{public}@", AnyError::current().what());
@@ -61,7 +63,7 @@ void StoredUploads::sendPortion() {
     std::vector<PreparedUploadRequest> requests;
     bool isMoreReady = false;
     for (const auto& identifier : identifiers) {
-        const auto row = storedRow(identifier);
+        const auto row = bounds_->isWithdrawn(identifier) ? std::nullopt : storedRow(identifier);
         auto request = row ? retryRequest(*row) : std::nullopt;
         if (request) {
             requests.push_back(*std::move(request));

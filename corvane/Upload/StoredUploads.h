@@ -6,6 +6,7 @@
 #include <corvane/Upload/DeliveryLedger.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
 #include <corvane/Upload/SignedEntity.h>
+#include <corvane/Upload/StorageBounds.h>
 #include <corvane/Upload/UploadDropboxType.h>
 #include <corvane/Upload/UploadRows.h>
 #include <corvane/Upload/UploadServiceType.h>
@@ -29,7 +30,7 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     /// The parts of the manager.
     StoredUploads(std::shared_ptr<SerialQueue> queue, std::shared_ptr<UploadServiceType> service,
                   std::shared_ptr<UploadRows> rows, std::shared_ptr<UploadDropboxType> dropbox,
-                  std::shared_ptr<DeliveryLedger> ledger);
+                  std::shared_ptr<DeliveryLedger> ledger, std::shared_ptr<StorageBounds> bounds);
 
     /// The queue of the submissions, which a next portion must not overtake. Any thread.
     void registerAccessQueue(std::shared_ptr<SerialQueue> queue);
@@ -66,6 +67,7 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     const std::shared_ptr<UploadRows> rows_;
     const std::shared_ptr<UploadDropboxType> dropbox_;
     const std::shared_ptr<DeliveryLedger> ledger_;
+    const std::shared_ptr<StorageBounds> bounds_;
 
     Backlog backlog_;
 

@@ -57,6 +57,7 @@ class UploadDropbox final : public UploadDropboxType {
     void finish(std::string_view identifier, const std::optional<UploadResponse>& response) override;
     /// Of names that are UUIDs, as those of the library's own documents are: anything else may be somebody else's file.
     [[nodiscard]] std::vector<std::string> abandonedPayloads(const std::set<std::string>& recorded) override;
+    [[nodiscard]] std::filesystem::path payloadDirectory() override { return baseURL(); }
     /// A name that cannot be a payload's has no file.
     [[nodiscard]] std::optional<std::filesystem::path> existingFile(std::string_view identifier) override;
 

@@ -33,6 +33,9 @@ class UploadDropboxType {
         return {};
     }
 
+    /// Where the payloads are, whether it exists or not; empty where they are in no directory, as here.
+    [[nodiscard]] virtual std::filesystem::path payloadDirectory() { return {}; }
+
     /// The payload file of an upload, if there is one.
     [[nodiscard]] virtual std::optional<std::filesystem::path> existingFile(std::string_view identifier) = 0;
 };

@@ -43,11 +43,11 @@ std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServi
                                                      std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                                                      std::shared_ptr<UploadDropboxType> dropbox,
                                                      std::shared_ptr<DeliveryLedger> ledger,
-                                                     std::shared_ptr<LedgerBook> book) {
+                                                     std::shared_ptr<LedgerBook> book, const StorageLimits& limits) {
     if (!ledger) ledger = std::make_shared<DeliveryLedger>();
     if (!book) book = std::make_shared<LedgerBook>();
-    std::shared_ptr<UploadManager> manager(new UploadManager(std::move(service), std::move(deferredStore),
-                                                             std::move(dropbox), std::move(ledger), std::move(book)));
+    std::shared_ptr<UploadManager> manager(new UploadManager(
+        std::move(service), std::move(deferredStore), std::move(dropbox), std::move(ledger), std::move(book), limits));
     manager->service_->setDelegate(manager);
     return manager;
 }
@@ -55,12 +55,13 @@ std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServi
 UploadManager::UploadManager(std::shared_ptr<UploadServiceType> service,
                              std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                              std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger,
-                             std::shared_ptr<LedgerBook> book)
+                             std::shared_ptr<LedgerBook> book, const StorageLimits& limits)
     : service_(std::move(service)),
-      rows_(std::make_shared<UploadRows>(std::move(deferredStore), std::move(book))),
+      rows_(std::make_shared<UploadRows>(std::move(deferredStore), book)),
       dropbox_(std::move(dropbox)),
       ledger_(std::move(ledger)),
-      stored_(std::make_shared<StoredUploads>(queue_, service_, rows_, dropbox_, ledger_)) {}
+      bounds_(std::make_shared<StorageBounds>(limits, queue_, service_, rows_, dropbox_, ledger_, std::move(book))),
+      stored_(std::make_shared<StoredUploads>(queue_, service_, rows_, dropbox_, ledger_, bounds_)) {}
 
 UploadManager::~UploadManager() = default;
 
@@ -128,6 +129,7 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     }
     service_->submit(prepared(entity, std::move(file)));
     ledger_->begin(entity.identifier);
+    bounds_->keep();
     return taken;
 }
 
@@ -181,6 +183,7 @@ void UploadManager::didFinish(const UploadResult& result, const std::optional<An
     const auto& identifier = result.identifier();
     const auto* success = std::get_if<UploadResult::Success>(&result.value);
     forgetUnrecorded(identifier);
+    bounds_->end(identifier);
     auto problem = rowProblem;
     try {
         const auto& response = success ? success->response : std::get<UploadResult::Failed>(result.value).response;
@@ -200,6 +203,7 @@ void UploadManager::didFinish(const UploadResult& result, const std::optional<An
 // were kept.
 void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
     const bool wasUnrecorded = forgetUnrecorded(retry.identifier);
+    if (const auto reason = bounds_->takeReason(retry.identifier)) return bounds_->giveUp(retry.identifier, *reason);
     bool goesOutAgain = true;
     try {
         goesOutAgain = rows_->countRetry(retry) || wasUnrecorded;
@@ -220,6 +224,7 @@ bool UploadManager::forgetUnrecorded(const std::string& identifier) {
 void UploadManager::uploadEndedElsewhere(const UploadResult& result) {
     const auto& identifier = result.identifier();
     forgetUnrecorded(identifier);
+    bounds_->end(identifier);
     stored_->end({identifier});
     const auto cause = result.cause();
     if (std::holds_alternative<UploadResult::Success>(result.value)) {

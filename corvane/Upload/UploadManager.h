@@ -5,6 +5,7 @@
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Upload/DeliveryLedger.h>
 #include <corvane/Upload/SignedEntity.h>
+#include <corvane/Upload/StorageBounds.h>
 #include <corvane/Upload/StoredUploads.h>
 #include <corvane/Upload/UploadDropboxType.h>
 #include <corvane/Upload/UploadManagerType.h>
@@ -40,12 +41,12 @@ class UploadManager final : public UploadManagerType,
                             public UploadServiceDelegate,
                             public std::enable_shared_from_this<UploadManager> {
   public:
-    /// Makes a manager and sets it as the service's delegate. No argument but the last two may be empty; it
-    /// then has such a one of its own.
+    /// Makes a manager and sets it as the service's delegate. Of the arguments, `ledger` and `book` may be
+    /// empty; it then has such a one of its own.
     [[nodiscard]] static std::shared_ptr<UploadManager> create(
         std::shared_ptr<UploadServiceType> service, std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
         std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger = nullptr,
-        std::shared_ptr<LedgerBook> book = nullptr);
+        std::shared_ptr<LedgerBook> book = nullptr, const StorageLimits& limits = {});
     ~UploadManager() override;
 
     /// Opens the store, creates the table, and the first time sends again what is stored. Requires: not on the
@@ -74,7 +75,7 @@ class UploadManager final : public UploadManagerType,
     UploadManager(std::shared_ptr<UploadServiceType> service,
                   std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                   std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger,
-                  std::shared_ptr<LedgerBook> book);
+                  std::shared_ptr<LedgerBook> book, const StorageLimits& limits);
 
     UploadTaken uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(*queue_);
     /// Writes the document's row, and has its backup removed, both or neither.
@@ -94,6 +95,7 @@ class UploadManager final : public UploadManagerType,
 
     const std::shared_ptr<SerialQueue> queue_ =
         std::make_shared<SerialQueue>("com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background);
+    const std::shared_ptr<StorageBounds> bounds_;
     const std::shared_ptr<StoredUploads> stored_;
     bool hasSentStored_ CORVANE_GUARDED_BY(*queue_) = false;
 

@@ -108,6 +108,22 @@ std::optional<SignedEntity> UploadRows::find(const std::string& identifier) {
     return found.empty() ? std::nullopt : std::optional(std::move(found.front()));
 }
 
+std::vector<UploadRows::Oldest> UploadRows::oldest(std::size_t count) {
+    std::vector<Oldest> oldest;
+    deferredStore_->perform([&](Rows& rows) {
+        const std::string sql =
+            "SELECT identifier, bytes, createdDate FROM documents JOIN signed_requests USING (identifier) ORDER BY "
+            "documents.rowid LIMIT " +
+            std::to_string(count) + ";";
+        rows.connection()->query(sql, [&](StoreStepper& stepper) {
+            Oldest one{.identifier = stepper.text(), .bytes = stepper.integer(), .created = now()};
+            one.created = dateFromSeconds(stepper.double_()).value_or(one.created);
+            oldest.push_back(std::move(one));
+        });
+    });
+    return oldest;
+}
+
 bool UploadRows::countRetry(const UploadResult::Retry& retry) {
     bool isThere = false;
     change([&](Rows& rows, Changes& changes) {

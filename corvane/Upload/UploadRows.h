@@ -7,6 +7,7 @@
 #include <corvane/Upload/SignedEntity.h>
 #include <corvane/Upload/UploadResult.h>
 
+#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -45,6 +46,13 @@ class UploadRows {
     /// What is stored, once the books are in line with what releases that keep none have done.
     [[nodiscard]] Stored stored();
     [[nodiscard]] std::optional<SignedEntity> find(const std::string& identifier);
+    struct Oldest {
+        std::string identifier;
+        std::int64_t bytes = 0;
+        Date created;
+    };
+    /// So many of the documents that were handed over first, in that order.
+    [[nodiscard]] std::vector<Oldest> oldest(std::size_t count);
     /// Counts a retry in the upload's row. Returns false when there is no row.
     bool countRetry(const UploadResult::Retry& retry);
     void end(const Ending& ending);

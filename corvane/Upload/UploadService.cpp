@@ -244,6 +244,19 @@ void UploadService::cancelAll() {
     }
 }
 
+void UploadService::cancel(std::set<std::string> identifiers,
+                           std::function<void(const std::set<std::string>&)> answer) {
+    const auto opened = session();
+    if (!opened) return;
+    opened->tasks([identifiers = std::move(identifiers), answer = std::move(answer)](const auto& tasks) mutable {
+        for (const auto& task : tasks) {
+            const auto identifier = task->description();
+            if (identifier && identifiers.erase(*identifier) > 0) task->cancel();
+        }
+        answer(identifiers);
+    });
+}
+
 void UploadService::startMissing(const std::vector<PreparedUploadRequest>& requests,
                                  const std::vector<std::shared_ptr<TransferTask>>& tasks) {
     const auto inFlight = identifiersOfRunning(tasks);

@@ -44,6 +44,11 @@ class UploadServiceType {
     /// them; they end as a retry, later. Returns before that is done. A service that cannot does nothing, as here.
     virtual void cancelAll() {}
 
+    /// Cancels those of `identifiers` that are running, which end as a retry or as they would have, and tells, later
+    /// and on the registered queue, which were not. A service that cannot never answers, which is what happens here.
+    virtual void cancel(std::set<std::string> /*identifiers*/,
+                        std::function<void(const std::set<std::string>& notRunning)> /*answer*/) {}
+
     /// Whether `identifier` names this service's transfer session. If so, `completion` is kept and called once, on the
     /// main queue, when all events of the session have been delivered; otherwise it is dropped. Callable from any
     /// thread.

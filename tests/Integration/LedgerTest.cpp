@@ -50,9 +50,10 @@ class Books : public ::testing::Test, protected FaultFixture {
   protected:
     Books() { settings.setTransfers(FakeTransferSession::factory(session)); }
 
-    std::unique_ptr<Application> start(int batchSize) {
+    std::unique_ptr<Application> start(int batchSize) { return start({.batchSize = batchSize}); }
+    std::unique_ptr<Application> start(const UploadBatchEventOptions& options) {
         settled = std::make_shared<RecordingProcessor>();
-        auto application = std::make_unique<Application>("https://collector.example.com/in", batchSize);
+        auto application = std::make_unique<Application>("https://collector.example.com/in", options);
         application->sessions.processorManager()->add(settled);
         settled->settle();
         return application;
@@ -225,6 +226,49 @@ TEST_F(Books, ForgetIsObeyedByOthersAndFinishedByTheNext) {
     DeferredStoreCore::queue().sync([] {});
     EXPECT_EQ(rows().size() + payloads().size(), 0u);
     EXPECT_EQ(ledger(*application), "forgotten 7/3");
+}
+
+TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) {
+    settings.setTransfers([this, open = FakeTransferSession::factory(session)](auto... arguments) {
+        auto opened = open(std::move(arguments)...);
+        session->scriptCancel(std::nullopt);
+        return opened;
+    });
+    auto application = start({.batchSize = 2, .maximumBytesOnDisk = 1});
+    application->sessions.tracker()->chain("menu")->enterGroup("menu");
+    application->submit(4);
+    EXPECT_EQ(ledger(*application), "waiting 4/2") << "both are being withdrawn";
+    EXPECT_EQ(log.count("More is stored than is allowed"), 1);
+    session->complete(1, 200);  // it gets through all the same
+    session->complete(2, FakeTransferSession::Outcome::failure(TransferError::Code::cancelled));
+    EXPECT_EQ(ledger(*application), "delivered 2/1, size 2/1");
+    EXPECT_EQ(payloads().size() + rows().size(), 0u);
+    application->submit(2);
+    settled->settle();
+    session->complete(3, 503);
+    EXPECT_EQ(ledger(*application), "delivered 2/1, size 4/2") << "nothing is sent again";
+    EXPECT_EQ(application->wait(), (DeliveryReport{{2, 1}, {}, {4, 2}}));
+    EXPECT_EQ(log.count("More is stored than is allowed"), 2) << "once for each time";
+    application->abandon();
+
+    // What is counted is compared with what is there; a start gives up what is too old before it was sent again.
+    application = start(1);
+    application->submit(3);
+    settled->settle();
+    for (const int task : {1, 2, 3}) session->complete(task, 503);
+    application->abandon();
+    auto old = rows().at(0);
+    old.createdDate -= std::chrono::hours(2);
+    Store<SignedEntity>(StoreLocation::default_("main")).insert(old);
+    std::filesystem::resize_file(dropbox() / rows().at(0).identifier, 100'000);
+    application = start({.batchSize = 2, .maximumBytesOnDisk = 90'000, .maximumAge = std::chrono::hours(1)});
+    settled->settle();
+    ASSERT_TRUE(session->waitForTasks(1));
+    EXPECT_EQ(ledger(*application), "waiting 1/1, delivered 2/1, size 5/3, age 1/1, again 3/3");
+    for (const UploadBatchEventOptions& bad :
+         {UploadBatchEventOptions{.maximumBytesOnDisk = 0}, {.maximumAge = std::chrono::milliseconds(0)}}) {
+        EXPECT_THROW(UploadBatchEventConfig{bad}, InvalidArgument);
+    }
 }
 
 }  // namespace
