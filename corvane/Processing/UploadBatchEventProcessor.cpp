@@ -8,10 +8,14 @@
 namespace corvane {
 
 UploadBatchEventConfig::UploadBatchEventConfig(int batchSize, bool batchDebugging)
-    : UploadBatchEventConfig(UploadBatchEventOptions{batchSize, batchDebugging}) {}
+    : UploadBatchEventConfig(UploadBatchEventOptions{.batchSize = batchSize, .batchDebugging = batchDebugging}) {}
 
 UploadBatchEventConfig::UploadBatchEventConfig(const UploadBatchEventOptions& options) : options_(options) {
     if (options.batchSize < 1) throw InvalidArgument("the batch size must be at least 1");
+    if (options.maximumDelay && *options.maximumDelay < std::chrono::milliseconds(1))
+        throw InvalidArgument("the maximum delay must be at least 1 ms");
+    if (options.retryDelay && *options.retryDelay < std::chrono::milliseconds(1))
+        throw InvalidArgument("the retry delay must be at least 1 ms");
 }
 
 const UploadBatchEventConfig& UploadBatchEventConfig::default_() {

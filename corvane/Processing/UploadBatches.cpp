@@ -50,10 +50,10 @@ UploadBatches::UploadBatches(Client client, std::shared_ptr<UploadManagerType> u
 std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint& endpoint,
                                                    const UploadBatchEventConfig& config) {
     auto ledger = std::make_shared<DeliveryLedger>();
-    auto manager =
-        UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
-                              std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
-                              std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()), ledger);
+    auto manager = UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
+                                         std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
+                                         std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()),
+                                         ledger, config.options().retryDelay);
     return std::make_shared<UploadBatches>(std::move(client), std::move(manager),
                                            std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name()), config,
                                            std::move(ledger), std::make_shared<const EndpointUse>(endpoint));
@@ -79,9 +79,12 @@ void UploadBatches::flush() {
     if (!queue || born_.isInChild()) return;
     queue->async([self = shared_from_this()] {
         self->assertOnQueue("UploadBatchEventProcessor::flush");
-        if (self->currentSession_)
-            self->handOver(UploadBatchQueueKey::session(self->currentSession_->identifier), true);
+        self->handOverSession();
     });
+}
+
+void UploadBatches::handOverSession() {
+    if (currentSession_) handOver(UploadBatchQueueKey::session(currentSession_->identifier), true);
 }
 
 std::shared_ptr<SerialQueue> UploadBatches::registeredQueue() const {
@@ -116,10 +119,25 @@ void UploadBatches::process(const ProcessEvent& processEvent) {
     try {
         const UploadBatchQueueKey key = keyOf(processEvent);
         add(key, processEvent.payload());
-        if (!key.isGroup()) handOver(key, false);
+        if (!key.isGroup()) {
+            handOver(key, false);
+            limitDelay();
+        }
     } catch (...) {
         Log::shared().error("Failed to process event for batching, error=%{public}@", AnyError::current().what());
     }
+}
+
+void UploadBatches::limitDelay() {
+    const auto& delay = config_.options().maximumDelay;
+    if (!delay || delayTimer_.isSet() || !currentSession_) return;
+    if (!batchQueues_.contains(UploadBatchQueueKey::session(currentSession_->identifier))) return;
+    delayTimer_ = Timer::after(*accessQueue_, *delay, [weak = weak_from_this()] {
+        const auto self = weak.lock();
+        if (!self) return;
+        self->assertOnQueue("UploadBatchEventProcessor::handOverSession");
+        self->handOverSession();
+    });
 }
 
 void UploadBatches::add(const UploadBatchQueueKey& key, const JSON& payload) {
@@ -209,6 +227,7 @@ void UploadBatches::handOver(const UploadBatchQueueKey& key, bool force) {
     if (found->second.count() < config_.batchSize() && !force) return;
     // A manager of the host's may submit events from inside its call: they go into a batch of their own.
     auto handedOver = batchQueues_.extract(found);
+    if (!key.isGroup()) delayTimer_.cancel();
     try {
         tryHandOver(handedOver.mapped());
     } catch (...) {
@@ -249,6 +268,7 @@ void UploadBatches::putBack(Queues::node_type refused) {
     auto back = batchQueues_.insert(std::move(refused));
     if (!back.inserted) back.position->second.prepend(std::move(back.node.mapped()));
     writeAtEndOfRun();
+    limitDelay();  // it is tried again then, if no event tries before
 }
 
 void UploadBatches::didLeaveGroup(const Group& group) {
@@ -271,6 +291,7 @@ void UploadBatches::didStartSession(const Session& session) {
         Log::shared().error("Failed to open handle to the store, error=%{public}@", AnyError::current().what());
     }
     uploadManager_->open();
+    delayTimer_.cancel();
     setSession(session);
     // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
     // rest.
@@ -346,7 +367,7 @@ void UploadBatches::takeOut(const std::string& identifier, const DocumentHandOve
 
 void UploadBatches::didUpdateSession(const Session& session, bool submitQueues) {
     assertOnQueue("UploadBatchEventProcessor::didUpdateSession");
-    if (currentSession_ && submitQueues) handOver(UploadBatchQueueKey::session(currentSession_->identifier), true);
+    if (submitQueues) handOverSession();
     setSession(session);
 }
 
@@ -367,6 +388,7 @@ void UploadBatches::didEndSession() {
     for (const auto& [key, queue] : batchQueues_) keys.push_back(key);
     for (const auto& key : keys) handOver(key, true);
     currentSession_.reset();
+    delayTimer_.cancel();
     try {
         deferredStore_->perform([](Rows& rows) { rows.close(); });
     } catch (...) {

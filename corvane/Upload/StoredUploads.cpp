@@ -69,9 +69,18 @@ void StoredUploads::sendPortion() {
             isMoreReady = backlog_.end(identifier);
         }
     }
+    send(std::move(requests));
+    if (isMoreReady) sendPortionLater();
+}
+
+void StoredUploads::send(std::vector<PreparedUploadRequest> requests) {
     for (const auto& request : requests) ledger_->begin(request.identifier);
     service_->resubmit(std::move(requests));
-    if (isMoreReady) sendPortionLater();
+}
+
+std::optional<PreparedUploadRequest> StoredUploads::find(const std::string& identifier) {
+    const auto row = rows_->find(identifier);
+    return row ? preparedRequest(*row) : std::nullopt;
 }
 
 void StoredUploads::end(const std::vector<std::string>& identifiers) {
@@ -80,24 +89,24 @@ void StoredUploads::end(const std::vector<std::string>& identifiers) {
     if (isMoreReady) sendPortionLater();
 }
 
-// Behind the submissions that wait: results overtake them, so that a backlog that ends quickly would keep them waiting.
 void StoredUploads::sendPortionLater() {
-    const auto retry = [weak = weak_from_this()] {
+    runLater([weak = weak_from_this()] {
         const auto self = weak.lock();
         if (!self) return;
-        self->queue_->async([weak] {
-            const auto still = weak.lock();
-            if (!still) return;
-            still->queue_->assertCurrent("StoredUploads::sendPortion");
-            still->sendPortion();
-        });
-    };
-    std::shared_ptr<SerialQueue> accessQueue;
-    {
-        const Lock lock(mutex_);
-        accessQueue = accessQueue_;
-    }
-    accessQueue ? accessQueue->async(retry) : retry();
+        self->queue_->assertCurrent("StoredUploads::sendPortion");
+        self->sendPortion();
+    });
+}
+
+void StoredUploads::runLater(Task task) {
+    const auto behind = accessQueue();
+    if (behind == queue_) return queue_->async(std::move(task));
+    behind->async([queue = queue_, work = std::move(task)]() mutable { queue->async(std::move(work)); });
+}
+
+std::shared_ptr<SerialQueue> StoredUploads::accessQueue() {
+    const Lock lock(mutex_);
+    return accessQueue_ ? accessQueue_ : queue_;
 }
 
 std::optional<SignedEntity> StoredUploads::storedRow(const std::string& identifier) {

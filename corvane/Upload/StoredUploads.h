@@ -38,6 +38,17 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     /// Uploads have ended here or elsewhere, of whichever run: the next portion may be due. Any thread.
     void end(const std::vector<std::string>& identifiers);
 
+    /// What is to be sent of a stored document, however often it was retried, or nothing when its row has gone or its
+    /// payload, with which the row goes, too. Throws `StoreError` and `DeferredStoreError`.
+    [[nodiscard]] std::optional<PreparedUploadRequest> find(const std::string& identifier) CORVANE_REQUIRES(*queue_);
+    /// Sends what is not in flight.
+    void send(std::vector<PreparedUploadRequest> requests) CORVANE_REQUIRES(*queue_);
+    /// Runs a task of this queue's behind the submissions that wait: results overtake them, so that a backlog that ends
+    /// quickly would keep them waiting. Any thread.
+    void runLater(Task task);
+    /// The queue of the submissions; this one when none was registered. Any thread.
+    [[nodiscard]] std::shared_ptr<SerialQueue> accessQueue();
+
   private:
     void list() CORVANE_REQUIRES(*queue_);
     /// Sends the next portion. Goes on with what ends.

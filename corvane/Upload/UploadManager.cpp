@@ -34,22 +34,26 @@ PreparedUploadRequest prepared(const SignedEntity& entity, std::filesystem::path
 std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServiceType> service,
                                                      std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                                                      std::shared_ptr<UploadDropboxType> dropbox,
-                                                     std::shared_ptr<DeliveryLedger> ledger) {
+                                                     std::shared_ptr<DeliveryLedger> ledger,
+                                                     std::optional<std::chrono::milliseconds> retryDelay) {
     if (!ledger) ledger = std::make_shared<DeliveryLedger>();
-    std::shared_ptr<UploadManager> manager(
-        new UploadManager(std::move(service), std::move(deferredStore), std::move(dropbox), std::move(ledger)));
+    if (retryDelay) ledger->keepPending();
+    std::shared_ptr<UploadManager> manager(new UploadManager(std::move(service), std::move(deferredStore),
+                                                             std::move(dropbox), std::move(ledger), retryDelay));
     manager->service_->setDelegate(manager);
     return manager;
 }
 
 UploadManager::UploadManager(std::shared_ptr<UploadServiceType> service,
                              std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
-                             std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger)
+                             std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger,
+                             std::optional<std::chrono::milliseconds> retryDelay)
     : service_(std::move(service)),
       rows_(std::make_shared<UploadRows>(std::move(deferredStore))),
       dropbox_(std::move(dropbox)),
       ledger_(std::move(ledger)),
-      stored_(std::make_shared<StoredUploads>(queue_, service_, rows_, dropbox_, ledger_)) {}
+      stored_(std::make_shared<StoredUploads>(queue_, service_, rows_, dropbox_, ledger_)),
+      retries_(retryDelay ? std::make_shared<UploadRetries>(*retryDelay, queue_, stored_) : nullptr) {}
 
 UploadManager::~UploadManager() = default;
 
@@ -130,12 +134,13 @@ void UploadManager::uploadServiceTogether(UploadServiceType&, const std::vector<
     const auto rowProblem = rows_->remove(over);
     for (const auto& result : results) {
         if (const auto* retry = std::get_if<UploadResult::Retry>(&result.value)) {
-            didFailForNow(*retry);
+            didFailForNow(retries_ ? retries_->countedOnce(*retry) : *retry);
         } else {
             didFinish(result, rowProblem);
         }
     }
     stored_->end(all);
+    if (retries_) retries_->end(results);
 }
 
 void UploadManager::didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem) {
@@ -180,6 +185,7 @@ void UploadManager::uploadEndedElsewhere(const UploadResult& result) {
     const auto& identifier = result.identifier();
     forgetUnrecorded(identifier);
     stored_->end({identifier});
+    if (retries_) retries_->endElsewhere(identifier);
     const auto cause = result.cause();
     if (std::holds_alternative<UploadResult::Success>(result.value)) {
         return ledger_->settle(identifier, Outcome::delivered, cause);
