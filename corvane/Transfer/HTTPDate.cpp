@@ -6,7 +6,8 @@ namespace corvane {
 
 std::optional<Date> dateFromHTTP(const std::string& text) {
     const auto seconds = curl_getdate(text.c_str(), nullptr);
-    return seconds < 0 ? std::nullopt : dateFromSeconds(static_cast<double>(seconds));
+    if (seconds < 0) return std::nullopt;
+    return dateFromSeconds(static_cast<double>(seconds)).value_or(Date::max());
 }
 
 }  // namespace corvane
