@@ -172,10 +172,10 @@ void SerialQueue::State::sleep(Lock& lock) {
     const int problem = timers.isEmpty() || suspended() ? (lock.wait(wake), 0) : sleepUntilTimer(lock);
     asleep = false;
     if (std::exchange(timerProblem, problem) == problem || problem == 0) return;
-    lock.unlock();
+    mutex.unlock();
     Log::shared().error("Timers may be late, queue=%{public}@, error=%{public}@", label,
                         SystemError("make a timer", problem).what());
-    lock.lock();
+    mutex.lock();
 }
 
 // Returns why the system does not wait for the timer. Then it is looked after now and then, by a clock that stands
@@ -186,9 +186,9 @@ int SerialQueue::State::sleepUntilTimer(Lock& lock) {
         lock.waitUntil(wake, Clock::now() + std::min<Clock::duration>(timers.untilNext(), longest));
         return problem;
     }
-    lock.unlock();
+    mutex.unlock();
     timers.wait();
-    lock.lock();
+    mutex.lock();
     return 0;
 }
 

@@ -25,6 +25,11 @@ std::vector<std::string> Backlog::take() {
     return taken;
 }
 
+bool Backlog::isIdle() {
+    const Lock lock(mutex_);
+    return underWay_.empty();
+}
+
 std::vector<std::string> Backlog::takeBack() {
     const Lock lock(mutex_);
     std::vector<std::string> taken(std::move_iterator(waiting_.begin()), std::move_iterator(waiting_.end()));

@@ -33,6 +33,7 @@ void StoredUploads::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
 }
 
 void StoredUploads::begin() {
+    queue_->assertCurrent("StoredUploads::begin");
     try {
         list();
         sendPortion();
@@ -74,11 +75,13 @@ void StoredUploads::sendPortion() {
 }
 
 void StoredUploads::send(std::vector<PreparedUploadRequest> requests) {
+    queue_->assertCurrent("StoredUploads::send");
     for (const auto& request : requests) ledger_->begin(request.identifier);
     service_->resubmit(std::move(requests));
 }
 
 std::optional<PreparedUploadRequest> StoredUploads::find(const std::string& identifier) {
+    queue_->assertCurrent("StoredUploads::find");
     const auto row = rows_->find(identifier);
     return row ? preparedRequest(*row) : std::nullopt;
 }

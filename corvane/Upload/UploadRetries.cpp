@@ -49,6 +49,7 @@ void UploadRetries::end(const std::vector<UploadResult>& results) {
                 continue;
             }
             forget(result.identifier());
+            pass_.isAnswered = true;
             if (!std::holds_alternative<UploadResult::Success>(result.value)) continue;
             pass_.hasDelivered = true;
             schedule_.succeed(BootClock::now());
@@ -63,7 +64,7 @@ void UploadRetries::end(const std::vector<UploadResult>& results) {
 
 void UploadRetries::noteRetry(const UploadResult::Retry& retry, std::vector<std::string>& exhausted) {
     auto& document = documents_[retry.identifier];
-    if (document.isInPass) ++pass_.failed;
+    if (document.isInPass) pass_.hasFailed = true;
     leavePass(document);
     if (isAttempt(retry.cause.reason)) ++document.attempts;
     if (retry.serverDelay) schedule_.hold(BootClock::now(), *retry.serverDelay);
@@ -154,6 +155,7 @@ void UploadRetries::sendPortion() {
         }
         isMoreReady = backlog_.end(identifier);
         const Lock lock(mutex_);
+        if (!isReadable) pass_.hasFailed = true;
         isReadable ? forget(identifier) : putBack(identifier);
     }
     stored_->send(std::move(requests));
@@ -163,10 +165,11 @@ void UploadRetries::sendPortion() {
 
 void UploadRetries::proceed(bool isMoreReady) {
     if (pass_.left > 0) {
-        const bool isInVain = pass_.failed >= Backlog::portion && !pass_.hasDelivered;
+        const bool isIdle = backlog_.isIdle();
+        const bool isInVain = isIdle && pass_.hasFailed && !pass_.isAnswered;
         if (isInVain || schedule_.isHeld(BootClock::now())) {
             for (const auto& identifier : backlog_.takeBack()) putBack(identifier);
-        } else if (isMoreReady) {
+        } else if (isMoreReady && (isIdle || pass_.isAnswered)) {
             sendPortionLater();
         }
     }

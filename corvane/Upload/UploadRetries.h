@@ -21,9 +21,10 @@ namespace corvane {
 /// Sends again, while the process runs, what ended with a retry in it; for hosts that ask for that.
 ///
 /// A pass takes all that waits, when the schedule says so, and hands it over a portion at a time; there is one at a
-/// time, which is over when all that it has sent has ended. One in which a whole portion has failed and nothing got
-/// through, or in which the server asks to be left alone, sends no more. What ended elsewhere is left to the process
-/// that was told of it, and what no transfer of this run has ended, to the next run.
+/// time, which is over when all that it has sent has ended. It goes on with a second portion once the server has
+/// decided on a document, and sends no more when the first has failed as a whole, or the server asks to be left alone.
+/// What ended elsewhere is left to the process that was told of it, and what no transfer of this run has ended, to the
+/// next run.
 ///
 /// Owned by an `UploadManager`. Its timer is the access queue's, its passes are on the manager's. Safe from any thread.
 /// Internal.
@@ -56,7 +57,8 @@ class UploadRetries : public std::enable_shared_from_this<UploadRetries> {
     struct Pass {
         bool runs = false;
         std::size_t left = 0;
-        std::size_t failed = 0;
+        bool hasFailed = false;
+        bool isAnswered = false;  // the server has taken or refused a document meanwhile
         bool hasDelivered = false;
     };
 

@@ -18,8 +18,9 @@ struct ProcessRun {
                         std::optional<std::chrono::milliseconds> retryDelay = {})
         : store(std::make_shared<DeferredStore<SignedEntity>>(std::move(location))),
           manager(UploadManager::create(service, store, dropbox, ledger, retryDelay)) {
+        if (!retryDelay) return;
         manager->registerAccessQueue(accessQueue);
-        if (retryDelay) manager->open();
+        manager->open();
     }
     ~ProcessRun() {
         manager.reset();
