@@ -33,5 +33,6 @@
 #include <corvane/Transfer/TransferError.h>
 #include <corvane/Upload/Endpoint.h>
 #include <corvane/Upload/ExternalAnalyticsUploader.h>
+#include <corvane/Upload/Ledger.h>
 
 #endif

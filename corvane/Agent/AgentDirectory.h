@@ -16,6 +16,9 @@ namespace corvane {
 /// docs/formats/transfer-journal.md says what is in it. Internal.
 class AgentDirectory {
   public:
+    /// Its name in a documents directory, unless the host says otherwise.
+    static constexpr const char* usualName = "com.veskar.corvane.transfer-agent";
+
     /// Creates what is missing. Throws `SystemError`, and `InvalidArgument` when the directory is another user's.
     explicit AgentDirectory(const std::filesystem::path& directory);
 

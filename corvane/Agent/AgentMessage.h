@@ -66,6 +66,19 @@ struct Ping {
     static constexpr bool isAnswered = true;
     void visit(auto&&) {}
 };
+/// Tasks have been taken back or cancelled: their marks are there. Answered with a pong.
+struct Look {
+    static constexpr std::uint8_t kind = 8;
+    static constexpr bool isAnswered = true;
+    void visit(auto&&) {}
+};
+/// Drops every task, of every owner, whose body lies beneath a directory.
+struct Discard {
+    static constexpr std::uint8_t kind = 9;
+    static constexpr bool isAnswered = true;
+    std::string directory;
+    void visit(auto&& with) { with(directory); }
+};
 
 /// The agent's first message.
 struct Welcome {
@@ -135,13 +148,13 @@ struct Forgotten {
     void visit(auto&& with) { with(token); }
 };
 
-/// A task that this connection has not reported was acknowledged by another one of its owner, or taken back by the
-/// process that made it, and is forgotten.
+/// A task that this connection has not reported was acknowledged by another one of its owner, taken back by the process
+/// that made it, cancelled or discarded, and is forgotten.
 struct Elsewhere {
     static constexpr std::uint8_t kind = 75;
     std::string token;
     std::optional<std::string> description;
-    std::string outcome;  ///< its bytes, see `decodeOutcome`; empty when it was taken back
+    std::string outcome;  ///< its bytes, see `decodeOutcome`; empty when it was not over
     void visit(auto&& with) { with(token, description, outcome); }
 };
 /// Uploads of the owner to a server are held up, or go on.
@@ -159,10 +172,17 @@ struct Unsupported {
     std::int64_t request = 0;
     void visit(auto&& with) { with(request); }
 };
+/// So many tasks were dropped; nothing of them is sent any more, and none is in the journal.
+struct Discarded {
+    static constexpr std::uint8_t kind = 78;
+    static constexpr bool isAnswer = true;
+    std::int64_t dropped = 0;
+    void visit(auto&& with) { with(dropped); }
+};
 
-using Request = std::variant<Hello, Submit, List, Acknowledge, Describe, Flush, Ping>;
+using Request = std::variant<Hello, Submit, List, Acknowledge, Describe, Flush, Ping, Look, Discard>;
 using Reply = std::variant<Welcome, Accepted, Refused, Known, Listed, Progress, Completed, Flushed, Pong, Forgotten,
-                           Elsewhere, Trouble, Unsupported>;
+                           Elsewhere, Trouble, Unsupported, Discarded>;
 
 /// The longest message there may be, without its length: an answer's head of 256 KiB fits.
 constexpr std::size_t longestMessage = std::size_t{512} * 1024;

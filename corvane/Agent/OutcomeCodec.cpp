@@ -15,7 +15,7 @@ namespace {
 
 using Code = TransferError::Code;
 
-constexpr auto lastCode = static_cast<std::int64_t>(Code::blocked);
+constexpr auto lastCode = static_cast<std::int64_t>(Code::cancelled);
 // Fits into a message with the longest description that a submission can have.
 constexpr std::size_t longestHeaders = std::size_t{192} * 1024;
 

@@ -26,6 +26,8 @@ DocumentHandOver::Removal DocumentHandOver::handOver(const Contents& contents, c
     ledger_->add(document->identifier(), static_cast<std::int64_t>(count));
     try {
         UploadRequest request{client_, document};
+        request.events = static_cast<std::int64_t>(count);
+        request.epoch = contents.epoch;
         request.removeBackup = [&](const std::shared_ptr<StoreConnection>& connection) {
             removeBackup(connection, contents, mayDelete, removal);
         };
@@ -34,9 +36,10 @@ DocumentHandOver::Removal DocumentHandOver::handOver(const Contents& contents, c
         ledger_->remove(document->identifier());
         throw;
     }
+    if (removal.taken == UploadTaken::forgotten) ledger_->remove(document->identifier());
     removal.document = document->identifier();
-    if (removal.taken == UploadTaken::underWay) {  // what the transaction did is undone
-        return {.document = std::move(removal.document), .error = std::nullopt};
+    if (removal.taken != UploadTaken::recorded) {  // what the transaction did is undone
+        return {.document = std::move(removal.document), .taken = removal.taken, .error = std::nullopt};
     }
     if (removal.isKept || removal.isDone || removal.error) return removal;
     try {

@@ -8,6 +8,7 @@
 #include <corvane/Upload/DeliveryLedger.h>
 #include <corvane/Upload/UploadManagerType.h>
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -27,6 +28,7 @@ class DocumentHandOver {
         JSON session;
         UserEvents::Events events;
         std::vector<std::string> rows;
+        std::int64_t epoch = 0;  // in which they were recorded
     };
     /// Whether a batch's rows may go: asked inside the transaction that deletes it.
     using MayDelete = std::function<bool(Rows&)>;
@@ -46,6 +48,7 @@ class DocumentHandOver {
 
     /// Makes a document, enters it in the ledger and hands it over, and deletes the batch's rows if they may go and the
     /// document is recorded. Throws what the manager throws; the batch is then as it was.
+    /// What is of an epoch that is over is not handed over, and stays where it is.
     Removal handOver(const Contents& contents, const MayDelete& mayDelete);
 
   private:

@@ -2,7 +2,9 @@
 
 #include <corvane/Export.h>
 #include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/RejectedEvent.h>
 #include <corvane/Models/Session.h>
+#include <corvane/Platform/ForgottenRecords.h>
 
 #include <functional>
 #include <memory>
@@ -32,6 +34,13 @@ class CORVANE_EXPORT EventProcessorType {
     /// The session's data changed. `submitQueues` asks the processor to send what it has queued now.
     virtual void didUpdateSession(const Session& /*session*/, bool /*submitQueues*/) {}
     virtual void didEndSession(const Session& /*session*/, Date /*endDate*/) {}
+
+    /// The submission of an event has failed.
+    virtual void didReject(const RejectedEvent& /*event*/) {}
+    /// Everything that was recorded is to be forgotten: the processor drops what it has and has not passed on. What the
+    /// library keeps in the documents directory is removed besides. Returns how much it has dropped that was kept
+    /// nowhere else.
+    virtual ForgottenRecords forget() { return {}; }
 
     /// What tells this processor apart from others: itself, or what it stands for.
     [[nodiscard]] virtual const void* identity() const { return this; }

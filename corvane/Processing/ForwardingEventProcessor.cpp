@@ -49,6 +49,12 @@ void ForwardingEventProcessor::didUpdateSession(const Session& session, bool sub
 void ForwardingEventProcessor::didEndSession(const Session& session, Date endDate) {
     eventProcessor_->didEndSession(session, endDate);
 }
+void ForwardingEventProcessor::didReject(const RejectedEvent& event) {
+    eventProcessor_->didReject(event);
+}
+ForgottenRecords ForwardingEventProcessor::forget() {
+    return eventProcessor_->forget();
+}
 const void* ForwardingEventProcessor::identity() const {
     return eventProcessor_->identity();
 }

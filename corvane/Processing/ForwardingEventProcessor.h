@@ -47,6 +47,8 @@ class CORVANE_EXPORT ForwardingEventProcessor : public EventProcessorType {
     void didStartSession(const Session& session) override;
     void didUpdateSession(const Session& session, bool submitQueues) override;
     void didEndSession(const Session& session, Date endDate) override;
+    void didReject(const RejectedEvent& event) override;
+    ForgottenRecords forget() override;
     /// The wrapped processor's.
     [[nodiscard]] const void* identity() const override;
     bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion) override;

@@ -95,6 +95,20 @@ void ProcessorManager::didUpdateSession(const Session& session, bool submitQueue
             [&](EventProcessorType& processor) { processor.didUpdateSession(session, submitQueues); });
 }
 
+void ProcessorManager::didReject(const RejectedEvent& event) {
+    deliver("didReject", [&](EventProcessorType& processor) { processor.didReject(event); });
+}
+
+ForgottenRecords ProcessorManager::forget() {
+    ForgottenRecords forgotten;
+    deliver("forget", [&](EventProcessorType& processor) {
+        const auto more = processor.forget();
+        forgotten.events += more.events;
+        forgotten.documents += more.documents;
+    });
+    return forgotten;
+}
+
 void ProcessorManager::didEndSession(const Session& session, Date endDate) {
     deliver("didEndSession", [&](EventProcessorType& processor) { processor.didEndSession(session, endDate); });
 }

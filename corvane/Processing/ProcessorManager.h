@@ -50,6 +50,9 @@ class CORVANE_EXPORT ProcessorManager : public std::enable_shared_from_this<Proc
     void didStartSession(const Session& session);
     void didUpdateSession(const Session& session, bool submitQueues);
     void didEndSession(const Session& session, Date endDate);
+    void didReject(const RejectedEvent& event);
+    /// Returns the sum of what the processors say.
+    ForgottenRecords forget();
 
   private:
     struct DeferredBackgroundResuming {

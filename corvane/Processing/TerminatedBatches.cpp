@@ -33,6 +33,11 @@ void TerminatedBatches::list() {
     }
 }
 
+void TerminatedBatches::clear() {
+    for (const auto& identifier : identifiers_) ledger_->remove(identifier);
+    identifiers_.clear();
+}
+
 std::optional<UploadBatchEntity> TerminatedBatches::read(const std::string& identifier) const {
     try {
         auto found = deferredStore_->perform([&](Rows& rows) { return rows.fetchWhere("identifier", identifier); });

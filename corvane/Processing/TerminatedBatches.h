@@ -4,6 +4,7 @@
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Upload/DeliveryLedger.h>
 
+#include <cstddef>
 #include <deque>
 #include <memory>
 #include <optional>
@@ -23,6 +24,9 @@ class TerminatedBatches {
     void list();
 
     [[nodiscard]] bool isEmpty() const { return identifiers_.empty(); }
+    [[nodiscard]] std::size_t count() const { return identifiers_.size(); }
+    /// Sends nothing more of what was noted.
+    void clear();
 
     /// Takes the next row to `send` it, and out of the list and the ledger. One at a time: rows are as large as the
     /// groups that they hold. Returns how many bytes it has; 0 for one that cannot be read, which is logged and stays,

@@ -22,18 +22,21 @@ bool fit(const EncodedEvents& first, const EncodedEvents& second) {
 }  // namespace
 
 void UploadBatch::append(const JSON& payload, const JSON& session) {
-    if (parts_.empty() || isFull(*parts_.back().events)) {
+    const bool isNewPart = parts_.empty() || isFull(*parts_.back().events);
+    if (isNewPart) {
         // A part is never empty, not even without memory: a document would have a gap.
         Part added{newUUID(), session, std::make_shared<EncodedEvents>()};
         added.events->append(payload);
         parts_.push_back(std::move(added));
-        return;
+    } else {
+        Part& part = parts_.back();
+        part.events->append(payload);
+        part.session = session;
+        part.isDue = true;
+        part.isBackedUp = false;
     }
-    Part& part = parts_.back();
-    part.events->append(payload);
-    part.session = session;
-    part.isDue = true;
-    part.isBackedUp = false;
+    ++count_;
+    bytes_ += payload.text().size();
 }
 
 void UploadBatch::prepend(UploadBatch earlier) {
@@ -49,12 +52,21 @@ void UploadBatch::prepend(UploadBatch earlier) {
     earlier.parts_.insert(earlier.parts_.end(), std::make_move_iterator(parts_.begin()),
                           std::make_move_iterator(parts_.end()));
     parts_ = std::move(earlier.parts_);
+    count_ += earlier.count_;
+    bytes_ += earlier.bytes_;
 }
 
-std::size_t UploadBatch::count() const {
-    std::size_t count = 0;
-    for (const Part& part : parts_) count += part.events->count();
-    return count;
+UploadBatch UploadBatch::take(const std::string& identifier) {
+    UploadBatch taken;
+    if (Part* const part = find(identifier)) {
+        taken.count_ = part->events->count();
+        taken.bytes_ = part->events->text().size();
+        taken.parts_.push_back(std::move(*part));
+        parts_.erase(parts_.begin() + (part - parts_.data()));
+        count_ -= taken.count_;
+        bytes_ -= std::min(bytes_, taken.bytes_);
+    }
+    return taken;
 }
 
 bool UploadBatch::isBackedUp() const {

@@ -25,6 +25,7 @@ class UploadBatch {
         bool isDue = true;        // to be written at the end of the run
         bool isBackedUp = false;  // the row holds all events
         bool hasRow = false;      // there may be a row
+        std::size_t saved = 0;    // how many events the row holds
     };
 
     /// Adds an event to the last part, or to a new one when that is full.
@@ -33,16 +34,22 @@ class UploadBatch {
     /// yet.
     void prepend(UploadBatch earlier);
 
-    [[nodiscard]] std::size_t count() const;
+    [[nodiscard]] std::size_t count() const { return count_; }
+    /// Of the events' text.
+    [[nodiscard]] std::size_t bytes() const { return bytes_; }
+    [[nodiscard]] bool isEmpty() const { return parts_.empty(); }
     [[nodiscard]] bool isBackedUp() const;
     /// Never empty, once an event was added.
     [[nodiscard]] std::vector<Part>& parts() { return parts_; }
     [[nodiscard]] const std::vector<Part>& parts() const { return parts_; }
     /// The part of that identifier, or nullptr.
     [[nodiscard]] Part* find(const std::string& identifier);
+    /// Takes the part of that identifier out, if it is there.
+    [[nodiscard]] UploadBatch take(const std::string& identifier);
 
   private:
     std::vector<Part> parts_;
+    std::size_t count_ = 0, bytes_ = 0;
 };
 
 }  // namespace corvane

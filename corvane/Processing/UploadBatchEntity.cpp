@@ -2,6 +2,7 @@
 
 #include <corvane/Models/JSONShape.h>
 #include <corvane/Models/OwnJSON.h>
+#include <corvane/Upload/LedgerEntity.h>
 
 #include <algorithm>
 #include <utility>
@@ -39,6 +40,30 @@ std::vector<StoreColumn> UploadBatchEntity::columns() {
     return {{.name = "identifier", .type = "TEXT", .nullable = false, .primary = true},
             {.name = "events", .type = "DATA", .nullable = false, .primary = false},
             {.name = "session", .type = "DATA", .nullable = false, .primary = false}};
+}
+
+std::vector<UploadBatchEntity::Size> UploadBatchEntity::sizes(StoreConnection& connection) {
+    std::vector<Size> sizes;
+    connection.query(
+        "SELECT identifier, CASE json_valid(text) WHEN 1 THEN json_array_length(text, '$.events') ELSE 0 END, bytes "
+        "FROM "
+        "(SELECT identifier, CAST(events AS TEXT) AS text, length(events) AS bytes FROM upload_batches);",
+        [&](StoreStepper& stepper) {
+            Size size{stepper.text()};
+            size.events = stepper.integer();
+            size.bytes = stepper.integer();
+            sizes.push_back(std::move(size));
+        });
+    return sizes;
+}
+
+StoreTableExtras UploadBatchEntity::extras() {
+    return {{}, [](const std::shared_ptr<StoreConnection>& connection) {
+                ForgottenRecords forgotten;
+                for (const auto& size : sizes(*connection)) forgotten.events += size.events;
+                noteForgotten(connection, forgotten);
+                return forgotten;
+            }};
 }
 
 StorableValue UploadBatchEntity::storableValue(std::string_view columnName) const {

@@ -3,6 +3,8 @@
 #include <corvane/Models/JSON.h>
 #include <corvane/Processing/EncodedEvents.h>
 #include <corvane/Store/Storable.h>
+#include <corvane/Store/StoreConnection.h>
+#include <corvane/Store/StoreTable.h>
 
 #include <cstdint>
 #include <memory>
@@ -23,6 +25,17 @@ struct UploadBatchEntity {
     std::shared_ptr<const EncodedEvents> events;  ///< never null
 
     [[nodiscard]] static std::vector<StoreColumn> columns();
+    /// The ledger is told what is forgotten.
+    [[nodiscard]] static StoreTableExtras extras();
+
+    /// How much a row holds: no events where it cannot be read.
+    struct Size {
+        std::string identifier;
+        std::int64_t events = 0;
+        std::int64_t bytes = 0;
+    };
+    /// The sizes of all rows. On the store's queue; throws `StoreError`.
+    [[nodiscard]] static std::vector<Size> sizes(StoreConnection& connection);
     [[nodiscard]] StorableValue storableValue(std::string_view columnName) const;
     /// Throws `StoreStepper::Errors`: badColumn, or badDataInColumn for a blob that is not JSON of this shape.
     [[nodiscard]] static UploadBatchEntity read(StoreStepper& stepper);

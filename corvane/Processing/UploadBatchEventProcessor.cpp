@@ -60,6 +60,18 @@ void UploadBatchEventProcessor::didUpdateSession(const Session& session, bool su
 void UploadBatchEventProcessor::didEndSession(const Session&, Date) {
     batches_->didEndSession();
 }
+void UploadBatchEventProcessor::didReject(const RejectedEvent& event) {
+    batches_->didReject(event.reason);
+}
+ForgottenRecords UploadBatchEventProcessor::forget() {
+    return batches_->forget();
+}
+Ledger UploadBatchEventProcessor::ledger() const {
+    return batches_->ledger();
+}
+void UploadBatchEventProcessor::readLedger(std::function<void(const Ledger&)> completion) {
+    batches_->readLedger(std::move(completion));
+}
 bool UploadBatchEventProcessor::resumeBackgroundProcessing(const std::string& identifier,
                                                            const std::function<void()>& completion) {
     return batches_->resumeBackgroundProcessing(identifier, completion);

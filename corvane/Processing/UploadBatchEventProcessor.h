@@ -6,6 +6,7 @@
 #include <corvane/Upload/DeliveryReport.h>
 #include <corvane/Upload/DeliveryUpdate.h>
 #include <corvane/Upload/Endpoint.h>
+#include <corvane/Upload/Ledger.h>
 
 #include <chrono>
 #include <cstddef>
@@ -104,6 +105,14 @@ class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType
     /// be handed over stays open, which is logged. Any thread.
     void flush();
 
+    /// What became of everything that was recorded for the endpoint: what this process has done, at once, and of other
+    /// processes what was on disk when the first session began, or at the last `readLedger`. For the moment in which a
+    /// batch is handed over its events may count both as open and as waiting. Any thread; waits for nothing.
+    [[nodiscard]] Ledger ledger() const;
+    /// Reads the ledger on disk again, and calls the completion with it, on the queue of the session manager. Any
+    /// thread. Does nothing for a processor that was never added.
+    void readLedger(std::function<void(const Ledger& ledger)> completion);
+
     /// Has `observer` told of every document of the endpoint as it happens, from now on and in order, in place of an
     /// observer that was set before; an empty one ends that. Documents that earlier runs have left are told of, too.
     ///
@@ -126,6 +135,8 @@ class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType
     void didStartSession(const Session& session) override;
     void didUpdateSession(const Session& session, bool submitQueues) override;
     void didEndSession(const Session& session, Date endDate) override;
+    void didReject(const RejectedEvent& event) override;
+    ForgottenRecords forget() override;
     bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion) override;
 
   private:

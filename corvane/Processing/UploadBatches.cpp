@@ -1,6 +1,8 @@
 #include <corvane/Processing/UploadBatches.h>
 
+#include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Platform/Require.h>
 #include <corvane/Platform/UUID.h>
 #include <corvane/Upload/OstrelSigner.h>
@@ -38,8 +40,9 @@ void waitForQueue(SerialQueue& queue, std::chrono::steady_clock::time_point dead
 UploadBatches::UploadBatches(Client client, std::shared_ptr<UploadManagerType> uploadManager,
                              const std::shared_ptr<DeferredStore<UploadBatchEntity>>& deferredStore,
                              const UploadBatchEventConfig& config, std::shared_ptr<DeliveryLedger> ledger,
-                             std::shared_ptr<const EndpointUse> endpointUse)
+                             std::shared_ptr<LedgerBook> book, std::shared_ptr<const EndpointUse> endpointUse)
     : ledger_(std::move(ledger)),
+      book_(std::move(book)),
       uploadManager_(std::move(uploadManager)),
       deferredStore_(deferredStore),
       config_(config),
@@ -50,13 +53,14 @@ UploadBatches::UploadBatches(Client client, std::shared_ptr<UploadManagerType> u
 std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint& endpoint,
                                                    const UploadBatchEventConfig& config) {
     auto ledger = std::make_shared<DeliveryLedger>();
+    auto book = std::make_shared<LedgerBook>();
     auto manager = UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
                                          std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
                                          std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()),
-                                         ledger, config.options().retryDelay);
-    return std::make_shared<UploadBatches>(std::move(client), std::move(manager),
-                                           std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name()), config,
-                                           std::move(ledger), std::make_shared<const EndpointUse>(endpoint));
+                                         ledger, book, config.options().retryDelay);
+    return std::make_shared<UploadBatches>(
+        std::move(client), std::move(manager), std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name()),
+        config, std::move(ledger), std::move(book), std::make_shared<const EndpointUse>(endpoint));
 }
 
 DeliveryReport UploadBatches::waitForDelivery(std::chrono::steady_clock::time_point deadline,
@@ -116,6 +120,8 @@ UploadBatchQueueKey UploadBatches::keyOf(const ProcessEvent& processEvent) const
 
 void UploadBatches::process(const ProcessEvent& processEvent) {
     assertOnQueue("UploadBatchEventProcessor::process");
+    dropForgotten();
+    ++counts_.accepted;
     try {
         const UploadBatchQueueKey key = keyOf(processEvent);
         add(key, processEvent.payload());
@@ -168,11 +174,13 @@ void UploadBatches::writeChanged() {
             if (part.isDue && !backUp(part)) isWritten = false;
         }
     }
+    if (dropForgotten()) return;
     if (!isWritten) {
         backupsAreBehind_ = true;
     } else if (backupsAreBehind_) {
         backUpAll();
     }
+    publish();
 }
 
 bool UploadBatches::backUp(UploadBatch::Part& part) {
@@ -180,9 +188,13 @@ bool UploadBatches::backUp(UploadBatch::Part& part) {
     part.hasRow = true;  // also when it fails: it may be there from before
     try {
         const UploadBatchEntity backup{part.identifier, part.session, part.events};
-        deferredStore_->perform([&](Rows& rows) { rows.insert(backup); });
-        part.isBackedUp = true;
+        deferredStore_->change([&, epoch = epoch_](Rows& rows) {
+            part.isBackedUp = RecordingSwitch::epoch() <= epoch;
+            if (part.isBackedUp) rows.insert(backup);
+        });
+        if (part.isBackedUp) part.saved = part.events->count();
     } catch (...) {
+        part.isBackedUp = false;
         Log::shared().error("Failed to write queue to disk for backup uploads, identifier=%{public}@, error=%{public}@",
                             part.identifier, AnyError::current().what());
     }
@@ -202,12 +214,16 @@ void UploadBatches::backUpAll() {
     dropDelivered();
     for (auto one = unsaved_.begin(); one != unsaved_.end();) {
         const bool isSaved = backUp(one->second);
-        if (isSaved) ledger_->unfollow(one->first);
+        if (isSaved) {
+            ledger_->unfollow(one->first);
+            leave(one->second);
+        }
         one = isSaved ? unsaved_.erase(one) : std::next(one);
     }
     for (auto& [key, queue] : batchQueues_) {
         if (!backUp(queue)) backupsAreBehind_ = true;
     }
+    if (dropForgotten()) return;
     if (!unsaved_.empty()) backupsAreBehind_ = true;
 }
 
@@ -229,15 +245,19 @@ void UploadBatches::handOver(const UploadBatchQueueKey& key, bool force) {
     auto handedOver = batchQueues_.extract(found);
     if (!key.isGroup()) delayTimer_.cancel();
     try {
-        tryHandOver(handedOver.mapped());
+        if (!tryHandOver(handedOver.mapped())) {
+            putBack(std::move(handedOver));
+            dropForgotten();
+        }
+        publish();
     } catch (...) {
         Log::shared().error("Failed to submit request for upload, error=%{public}@", AnyError::current().what());
         putBack(std::move(handedOver));
     }
 }
 
-void UploadBatches::tryHandOver(UploadBatch& batch) {
-    DocumentHandOver::Contents contents{currentSession_->sessionData, {}, {}};
+bool UploadBatches::tryHandOver(UploadBatch& batch) {
+    DocumentHandOver::Contents contents{currentSession_->sessionData, {}, {}, epoch_};
     for (const auto& part : batch.parts()) {
         contents.events.push_back(part.events);
         if (part.hasRow) contents.rows.push_back(part.identifier);
@@ -246,22 +266,48 @@ void UploadBatches::tryHandOver(UploadBatch& batch) {
     if (removal.error) {
         Log::shared().error("Failed to clean up request after submission, error=%{public}@", removal.error->what());
     }
-    if (removal.taken == UploadTaken::underWay || removal.isKept) keep(batch, removal.document);
+    if (removal.taken == UploadTaken::forgotten) return false;
+    if (removal.taken == UploadTaken::underWay || removal.isKept) {
+        keep(batch, removal.document);
+    } else {
+        counts_.handedOver += static_cast<std::int64_t>(batch.count());
+    }
+    return true;
 }
 
 void UploadBatches::keep(UploadBatch& batch, const std::string& document) {
-    if (batch.isBackedUp() || backUp(batch)) return;
+    if (batch.isBackedUp() || backUp(batch)) return leave(batch);
     dropDelivered();
-    if (!ledger_->follow(document)) return;
+    if (!ledger_->follow(document)) return leave(batch);
     unsaved_.emplace(document, std::move(batch));
     backupsAreBehind_ = true;
 }
 
+void UploadBatches::leave(const UploadBatch& batch) {
+    const auto events = static_cast<std::int64_t>(batch.count());
+    counts_.handedOver += events;
+    for (const auto& part : batch.parts()) {
+        book_->addOpenOfOthers({static_cast<std::int64_t>(part.saved), part.saved != 0 ? 1 : 0},
+                               static_cast<std::int64_t>(part.events->text().size()));
+    }
+}
+
+// There is no row whose going would count them.
 void UploadBatches::dropDelivered() {
-    std::erase_if(unsaved_, [this](const auto& one) {
-        const auto outcome = ledger_->takeOutcome(one.first);
-        return outcome && *outcome != DeliveryLedger::Outcome::pending;
-    });
+    assertOnQueue("UploadBatchEventProcessor::dropDelivered");
+    for (auto one = unsaved_.begin(); one != unsaved_.end();) {
+        const auto settled = ledger_->takeOutcome(one->first);
+        if (!settled || settled->outcome == DeliveryLedger::Outcome::pending) {
+            ++one;
+            continue;
+        }
+        const auto events = static_cast<std::int64_t>(one->second.count());
+        const bool isDelivered = settled->outcome == DeliveryLedger::Outcome::delivered;
+        book_->addLater(isDelivered ? LedgerEntry::delivered : refusalOf(settled->cause.status.value_or(0)),
+                        {events, 1});
+        counts_.handedOver += events;
+        one = unsaved_.erase(one);
+    }
 }
 
 void UploadBatches::putBack(Queues::node_type refused) {
@@ -292,11 +338,21 @@ void UploadBatches::didStartSession(const Session& session) {
     }
     uploadManager_->open();
     delayTimer_.cancel();
+    dropForgotten();
     setSession(session);
     // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
     // rest.
     backUpAll();
     terminated_.list();
+    constexpr std::size_t few = 64;
+    if (terminated_.count() > few) {
+        accessQueue_->async([self = shared_from_this()] {
+            self->assertOnQueue("UploadBatchEventProcessor::countOthers");
+            self->countOthers();
+        });
+    } else {
+        countOthers();
+    }
     handOverTerminated();
 }
 
@@ -337,7 +393,8 @@ void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
     };
     DocumentHandOver::Removal removal;
     try {
-        removal = documents_.handOver({batch.session, {batch.events}, {batch.identifier}}, hasNotGrown);
+        removal = documents_.handOver({batch.session, {batch.events}, {batch.identifier}, epoch_}, hasNotGrown);
+        if (removal.taken == UploadTaken::forgotten) return;
         if (removal.error) {
             Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",
                                 batch.identifier, removal.error->what());
@@ -347,21 +404,27 @@ void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
                             AnyError::current().what());
         return;
     }
-    takeOut(batch.identifier, removal);
+    takeOut(batch, removal);
 }
 
 // The manager may be the host's, whose code may have changed the batches meanwhile.
-void UploadBatches::takeOut(const std::string& identifier, const DocumentHandOver::Removal& removal) {
+void UploadBatches::takeOut(const UploadBatchEntity& batch, const DocumentHandOver::Removal& removal) {
+    const auto& identifier = batch.identifier;
+    const auto events = static_cast<std::int64_t>(batch.events->count());
+    const auto bytes = static_cast<std::int64_t>(batch.events->text().size());
     for (auto queue = batchQueues_.begin(); queue != batchQueues_.end(); ++queue) {
-        UploadBatch::Part* const open = queue->second.find(identifier);
-        if (!open) continue;
-        auto& parts = queue->second.parts();
-        UploadBatch handedOver;
-        handedOver.parts().push_back(std::move(*open));
-        parts.erase(parts.begin() + (open - parts.data()));
-        if (parts.empty()) batchQueues_.erase(queue);
-        if (removal.taken == UploadTaken::underWay) keep(handedOver, removal.document);
-        return;
+        UploadBatch handedOver = queue->second.take(identifier);
+        if (handedOver.isEmpty()) continue;
+        if (queue->second.isEmpty()) batchQueues_.erase(queue);
+        if (removal.taken == UploadTaken::underWay) {
+            keep(handedOver, removal.document);
+        } else {
+            counts_.handedOver += static_cast<std::int64_t>(handedOver.count());
+        }
+        return publish();
+    }
+    if (removal.isDone || !(removal.isKept || removal.error || removal.taken == UploadTaken::underWay)) {
+        book_->addOpenOfOthers({-events, -1}, -bytes);
     }
 }
 
@@ -395,6 +458,96 @@ void UploadBatches::didEndSession() {
         Log::shared().error("Failed to close handle to the store, error=%{public}@", AnyError::current().what());
     }
     uploadManager_->close();
+}
+
+void UploadBatches::didReject(RejectedEvent::Reason reason) {
+    using Reason = RejectedEvent::Reason;
+    const auto entry = reason == Reason::noSession      ? LedgerEntry::noSession
+                       : reason == Reason::missingData  ? LedgerEntry::missingData
+                       : reason == Reason::encoding     ? LedgerEntry::encoding
+                       : reason == Reason::notRecording ? LedgerEntry::notRecording
+                                                        : LedgerEntry::otherProblem;
+    book_->addLater(entry, {1, 0});
+}
+
+std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
+    const auto epoch = RecordingSwitch::epoch();
+    if (epoch <= epoch_) return std::nullopt;
+    epoch_ = epoch;
+    ForgottenRecords unsaved;
+    const auto drop = [&](const UploadBatch& batch) {
+        counts_.forgotten += static_cast<std::int64_t>(batch.count());
+        for (const auto& part : batch.parts()) {
+            unsaved.events += static_cast<std::int64_t>(part.events->count() - part.saved);
+        }
+    };
+    for (const auto& [key, batch] : batchQueues_) drop(batch);
+    for (const auto& [document, batch] : unsaved_) {
+        drop(batch);
+        ledger_->unfollow(document);
+    }
+    if (unsaved.events != 0) book_->addLater(LedgerEntry::givenUpForgotten, {unsaved.events, 0});
+    batchQueues_.clear();
+    delayTimer_.cancel();
+    unsaved_.clear();
+    terminated_.clear();
+    backupsAreBehind_ = false;
+    uploadManager_->forget();
+    publish();
+    return unsaved;
+}
+
+ForgottenRecords UploadBatches::forget() {
+    assertOnQueue("UploadBatchEventProcessor::forget");
+    return dropForgotten().value_or(ForgottenRecords());
+}
+
+bool UploadBatches::isOpen(const std::string& identifier) {
+    assertOnQueue("UploadBatchEventProcessor::isOpen");
+    const auto has = [&](auto& one) { return one.second.find(identifier) != nullptr; };
+    return std::any_of(batchQueues_.begin(), batchQueues_.end(), has) ||
+           std::any_of(unsaved_.begin(), unsaved_.end(), has);
+}
+
+void UploadBatches::countOthers() {
+    try {
+        auto sizes = deferredStore_->perform([](Rows& rows) { return UploadBatchEntity::sizes(*rows.connection()); });
+        Ledger::Count count;
+        std::int64_t bytes = 0;
+        for (const auto& size : sizes) {
+            if (isOpen(size.identifier)) continue;
+            count.events += size.events;
+            ++count.documents;
+            bytes += size.bytes;
+        }
+        book_->setOpenOfOthers(count, bytes);
+    } catch (...) {
+        Log::shared().error("Failed to count what is stored, error=%{public}@", AnyError::current().what());
+    }
+}
+
+void UploadBatches::publish() {
+    counts_.open = {};
+    counts_.openBytes = 0;
+    const auto add = [&](const UploadBatch& batch) {
+        counts_.open.events += static_cast<std::int64_t>(batch.count());
+        counts_.open.documents += static_cast<std::int64_t>(batch.parts().size());
+        counts_.openBytes += static_cast<std::int64_t>(batch.bytes());
+    };
+    for (const auto& [key, batch] : batchQueues_) add(batch);
+    for (const auto& [document, batch] : unsaved_) add(batch);
+    book_->setBatches(counts_);
+}
+
+void UploadBatches::readLedger(std::function<void(const Ledger&)> completion) {
+    const auto queue = registeredQueue();
+    if (!queue || born_.isInChild()) return;
+    queue->async([self = shared_from_this(), completion = std::move(completion)] {
+        self->assertOnQueue("UploadBatchEventProcessor::readLedger");
+        self->countOthers();
+        self->uploadManager_->readLedger();
+        callHost("ledger completion", [&] { completion(self->ledger()); });
+    });
 }
 
 bool UploadBatches::resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion) {

@@ -16,9 +16,11 @@
 #include <corvane/Store/DeferredStore.h>
 #include <corvane/Upload/DeliveryLedger.h>
 #include <corvane/Upload/EndpointUse.h>
+#include <corvane/Upload/LedgerBook.h>
 #include <corvane/Upload/UploadManagerType.h>
 
 #include <chrono>
+#include <cstdint>
 #include <functional>
 #include <map>
 #include <memory>
@@ -37,10 +39,11 @@ namespace corvane {
 /// has got through. Rows of an earlier run are in `terminated_` until they are handed over in their turn. Internal.
 class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
   public:
-    /// Works with an upload manager and a store of the caller's. `ledger` is the one that the manager keeps.
+    /// Works with an upload manager and a store of the caller's. `ledger` and `book` are those that the manager keeps.
     UploadBatches(Client client, std::shared_ptr<UploadManagerType> uploadManager,
                   const std::shared_ptr<DeferredStore<UploadBatchEntity>>& deferredStore,
                   const UploadBatchEventConfig& config, std::shared_ptr<DeliveryLedger> ledger,
+                  std::shared_ptr<LedgerBook> book = std::make_shared<LedgerBook>(),
                   std::shared_ptr<const EndpointUse> endpointUse = nullptr);
 
     /// The library's own set-up for an endpoint.
@@ -51,6 +54,8 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
                                    const DeliveryWaitOptions& options) const;
     void flush();
     void setDeliveryObserver(DeliveryObserver observer) { ledger_->news()->setObserver(std::move(observer)); }
+    [[nodiscard]] Ledger ledger() const { return book_->ledger(); }
+    void readLedger(std::function<void(const Ledger&)> completion);
     void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue);
     bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion);
 
@@ -60,6 +65,8 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     void didStartSession(const Session& session);
     void didUpdateSession(const Session& session, bool submitQueues);
     void didEndSession();
+    void didReject(RejectedEvent::Reason reason);
+    ForgottenRecords forget();
 
   private:
     using Rows = Store<UploadBatchEntity>;
@@ -77,12 +84,14 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     /// Has the rows written whose batches have changed, once for a run.
     void writeAtEndOfRun() CORVANE_REQUIRES(*accessQueue_);
     void writeChanged() CORVANE_REQUIRES(*accessQueue_);
-    /// Writes a part's row. Returns whether it is written; if not, that has been logged.
-    bool backUp(UploadBatch::Part& part);
+    /// Writes a part's row. Returns whether it is written; if not, that has been logged, or it is forgotten.
+    bool backUp(UploadBatch::Part& part) CORVANE_REQUIRES(*accessQueue_);
     /// Writes the rows of all parts, and returns whether all are written.
-    bool backUp(UploadBatch& batch);
+    bool backUp(UploadBatch& batch) CORVANE_REQUIRES(*accessQueue_);
     /// Writes the rows of all batches, after one could not be written.
     void backUpAll() CORVANE_REQUIRES(*accessQueue_);
+    /// Counts a batch that is left to its rows, as one of an earlier run.
+    void leave(const UploadBatch& batch) CORVANE_REQUIRES(*accessQueue_);
     /// Lets go of unsaved batches whose documents need no second attempt.
     void dropDelivered() CORVANE_REQUIRES(*accessQueue_);
 
@@ -92,8 +101,8 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     /// Hands a batch over when it is full, or in any case; one that is refused is open again.
     void handOver(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
     /// Hands a batch over that is in no list any more, with the session's data as it is now.
-    /// Throws what the manager throws; the batch is then as it was.
-    void tryHandOver(UploadBatch& batch) CORVANE_REQUIRES(*accessQueue_);
+    /// Throws what the manager throws; the batch is then as it was. Returns false, and it is, when it is forgotten.
+    [[nodiscard]] bool tryHandOver(UploadBatch& batch) CORVANE_REQUIRES(*accessQueue_);
     /// Sees to it that a batch whose document is under way without a row of its own stays in its backup.
     void keep(UploadBatch& batch, const std::string& document) CORVANE_REQUIRES(*accessQueue_);
     /// Puts a batch back that was refused, before what was added to its successor meanwhile.
@@ -104,11 +113,22 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     /// Sends one as its row holds it, or as it is open here if that has more.
     void handOverTerminated(UploadBatchEntity batch) CORVANE_REQUIRES(*accessQueue_);
     /// Takes a part that was handed over by its row out of its open batch, if it is in one.
-    void takeOut(const std::string& identifier, const DocumentHandOver::Removal& removal)
+    void takeOut(const UploadBatchEntity& batch, const DocumentHandOver::Removal& removal)
         CORVANE_REQUIRES(*accessQueue_);
+
+    /// Drops all that is here when everything is to be forgotten that was recorded before now. Returns what of it was
+    /// in no row; nothing when there is nothing to forget.
+    std::optional<ForgottenRecords> dropForgotten() CORVANE_REQUIRES(*accessQueue_);
+    /// Whether a row's batch is one of those here.
+    [[nodiscard]] bool isOpen(const std::string& identifier) CORVANE_REQUIRES(*accessQueue_);
+    /// Looks how much there is in rows of earlier runs and other processes.
+    void countOthers() CORVANE_REQUIRES(*accessQueue_);
+    /// Tells the book what is here.
+    void publish() CORVANE_REQUIRES(*accessQueue_);
 
     // Constant after construction.
     const std::shared_ptr<DeliveryLedger> ledger_;
+    const std::shared_ptr<LedgerBook> book_;
     const std::shared_ptr<UploadManagerType> uploadManager_;
     const std::shared_ptr<DeferredStore<UploadBatchEntity>> deferredStore_;
     const UploadBatchEventConfig config_;
@@ -129,6 +149,10 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     // A row could not be written; once one can, all are.
     bool backupsAreBehind_ CORVANE_GUARDED_BY(*accessQueue_) = false;
     bool writesAtEndOfRun_ CORVANE_GUARDED_BY(*accessQueue_) = false;
+    // In which all that is here was recorded.
+    std::int64_t epoch_ CORVANE_GUARDED_BY(*accessQueue_) = 0;
+    // What became of the events of this run.
+    LedgerBook::Batches counts_ CORVANE_GUARDED_BY(*accessQueue_);
 };
 
 }  // namespace corvane

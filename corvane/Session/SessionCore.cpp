@@ -90,6 +90,10 @@ void SessionCore::process(const ProcessEvent& event) {
     processorManager_->process(event);
 }
 
+void SessionCore::didReject(const RejectedEvent& event) {
+    processorManager_->didReject(event);
+}
+
 void SessionCore::addSessionObserver(std::shared_ptr<SessionObserver> observer) {
     accessQueue_->async([self = shared_from_this(), observer = std::move(observer)]() mutable {
         self->addSessionObserverNow(std::move(observer));

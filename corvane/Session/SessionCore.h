@@ -52,6 +52,7 @@ class SessionCore final : public TrackerDelegate,
     // TrackerDelegate
     [[nodiscard]] const ActiveSessionType* activeSession() const override;
     void process(const ProcessEvent& event) override;
+    void didReject(const RejectedEvent& event) override;
     void addSessionObserver(std::shared_ptr<SessionObserver> observer) override;
     void addSessionObserverNow(std::shared_ptr<SessionObserver> observer) override;
     void removeSessionObservers(std::weak_ptr<const void> object) override;

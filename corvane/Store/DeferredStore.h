@@ -58,6 +58,27 @@ class DeferredStore {
         });
     }
 
+    /// Inside `perform`: calls `operations` in a transaction that finds nothing of an earlier epoch in the table. What
+    /// they do is done all or not at all, and no other process writes, or begins an epoch that was not seen, before.
+    template <class Operations>
+    void transaction(Store<Entity>& store, Operations&& operations) {
+        const auto epoch = core_->epoch();
+        try {
+            store.transaction([&] {
+                core_->keepUp();
+                operations();
+            });
+        } catch (...) {
+            core_->restoreEpoch(epoch);
+            throw;
+        }
+    }
+    /// `perform` of one such transaction.
+    template <class Operation>
+    void change(Operation&& operation) {
+        perform([&](Store<Entity>& store) { transaction(store, [&] { operation(store); }); });
+    }
+
     /// Whether a transaction on `connection` holds for this store too: both are on one file. Requires: on the shared
     /// queue, as inside another store's `perform`.
     [[nodiscard]] bool sharesFileWith(const StoreConnection& connection) const {

@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/RecordingSwitch.h>
+#include <corvane/Store/EpochEntity.h>
 #include <corvane/Store/Store.h>
 #include <corvane/Store/VersionEntity.h>
 
@@ -108,7 +109,32 @@ const std::shared_ptr<StoreConnection>& DeferredStoreCore::connection() {
         lost_ = connection_->location();
         makeAnew();
     }
+    if (RecordingSwitch::epoch() > epoch_) {
+        connection_->transaction([this] {
+            queue().assertCurrent("DeferredStoreCore::connection");
+            keepUp();
+        });
+    }
     return connection_;
+}
+
+void DeferredStoreCore::keepUp() {
+    queue().assertCurrent("DeferredStoreCore::keepUp");
+    RecordingSwitch::look();
+    const auto epoch = RecordingSwitch::epoch();
+    if (epoch <= epoch_) return;
+    forgetBefore(epoch, connection_, table_);
+    epoch_ = epoch;
+}
+
+std::int64_t DeferredStoreCore::epoch() const {
+    queue().assertCurrent("DeferredStoreCore::epoch");
+    return epoch_;
+}
+
+void DeferredStoreCore::restoreEpoch(std::int64_t epoch) {
+    queue().assertCurrent("DeferredStoreCore::restoreEpoch");
+    epoch_ = epoch;
 }
 
 // With its version and its table: a table without its version would be dropped, rows and all, by the next run.
@@ -120,7 +146,8 @@ void DeferredStoreCore::makeAnew() {
     } catch (const std::exception& error) {
         connection_ = fallBack(table_, error);
     }
-    connection_->run(table_.createSQL());
+    connection_->createTable(table_);
+    epoch_ = 0;
     if (!wasOpen) connection_->close();
 }
 

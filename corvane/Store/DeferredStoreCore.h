@@ -49,6 +49,13 @@ class DeferredStoreCore {
     /// The connection to use now. When its file has been removed or replaced, it is made anew first, with the table.
     /// Requires: on the queue. Throws `DeferredStoreError` noStore.
     [[nodiscard]] const std::shared_ptr<StoreConnection>& connection();
+    /// Drops what the table holds of earlier epochs, as of now. Inside a transaction on the connection, so that nothing
+    /// of an earlier epoch is written behind another process's back. Requires: on the queue. Throws `StoreError`.
+    void keepUp();
+    /// The epoch up to which the table is known to have forgotten; a transaction that fails puts it back. Requires: on
+    /// the queue.
+    [[nodiscard]] std::int64_t epoch() const;
+    void restoreEpoch(std::int64_t epoch);
     /// Whether the connection is to the same file as `other`. As it was used last: a file that was lost since is not
     /// made anew, which would wait for the transaction that asks. Requires: on the queue.
     [[nodiscard]] bool sharesFileWith(const StoreConnection& other) const;
@@ -67,6 +74,7 @@ class DeferredStoreCore {
     const std::int64_t schemaVersion_;
 
     std::shared_ptr<StoreConnection> connection_ CORVANE_GUARDED_BY(queue());
+    std::int64_t epoch_ CORVANE_GUARDED_BY(queue()) = 0;
     // Where the file was, when the last look found it gone.
     std::optional<StoreLocation> lost_ CORVANE_GUARDED_BY(queue());
 };

@@ -19,6 +19,7 @@ namespace corvane {
 ///         static std::vector<StoreColumn> columns();         // in table order
 ///         StorableValue storableValue(std::string_view columnName) const;
 ///         static Note read(StoreStepper& stepper);           // reads the columns in table order; may throw
+///         static StoreTableExtras extras();                // optional
 ///     };
 template <class Entity>
 concept Storable = requires(const Entity& entity, std::string_view columnName, StoreStepper& stepper) {

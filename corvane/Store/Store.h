@@ -4,6 +4,7 @@
 #include <corvane/Store/StoreConnection.h>
 #include <corvane/Store/StoreTable.h>
 
+#include <cstdint>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -39,18 +40,16 @@ class Store {
     void close() { connection_->close(); }
     [[nodiscard]] bool isOpen() const { return connection_->isOpen(); }
 
-    /// Creates the table unless it is there.
-    void createTable() { connection_->run(table().createSQL()); }
+    /// Creates the table, and its companions, unless they are there.
+    void createTable() { connection_->createTable(table()); }
     /// Drops the table if it is there.
     void dropTable() { connection_->run(table().dropSQL()); }
 
     /// Writes a record, in place of one with the same key.
-    void insert(const Entity& entity) {
-        std::vector<StorableValue> values;
-        values.reserve(table().columns().size());
-        for (const auto& column : table().columns()) values.push_back(entity.storableValue(column.name));
-        connection_->run(table().insertSQL(values));
-    }
+    void insert(const Entity& entity) { connection_->run(table().insertSQL(values(entity))); }
+
+    /// Writes a record, or adds its numbers to those of the one with the same key.
+    void add(const Entity& entity) { connection_->run(table().addSQL(values(entity))); }
 
     /// All records, in no particular order. A record that cannot be read fails the whole call with its error.
     [[nodiscard]] std::vector<Entity> fetchAll() { return fetch(table().selectSQL()); }
@@ -71,6 +70,20 @@ class Store {
         connection_->run(table().deleteSQL(column, value));
     }
 
+    /// Deletes the records whose `column` equals `value`, and returns them.
+    [[nodiscard]] std::vector<Entity> takeWhere(std::string_view column, const StorableValue& value) {
+        return fetch(table().takeSQL(column, value));
+    }
+    /// The number of records, and the sums of their columns of type INTEGER, in table order.
+    [[nodiscard]] std::vector<std::int64_t> sums() {
+        std::vector<std::int64_t> sums(1);
+        for (const auto& column : table().columns()) sums.resize(sums.size() + (column.type == "INTEGER" ? 1 : 0));
+        connection_->query(table().sumsSQL(), [&](StoreStepper& stepper) {
+            for (auto& sum : sums) sum = stepper.integer();
+        });
+        return sums;
+    }
+
     /// Calls `operations`: what they do here is done all or not at all, and no other process writes in between. What
     /// they throw undoes them and comes through.
     template <class Operations>
@@ -83,11 +96,24 @@ class Store {
 
     /// The entity's table and its statements.
     [[nodiscard]] static const StoreTable& table() {
-        static const auto& table = *new StoreTable(Entity::tableName, Entity::columns());
+        static const auto& table = *new StoreTable(makeTable());
         return table;
     }
 
   private:
+    static StoreTable makeTable() {
+        if constexpr (requires { Entity::extras(); }) {
+            return {Entity::tableName, Entity::columns(), Entity::extras()};
+        } else {
+            return {Entity::tableName, Entity::columns()};
+        }
+    }
+    static std::vector<StorableValue> values(const Entity& entity) {
+        std::vector<StorableValue> values;
+        values.reserve(table().columns().size());
+        for (const auto& column : table().columns()) values.push_back(entity.storableValue(column.name));
+        return values;
+    }
     std::vector<Entity> fetch(const std::string& sql) {
         std::vector<Entity> entities;
         connection_->query(sql, [&](StoreStepper& stepper) { entities.push_back(Entity::read(stepper)); });

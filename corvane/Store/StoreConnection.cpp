@@ -49,6 +49,7 @@ void precreatePrivately(const std::string& path) {
 
 struct StoreConnection::Handle {
     Database database;
+    Statement begin = nullptr, commit = nullptr;  // kept: every write is in a transaction
 };
 
 /// Opens a closed connection for its own lifetime.
@@ -75,6 +76,26 @@ class StoreConnection::OnDemand {
         if (result == SQLITE_BUSY) connection_.setPatient(false);
         if (result != SQLITE_OK) throw StoreError::makePrepare(sql, sqlite3_errmsg(database()));
         return statement;
+    }
+
+    void run(sqlite3_stmt* statement) const {
+        int result = sqlite3_step(statement);
+        while (result == SQLITE_ROW) result = sqlite3_step(statement);  // of no interest
+        if (result == SQLITE_BUSY) connection_.setPatient(false);
+        if (result == SQLITE_DONE) connection_.setPatient(true);
+        if (result != SQLITE_DONE) throw StoreError::makeExecute(sqlite3_sql(statement), sqlite3_errmsg(database()));
+    }
+
+    /// Runs a statement that is kept for the next time.
+    void run(Statement& kept, const char* sql) const {
+        if (!kept) kept = prepare(sql);
+        try {
+            run(kept.get());
+            sqlite3_reset(kept.get());
+        } catch (...) {
+            kept.reset();
+            throw;
+        }
     }
 
   private:
@@ -114,7 +135,7 @@ void StoreConnection::open() {
     if (result != SQLITE_OK) {
         throw StoreError::makeCantOpen(location_, opened ? sqlite3_errmsg(opened) : sqlite3_errstr(result));
     }
-    handle_ = std::make_unique<Handle>(Handle{std::move(database)});
+    handle_ = std::make_unique<Handle>(Handle{.database = std::move(database)});
     if (location_.isMemory()) return;
     opened_ = fileIdentity();
     applyPatience();
@@ -164,11 +185,12 @@ bool StoreConnection::isOpen() const noexcept {
 
 void StoreConnection::run(const std::string& sql) {
     const OnDemand open(*this);
-    const Statement statement = open.prepare(sql);
-    const int result = sqlite3_step(statement.get());
-    if (result == SQLITE_BUSY) setPatient(false);
-    if (result == SQLITE_DONE) setPatient(true);
-    if (result != SQLITE_DONE) throw StoreError::makeExecute(sql, sqlite3_errmsg(open.database()));
+    open.run(open.prepare(sql).get());
+}
+
+void StoreConnection::createTable(const StoreTable& table) {
+    run(table.createSQL());
+    for (const auto& companion : table.extras().companions) run(companion);
 }
 
 void StoreConnection::query(const std::string& sql, const std::function<void(StoreStepper&)>& readRow) {
@@ -186,10 +208,10 @@ void StoreConnection::query(const std::string& sql, const std::function<void(Sto
 
 void StoreConnection::transaction(const std::function<void()>& statements) {
     const OnDemand open(*this);
-    run("BEGIN IMMEDIATE;");
+    open.run(handle_->begin, "BEGIN IMMEDIATE;");
     try {
         statements();
-        run("COMMIT;");
+        open.run(handle_->commit, "COMMIT;");
     } catch (...) {
         sqlite3_exec(open.database(), "ROLLBACK;", nullptr, nullptr, nullptr);
         throw;

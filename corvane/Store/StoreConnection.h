@@ -3,6 +3,7 @@
 #include <corvane/Store/StoreError.h>
 #include <corvane/Store/StoreLocation.h>
 #include <corvane/Store/StoreStepper.h>
+#include <corvane/Store/StoreTable.h>
 
 #include <chrono>
 #include <cstdint>
@@ -51,6 +52,8 @@ class StoreConnection {
 
     /// Runs a statement that changes something. Throws `StoreError`.
     void run(const std::string& sql);
+    /// Creates a table and its companions unless they are there. Throws `StoreError`.
+    void createTable(const StoreTable& table);
     /// Runs a query and calls `readRow` for every result row. Throws `StoreError`, or what `readRow` throws, which ends
     /// the query.
     void query(const std::string& sql, const std::function<void(StoreStepper&)>& readRow);

@@ -17,8 +17,8 @@ std::string comparison(std::string opening, std::string_view column, const Stora
 
 }  // namespace
 
-StoreTable::StoreTable(std::string_view name, std::vector<StoreColumn> columns)
-    : name_(name), columns_(std::move(columns)) {
+StoreTable::StoreTable(std::string_view name, std::vector<StoreColumn> columns, StoreTableExtras extras)
+    : name_(name), columns_(std::move(columns)), extras_(std::move(extras)) {
     insertOpening_ = "INSERT OR REPLACE INTO " + name_ + " (";
     const char* separator = "";
     for (const auto& column : columns_) {
@@ -46,6 +46,10 @@ std::string StoreTable::dropSQL() const {
     return "DROP TABLE IF EXISTS " + name_ + ";";
 }
 
+std::string StoreTable::deleteAllSQL() const {
+    return "DELETE FROM " + name_ + ";";
+}
+
 std::string StoreTable::insertSQL(const std::vector<StorableValue>& values) const {
     CORVANE_REQUIRE(values.size() == columns_.size(), "a row of " + name_ + " needs one value for each column");
     std::size_t size = insertOpening_.size() + 2;
@@ -66,17 +70,51 @@ std::string StoreTable::selectSQL() const {
     return "SELECT * FROM " + name_ + ";";
 }
 
-std::string StoreTable::keysSQL() const {
-    const auto key =
+const StoreColumn& StoreTable::key() const {
+    const auto found =
         std::find_if(columns_.begin(), columns_.end(), [](const StoreColumn& column) { return column.primary; });
-    CORVANE_REQUIRE(key != columns_.end(), "the table " + name_ + " has no key");
+    CORVANE_REQUIRE(found != columns_.end(), "the table " + name_ + " has no key");
+    return *found;
+}
+
+std::string StoreTable::addSQL(const std::vector<StorableValue>& values) const {
+    std::string sql = insertSQL(values);
+    constexpr std::string_view replace = " OR REPLACE";
+    sql.erase(sql.find(replace), replace.size());
+    sql.back() = ' ';  // the semicolon
+    sql.append("ON CONFLICT (").append(key().name).append(") DO UPDATE SET ");
+    const char* separator = "";
+    for (const auto& column : columns_) {
+        if (column.primary) continue;
+        sql.append(separator).append(column.name).append(" = ").append(column.name);
+        sql.append(" + excluded.").append(column.name);
+        separator = ", ";
+    }
+    return sql += ';';
+}
+
+std::string StoreTable::sumsSQL() const {
+    std::string sql = "SELECT count(*)";
+    for (const auto& column : columns_) {
+        if (column.type == "INTEGER") sql.append(", sum(").append(column.name).append(")");
+    }
+    return sql.append(" FROM ").append(name_).append(";");
+}
+
+std::string StoreTable::keysSQL() const {
     // The sign keeps the database from walking through the table, whose rows may be large: the key's index has all of
     // it.
-    return "SELECT " + key->name + " FROM " + name_ + " ORDER BY +rowid;";
+    return "SELECT " + key().name + " FROM " + name_ + " ORDER BY +rowid;";
 }
 
 std::string StoreTable::selectSQL(std::string_view column, const StorableValue& value) const {
     return comparison("SELECT * FROM " + name_ + " WHERE ", column, value);
+}
+
+std::string StoreTable::takeSQL(std::string_view column, const StorableValue& value) const {
+    auto sql = deleteSQL(column, value);
+    sql.back() = ' ';  // the semicolon
+    return sql += "RETURNING *;";
 }
 
 std::string StoreTable::deleteSQL(std::string_view column, const StorableValue& value) const {

@@ -55,6 +55,28 @@ void FakeTransferSession::Task::resume() {
     session->complete(number_, *std::move(outcome));
 }
 
+void FakeTransferSession::Task::cancel() {
+    {
+        std::lock_guard lock(mutex_);
+        const bool isFirst = !std::exchange(wasCancelled_, true);
+        if (!isFirst || state_ == State::completed) return;
+        state_ = State::cancelling;
+    }
+    const auto session = session_.lock();
+    if (!session) return;
+    std::optional<Outcome> outcome;
+    {
+        std::lock_guard lock(session->mutex_);
+        outcome = session->cancelOutcome_;
+    }
+    if (outcome) session->end(session->task(number_), *std::move(outcome), false);
+}
+
+bool FakeTransferSession::Task::wasCancelled() const {
+    std::lock_guard lock(mutex_);
+    return wasCancelled_;
+}
+
 TransferSession::Factory FakeTransferSession::factory(std::shared_ptr<FakeTransferSession>& opened,
                                                       std::vector<Outcome> script) {
     return [&opened, script = std::move(script)](auto given, auto delegate, auto queue) {
@@ -76,11 +98,20 @@ void FakeTransferSession::script(const Outcome& outcome, int times) {
     script_.insert(script_.end(), static_cast<std::size_t>(times), outcome);
 }
 
+void FakeTransferSession::scriptCancel(std::optional<Outcome> outcome) {
+    std::lock_guard lock(mutex_);
+    cancelOutcome_ = std::move(outcome);
+}
+
 void FakeTransferSession::complete(std::int64_t identifier, Outcome outcome) {
+    end(task(identifier), std::move(outcome), true);
+}
+
+void FakeTransferSession::end(std::shared_ptr<Task> task, Outcome outcome, bool evenCompleted) {
     // The session may be gone when the queue comes to it: then nothing is reported, as the real ones keep it.
-    queue_->async([session = weak_from_this(), ended = task(identifier), outcome = std::move(outcome)] {
+    queue_->async([session = weak_from_this(), ended = std::move(task), outcome = std::move(outcome), evenCompleted] {
         const auto open = session.lock();
-        if (!open) return;
+        if (!open || (!evenCompleted && ended->state() == TransferTask::State::completed)) return;
         if (const auto delegate = open->delegate_.lock()) {
             delegate->taskDidComplete(*ended, outcome.error, outcome.response);
         }

@@ -52,6 +52,10 @@ class FakeTransferSession final : public TransferSession, public std::enable_sha
         void setDescription(std::string description) override;
         /// Takes the next scripted outcome, if one is left.
         void resume() override;
+        /// The task is cancelling, and ends as `scriptCancel` says; one that is over stays as it is.
+        void cancel() override;
+        /// Whether `cancel` was called, also when it came too late.
+        [[nodiscard]] bool wasCancelled() const;
         /// Puts the task into a state, as another process or a lost agent could have.
         void setState(State state);
 
@@ -65,6 +69,7 @@ class FakeTransferSession final : public TransferSession, public std::enable_sha
         const std::int64_t number_;
         mutable std::mutex mutex_;
         State state_ = State::suspended;
+        bool wasCancelled_ = false;
         std::optional<std::string> description_;
         std::atomic<std::int64_t> sent_ = 0;  // as was reported
     };
@@ -78,6 +83,9 @@ class FakeTransferSession final : public TransferSession, public std::enable_sha
 
     /// The next tasks that are resumed end so, one each, by themselves; those behind the end of the script run on.
     void script(const Outcome& outcome, int times = 1);
+    /// Tasks that are cancelled end so, unless they are over when the queue comes to it; with nothing they go on
+    /// cancelling until `complete` ends them. As `TransferError` cancelled by default.
+    void scriptCancel(std::optional<Outcome> outcome);
     /// Ends a task, whatever its state; the delegate is told on the queue. Throws `std::out_of_range` for a task that
     /// was not made.
     void complete(std::int64_t identifier, Outcome outcome);
@@ -108,12 +116,15 @@ class FakeTransferSession final : public TransferSession, public std::enable_sha
     const TransferSessionConfiguration configuration;
 
   private:
+    void end(std::shared_ptr<Task> task, Outcome outcome, bool evenCompleted);
+
     const std::weak_ptr<TransferSessionDelegate> delegate_;
     const std::shared_ptr<SerialQueue> queue_;
     mutable std::mutex mutex_;
     mutable std::condition_variable changed_;
     std::vector<std::shared_ptr<Task>> made_;
     std::deque<Outcome> script_;
+    std::optional<Outcome> cancelOutcome_ = Outcome::failure(TransferError::Code::cancelled);
     int wakeUps_ = 0;
     std::optional<std::string> description_;
 };

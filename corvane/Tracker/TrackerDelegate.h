@@ -9,6 +9,7 @@ namespace corvane {
 
 class ActiveSessionType;
 class SessionObserver;
+struct RejectedEvent;
 
 /// Who receives what trackers make: the session manager. Unless said otherwise, called on the trackers' queue.
 class TrackerDelegate {
@@ -18,6 +19,7 @@ class TrackerDelegate {
     /// The active session, or nullptr. Good until the queue's task ends.
     [[nodiscard]] virtual const ActiveSessionType* activeSession() const = 0;
     virtual void process(const ProcessEvent& event) = 0;
+    virtual void didReject(const RejectedEvent& event) = 0;
 
     /// Registers an observer. Any thread; takes effect on the queue.
     virtual void addSessionObserver(std::shared_ptr<SessionObserver> observer) = 0;

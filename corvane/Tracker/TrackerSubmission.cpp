@@ -3,6 +3,7 @@
 #include <corvane/Tracker/Tracker.h>
 
 #include <corvane/Models/EventData.h>
+#include <corvane/Models/RejectedEvent.h>
 #include <corvane/Platform/HostCall.h>
 #include <corvane/Platform/JSONText.h>
 #include <corvane/Platform/RecordingSwitch.h>
@@ -14,6 +15,21 @@
 #include <utility>
 
 namespace corvane {
+
+namespace {
+
+RejectedEvent::Reason rejectionReason(const AnyError& error) {
+    using Reason = RejectedEvent::Reason;
+    if (error.as<EncodingError>()) return Reason::encoding;
+    const auto* own = error.as<TrackerError>();
+    if (!own) return Reason::other;
+    const auto code = own->value();
+    return code == TrackerError::noSession      ? Reason::noSession
+           : code == TrackerError::notRecording ? Reason::notRecording
+                                                : Reason::missingData;
+}
+
+}  // namespace
 
 void Tracker::submit(EventSubmit event, Date submitTime, SubmitOptions options) {
     accessQueue_->asyncInRun([self = shared_from_this(), event = std::move(event), submitTime,
@@ -58,14 +74,16 @@ void Tracker::submitNow(const EventSubmit& event, Date submitTime, const SubmitO
 EventSubmitResult Tracker::performSubmit(const EventSubmit& event, Date submitTime, bool isRecorded) {
     const auto delegate = delegate_.lock();
     const ActiveSessionType* session = delegate ? delegate->activeSession() : nullptr;
-    if (!session) return EventSubmitResult::failed(AnyError(TrackerError::withoutSession()));
-    if (!isRecorded || !RecordingSwitch::isOn()) {
-        return EventSubmitResult::failed(AnyError(TrackerError::withoutRecording()));
-    }
+    const auto rejected = [&](AnyError error) {
+        if (delegate) delegate->didReject({event.name(), rejectionReason(error), error});
+        return EventSubmitResult::failed(std::move(error));
+    };
+    if (!session) return rejected(AnyError(TrackerError::withoutSession()));
+    if (!isRecorded || !RecordingSwitch::isOn()) return rejected(AnyError(TrackerError::withoutRecording()));
     try {
         return EventSubmitResult::success(process(event, submitTime, *delegate, session->identifier()));
     } catch (...) {
-        return EventSubmitResult::failed(AnyError::current());
+        return rejected(AnyError::current());
     }
 }
 

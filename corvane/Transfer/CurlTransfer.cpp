@@ -4,6 +4,7 @@
 
 #include <curl/curl.h>
 #include <fcntl.h>
+#include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -22,6 +23,8 @@ using Code = TransferError::Code;
 
 // More than any server has to say, and little enough to keep for every transfer.
 constexpr std::size_t longestHead = std::size_t{256} * 1024;
+
+thread_local bool dropsUnsent = false;
 
 bool isToken(std::string_view text) {
     return !text.empty() && std::all_of(text.begin(), text.end(), [](char c) {
@@ -108,6 +111,7 @@ void CurlTransfer::setOptions(const HTTPTransfer& transfer) {
     curl_easy_setopt(easy, CURLOPT_SSL_VERIFYPEER, 1L);
     curl_easy_setopt(easy, CURLOPT_SSL_VERIFYHOST, 2L);
     curl_easy_setopt(easy, CURLOPT_NOSIGNAL, 1L);
+    curl_easy_setopt(easy, CURLOPT_CLOSESOCKETFUNCTION, &closeSocket);
     // A name that is still being looked up must not hold up the thread when its transfer is dropped.
     curl_easy_setopt(easy, CURLOPT_QUICK_EXIT, 1L);
     curl_easy_setopt(easy, CURLOPT_CONNECTTIMEOUT_MS, static_cast<long>(limits_.timeWithoutProgress.count()));
@@ -150,6 +154,21 @@ void CurlTransfer::setProxy(const TransferProxy& proxy, bool isLoopback) {
     if (!isLoopback) proxy_ = proxy.url;
     curl_easy_setopt(easy_.get(), CURLOPT_PROXY, proxy_.c_str());
     curl_easy_setopt(easy_.get(), CURLOPT_NOPROXY, proxy.exceptions.c_str());
+}
+
+CurlTransfer::UnsentIsDropped::UnsentIsDropped() noexcept {
+    dropsUnsent = true;
+}
+CurlTransfer::UnsentIsDropped::~UnsentIsDropped() {
+    dropsUnsent = false;
+}
+
+// Of every connection, since a transfer may have one that another has made. Those that HTTP/2 transfers share stay
+// open.
+int CurlTransfer::closeSocket(void* /*self*/, int socket) noexcept {
+    constexpr linger none{1, 0};
+    if (dropsUnsent) setsockopt(socket, SOL_SOCKET, SO_LINGER, &none, sizeof none);
+    return close(socket);
 }
 
 void CurlTransfer::update(Clock::time_point now) {

@@ -30,6 +30,16 @@ class CurlTransfer {
     /// A handle as libcurl makes it, or as one that has done its work is set back.
     using Easy = std::unique_ptr<void, EasyDeleter>;
 
+    /// While it lives, the system drops what it has still to send on a connection that this thread has curl close: it
+    /// would go out to the last byte.
+    class UnsentIsDropped {
+      public:
+        UnsentIsDropped() noexcept;
+        UnsentIsDropped(const UnsentIsDropped&) = delete;
+        UnsentIsDropped& operator=(const UnsentIsDropped&) = delete;
+        ~UnsentIsDropped();
+    };
+
     /// Opens the body file and sets a handle up: `spare`, or one of its own. Throws `TransferError`.
     explicit CurlTransfer(const HTTPTransfer& transfer, Easy spare = nullptr);
     CurlTransfer(const CurlTransfer&) = delete;
@@ -69,6 +79,7 @@ class CurlTransfer {
     void reportSent(std::int64_t sent) const noexcept;
     void takeHeader(std::string_view line);
 
+    static int closeSocket(void* self, int socket) noexcept;
     static std::size_t readBody(char* buffer, std::size_t size, std::size_t count, void* self) noexcept;
     static int seekBody(void* self, std::int64_t offset, int origin) noexcept;
     static std::size_t headerArrived(char* data, std::size_t size, std::size_t count, void* self) noexcept;

@@ -29,7 +29,7 @@ struct HTTPTransfer {
     std::string pool;
     /// The bytes of the body that have gone out so far and its size, whenever the first has grown. May be empty.
     std::function<void(std::int64_t total, std::int64_t expected)> didSend;
-    /// The end; called once, unless the transfer is cancelled or the process exits before.
+    /// The end; called once, unless the process exits before.
     std::function<void(TransferOutcome outcome)> didComplete;
 };
 

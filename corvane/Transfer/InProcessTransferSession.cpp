@@ -46,12 +46,14 @@ class InProcessTransferSession::UploadTask final : public SessionTask, public st
         return state_;
     }
     void resume() override;
+    void cancel() override;
     void complete() override;
     /// Ends the task with its session. Returns the ticket of a transfer that is to be dropped, or 0.
     TransferThread::Ticket close();
 
   private:
     HTTPTransfer transfer(const Core& core) CORVANE_REQUIRES(mutex_);
+    static void reportEnd(std::shared_ptr<UploadTask> task, std::shared_ptr<Core> core, TransferOutcome outcome);
 
     const std::weak_ptr<Core> core_;
 
@@ -71,6 +73,16 @@ void InProcessTransferSession::UploadTask::resume() {
     ticket_ = TransferThread::start(transfer(*core));
 }
 
+void InProcessTransferSession::UploadTask::cancel() {
+    auto core = core_.lock();
+    if (!core) return;
+    Lock lock(mutex_);
+    if (state_ != State::suspended && state_ != State::running) return;
+    const bool isStarted = std::exchange(state_, State::cancelling) == State::running;
+    if (!isStarted) reportEnd(shared_from_this(), std::move(core), cancelledOutcome());
+    if (ticket_ != 0) TransferThread::cancel({ticket_});
+}
+
 void InProcessTransferSession::UploadTask::complete() {
     close();
     if (const auto core = core_.lock()) core->remove(identifier());
@@ -78,7 +90,7 @@ void InProcessTransferSession::UploadTask::complete() {
 
 TransferThread::Ticket InProcessTransferSession::UploadTask::close() {
     Lock lock(mutex_);
-    return std::exchange(state_, State::completed) == State::running ? ticket_ : 0;
+    return std::exchange(state_, State::completed) == State::completed ? 0 : ticket_;
 }
 
 HTTPTransfer InProcessTransferSession::UploadTask::transfer(const Core& core) {
@@ -97,16 +109,20 @@ HTTPTransfer InProcessTransferSession::UploadTask::transfer(const Core& core) {
     transfer.didComplete = [self = weak_from_this(), weakCore = core_](TransferOutcome outcome) {
         auto task = self.lock();
         auto owner = weakCore.lock();
-        if (!task || !owner) return;
-        const auto reporter = owner->reporter;  // the session may be gone before the call is back
-        // Nobody else would ever end a task whose delegate has gone.
-        auto afterwards = [task, owner = std::move(owner)](bool isTold) {
-            if (!isTold) task->complete();
-        };
-        reporter->enqueueEnd(std::move(task), &TransferSessionDelegate::taskDidComplete, std::move(outcome),
-                             std::move(afterwards));
+        if (task && owner) reportEnd(std::move(task), std::move(owner), std::move(outcome));
     };
     return transfer;
+}
+
+void InProcessTransferSession::UploadTask::reportEnd(std::shared_ptr<UploadTask> task, std::shared_ptr<Core> core,
+                                                     TransferOutcome outcome) {
+    const auto reporter = core->reporter;  // the session may be gone before the call is back
+    // Nobody else would ever end a task whose delegate has gone.
+    auto afterwards = [task, core = std::move(core)](bool isTold) {
+        if (!isTold) task->complete();
+    };
+    reporter->enqueueEnd(std::move(task), &TransferSessionDelegate::taskDidComplete, std::move(outcome),
+                         std::move(afterwards));
 }
 
 std::shared_ptr<InProcessTransferSession::UploadTask> InProcessTransferSession::Core::add(TransferRequest request,

@@ -18,6 +18,7 @@ class CORVANE_EXPORT TransferError : public Error {
         unreachable,      ///< no name or no connection: nothing was sent
         blocked,          ///< no trusted connection: a certificate that does not verify, a TLS handshake that fails, or
                           ///< a proxy that refuses; nothing of the body reached the server
+        cancelled,        ///< `TransferTask::cancel` has stopped it; the server may have got the body all the same
     };
 
     TransferError(Code code, std::string message);

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Platform/Error.h>
+#include <corvane/Transfer/TransferError.h>
 #include <corvane/Transfer/TransferRequest.h>
 
 #include <optional>
@@ -14,5 +15,10 @@ struct TransferOutcome {
     /// The head of the answer; it may be there beside an error, when the connection broke inside the answer's body.
     std::optional<TransferResponse> response = {};
 };
+
+/// That of a transfer whose task was cancelled.
+[[nodiscard]] inline TransferOutcome cancelledOutcome() {
+    return {AnyError(TransferError(TransferError::Code::cancelled, "the transfer was cancelled")), std::nullopt};
+}
 
 }  // namespace corvane

@@ -18,7 +18,11 @@ void TransferQueue::start(Ticket ticket, HTTPTransfer transfer) {
 
 void TransferQueue::cancel(const std::set<Ticket>& tickets) {
     for (auto& [name, host] : hosts_) {
-        std::erase_if(host.waiting, [&](const Waiting& one) { return tickets.contains(one.ticket); });
+        std::erase_if(host.waiting, [&](const Waiting& one) {
+            const bool isMeant = tickets.contains(one.ticket);
+            if (isMeant) TransferScheduler::reportCancelled(one.transfer);
+            return isMeant;
+        });
     }
     scheduler_.cancel(tickets);
 }

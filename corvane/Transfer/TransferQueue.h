@@ -22,7 +22,8 @@ class TransferQueue {
     /// Lets a transfer run when its turn has come, in `perform`. One that cannot be taken is reported at once.
     /// Requires: the ticket is not in use.
     void start(Ticket ticket, HTTPTransfer transfer);
-    /// Drops transfers without reporting them; tickets that are not in use are left alone.
+    /// Stops transfers, which then have ended with `TransferError` cancelled; tickets that are not in use are left
+    /// alone.
     void cancel(const std::set<Ticket>& tickets);
     /// Does what can be done without waiting, and reports the transfers that ended.
     void perform();

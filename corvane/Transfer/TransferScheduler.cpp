@@ -71,6 +71,10 @@ void TransferScheduler::reportFailure(const HTTPTransfer& transfer) noexcept {
     callHost("transfer completion", [&] { transfer.didComplete({AnyError::current(), std::nullopt}); });
 }
 
+void TransferScheduler::reportCancelled(const HTTPTransfer& transfer) noexcept {
+    callHost("transfer completion", [&] { transfer.didComplete(cancelledOutcome()); });
+}
+
 void TransferScheduler::perform() {
     int stillRunning = 0;
     curl_multi_perform(multi_.get(), &stillRunning);
@@ -103,10 +107,12 @@ void TransferScheduler::wakeUp() noexcept {
 }
 
 void TransferScheduler::cancel(const std::set<Ticket>& tickets) {
-    const auto dropped = [&tickets](const Running& one) { return tickets.contains(one.ticket); };
+    const auto isMeant = [&tickets](const Running& one) { return tickets.contains(one.ticket); };
     for (auto found = running_.end();
-         (found = std::find_if(running_.begin(), running_.end(), dropped)) != running_.end();) {
-        takeOut(found);
+         (found = std::find_if(running_.begin(), running_.end(), isMeant)) != running_.end();) {
+        const CurlTransfer::UnsentIsDropped dropped;
+        const Running ended = takeOut(found);
+        finish(ended, [] { return cancelledOutcome().error; });
     }
 }
 

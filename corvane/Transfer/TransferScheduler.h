@@ -41,7 +41,8 @@ class TransferScheduler {
     /// is not in use.
     bool start(Ticket ticket, HTTPTransfer transfer);
 
-    /// Drops transfers without reporting them; tickets that are not in use are left alone.
+    /// Stops transfers, which then have ended with `TransferError` cancelled; tickets that are not in use are left
+    /// alone.
     void cancel(const std::set<Ticket>& tickets);
 
     /// Does what can be done without waiting, and reports the transfers that ended.
@@ -62,6 +63,8 @@ class TransferScheduler {
     /// Reports the exception that is being handled as a transfer's end: one that never ends would be worse than one
     /// whose ending there is no memory for. Requires: called inside a `catch` block.
     static void reportFailure(const HTTPTransfer& transfer) noexcept;
+    /// Reports that a transfer was cancelled before it started.
+    static void reportCancelled(const HTTPTransfer& transfer) noexcept;
 
   private:
     struct Running {

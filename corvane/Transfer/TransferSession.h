@@ -44,6 +44,16 @@ class CORVANE_EXPORT TransferTask {
     /// Starts a suspended task; a task in another state stays as it is. Failures of any kind are reported through the
     /// delegate, later.
     virtual void resume() = 0;
+
+    /// Stops the task, and returns at once. A task that is not over yet completes through the delegate, once: with
+    /// `TransferError` cancelled, and from then on nothing of its body is sent, or with what it had come to by then.
+    /// One that was never resumed completes with cancelled too, and does not run any more. Until the completion
+    /// callback has returned, the task's state is `cancelling`. A task that is over, or whose session has gone, stays
+    /// as it is.
+    ///
+    /// Does nothing by default, for sessions of a host's own that cannot stop their tasks: these then end as they would
+    /// have without.
+    virtual void cancel() {}
 };
 
 /// Whoever a transfer session reports to. The session holds it weakly; every callback runs on the session's queue,
@@ -59,16 +69,17 @@ class CORVANE_EXPORT TransferSessionDelegate {
     virtual void taskDidSendBodyData(const TransferTask& task, std::int64_t sent, std::int64_t total,
                                      std::int64_t expected) = 0;
 
-    /// A task is over; called once for every resumed task, as the last callback about it. Until it returns the task
-    /// counts as running.
+    /// A task is over; called once for every task that was resumed or cancelled, as the last callback about it. Until
+    /// it returns the task counts as running, or as cancelling.
     /// @param error what went wrong, a `TransferError` as a rule; nothing when the server's answer is in.
     /// @param response the head of the answer. It may be there beside an error, when the connection broke inside the
     ///        answer's body.
     virtual void taskDidComplete(const TransferTask& task, const std::optional<AnyError>& error,
                                  const std::optional<TransferResponse>& response) = 0;
 
-    /// A task is over, and the session of another process, of the same owner, was told by `taskDidComplete`: nothing is
-    /// left to do for it here. Sessions outside the process only. Does nothing by default.
+    /// A task is over, and the session of another process, of the same owner, was told by `taskDidComplete`, or what it
+    /// sent was discarded: nothing is left to do for it here. Sessions outside the process only. Does nothing by
+    /// default.
     /// @param error also when how the task ended is not known here, because that process has taken it over.
     virtual void taskDidEndElsewhere(const TransferTask& /*task*/, const std::optional<AnyError>& /*error*/,
                                      const std::optional<TransferResponse>& /*response*/) {}

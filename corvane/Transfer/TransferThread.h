@@ -21,9 +21,8 @@ class TransferThread {
     /// Hands a transfer over. Failures of any kind, to start the thread too, end up in its `didComplete`.
     static Ticket start(HTTPTransfer transfer);
 
-    /// Drops transfers, all at once, as soon as the thread gets to it; until then they may still be heard of, so
-    /// whoever cancels also stops listening. Transfers that are over are left alone. Requires: tickets that `start`
-    /// gave, other than 0.
+    /// Stops transfers, all at once, as soon as the thread gets to it: they then have ended with `TransferError`
+    /// cancelled. Transfers that are over are left alone. Requires: tickets that `start` gave, other than 0.
     static void cancel(const std::vector<Ticket>& tickets);
 };
 

@@ -2,7 +2,9 @@
 
 #include <algorithm>
 #include <limits>
+#include <string>
 #include <utility>
+#include <vector>
 
 namespace corvane {
 
@@ -100,7 +102,7 @@ void DeliveryLedger::settle(std::string_view identifier, Outcome outcome, const 
         if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) {
             fold(found, outcome);
             const auto followed = followed_.find(identifier);
-            if (followed != followed_.end()) followed->second = outcome;
+            if (followed != followed_.end()) followed->second = Settled{outcome, cause};
         } else if (const auto again = pending_.find(identifier); again != pending_.end()) {
             again->second.isUnderWay = false;
             if (outcome != Outcome::pending) {
@@ -120,6 +122,16 @@ void DeliveryLedger::fold(Documents::iterator document, Outcome outcome) {
     } else {
         addTo(countOf(totals_, outcome), settled.mapped().events);
     }
+}
+
+void DeliveryLedger::settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause) {
+    std::vector<std::string> identifiers;
+    {
+        const Lock lock(mutex_);
+        for (const auto& [identifier, document] : onTheirWay_) identifiers.push_back(identifier);
+        for (const auto& [identifier, document] : pending_) identifiers.push_back(identifier);
+    }
+    for (const auto& identifier : identifiers) settle(identifier, outcome, cause);
 }
 
 void DeliveryLedger::noteServer(DeliveryUpdate::Reason reason) {
@@ -160,13 +172,13 @@ void DeliveryLedger::unfollow(std::string_view identifier) {
     if (const auto found = followed_.find(identifier); found != followed_.end()) followed_.erase(found);
 }
 
-std::optional<DeliveryLedger::Outcome> DeliveryLedger::takeOutcome(std::string_view identifier) {
+std::optional<DeliveryLedger::Settled> DeliveryLedger::takeOutcome(std::string_view identifier) {
     const Lock lock(mutex_);
     const auto found = followed_.find(identifier);
     if (found == followed_.end() || !found->second) return std::nullopt;
-    const auto outcome = found->second;
+    const auto settled = found->second;
     followed_.erase(found);
-    return outcome;
+    return settled;
 }
 
 DeliveryReport DeliveryLedger::reportLocked() const {

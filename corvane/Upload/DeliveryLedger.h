@@ -54,6 +54,8 @@ class DeliveryLedger {
     /// Settles a document, for good unless it is pending and `keepPending` was called. The observer is told also of one
     /// that is not there, which is otherwise harmless.
     void settle(std::string_view identifier, Outcome outcome, const DeliveryUpdate::Cause& cause = {});
+    /// Settles every document that is on its way.
+    void settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause);
     /// Notes that the transfer session holds all uploads up because their server cannot be reached, or no longer.
     void holdUp(bool lasts);
 
@@ -61,8 +63,12 @@ class DeliveryLedger {
     /// (any more).
     bool follow(std::string_view identifier);
     void unfollow(std::string_view identifier);
+    struct Settled {
+        Outcome outcome = Outcome::pending;
+        DeliveryUpdate::Cause cause;
+    };
     /// The outcome of a document that was followed, once, when there is one.
-    [[nodiscard]] std::optional<Outcome> takeOutcome(std::string_view identifier);
+    [[nodiscard]] std::optional<Settled> takeOutcome(std::string_view identifier);
 
     /// Who is told of documents as it happens.
     [[nodiscard]] const std::shared_ptr<DeliveryNews>& news() const { return news_; }
@@ -114,7 +120,7 @@ class DeliveryLedger {
     // The documents up to this number wait for a server that is known to be unreachable.
     std::uint64_t heldUpTo_ CORVANE_GUARDED_BY(mutex_) = 0;
     DeliveryReport totals_ CORVANE_GUARDED_BY(mutex_);  // of settled documents
-    std::map<std::string, std::optional<Outcome>, std::less<>> followed_ CORVANE_GUARDED_BY(mutex_);
+    std::map<std::string, std::optional<Settled>, std::less<>> followed_ CORVANE_GUARDED_BY(mutex_);
 };
 
 }  // namespace corvane

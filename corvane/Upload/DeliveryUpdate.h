@@ -30,6 +30,10 @@ struct DeliveryUpdate {
         failed,           ///< the transfer failed otherwise
         tooManyAttempts,  ///< it was retried more often than is allowed
         payloadMissing,   ///< its payload file has gone, or is empty
+        forgotten,        ///< what was recorded was to be forgotten
+        tooOld,           ///< it was stored for longer than the configuration allows
+        noRoom,           ///< more was stored than the configuration allows, and it was the oldest
+        cancelled,        ///< its transfer was stopped, for one of the reasons above or by its owner
     };
 
     /// Why a document has its outcome.

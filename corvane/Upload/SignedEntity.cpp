@@ -1,5 +1,9 @@
 #include <corvane/Upload/SignedEntity.h>
 
+#include <corvane/Store/Store.h>
+#include <corvane/Upload/LedgerEntity.h>
+#include <corvane/Upload/LedgerEntry.h>
+
 namespace corvane {
 
 namespace {
@@ -17,6 +21,20 @@ std::vector<StoreColumn> SignedEntity::columns() {
             {"contentType", "TEXT", false, false}, {"userAgent", "TEXT", false, false},
             {"retries", "INTEGER", false, false},  {"retryAfterDate", "DOUBLE", false, false},
             {"signature", "TEXT", true, false}};
+}
+
+StoreTableExtras SignedEntity::extras() {
+    const auto willForget = [](const std::shared_ptr<StoreConnection>& connection) {
+        Store<DocumentEntity> documents(connection);
+        const auto sums = documents.sums();
+        // Of what a release without a ledger has written there is nothing but the row.
+        const ForgottenRecords forgotten{.events = sums.at(1),
+                                         .documents = Store<SignedEntity>(connection).sums().at(0)};
+        connection->run(Store<DocumentEntity>::table().deleteAllSQL());
+        noteForgotten(connection, forgotten);
+        return forgotten;
+    };
+    return {{Store<DocumentEntity>::table().createSQL(), Store<LedgerEntity>::table().createSQL()}, willForget};
 }
 
 SignedEntity SignedEntity::read(StoreStepper& stepper) {

@@ -4,6 +4,7 @@
 #include <corvane/Store/StorableValue.h>
 #include <corvane/Store/StoreColumn.h>
 #include <corvane/Store/StoreStepper.h>
+#include <corvane/Store/StoreTable.h>
 
 #include <cstdint>
 #include <optional>
@@ -18,6 +19,8 @@ struct SignedEntity {
     static constexpr std::string_view tableName = "signed_requests";
     static constexpr std::int64_t schemaVersion = 2;
     static std::vector<StoreColumn> columns();
+    /// The tables of the ledger, which is told what is forgotten.
+    static StoreTableExtras extras();
     /// Throws `StoreStepperError`; a date that cannot be one is `badDataInColumn`.
     static SignedEntity read(StoreStepper& stepper);
     [[nodiscard]] StorableValue storableValue(std::string_view columnName) const;

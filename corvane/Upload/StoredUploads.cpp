@@ -92,6 +92,10 @@ void StoredUploads::end(const std::vector<std::string>& identifiers) {
     if (isMoreReady) sendPortionLater();
 }
 
+void StoredUploads::forget() {
+    backlog_.clear();
+}
+
 void StoredUploads::sendPortionLater() {
     runLater([weak = weak_from_this()] {
         const auto self = weak.lock();
@@ -131,7 +135,7 @@ std::optional<PreparedUploadRequest> StoredUploads::retryRequest(const SignedEnt
 void StoredUploads::dropExceeded(const SignedEntity& entity) {
     Log::shared().default_("Retry dropped for exceeding allowed attempts, identifier=%{public}@", entity.identifier);
     try {
-        rows_->remove(entity.identifier);
+        rows_->end({entity.identifier, LedgerEntry::givenUpAttempts});
         dropbox_->finish(entity.identifier, std::nullopt);
     } catch (...) {
         Log::shared().error(
@@ -147,7 +151,7 @@ std::optional<PreparedUploadRequest> StoredUploads::preparedRequest(const Signed
         return PreparedUploadRequest{entity.identifier, entity.contentType, entity.userAgent, *std::move(file)};
     Log::shared().default_("Retry dropped for missing upload file, identifier=%{public}@", entity.identifier);
     try {
-        rows_->remove(entity.identifier);
+        rows_->end({entity.identifier, LedgerEntry::givenUpPayloadMissing});
         if (file) dropbox_->finish(entity.identifier, std::nullopt);
     } catch (...) {
         Log::shared().error(

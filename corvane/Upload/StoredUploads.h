@@ -38,6 +38,8 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     void begin();
     /// Uploads have ended here or elsewhere, of whichever run: the next portion may be due. Any thread.
     void end(const std::vector<std::string>& identifiers);
+    /// Sends nothing more of what was listed. Any thread.
+    void forget();
 
     /// What is to be sent of a stored document, however often it was retried, or nothing when its row has gone or its
     /// payload, with which the row goes, too. Throws `StoreError` and `DeferredStoreError`.

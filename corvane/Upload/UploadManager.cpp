@@ -2,6 +2,7 @@
 
 #include <corvane/Platform/Date.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Upload/UploadRequest.h>
 #include <corvane/Upload/gzip.h>
 
@@ -25,6 +26,13 @@ SignedEntity newEntity(const UploadRequest& request, std::string identifier) {
             .signature = ""};
 }
 
+/// What an upload counts as that is over; nothing for one that is not.
+std::optional<LedgerEntry> entryOf(const UploadResult& result) {
+    if (std::holds_alternative<UploadResult::Retry>(result.value)) return std::nullopt;
+    const auto* refused = std::get_if<UploadResult::Failed>(&result.value);
+    return refused ? refusalOf(refused->response.statusCode) : LedgerEntry::delivered;
+}
+
 PreparedUploadRequest prepared(const SignedEntity& entity, std::filesystem::path file) {
     return {entity.identifier, entity.contentType, entity.userAgent, std::move(file)};
 }
@@ -35,11 +43,14 @@ std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServi
                                                      std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                                                      std::shared_ptr<UploadDropboxType> dropbox,
                                                      std::shared_ptr<DeliveryLedger> ledger,
+                                                     std::shared_ptr<LedgerBook> book,
                                                      std::optional<std::chrono::milliseconds> retryDelay) {
     if (!ledger) ledger = std::make_shared<DeliveryLedger>();
+    if (!book) book = std::make_shared<LedgerBook>();
     if (retryDelay) ledger->keepPending();
     std::shared_ptr<UploadManager> manager(new UploadManager(std::move(service), std::move(deferredStore),
-                                                             std::move(dropbox), std::move(ledger), retryDelay));
+                                                             std::move(dropbox), std::move(ledger), std::move(book),
+                                                             retryDelay));
     manager->service_->setDelegate(manager);
     return manager;
 }
@@ -47,9 +58,9 @@ std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServi
 UploadManager::UploadManager(std::shared_ptr<UploadServiceType> service,
                              std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                              std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger,
-                             std::optional<std::chrono::milliseconds> retryDelay)
+                             std::shared_ptr<LedgerBook> book, std::optional<std::chrono::milliseconds> retryDelay)
     : service_(std::move(service)),
-      rows_(std::make_shared<UploadRows>(std::move(deferredStore))),
+      rows_(std::make_shared<UploadRows>(std::move(deferredStore), std::move(book))),
       dropbox_(std::move(dropbox)),
       ledger_(std::move(ledger)),
       stored_(std::make_shared<StoredUploads>(queue_, service_, rows_, dropbox_, ledger_)),
@@ -73,6 +84,7 @@ void UploadManager::open() {
 void UploadManager::close() {
     Log::shared().default_("Close upload manager");
     try {
+        rows_->writeLedger();
         rows_->close();
     } catch (...) {
         Log::shared().error("Failed to close database, error=%{public}@", AnyError::current().what());
@@ -82,6 +94,17 @@ void UploadManager::close() {
 void UploadManager::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
     stored_->registerAccessQueue(queue);
     service_->registerAccessQueue(std::move(queue));
+}
+
+void UploadManager::forget() {
+    {
+        const Lock lock(mutex_);
+        unrecorded_.clear();
+    }
+    stored_->forget();
+    if (retries_) retries_->forget();
+    service_->cancelAll();
+    ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
 }
 
 bool UploadManager::shouldResume(std::string_view identifier, std::function<void()> completion) {
@@ -103,17 +126,33 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     const auto body = json.isObject() ? gzipCompressed(json.text()) : gzipCompressed(json.toData());
     auto file = dropbox_->write(identifier, body, resource);
     const auto entity = newEntity(request, std::move(identifier));
-    const auto taken = record(entity, request);
+    const auto taken = record(entity, static_cast<std::int64_t>(body.size()), request);
+    if (taken == UploadTaken::forgotten) {
+        removeForgotten(entity.identifier);
+        return taken;
+    }
     service_->submit(prepared(entity, std::move(file)));
     ledger_->begin(entity.identifier);
     return taken;
 }
 
-UploadTaken UploadManager::record(const SignedEntity& entity, const UploadRequest& request) {
+// Whoever removes everything may have come before.
+void UploadManager::removeForgotten(const std::string& identifier) {
     try {
-        rows_->record(entity, request.removeBackup);
-        return UploadTaken::recorded;
+        dropbox_->finish(identifier, std::nullopt);
     } catch (...) {
+        Log::shared().default_("Payload was removed meanwhile, identifier=%{public}@, error=%{public}@", identifier,
+                               AnyError::current().what());
+    }
+}
+
+UploadTaken UploadManager::record(const SignedEntity& entity, std::int64_t bytes, const UploadRequest& request) {
+    try {
+        const DocumentEntity document{entity.identifier, request.events, bytes};
+        const bool isRecorded = rows_->record(entity, document, request.epoch, request.removeBackup);
+        return isRecorded ? UploadTaken::recorded : UploadTaken::forgotten;
+    } catch (...) {
+        if (RecordingSwitch::epoch() > request.epoch) return UploadTaken::forgotten;
         // This attempt is made all the same; if it fails, the contents go out again from where they are kept.
         const Lock lock(mutex_);
         unrecorded_.insert(entity.identifier);
@@ -126,15 +165,16 @@ void UploadManager::uploadService(UploadServiceType& service, const UploadResult
 }
 
 void UploadManager::uploadServiceTogether(UploadServiceType&, const std::vector<UploadResult>& results) {
-    std::vector<std::string> all, over;
+    std::vector<std::string> all;
+    std::vector<UploadRows::Ending> over;
     for (const auto& result : results) {
         all.push_back(result.identifier());
-        if (!std::holds_alternative<UploadResult::Retry>(result.value)) over.push_back(result.identifier());
+        if (const auto entry = entryOf(result)) over.push_back({result.identifier(), *entry});
     }
-    const auto rowProblem = rows_->remove(over);
+    const auto rowProblem = rows_->end(over);
     for (const auto& result : results) {
         if (const auto* retry = std::get_if<UploadResult::Retry>(&result.value)) {
-            didFailForNow(retries_ ? retries_->countedOnce(*retry) : *retry);
+            didFailForNow(*retry);
         } else {
             didFinish(result, rowProblem);
         }
@@ -168,7 +208,8 @@ void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
     const bool wasUnrecorded = forgetUnrecorded(retry.identifier);
     bool goesOutAgain = true;
     try {
-        goesOutAgain = rows_->countRetry(retry) || wasUnrecorded;
+        const bool isFirstOfRun = !retries_ || retries_->isFirstCounted(retry);
+        goesOutAgain = rows_->countRetry(retry, isFirstOfRun) || wasUnrecorded;
     } catch (...) {
         Log::shared().error("Failed to mark retry, identifier=%{public}@, error=%{public}@", retry.identifier,
                             AnyError::current().what());

@@ -43,14 +43,14 @@ class UploadManager final : public UploadManagerType,
                             public UploadServiceDelegate,
                             public std::enable_shared_from_this<UploadManager> {
   public:
-    /// Makes a manager and sets it as the service's delegate. No argument but `ledger` may be empty; it then has one
-    /// of its own.
+    /// Makes a manager and sets it as the service's delegate. No argument but the last three may be empty; it
+    /// then has such a one of its own.
     /// @param retryDelay after which what ended with a retry is sent again in this run, see `UploadRetries`; not at all
     ///        without one
     [[nodiscard]] static std::shared_ptr<UploadManager> create(
         std::shared_ptr<UploadServiceType> service, std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
         std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger = nullptr,
-        std::optional<std::chrono::milliseconds> retryDelay = std::nullopt);
+        std::shared_ptr<LedgerBook> book = nullptr, std::optional<std::chrono::milliseconds> retryDelay = std::nullopt);
     ~UploadManager() override;
 
     /// Opens the store, creates the table, and the first time sends again what is stored. Requires: not on the
@@ -61,6 +61,8 @@ class UploadManager final : public UploadManagerType,
     /// Throws what the encoding, the compression or the payload file failed with; there is then no row. That the row
     /// cannot be written is no reason not to send. Requires: not on the manager's queue or the store's.
     UploadTaken upload(const UploadRequest& request) override;
+    void forget() override;
+    void readLedger() override { rows_->readLedger(); }
     bool shouldResume(std::string_view identifier, std::function<void()> completion) override;
 
     /// Deletes row and file of an upload that is over, or counts a retry.
@@ -77,11 +79,12 @@ class UploadManager final : public UploadManagerType,
     UploadManager(std::shared_ptr<UploadServiceType> service,
                   std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                   std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger,
-                  std::optional<std::chrono::milliseconds> retryDelay);
+                  std::shared_ptr<LedgerBook> book, std::optional<std::chrono::milliseconds> retryDelay);
 
     UploadTaken uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(*queue_);
     /// Writes the document's row, and has its backup removed, both or neither.
-    [[nodiscard]] UploadTaken record(const SignedEntity& entity, const UploadRequest& request);
+    [[nodiscard]] UploadTaken record(const SignedEntity& entity, std::int64_t bytes, const UploadRequest& request);
+    void removeForgotten(const std::string& identifier);
     /// Removes the payload of an upload that is over, unless its row could not be deleted.
     void didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem);
     void didFailForNow(const UploadResult::Retry& retry);

@@ -11,9 +11,10 @@ struct UploadRequest;
 
 /// What became of a document that was taken over: whether its upload outlives a kill of the process.
 enum class UploadTaken {
-    recorded,  ///< its row is written: whoever keeps its contents elsewhere may let go of them
-    underWay,  ///< its row could not be written, and only this attempt is made: its contents must stay where they are
-               ///< kept
+    recorded,   ///< its row is written: whoever keeps its contents elsewhere may let go of them
+    underWay,   ///< its row could not be written, and only this attempt is made: its contents must stay where they are
+                ///< kept
+    forgotten,  ///< neither: what is in it was recorded before it was all to be forgotten
 };
 
 /// Takes documents for upload and sees to it that each reaches the collector, is refused by it, or is given up after
@@ -33,6 +34,11 @@ class UploadManagerType {
     /// Takes a document over: when the call returns its payload is on disk and its upload has been started. Throws when
     /// the document cannot be encoded, compressed or written; it is then not taken over.
     virtual UploadTaken upload(const UploadRequest& request) = 0;
+    /// Lets go of all uploads, which were recorded before everything was to be forgotten: cancels those that are under
+    /// way, and sends none again. Their rows and payloads are removed with everybody's. Does nothing by default.
+    virtual void forget() {}
+    /// Reads the ledger of what is on disk again. Throws what the database failed with. Does nothing by default.
+    virtual void readLedger() {}
     /// Offers a background wake-up: see `UploadServiceType::shouldResume`.
     virtual bool shouldResume(std::string_view identifier, std::function<void()> completion) = 0;
 };

@@ -3,6 +3,7 @@
 #include <corvane/Models/Client.h>
 #include <corvane/Upload/ResourceType.h>
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 
@@ -21,6 +22,8 @@ struct UploadRequest {
 
     Client client;
     std::shared_ptr<const ResourceType> resource;  ///< never null
+    std::int64_t events = 0;                       ///< in the document
+    std::int64_t epoch = 0;                        ///< in which they were recorded: see `RecordingSwitch`
     /// Called at most once, on the queue of the deferred stores, inside the transaction that has written the document's
     /// row on the connection that it is given. Must not throw. May be empty.
     std::function<void(const std::shared_ptr<StoreConnection>&)> removeBackup = {};

@@ -29,12 +29,10 @@ UploadRetries::UploadRetries(std::chrono::milliseconds firstDelay, std::shared_p
                              std::shared_ptr<StoredUploads> stored)
     : queue_(std::move(queue)), stored_(std::move(stored)), schedule_(firstDelay, chance()) {}
 
-UploadResult::Retry UploadRetries::countedOnce(UploadResult::Retry retry) {
+bool UploadRetries::isFirstCounted(const UploadResult::Retry& retry) {
+    if (!retry.isCounted) return false;
     const Lock lock(mutex_);
-    auto& document = documents_[retry.identifier];
-    retry.isCounted = retry.isCounted && !document.isCounted;
-    document.isCounted = document.isCounted || retry.isCounted;
-    return retry;
+    return !std::exchange(documents_[retry.identifier].isCounted, true);
 }
 
 void UploadRetries::end(const std::vector<UploadResult>& results) {
@@ -79,6 +77,15 @@ void UploadRetries::endElsewhere(const std::string& identifier) {
     const bool isMoreReady = backlog_.end(identifier);
     forget(identifier);
     proceed(isMoreReady);
+}
+
+void UploadRetries::forget() {
+    const Lock lock(mutex_);
+    backlog_.clear();
+    documents_.clear();
+    waiting_ = 0;
+    pass_ = {};
+    setTimer();
 }
 
 void UploadRetries::setWaiting(Document& document, bool isWaiting) {

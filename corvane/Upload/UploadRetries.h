@@ -39,12 +39,14 @@ class UploadRetries : public std::enable_shared_from_this<UploadRetries> {
     UploadRetries(std::chrono::milliseconds firstDelay, std::shared_ptr<SerialQueue> queue,
                   std::shared_ptr<StoredUploads> stored);
 
-    /// The retry as the document's row counts it: in a run at most one.
-    [[nodiscard]] UploadResult::Retry countedOnce(UploadResult::Retry retry);
+    /// Whether this is the document's first retry of the run that counts, which is noted.
+    [[nodiscard]] bool isFirstCounted(const UploadResult::Retry& retry);
     /// Uploads have ended, and their rows and the ledger say so.
     void end(const std::vector<UploadResult>& results);
     /// One has ended of which another process was told.
     void endElsewhere(const std::string& identifier);
+    /// Lets go of all of them.
+    void forget();
 
   private:
     struct Document {

@@ -2,10 +2,12 @@
 
 #include <corvane/Platform/Error.h>
 #include <corvane/Store/DeferredStore.h>
+#include <corvane/Upload/LedgerBook.h>
+#include <corvane/Upload/LedgerEntity.h>
 #include <corvane/Upload/SignedEntity.h>
-#include <corvane/Upload/UploadManagerType.h>
 #include <corvane/Upload/UploadResult.h>
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -14,8 +16,8 @@
 
 namespace corvane {
 
-/// The database's part in an endpoint's uploads: one row for each that is not over. Callable from any thread but the
-/// store's queue, for which every call waits. Internal.
+/// The database's part in an endpoint's uploads: one row for each that is not over, one for what it holds, and the
+/// totals of those that are. Callable from any thread but the store's queue, for which every call waits. Internal.
 class UploadRows {
   public:
     using RemoveBackup = std::function<void(const std::shared_ptr<StoreConnection>&)>;
@@ -24,27 +26,47 @@ class UploadRows {
         std::vector<std::string> identifiers;  // in the order in which the rows were written last
         bool isInMemory = false;               // then they say nothing of what is on disk
     };
+    /// An upload that is over, and what it counts as.
+    struct Ending {
+        std::string identifier;
+        LedgerEntry entry;
+    };
 
-    explicit UploadRows(std::shared_ptr<DeferredStore<SignedEntity>> deferredStore);
+    UploadRows(std::shared_ptr<DeferredStore<SignedEntity>> deferredStore, std::shared_ptr<LedgerBook> book);
 
-    /// Opens the database and creates the table. Throws `StoreError` and `DeferredStoreError`, as all of these do.
+    /// Opens the database and creates the tables. Throws `StoreError` and `DeferredStoreError`, as all of these do.
     void open();
     void close();
 
-    /// Writes a new upload's row and has the backup of its contents removed, both or neither.
-    void record(const SignedEntity& entity, const RemoveBackup& removeBackup);
+    /// Writes a new upload's row, and has the backup of its contents removed, both or neither. Returns false, and has
+    /// done nothing, when `epoch`, in which its contents were recorded, is over.
+    [[nodiscard]] bool record(const SignedEntity& entity, const DocumentEntity& document, std::int64_t epoch,
+                              const RemoveBackup& removeBackup);
+    /// What is stored, once the books are in line with what releases that keep none have done.
     [[nodiscard]] Stored stored();
     [[nodiscard]] std::optional<SignedEntity> find(const std::string& identifier);
-    /// Counts a retry in the upload's row. Returns false when there is no row.
-    bool countRetry(const UploadResult::Retry& retry);
-    void remove(const std::string& identifier);
-    /// Removes all of them or none, in which case it returns why.
-    [[nodiscard]] std::optional<AnyError> remove(const std::vector<std::string>& identifiers) noexcept;
+    /// Counts a retry, in the upload's row only the first of a run. Returns false when there is no row.
+    bool countRetry(const UploadResult::Retry& retry, bool isFirstOfRun = true);
+    void end(const Ending& ending);
+    /// Removes the rows of all of them or none, in which case it returns why. One whose row has gone already counts as
+    /// nothing: who removed it has counted it.
+    [[nodiscard]] std::optional<AnyError> end(const std::vector<Ending>& endings) noexcept;
+    /// Writes what the ledger has in memory alone, if there is anything.
+    void writeLedger();
+    /// Reads the totals on disk, and what waits, into the book.
+    void readLedger();
 
   private:
     using Rows = Store<SignedEntity>;
 
+    /// Runs `operation`, which notes what it changes, in a transaction that writes the ledger, too.
+    template <class Operation>
+    void change(Operation operation);
+    void reconcile();
+    void endAll(const std::vector<Ending>& endings);
+
     const std::shared_ptr<DeferredStore<SignedEntity>> deferredStore_;
+    const std::shared_ptr<LedgerBook> book_;
 };
 
 }  // namespace corvane

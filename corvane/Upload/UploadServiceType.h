@@ -40,6 +40,10 @@ class UploadServiceType {
     /// happens here.
     virtual void inFlight(std::function<void(const std::set<std::string>&)> /*answer*/) {}
 
+    /// Cancels the uploads that are running, also those of earlier runs and other processes where transfers outlive
+    /// them; they end as a retry, later. Returns before that is done. A service that cannot does nothing, as here.
+    virtual void cancelAll() {}
+
     /// Whether `identifier` names this service's transfer session. If so, `completion` is kept and called once, on the
     /// main queue, when all events of the session have been delivered; otherwise it is dropped. Callable from any
     /// thread.

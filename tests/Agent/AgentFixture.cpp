@@ -4,19 +4,7 @@
 #include <signal.h>
 #include <unistd.h>
 
-#include <future>
-#include <thread>
-
 namespace corvane::test {
-
-bool eventually(const std::function<bool()>& condition, std::chrono::milliseconds time) {
-    const auto deadline = std::chrono::steady_clock::now() + time;
-    while (!condition()) {
-        if (std::chrono::steady_clock::now() >= deadline) return false;
-        std::this_thread::sleep_for(2ms);
-    }
-    return true;
-}
 
 std::map<std::string, int> bodies(const ScriptedServer& server) {
     std::map<std::string, int> counts;
@@ -73,9 +61,9 @@ std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<Sessio
 }
 
 std::shared_ptr<TransferTask> AgentFixture::upload(TransferSession& session, const std::string& url,
-                                                   const std::string& description) {
+                                                   const std::string& description, const std::string& contents) {
     auto task = session.uploadTask({.url = url, .method = "PUT", .headers = {{"X-Task", description}}},
-                                   body("body " + description, description));
+                                   body("body " + description, contents.empty() ? description : contents));
     task->setDescription(description);
     task->resume();
     return task;

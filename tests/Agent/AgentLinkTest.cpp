@@ -1,16 +1,12 @@
 #include <corvane/Agent/Host/AgentLink.h>
-#include <corvane/Testing/CapturedLog.h>
+
+#include "tests/support/Testing.h"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <sys/socket.h>
-
-#include <cerrno>
 
 namespace corvane::test {
 namespace {
-
-using namespace std::chrono_literals;
 
 // A link whose agent is the test: at the other end of a socket pair, and of the pipe of a program that is started. The
 // test's thread stands in for the agent's, and the time is what the test says.
@@ -18,7 +14,7 @@ class AgentLinkTest : public testing::Test, public AgentLink::Listener {
   protected:
     void agentIsReady() override { heard += "ready "; }
     void agentSaid(const agent::Reply& reply) override { heard += agent::encode(reply)[0]; }
-    void agentFailed() override { heard += "failed "; }
+    void agentFailed(const std::string&) override { heard += "failed "; }
     void processEnds() override {}
     void onThread() const CORVANE_ASSERT_CAPABILITY(agentThread) {}
 

@@ -4,7 +4,6 @@
 #include <signal.h>
 #include <unistd.h>
 
-#include <set>
 #include <sstream>
 
 namespace corvane::test {

@@ -6,8 +6,6 @@
 #include <signal.h>
 #include <unistd.h>
 
-#include <cstdlib>
-
 namespace corvane::test {
 namespace {
 

@@ -7,10 +7,7 @@
 #include <unistd.h>
 
 #include <cstdio>
-#include <future>
 #include <random>
-#include <set>
-#include <thread>
 
 namespace corvane::test {
 namespace {

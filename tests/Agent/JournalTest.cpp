@@ -2,15 +2,11 @@
 #include <corvane/Agent/Daemon/TaskBook.h>
 #include <corvane/Agent/OutcomeCodec.h>
 #include <corvane/Agent/WireWriter.h>
-#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Transfer/TransferError.h>
 
-#include "tests/support/Files.h"
+#include "tests/support/Testing.h"
 
-#include <gtest/gtest.h>
 #include <sqlite3.h>
-
-#include <algorithm>
 
 namespace corvane::test {
 namespace {

@@ -1,11 +1,8 @@
 #include <corvane/Agent/Host/Acknowledgements.h>
 #include <corvane/Agent/Host/BackgroundTransferCore.h>
 #include <corvane/Agent/OutcomeCodec.h>
-#include <corvane/Testing/TemporaryDocuments.h>
 
-#include <gtest/gtest.h>
-
-#include <future>
+#include "tests/support/Testing.h"
 
 namespace corvane::test {
 namespace {

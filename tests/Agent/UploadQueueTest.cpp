@@ -1,19 +1,12 @@
 #include <corvane/Agent/Daemon/UploadQueue.h>
-#include <corvane/Testing/ScriptedServer.h>
-#include <corvane/Testing/TemporaryDocuments.h>
 #include <corvane/Transfer/TransferError.h>
 
-#include "tests/support/Files.h"
 #include "tests/support/TLSServer.h"
-
-#include <gtest/gtest.h>
-
-#include <functional>
+#include "tests/support/Testing.h"
 
 namespace corvane::test {
 namespace {
 
-using namespace std::chrono_literals;
 using namespace transferd;
 using Reply = ScriptedServer::Reply;
 using Numbers = std::vector<std::int64_t>;

@@ -77,6 +77,11 @@ TEST(FakeTransfers, EndAsTheyWereScripted) {
     EXPECT_EQ(report.delivered.documents, 1u);
     EXPECT_EQ(report.givenUp.documents, 1u);
     EXPECT_EQ(report.pending.documents, 1u);
+
+    transfers->scriptCancel(std::nullopt);
+    const auto task = transfers->uploadTask({}, "none");
+    task->cancel();
+    EXPECT_TRUE(transfers->task(4)->wasCancelled() && task->state() == TransferTask::State::cancelling);
 }
 
 }  // namespace

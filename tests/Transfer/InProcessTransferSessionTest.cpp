@@ -320,6 +320,39 @@ TEST_F(InProcessTransferSessionTest, SignalsAWakeUpOnceAndBehindWhatIsPending) {
     EXPECT_EQ(recorder->completedAtSignal, (std::vector<std::size_t>{0, 1}));
 }
 
+TEST_F(InProcessTransferSessionTest, ACancelledTaskStopsWhereverItIsAndCompletesOnce) {
+    Reply slow = Reply::never();
+    slow.bodyLimit = 10;
+    body(std::string(40'000'000, 'b'));
+    for (const auto& reply : {Reply::status(200), slow, Reply::never()}) server.script(reply);
+    std::promise<void> release;
+    queue->async([gate = release.get_future().share()] { gate.wait(); });
+    auto session = open({.transfersPerHost = 2});
+    std::vector<std::shared_ptr<TransferTask>> tasks;  // over, sending, unanswered, queued, suspended
+    for (std::size_t number = 1; number <= 4; ++number) {
+        tasks.push_back(start(*session, server.url()));
+        ASSERT_TRUE(server.waitForRequests(std::min<std::size_t>(number, 3)));
+    }
+    const auto idle = session->uploadTask({.url = server.url(), .method = "PUT", .headers = {}}, body());
+    tasks.push_back(idle);
+    for (const auto& task : tasks) {
+        task->cancel();
+        task->cancel();
+        EXPECT_EQ(task->state(), State::cancelling);
+    }
+    idle->resume();
+    EXPECT_EQ(recorder->completed(), 0u) << "no callback inside the call";
+    release.set_value();
+    for (const auto& task : tasks) {
+        const auto completion = recorder->wait(*task);
+        EXPECT_EQ(describe(completion), task == tasks.front() ? "200" : "cancelled") << task->identifier();
+        EXPECT_EQ(completion.state, State::cancelling);
+    }
+    queue->sync([] {});
+    idle->cancel();
+    EXPECT_TRUE(idle->state() == State::completed && server.requests().size() == 3);
+}
+
 TEST_F(InProcessTransferSessionTest, CancelsItsTransfersWhenItGoes) {
     server.script(Reply::never(), 4);
     auto session = open();

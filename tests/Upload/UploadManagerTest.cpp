@@ -17,7 +17,7 @@ struct ProcessRun {
     explicit ProcessRun(std::optional<std::string> location = "main",
                         std::optional<std::chrono::milliseconds> retryDelay = {})
         : store(std::make_shared<DeferredStore<SignedEntity>>(std::move(location))),
-          manager(UploadManager::create(service, store, dropbox, ledger, retryDelay)) {
+          manager(UploadManager::create(service, store, dropbox, ledger, nullptr, retryDelay)) {
         if (!retryDelay) return;
         manager->registerAccessQueue(accessQueue);
         manager->open();

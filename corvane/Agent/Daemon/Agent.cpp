@@ -96,10 +96,7 @@ void Agent::waitForNews() {
 void Agent::dropWithdrawn() {
     const auto withdrawn = directory_.withdrawn();
     for (const auto& token : withdrawn) {
-        if (const auto number = book_.find(token)) {
-            queue_.remove(*number);
-            desk_.withdraw(*number);
-        }
+        if (const auto number = book_.find(token)) desk_.drop(*number);
         unlink(directory_.submissionPath(token).c_str());
     }
     if (!book_.settle()) return;

@@ -46,7 +46,7 @@ class Agent final : private UploadQueue::Source {
 
     /// One time through everything that can be done without waiting: spool, uploads, journal, clients.
     void round();
-    /// Drops what hosts have withdrawn. They send it themselves; nobody waits for the agent's word on it.
+    /// Drops what hosts have withdrawn: they send it themselves, or have cancelled it.
     void dropWithdrawn();
     /// Tells the book how uploads ended.
     void completeEnded();

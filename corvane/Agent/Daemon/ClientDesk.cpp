@@ -105,6 +105,26 @@ void ClientDesk::take(Client& client, const agent::Ping&) {
     client.send(agent::Pong{});
 }
 
+// The system may have had no watch to give.
+void ClientDesk::take(Client& client, const agent::Look&) {
+    intake_.noteChange();
+    client.send(agent::Pong{});
+}
+
+void ClientDesk::take(Client& client, const agent::Discard& request) {
+    const std::filesystem::path directory(request.directory);
+    if (!directory.is_absolute()) throw FormatError("not an absolute path");
+    intake_.acceptSpooled();
+    const auto numbers = book_.withBodiesBeneath(directory);
+    for (const auto number : numbers) drop(number);
+    client.discarded.push_back({std::ssize(numbers)});
+}
+
+void ClientDesk::drop(std::int64_t number) {
+    queue_.remove(number);
+    forget(number, nullptr);
+}
+
 void ClientDesk::forget(std::int64_t number, const Client* reporter) {
     const Owner* owner = book_.task(number).owner;
     for (auto& client : clients_.all()) {
@@ -157,6 +177,14 @@ void ClientDesk::deliver() {
         if (!owner.over.empty() && hasClient(owner)) deliver(owner);
     }
     answerFlushes();
+    answerDiscards();
+}
+
+void ClientDesk::answerDiscards() {
+    if (!book_.isSettled()) return;
+    for (auto& client : clients_.all()) {
+        for (const auto& answer : std::exchange(client.discarded, {})) client.send(answer);
+    }
 }
 
 void ClientDesk::deliver(Owner& owner) {

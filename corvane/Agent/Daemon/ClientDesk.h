@@ -30,8 +30,9 @@ class ClientDesk final : private ClientList::Handler {
     void deliver();
     /// A server cannot be reached, or can be again: tells the owners of these uploads, or those that were told.
     void tell(const UploadQueue::Trouble& trouble, const std::vector<std::int64_t>& uploads);
-    /// Forgets a task that a host has withdrawn: it sends it itself.
-    void withdraw(std::int64_t number) { forget(number, nullptr); }
+    /// Stops and forgets a task that a host has withdrawn, or that is discarded. All connections of its owner hear of
+    /// it.
+    void drop(std::int64_t number);
     /// Lets go of owners that nothing refers to any more.
     void dropOwners();
 
@@ -48,6 +49,9 @@ class ClientDesk final : private ClientList::Handler {
     void take(Client& client, const agent::Describe& request);
     void take(Client& client, const agent::Flush& request);
     void take(Client& client, const agent::Ping& request);
+    void take(Client& client, const agent::Look& request);
+    /// Answered once the journal has let go of the tasks.
+    void take(Client& client, const agent::Discard& request);
 
     /// Lets go of a task. Whoever else waits for it than `reporter` hears how it ended, or that its host has taken it
     /// back.
@@ -60,6 +64,7 @@ class ClientDesk final : private ClientList::Handler {
     /// The host that submitted a task while it is there, and then the first of the same owner.
     [[nodiscard]] Client* addressee(const Owner& owner, std::int64_t number);
     void answerFlushes();
+    void answerDiscards();
     void tell(const Owner& owner, const UploadQueue::Trouble& trouble);
 
     TaskBook& book_;

@@ -34,6 +34,7 @@ class ClientList {
         std::set<std::int64_t> told;       ///< completions that it has not acknowledged
         std::set<std::uint64_t> troubles;  ///< that it was told of
         Clock::time_point greetsUntil = Clock::now() + timeToGreet;
+        std::vector<agent::Discarded> discarded;  ///< answers that wait for the journal
         bool isFlushing = false;
         bool isLeaving = false;  ///< closed at the next opportunity
 

@@ -4,7 +4,25 @@
 #include <corvane/Agent/FormatError.h>
 #include <corvane/Agent/OutcomeCodec.h>
 
+#include <algorithm>
+
 namespace corvane::transferd {
+
+namespace {
+
+// Without symbolic links as far as it exists.
+std::filesystem::path resolved(const std::filesystem::path& path) {
+    std::error_code failed;
+    const auto real = std::filesystem::weakly_canonical(path, failed);
+    const auto normal = failed ? path.lexically_normal() : real;
+    return normal.has_filename() ? normal : normal.parent_path();  // without a slash at its end
+}
+
+bool isSameOrBeneath(const std::filesystem::path& path, const std::filesystem::path& directory) {
+    return std::mismatch(directory.begin(), directory.end(), path.begin(), path.end()).first == directory.end();
+}
+
+}  // namespace
 
 void TaskBook::load(const std::function<void(std::int64_t number, const TransferSubmission&)>& visit) {
     std::vector<std::int64_t> unreadable;
@@ -123,6 +141,20 @@ bool TaskBook::settleOneByOne() {
     } catch (const JournalError&) {  // tried again later
         return false;
     }
+}
+
+std::vector<std::int64_t> TaskBook::withBodiesBeneath(const std::filesystem::path& directory) {
+    std::vector<std::int64_t> numbers;
+    const auto top = resolved(directory);
+    std::map<std::filesystem::path, bool> folders;  // most bodies are in few of them
+    journal_.forEach([&](const Journal::Task& task) {
+        if (!task.isReadable || !contains(task.number)) return;
+        const auto folder = std::filesystem::path(task.submission.bodyPath).parent_path();
+        auto [found, isNew] = folders.try_emplace(folder);
+        if (isNew) found->second = isSameOrBeneath(resolved(folder), top);
+        if (found->second) numbers.push_back(task.number);
+    });
+    return numbers;
 }
 
 std::optional<std::int64_t> TaskBook::find(std::string_view token) const {

@@ -20,7 +20,7 @@ namespace corvane::transferd {
 /// bytes. What reads the journal, and `accept` and `describe`, throw what it throws; the index then is as before.
 ///
 ///     accept -> open -> complete -> over -> forget
-///                 +---------------------------^      withdrawn by its host
+///                 +---------------------------^      withdrawn by its host, or discarded
 ///
 /// `complete` and `forget` never fail: they are kept for `settle`, which comes back to what the journal does not take.
 /// A kill before that leaves an open task, which is sent again, or one that is over, which is reported again.
@@ -73,6 +73,9 @@ class TaskBook {
     [[nodiscard]] bool isDamaged() const { return journal_.isDamaged(); }
     void describe(std::int64_t number, const std::string& description) { journal_.describe(number, description); }
 
+    /// The tasks, over or not, whose bodies lie beneath a directory, whatever both are called on the way there; it and
+    /// they need not exist.
+    [[nodiscard]] std::vector<std::int64_t> withBodiesBeneath(const std::filesystem::path& directory);
     [[nodiscard]] std::optional<std::int64_t> find(std::string_view token) const;
     [[nodiscard]] Task& task(std::int64_t number) { return tasks_.at(number); }
     [[nodiscard]] bool contains(std::int64_t number) const { return tasks_.contains(number); }

@@ -71,7 +71,9 @@ void UploadQueue::remove(std::int64_t number) {
 }
 
 void UploadQueue::settle(std::map<std::string, Host>::iterator host) {
-    if (host->second.waiting.empty() && host->second.running.empty()) hosts_.erase(host);
+    if (!host->second.waiting.empty() || !host->second.running.empty()) return;
+    tellOver(host->second);
+    hosts_.erase(host);
 }
 
 void UploadQueue::proceed(Clock::time_point now) {
@@ -127,6 +129,10 @@ void UploadQueue::finished(const Ended& ended, Clock::time_point now) {
 void UploadQueue::goOn(Host& host) {
     host.failures = 0;
     host.pausedUntil = Clock::time_point::min();
+    tellOver(host);
+}
+
+void UploadQueue::tellOver(Host& host) {
     if (!host.trouble) return;
     host.trouble->lasts = false;
     source_.troubleChanged(*host.trouble, {});

@@ -59,7 +59,7 @@ class UploadQueue {
         virtual std::optional<HTTPTransfer> transfer(std::int64_t number) = 0;
         /// Whether an upload whose server cannot be reached is to be tried again.
         virtual bool mayWait(std::int64_t number) = 0;
-        /// These uploads to a host begin to wait, or all of them go on. Not to call back.
+        /// These uploads to a host begin to wait, or all of them go on, or none is left. Not to call back.
         virtual void troubleChanged(const Trouble& trouble, const std::vector<std::int64_t>& uploads) = 0;
     };
 
@@ -113,11 +113,12 @@ class UploadQueue {
     void finished(const Ended& ended, Clock::time_point now);
     /// The host answers: opens it, and says so where it was in trouble.
     void goOn(Host& host);
+    void tellOver(Host& host);
     /// The host does not answer: pauses it, and ends the uploads that have waited long enough.
     void holdUp(Host& host, const AnyError& why, Clock::time_point now);
     /// Says why a host's uploads wait, unless that was the last thing said of it.
     void note(Host& host, const AnyError& why);
-    /// Forgets a host with nothing to do, with what is known of it.
+    /// Forgets a host with nothing to do, with what is known of it: nobody would say later that it answers.
     void settle(std::map<std::string, Host>::iterator host);
 
     Source& source_;

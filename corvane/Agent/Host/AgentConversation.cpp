@@ -79,7 +79,7 @@ bool AgentConversation::isUsable() {
 
 // --- What the session asks. ------------------------------------------------------------------------------------------
 
-void AgentConversation::submitted(std::string token) {
+void AgentConversation::taskChanged(std::string token) {
     post([token = std::move(token)](AgentConversation& self) CORVANE_REQUIRES(agentThread) {
         self.submitOrTakeBack(token);
         self.watch();
@@ -122,33 +122,32 @@ void AgentConversation::processEnds() {
 
 // --- Between the spool and the journal. ------------------------------------------------------------------------------
 
-// The agent may have failed since the task was given to it: nobody would take the task back then. One that was taken
-// back while its submission was being written, and may be through by now, leaves that behind.
+// The agent may have failed since the task was given to it: nobody would take the task back then.
 void AgentConversation::submitOrTakeBack(const std::string& token) {
     const auto task = tasks_->find(token);
-    if (task ? task->stage() == Stage::inside : Acknowledgements::shared().contains(token)) {
-        directory_.withdraw(token);
-    } else if (task && mayBecomeReady()) {
-        submit(*task);
-    } else if (task) {
-        takeBack(task, nullptr);
-    }
+    if (!task || !task->isWithAgent() || task->stage() == Stage::submitting) return;
+    if (!mayBecomeReady()) return takeBack(task, nullptr);
+    if (task->isCancelled()) directory_.withdraw(token);
+    submit(*task);
 }
 
 // An agent that found the submission by itself may be through with it, and have forgotten it: to ask for it then would
 // look like a task that was lost.
 void AgentConversation::submit(const Task& task) {
     if (task.stage() == Stage::spooled) send(agent::Submit{task.token()});
+    if (task.isCancelled()) send(agent::Look{});
 }
 
 void AgentConversation::takeBack(const std::shared_ptr<Task>& task, const char* why) {
-    if (!task->isOfThisRun() || !task->isWithAgent()) return;
+    const bool isCancelled = task->isCancelled();
+    if (!task->isWithAgent() || task->stage() == Stage::submitting || !(task->isOfThisRun() || isCancelled)) return;
+    directory_.withdraw(task->token());
+    Acknowledgements::shared().add(task->token());  // whatever the agent says of it from now on
+    if (isCancelled) return reportForgotten(task, std::nullopt);
     if (why) {
         Log::shared().error("Transfer goes on inside the process, task=%ld, reason=%{public}@", task->identifier(),
                             why);
     }
-    directory_.withdraw(task->token());
-    Acknowledgements::shared().add(task->token());  // whatever the agent says of it from now on
     inside_->takeOver(task);
 }
 
@@ -199,7 +198,7 @@ void AgentConversation::checkMissing(const AgentQuestions::Known& listed) {
         const bool isMissing = task->stage() == Stage::accepted && !known.contains(task->token()) &&
                                !Acknowledgements::shared().contains(task->token());
         if (isMissing && task->isOfThisRun()) takeBack(task, "the agent has lost it");
-        if (isMissing && !task->isOfThisRun()) reportEndElsewhere(task, takenOverElsewhere());
+        if (isMissing && !task->isOfThisRun()) reportForgotten(task, std::nullopt);
     }
 }
 
@@ -270,18 +269,21 @@ void AgentConversation::take(const agent::Elsewhere& reply) {
     auto task = tasks_->find(reply.token);
     if (!task && !Acknowledgements::shared().contains(reply.token)) task = findOrAdopt(reply.token, reply.description);
     if (!task || !task->isWithAgent()) return;
-    reportEndElsewhere(std::move(task), reply.outcome.empty() ? takenOverElsewhere() : readable(reply.outcome));
+    reportForgotten(std::move(task), reply.outcome.empty() ? std::nullopt : std::optional(readable(reply.outcome)));
 }
 
-void AgentConversation::reportEndElsewhere(std::shared_ptr<Task> task, TransferOutcome outcome) {
+void AgentConversation::reportForgotten(std::shared_ptr<Task> task, std::optional<TransferOutcome> outcome) {
+    const bool isCancelled = task->isCancelled();
+    if (!outcome) outcome = isCancelled ? cancelledOutcome() : takenOverElsewhere();
     auto afterwards = [self = shared_from_this(), token = task->token()](bool) {
         self->post([token](AgentConversation& on) CORVANE_REQUIRES(agentThread) {
             on.tasks_->remove(token);
             on.watch();
         });
     };
-    reporter_->enqueueEnd(task, &TransferSessionDelegate::taskDidEndElsewhere, std::move(outcome),
-                          std::move(afterwards));
+    const auto ending =
+        isCancelled ? &TransferSessionDelegate::taskDidComplete : &TransferSessionDelegate::taskDidEndElsewhere;
+    reporter_->enqueueEnd(task, ending, *std::move(outcome), std::move(afterwards));
     task->advanceTo(Stage::reporting);
 }
 
@@ -321,7 +323,7 @@ void AgentConversation::agentSaid(const agent::Reply& reply) {
         reply);
 }
 
-void AgentConversation::agentFailed() {
+void AgentConversation::agentFailed(const std::string&) {
     {
         Lock lock(mutex_);
         usable_ = false;

@@ -46,8 +46,8 @@ class AgentConversation final : public AgentLink::Listener, public std::enable_s
     /// Whether there is an agent, or there may be one: one that failed a while ago has another chance at this call.
     [[nodiscard]] bool isUsable();
 
-    /// A task's submission has been put into the spool.
-    void submitted(std::string token);
+    /// A task's submission has been put into the spool, or a task was marked as cancelled.
+    void taskChanged(std::string token);
     /// Tells the agent a task's new description.
     void describe(std::string token, std::string description);
     /// Answers once the agent has said which tasks it has.
@@ -60,7 +60,7 @@ class AgentConversation final : public AgentLink::Listener, public std::enable_s
     // What the link says.
     void agentIsReady() override CORVANE_REQUIRES(agentThread);
     void agentSaid(const agent::Reply& reply) override CORVANE_REQUIRES(agentThread);
-    void agentFailed() override CORVANE_REQUIRES(agentThread);
+    void agentFailed(const std::string& why) override CORVANE_REQUIRES(agentThread);
     void processEnds() override CORVANE_REQUIRES(agentThread);
 
   private:
@@ -70,12 +70,13 @@ class AgentConversation final : public AgentLink::Listener, public std::enable_s
     /// As `isUsable`, without another chance.
     [[nodiscard]] bool mayBecomeReady() const;
 
-    /// Tells the agent of a spooled task, or does what has become due while its submission was written.
+    /// Tells the agent of a task that is spooled or cancelled; without an agent, takes it back.
     void submitOrTakeBack(const std::string& token) CORVANE_REQUIRES(agentThread);
-    /// Tells the agent of a task that is spooled and not accepted.
+    /// Tells the agent of a task that is spooled and not accepted, and of the mark of one that is cancelled.
     void submit(const Task& task) CORVANE_REQUIRES(agentThread);
-    /// Withdraws a task of this run from the agent and starts it inside the process. `why` goes into the log; nullptr
-    /// when that has been said already.
+    /// Withdraws a task of this run from the agent and starts it inside the process; a cancelled one, of any run, is
+    /// over. `why` goes into the log; nullptr when that has been said already. A task that is still on its way to the
+    /// spool waits until it is there.
     void takeBack(const std::shared_ptr<Task>& task, const char* why) CORVANE_REQUIRES(agentThread);
     /// A task that was accepted and is in no list any more is lost to the agent, whatever happened to its journal; one
     /// of another process was acknowledged there.
@@ -92,9 +93,11 @@ class AgentConversation final : public AgentLink::Listener, public std::enable_s
     void acknowledge(const std::string& token) CORVANE_REQUIRES(agentThread);
     /// Enqueues the report of a task that this session tells its delegate of, and then acknowledges.
     void reportCompletion(std::shared_ptr<Task> task, TransferOutcome outcome) CORVANE_REQUIRES(agentThread);
-    /// The same of one that another process has told of: the row and the payload are that one's business, and whoever
-    /// waits here is to wait no longer.
-    void reportEndElsewhere(std::shared_ptr<Task> task, TransferOutcome outcome) CORVANE_REQUIRES(agentThread);
+    /// The same of one that the agent has forgotten. A cancelled one has completed. Another process has told of any
+    /// other: the row and the payload are that one's business, and whoever waits here is to wait no longer.
+    /// `outcome` is nothing when the agent has not told of any.
+    void reportForgotten(std::shared_ptr<Task> task, std::optional<TransferOutcome> outcome)
+        CORVANE_REQUIRES(agentThread);
     /// Takes back what the agent has said of servers that it cannot reach: another one finds out for itself.
     void forgetTroubles() CORVANE_REQUIRES(agentThread);
     /// While an end is waited for, an agent that hangs must not go unnoticed.
@@ -114,6 +117,7 @@ class AgentConversation final : public AgentLink::Listener, public std::enable_s
     void take(const agent::Welcome&) CORVANE_REQUIRES(agentThread) {}
     void take(const agent::Pong&) CORVANE_REQUIRES(agentThread) {}
     void take(const agent::Unsupported&) CORVANE_REQUIRES(agentThread) {}
+    void take(const agent::Discarded&) CORVANE_REQUIRES(agentThread) {}
 
     const AgentDirectory directory_;
     const std::shared_ptr<AgentLink> link_;

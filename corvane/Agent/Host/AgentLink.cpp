@@ -36,7 +36,9 @@ AgentLink::Way AgentLink::wayTo(AgentDirectory directory, std::filesystem::path 
 
 AgentLink::AgentLink(Way way, std::chrono::milliseconds deadline, agent::Hello hello, Clock::time_point now)
     : way_(std::move(way)), deadline_(deadline), hello_(std::move(hello)), giveUpAt_(now + deadline) {
-    if (!connect(now)) starter_ = way_.start();
+    if (connect(now)) return;
+    if (!way_.start) throw InvalidArgument(problem_);
+    starter_ = way_.start();
 }
 
 AgentLink::~AgentLink() = default;
@@ -103,7 +105,9 @@ AgentLink::Clock::time_point AgentLink::nextDeadline() const {
 
 void AgentLink::attempt(Clock::time_point now) {
     try {
-        if (!connect(now)) starter_ = way_.start();
+        if (connect(now)) return;
+        if (!way_.start) return fail(problem_);
+        starter_ = way_.start();
     } catch (const std::exception& error) {
         fail(error.what());
     }
@@ -227,7 +231,7 @@ void AgentLink::lost(Clock::time_point now, const std::string& why) {
     nextAttempt_ = now + betweenAttempts;
     problem_ = why;
     if (!stood) return;  // an agent that ends just now, or a start that goes on until its deadline
-    Log::shared().error("Transfer agent was lost and is started again, error=%{public}@", why);
+    if (way_.start) Log::shared().error("Transfer agent was lost and is started again, error=%{public}@", why);
     waitLonger(now);
     giveUpAt_ = nextAttempt_ + deadline_;
 }
@@ -237,11 +241,11 @@ void AgentLink::fail(const std::string& why) {
     forgetStarter();
     state_ = State::resting;
     // Once for each reason: an agent of another version, say, may be in the way for as long as it has work.
-    if (std::exchange(complaint_, why) != why) {
+    if (std::exchange(complaint_, why) != why && way_.start) {
         Log::shared().error("Transfer agent is not available, transfers go on inside the process, error=%{public}@",
                             why);
     }
-    if (const auto listener = listener_.lock()) listener->agentFailed();
+    if (const auto listener = listener_.lock()) listener->agentFailed(why);
 }
 
 }  // namespace corvane

@@ -38,7 +38,8 @@ class AgentLink {
     struct Way {
         /// A connected, non-blocking socket; none, and `errno`, when nobody answers.
         std::function<Descriptor()> connect;
-        /// Starts an agent, and waits for nothing. Throws `SystemError` when there can be none.
+        /// Starts an agent, and waits for nothing. Throws `SystemError` when there can be none. Empty: an agent that
+        /// does not run is not to be had, and nothing is logged of that.
         std::function<AgentProgram::Started()> start;
         /// Looks after the end of a process that was started.
         std::function<void(pid_t)> reap;
@@ -56,14 +57,14 @@ class AgentLink {
         virtual void agentIsReady() CORVANE_REQUIRES(agentThread) = 0;
         /// Whatever the agent says once it is ready, as it says it.
         virtual void agentSaid(const agent::Reply& reply) CORVANE_REQUIRES(agentThread) = 0;
-        /// There is no agent to be had.
-        virtual void agentFailed() CORVANE_REQUIRES(agentThread) = 0;
+        /// There is no agent to be had, and why.
+        virtual void agentFailed(const std::string& why) CORVANE_REQUIRES(agentThread) = 0;
         /// The process exits: what the agent may not have heard is to be left where it finds it.
         virtual void processEnds() CORVANE_REQUIRES(agentThread) = 0;
     };
 
     /// Connects, or starts an agent, at once: one that was started goes on if the process is killed at this moment.
-    /// Waits for neither. Throws what `Way::start` throws.
+    /// Waits for neither. Throws what `Way::start` throws; `InvalidArgument` without one.
     AgentLink(Way way, std::chrono::milliseconds deadline, agent::Hello hello, Clock::time_point now);
     AgentLink(const AgentLink&) = delete;
     AgentLink& operator=(const AgentLink&) = delete;

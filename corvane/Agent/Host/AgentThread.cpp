@@ -82,7 +82,7 @@ void AgentThread::post(std::function<void()> work) {
 void AgentThread::attach(std::shared_ptr<AgentLink> link) {
     post([this, link = std::move(link)] {
         agentThread.assertCurrent("AgentThread::attach");
-        links_.push_back(link);
+        adopt(link);
     });
 }
 

@@ -11,6 +11,7 @@
 #include <functional>
 #include <memory>
 #include <thread>
+#include <utility>
 #include <vector>
 
 namespace corvane {
@@ -41,6 +42,8 @@ class AgentThread {
 
     /// Looks after a link until it is closed. Callable from any thread.
     void attach(std::shared_ptr<AgentLink> link);
+    /// The same at once.
+    void adopt(std::shared_ptr<AgentLink> link) CORVANE_REQUIRES(agentThread) { links_.push_back(std::move(link)); }
 
     /// Waits, in the background, for a process that was started, so that none stays as a zombie.
     void reap(pid_t process) CORVANE_REQUIRES(agentThread) { unreaped_.push_back(process); }

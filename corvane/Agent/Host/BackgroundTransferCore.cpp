@@ -2,6 +2,7 @@
 
 #include <corvane/Agent/Host/AgentProgram.h>
 #include <corvane/Agent/Host/AgentThread.h>
+#include <corvane/Agent/Host/TransferDiscard.h>
 #include <corvane/Agent/TransferSubmission.h>
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/Log.h>
@@ -15,7 +16,6 @@ namespace corvane {
 
 namespace {
 using Stage = BackgroundTransferTask::Stage;
-constexpr const char* folder = "com.veskar.corvane.transfer-agent";
 }  // namespace
 
 BackgroundTransferCore::BackgroundTransferCore(TransferSessionConfiguration configuration,
@@ -43,8 +43,9 @@ void BackgroundTransferCore::open() {
 
 std::shared_ptr<AgentConversation> BackgroundTransferCore::converse(const std::filesystem::path& program) {
     TransferSubmission::checkNames(configuration_.identifier, configuration_.ownerKey, wakeCommand());
-    const AgentDirectory directory(options_.directory.empty() ? DocumentsDirectory::create() / folder
+    const AgentDirectory directory(options_.directory.empty() ? DocumentsDirectory::create() / AgentDirectory::usualName
                                                               : options_.directory);
+    TransferDiscard::noteDirectory(directory, options_.deadline);
     auto link = std::make_shared<AgentLink>(
         AgentLink::wayTo(directory, program, options_), options_.deadline,
         agent::Hello{
@@ -80,7 +81,19 @@ std::shared_ptr<BackgroundTransferTask> BackgroundTransferCore::add(TransferRequ
 void BackgroundTransferCore::start(const std::shared_ptr<Task>& task) {
     if (!agentIsUsable() || !spool(*task)) return inside_->takeOver(task);
     task->advanceTo(Stage::spooled);
-    conversation_->submitted(task->token());
+    conversation_->taskChanged(task->token());
+}
+
+// Whoever brings a task from `suspended` to `submitting` decides what becomes of it.
+void BackgroundTransferCore::cancel(const std::shared_ptr<Task>& task) {
+    if (task->advanceTo(Stage::submitting)) {
+        reporter_->enqueueEnd(task, &TransferSessionDelegate::taskDidComplete, cancelledOutcome(),
+                              [tasks = tasks_, token = task->token()](bool) { tasks->remove(token); });
+        task->advanceTo(Stage::reporting);
+        return;
+    }
+    inside_->cancel(*task);
+    if (conversation_) conversation_->taskChanged(task->token());
 }
 
 bool BackgroundTransferCore::spool(const Task& task) {

@@ -37,6 +37,8 @@ class BackgroundTransferCore final : public std::enable_shared_from_this<Backgro
     std::shared_ptr<Task> add(TransferRequest request, std::filesystem::path file);
     /// Hands a task that was resumed to the agent, or to the process.
     void start(const std::shared_ptr<Task>& task);
+    /// Stops a task that was just marked as cancelled.
+    void cancel(const std::shared_ptr<Task>& task);
     void describe(std::string token, std::string text);
     void tasks(TransferSession::Listing listing);
     void deliverPendingEvents();

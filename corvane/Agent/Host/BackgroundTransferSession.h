@@ -65,6 +65,13 @@ struct TransferAgentOptions {
 /// patience. Other failures and answers are reported as they come. Of several sessions of one identifier and owner key,
 /// in several processes, one is told of a task's end as its completion, and the others by `taskDidEndElsewhere`. What
 /// is handed over (URL, headers, proxy) lies in the agent's directory, readable by the user alone, until it is through.
+///
+/// A task may be cancelled wherever it is, one of an earlier run or of another process too; sessions of its owner that
+/// have not cancelled it are told that it has ended elsewhere. The agent is told in the background: a host that is
+/// killed before the completion may leave the task running, or have nobody told of it. An agent that does not answer
+/// within the deadline is given up, and stops the task when it goes on; one that was killed has left with the system
+/// what is in its buffers. A task that another process has taken over from its agent goes on there.
+///
 /// Otherwise see `TransferSession`, and `InProcessTransferSession` for redirects, certificates and proxies.
 ///
 ///     TransferSession::setFactory(BackgroundTransferSession::factory({.wakeCommand = {"/usr/bin/player",

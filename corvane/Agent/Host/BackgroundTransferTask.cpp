@@ -34,19 +34,20 @@ void BackgroundTransferTask::setDescription(std::string description) {
 }
 
 TransferTask::State BackgroundTransferTask::state() const {
-    switch (stage()) {
-        case Stage::suspended:
-            return State::suspended;
-        case Stage::completed:
-            return State::completed;
-        default:
-            return State::running;
-    }
+    const Stage now = stage();
+    if (now == Stage::completed) return State::completed;
+    if (isCancelled_) return State::cancelling;
+    return now == Stage::suspended ? State::suspended : State::running;
 }
 
 void BackgroundTransferTask::resume() {
     const auto core = core_.lock();
     if (core && advanceTo(Stage::submitting)) core->start(shared_from_this());
+}
+
+void BackgroundTransferTask::cancel() {
+    const auto core = core_.lock();
+    if (core && !isCancelled_.exchange(true)) core->cancel(shared_from_this());
 }
 
 bool BackgroundTransferTask::advanceTo(Stage stage) {

@@ -51,12 +51,17 @@ class BackgroundTransferTask final : public SessionTask, public std::enable_shar
     void setDescription(std::string description) override;
     [[nodiscard]] State state() const override;
     void resume() override;
+    void cancel() override;
     void complete() override { advanceTo(Stage::completed); }
 
     [[nodiscard]] const std::string& token() const { return token_; }
     [[nodiscard]] const TransferRequest& request() const { return request_; }
     [[nodiscard]] const std::filesystem::path& bodyPath() const { return bodyPath_; }
     [[nodiscard]] bool isOfThisRun() const { return isOfThisRun_; }
+
+    /// Whether it is to stop. It goes its way to its end all the same: from `inside` as what runs there does; otherwise
+    /// with the agent's word that it has no such task any more, after the mark that takes it back was made.
+    [[nodiscard]] bool isCancelled() const { return isCancelled_; }
 
     [[nodiscard]] Stage stage() const { return stage_; }
     /// Goes on to a later stage; stages may be left out. False, and the task stays where it is, when the stage does not
@@ -72,6 +77,7 @@ class BackgroundTransferTask final : public SessionTask, public std::enable_shar
     const std::filesystem::path bodyPath_;
     const bool isOfThisRun_;
     std::atomic<Stage> stage_;
+    std::atomic<bool> isCancelled_ = false;
 };
 
 }  // namespace corvane

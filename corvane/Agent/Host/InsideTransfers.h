@@ -6,8 +6,10 @@
 #include <corvane/Transfer/SessionReporter.h>
 
 #include <cstdint>
+#include <map>
 #include <memory>
 #include <optional>
+#include <string>
 
 namespace corvane {
 
@@ -21,6 +23,8 @@ class InsideTransfers final : public TransferSessionDelegate, public std::enable
     /// Starts a task inside the process, unless it is past that. One that cannot be started has failed: nobody else
     /// would end it.
     void takeOver(const std::shared_ptr<BackgroundTransferTask>& task);
+    /// Stops a task that was marked as cancelled, if it runs here; one that does not yet never starts here.
+    void cancel(const BackgroundTransferTask& task);
     /// Cancels what runs; nothing more is started.
     void close();
 
@@ -42,6 +46,7 @@ class InsideTransfers final : public TransferSessionDelegate, public std::enable
 
     Mutex mutex_;
     std::shared_ptr<InProcessTransferSession> session_ CORVANE_GUARDED_BY(mutex_);
+    std::map<std::string, std::shared_ptr<TransferTask>> running_ CORVANE_GUARDED_BY(mutex_);  // by token
 };
 
 }  // namespace corvane

@@ -31,6 +31,12 @@ void BridgedEventProcessor::didUpdateSession(const Session& session, bool submit
 void BridgedEventProcessor::didEndSession(const Session& session, Date endDate) {
     eventProcessor_->didEndSession(BridgedSession(session), endDate);
 }
+void BridgedEventProcessor::didReject(const RejectedEvent& event) {
+    eventProcessor_->didReject(event);
+}
+ForgottenRecords BridgedEventProcessor::forget() {
+    return eventProcessor_->forget();
+}
 bool BridgedEventProcessor::resumeBackgroundProcessing(const std::string& identifier,
                                                        const std::function<void()>& completion) {
     return eventProcessor_->resumeBackgroundProcessingForIdentifier(identifier, completion);

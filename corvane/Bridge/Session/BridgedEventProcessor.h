@@ -24,6 +24,8 @@ class BridgedEventProcessor final : public EventProcessorType {
     void didStartSession(const Session& session) override;
     void didUpdateSession(const Session& session, bool submitQueues) override;
     void didEndSession(const Session& session, Date endDate) override;
+    void didReject(const RejectedEvent& event) override;
+    ForgottenRecords forget() override;
     [[nodiscard]] const void* identity() const override { return eventProcessor_.get(); }
     bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion) override;
 

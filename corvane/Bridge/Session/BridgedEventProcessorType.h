@@ -3,8 +3,10 @@
 #include <corvane/Bridge/Models/BridgedSession.h>
 #include <corvane/Export.h>
 #include <corvane/Models/ProcessEvent.h>
+#include <corvane/Models/RejectedEvent.h>
 #include <corvane/Models/Session.h>
 #include <corvane/Platform/Date.h>
+#include <corvane/Platform/ForgottenRecords.h>
 
 #include <functional>
 #include <memory>
@@ -58,6 +60,11 @@ class CORVANE_EXPORT BridgedEventProcessorType {
     /// The session's data changed. `submitEventQueues` asks the processor to send what it has queued now.
     virtual void didUpdateSession(const BridgedSession& /*session*/, bool /*submitEventQueues*/) {}
     virtual void didEndSession(const BridgedSession& /*session*/, Date /*endDate*/) {}
+
+    /// The submission of an event has failed.
+    virtual void didReject(const RejectedEvent& /*event*/) {}
+    /// Everything that was recorded is to be forgotten: see `EventProcessorType::forget`.
+    virtual ForgottenRecords forget() { return {}; }
 
     /// Returns true when this processor owns the background transfer session `identifier` and takes the completion
     /// over, which it calls when the session's events are delivered; nobody in the process waits for that. Not

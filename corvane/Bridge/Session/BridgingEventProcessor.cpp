@@ -29,6 +29,12 @@ void BridgingEventProcessor::didUpdateSession(const BridgedSession& session, boo
 void BridgingEventProcessor::didEndSession(const BridgedSession& session, Date endDate) {
     eventProcessor_->didEndSession(session.session(), endDate);
 }
+void BridgingEventProcessor::didReject(const RejectedEvent& event) {
+    eventProcessor_->didReject(event);
+}
+ForgottenRecords BridgingEventProcessor::forget() {
+    return eventProcessor_->forget();
+}
 bool BridgingEventProcessor::resumeBackgroundProcessingForIdentifier(const std::string& identifier,
                                                                      const std::function<void()>& completion) {
     return eventProcessor_->resumeBackgroundProcessing(identifier, completion);

@@ -23,6 +23,8 @@ class CORVANE_EXPORT BridgingEventProcessor : public BridgedEventProcessorType {
     void didStartSession(const BridgedSession& session) override;
     void didUpdateSession(const BridgedSession& session, bool submitEventQueues) override;
     void didEndSession(const BridgedSession& session, Date endDate) override;
+    void didReject(const RejectedEvent& event) override;
+    ForgottenRecords forget() override;
     bool resumeBackgroundProcessingForIdentifier(const std::string& identifier,
                                                  const std::function<void()>& completion) override;
 
