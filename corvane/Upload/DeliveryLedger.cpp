@@ -56,7 +56,11 @@ void DeliveryLedger::add(std::string_view identifier, std::optional<std::int64_t
 
 void DeliveryLedger::remove(std::string_view identifier) {
     const Lock lock(mutex_);
-    if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) strikeOut(found);
+    if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) {
+        strikeOut(found);
+    } else if (const auto again = pending_.find(identifier); again != pending_.end()) {
+        pending_.erase(again);
+    }
 }
 
 DeliveryLedger::Document* DeliveryLedger::find(std::string_view identifier) {

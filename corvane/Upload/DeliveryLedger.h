@@ -42,7 +42,8 @@ class DeliveryLedger {
     /// Enters a document that is about to be handed over. Entering one again changes nothing, nor does one that is
     /// pending.
     void add(std::string_view identifier, std::optional<std::int64_t> events);
-    /// Strikes out a document whose hand-over was refused. Harmless for one that is not there.
+    /// Strikes out a document whose hand-over was refused, or that is another process's by now. Harmless for one that
+    /// is not there.
     void remove(std::string_view identifier);
     /// Enters a document of an earlier run, whose number of events is not known.
     void addEarlier(std::string_view identifier) { add(identifier, std::nullopt); }

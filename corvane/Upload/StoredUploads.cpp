@@ -83,7 +83,9 @@ void StoredUploads::send(std::vector<PreparedUploadRequest> requests) {
 std::optional<PreparedUploadRequest> StoredUploads::find(const std::string& identifier) {
     queue_->assertCurrent("StoredUploads::find");
     const auto row = rows_->find(identifier);
-    return row ? preparedRequest(*row) : std::nullopt;
+    if (row) return preparedRequest(*row);
+    ledger_->remove(identifier);  // another process has had its outcome
+    return std::nullopt;
 }
 
 void StoredUploads::end(const std::vector<std::string>& identifiers) {

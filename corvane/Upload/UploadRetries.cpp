@@ -122,6 +122,7 @@ void UploadRetries::begin() {
     }
     std::sort(waiting.begin(), waiting.end());
     std::vector<std::string> identifiers;
+    identifiers.reserve(waiting.size());
     for (auto& one : waiting) identifiers.push_back(std::move(one.second));
     backlog_.add(identifiers);
     schedule_.begin(chance());

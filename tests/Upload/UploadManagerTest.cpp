@@ -258,9 +258,10 @@ TEST(UploadManager, GivesNothingUpHoweverOftenItIsSentAgainInOneRun) {
     run.insert(row("I", StoredUploads::maximumRetries));
     run.dropbox->write("I", "x", TextResource("I"));
     for (const auto* name : {"I", "another's", "no payload"}) run.ledger->add(name, 1);
+    for (const auto* name : {"no payload", "another's"}) run.insert(row(name, 0));
     for (const auto* name : {"I", "another's"}) run.retry(name, {}, DeliveryUpdate::Reason::unreachable);
-    run.insert(row("no payload", 0));
     run.retry("no payload");
+    run.store->perform([](Store<SignedEntity>& rows) { rows.deleteWhere("identifier", "another's"); });
     for (int i = 0; i < UploadRetries::maximumAttempts + 9; ++i) {
         ASSERT_EQ(run.pass(2h), std::vector<std::string>{"I"}) << i;
         run.retry("I", {}, i < 10 ? DeliveryUpdate::Reason::blocked : DeliveryUpdate::Reason::answer);
@@ -271,7 +272,7 @@ TEST(UploadManager, GivesNothingUpHoweverOftenItIsSentAgainInOneRun) {
     ASSERT_EQ(run.rows().size(), 1u);
     EXPECT_EQ(run.rows().at(0).retries, StoredUploads::maximumRetries + 1);
     EXPECT_EQ(log.count("Upload waits for the next run after 100 attempts, identifier=I"), 1);
-    EXPECT_EQ(run.ledger->report(), (DeliveryReport{{}, {1, 1}, {2, 2}}));
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{{}, {1, 1}, {1, 1}}));
 }
 
 TEST(UploadManager, APassThatIsInVainSendsNoMore) {
