@@ -126,7 +126,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
     [[noreturn]] void failElsewhere(const char* operation) const;
     void enqueue(Task&& task, bool isAhead);
     void runSync(FunctionRef function);
-    std::shared_ptr<QueueTimers> addTimer(std::shared_ptr<TimerEntry> timer);
+    CORVANE_LOCAL std::shared_ptr<QueueTimers> addTimer(std::shared_ptr<TimerEntry> timer);
 
     const std::shared_ptr<State> state_;
 };
