@@ -347,11 +347,11 @@ void UploadBatches::didStartSession(const Session& session) {
     constexpr std::size_t few = 64;
     if (terminated_.count() > few) {
         accessQueue_->async([self = shared_from_this()] {
-            self->assertOnQueue("UploadBatchEventProcessor::countOthers");
-            self->countOthers();
+            self->assertOnQueue("UploadBatchEventProcessor::readStored");
+            self->readStored();
         });
     } else {
-        countOthers();
+        readStored();
     }
     handOverTerminated();
 }
@@ -493,6 +493,7 @@ std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
     terminated_.clear();
     backupsAreBehind_ = false;
     uploadManager_->forget();
+    readStored();
     publish();
     return unsaved;
 }
@@ -509,8 +510,9 @@ bool UploadBatches::isOpen(const std::string& identifier) {
            std::any_of(unsaved_.begin(), unsaved_.end(), has);
 }
 
-void UploadBatches::countOthers() {
+void UploadBatches::readStored() {
     try {
+
         auto sizes = deferredStore_->perform([](Rows& rows) { return UploadBatchEntity::sizes(*rows.connection()); });
         Ledger::Count count;
         std::int64_t bytes = 0;
@@ -521,8 +523,9 @@ void UploadBatches::countOthers() {
             bytes += size.bytes;
         }
         book_->setOpenOfOthers(count, bytes);
+        uploadManager_->readLedger();  // behind the rows of batches, which are forgotten into the ledger
     } catch (...) {
-        Log::shared().error("Failed to count what is stored, error=%{public}@", AnyError::current().what());
+        Log::shared().error("Failed to read the ledger, error=%{public}@", AnyError::current().what());
     }
 }
 
@@ -544,8 +547,7 @@ void UploadBatches::readLedger(std::function<void(const Ledger&)> completion) {
     if (!queue || born_.isInChild()) return;
     queue->async([self = shared_from_this(), completion = std::move(completion)] {
         self->assertOnQueue("UploadBatchEventProcessor::readLedger");
-        self->countOthers();
-        self->uploadManager_->readLedger();
+        self->readStored();
         callHost("ledger completion", [&] { completion(self->ledger()); });
     });
 }

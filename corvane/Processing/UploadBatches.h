@@ -121,8 +121,8 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     std::optional<ForgottenRecords> dropForgotten() CORVANE_REQUIRES(*accessQueue_);
     /// Whether a row's batch is one of those here.
     [[nodiscard]] bool isOpen(const std::string& identifier) CORVANE_REQUIRES(*accessQueue_);
-    /// Looks how much there is in rows of earlier runs and other processes.
-    void countOthers() CORVANE_REQUIRES(*accessQueue_);
+    /// Reads what is on disk into the book, rows of earlier runs and other processes among it. Logs what fails.
+    void readStored() CORVANE_REQUIRES(*accessQueue_);
     /// Tells the book what is here.
     void publish() CORVANE_REQUIRES(*accessQueue_);
 

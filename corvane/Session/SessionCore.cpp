@@ -1,6 +1,7 @@
 #include <corvane/Session/SessionCore.h>
 
 #include <corvane/Platform/HostCall.h>
+#include <corvane/Platform/Log.h>
 #include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Platform/UUID.h>
 
@@ -49,7 +50,7 @@ void SessionCore::resume() {
 void SessionCore::start(Session::Kind kind, Date startDate) {
     accessQueue_->assertCurrent("SessionManager start");
     if (isActive()) return;
-    RecordingSwitch::look();
+    finishForgetting();
     announce(SessionChange::willStart);
     state_ = std::make_unique<ActiveSession>(newUUID(), std::move(kind), startDate);
     processorManager_->didStartSession(*currentSession());
@@ -70,6 +71,29 @@ void SessionCore::end(Date endDate) {
 void SessionCore::abandon() {
     accessQueue_->assertCurrent("SessionManager destructor");
     state_ = None{};
+}
+
+void SessionCore::forget(ForgetCompletion completion) {
+    accessQueue_->assertCurrent("SessionManager forget");
+    const auto call = [completion = std::move(completion)](const ForgottenRecords& forgotten, const AnyError* error) {
+        if (completion) callHost("forget completion", [&] { completion(forgotten, error); });
+    };
+    accessQueue_->endRun();  // what was submitted before is told to be on disk before it is dropped
+    std::int64_t epoch = 0;
+    try {
+        epoch = RecordingSwitch::raiseEpoch();
+    } catch (...) {
+        const auto error = AnyError::current();
+        Log::shared().error("Failed to begin to forget, error=%{public}@", error.what());
+        return call({}, &error);
+    }
+    const auto own = processorManager_->forget();
+    forgetDirectory(epoch, [queue = accessQueue_, own, call](const ForgottenRecords& stored, const AnyError* error) {
+        const ForgottenRecords all{own.events + stored.events, own.documents + stored.documents};
+        queue->async([call, all, error = error ? std::optional(*error) : std::nullopt] {
+            call(all, error ? &*error : nullptr);
+        });
+    });
 }
 
 void SessionCore::push(AnyDataEventEntry entry, bool submitEventQueues) {

@@ -4,6 +4,7 @@
 #include <corvane/Platform/ForkMark.h>
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
+#include <corvane/Processing/Forgetting.h>
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Session/ActiveSession.h>
 #include <corvane/Tracker/DataEventStacks.h>
@@ -45,6 +46,7 @@ class SessionCore final : public TrackerDelegate,
     void start(Session::Kind kind, Date startDate);
     void end(Date endDate);
     void push(AnyDataEventEntry entry, bool submitEventQueues);
+    void forget(ForgetCompletion completion);
     /// The session manager is gone: whoever else still holds this, no session is active any more, and none has ended.
     void abandon();
     [[nodiscard]] bool isActive() const { return activeSession() != nullptr; }

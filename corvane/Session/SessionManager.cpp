@@ -79,6 +79,11 @@ bool SessionManager::isRecording() const {
     return RecordingSwitch::isOn();
 }
 
+void SessionManager::forget(std::function<void(const ForgottenRecords&, const AnyError*)> completion) {
+    core_->accessQueue()->async(
+        [core = core_, completion = std::move(completion)]() mutable { core->forget(std::move(completion)); });
+}
+
 std::uint64_t SessionManager::waitingCount() const {
     return core_->accessQueue()->waitingCount();
 }

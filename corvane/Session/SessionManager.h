@@ -3,6 +3,7 @@
 #include <corvane/Export.h>
 #include <corvane/Models/Session.h>
 #include <corvane/Models/SessionData.h>
+#include <corvane/Platform/ForgottenRecords.h>
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Session/AccessSessionManager.h>
 #include <corvane/Tracker/Tracker.h>
@@ -75,6 +76,21 @@ class CORVANE_EXPORT SessionManager {
     void setRecording(bool isOn, std::function<void(const AnyError* error)> completion = {});
     /// Whether events are recorded now. Any thread.
     [[nodiscard]] bool isRecording() const;
+
+    /// Forgets what was recorded so far and is not delivered, in the documents directory as it is set now: of every
+    /// endpoint there, of all processes that use it, and of earlier runs. Open batches, stored documents, their
+    /// payloads and all debugging copies are removed, and transfers are stopped, the transfer agent's too. What is
+    /// recorded from now on is kept; whether to record, sessions, data and timers stay as they are, and so does what a
+    /// processor of the host's keeps, unless it overrides `forget`.
+    ///
+    /// Submissions before this call are told to have succeeded first. Another process drops what it has in memory when
+    /// it next looks at its database, and neither writes nor sends it; a transfer that runs inside it at this moment
+    /// comes to its end. A kill in the midst of it is made good by the next session start of any process.
+    ///
+    /// The completion, if any, is called on the queue when it is done, with how much was dropped, and with the reason
+    /// when something may be left, which is logged too and tried again when a session next starts; with nothing dropped
+    /// if the beginning could not be written. Any thread; waits for nothing.
+    void forget(std::function<void(const ForgottenRecords& forgotten, const AnyError* error)> completion = {});
 
     /// How many calls wait in memory: those of this manager, its trackers and its processor manager that were enqueued
     /// and have not begun to run. Exact at no moment, since others call and the queue works meanwhile; good for a

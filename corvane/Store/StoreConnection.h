@@ -39,6 +39,8 @@ class StoreConnection {
     [[nodiscard]] bool isOpen() const noexcept;
 
     [[nodiscard]] const StoreLocation& location() const noexcept { return location_; }
+    /// The database file's path; empty for memory.
+    [[nodiscard]] const std::string& file() const noexcept { return path_; }
 
     /// Whether the file that was opened last has since been removed, or another has taken its name. The database goes
     /// on writing to such a file and reports no error, though nobody will ever read it.

@@ -4,6 +4,7 @@
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/Thread.h>
+#include <corvane/Signing/OpenSSLUse.h>
 #include <corvane/Transfer/TransferQueue.h>
 
 #include <atomic>
@@ -27,6 +28,7 @@ class Engine {
     // Never destroyed: the exit handler stops the thread, and what it held is left to the system.
     static Engine& shared() {
         if (Engine* made = instance_.load()) return *made;
+        const OpenSSLUse use;  // libcurl sets up what is built on it, which crashes once OpenSSL has been taken down
         static auto& engine = *new Engine;
         return engine;
     }

@@ -3,6 +3,7 @@
 #include <corvane/Store/Store.h>
 #include <corvane/Upload/LedgerEntity.h>
 #include <corvane/Upload/LedgerEntry.h>
+#include <corvane/Upload/UploadDropbox.h>
 
 namespace corvane {
 
@@ -25,6 +26,13 @@ std::vector<StoreColumn> SignedEntity::columns() {
 
 StoreTableExtras SignedEntity::extras() {
     const auto willForget = [](const std::shared_ptr<StoreConnection>& connection) {
+        // The payloads first: a kill in between leaves rows, and whoever comes next goes on.
+        if (!connection->location().isMemory()) {
+            const auto payloads = UploadDropbox::directoryBeside(*connection);
+            for (const auto& identifier : Store<SignedEntity>(connection).keys()) {
+                UploadDropbox::remove(payloads, identifier);
+            }
+        }
         Store<DocumentEntity> documents(connection);
         const auto sums = documents.sums();
         // Of what a release without a ledger has written there is nothing but the row.

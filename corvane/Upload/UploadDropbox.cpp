@@ -4,6 +4,7 @@
 #include <corvane/Platform/Error.h>
 #include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/UUID.h>
+#include <corvane/Store/StoreConnection.h>
 #include <corvane/Upload/ResourceType.h>
 #include <corvane/Upload/UploadResponse.h>
 
@@ -46,6 +47,16 @@ UploadDropbox::UploadDropbox(const std::string& name, bool debugging)
       }) {}
 
 UploadDropbox::~UploadDropbox() = default;
+
+std::filesystem::path UploadDropbox::directoryBeside(const StoreConnection& database) {
+    return std::filesystem::path(database.file()).replace_extension(".upload-dropbox");
+}
+
+void UploadDropbox::remove(const std::filesystem::path& directory, std::string_view identifier) {
+    if (!canNameFile(identifier)) return;
+    const auto payload = file(directory, identifier);
+    if (::unlink(payload.c_str()) != 0 && errno != ENOENT) throw SystemError("remove file " + payload.string(), errno);
+}
 
 std::filesystem::path UploadDropbox::write(std::string_view identifier, std::string_view data,
                                            const ResourceType& resource) {

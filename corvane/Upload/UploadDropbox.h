@@ -12,6 +12,8 @@
 
 namespace corvane {
 
+class StoreConnection;
+
 /// The payload directory of one endpoint, in the documents directory, and with debugging its twin with readable copies
 /// of what was sent and answered, which the library never removes.
 ///
@@ -39,6 +41,11 @@ class UploadDropbox final : public UploadDropboxType {
     /// @param name the endpoint's name.
     explicit UploadDropbox(const std::string& name, bool debugging = false);
     ~UploadDropbox() override;
+
+    /// The payload directory of the endpoint whose database that is. Requires: the database is a file.
+    [[nodiscard]] static std::filesystem::path directoryBeside(const StoreConnection& database);
+    /// Removes the payload of an upload from such a directory, if it is there. Throws `SystemError`.
+    static void remove(const std::filesystem::path& directory, std::string_view identifier);
 
     /// The payload directory, whether it exists or not. Throws `InvalidArgument` for a name that cannot name one.
     [[nodiscard]] const std::filesystem::path& baseURL() const { return baseURL_.value(); }

@@ -214,6 +214,8 @@ void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
         Log::shared().error("Failed to mark retry, identifier=%{public}@, error=%{public}@", retry.identifier,
                             AnyError::current().what());
     }
+    // Who had it cancelled because its row was to go has told of it.
+    if (!goesOutAgain && retry.cause.reason == DeliveryUpdate::Reason::cancelled) return;
     ledger_->settle(retry.identifier, goesOutAgain ? Outcome::pending : Outcome::givenUp, retry.cause);
 }
 

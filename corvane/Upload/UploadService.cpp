@@ -69,17 +69,14 @@ std::set<std::string> identifiersOfRunning(const std::vector<std::shared_ptr<Tra
     return identifiers;
 }
 
-// A captive portal in the way would use up a document's attempts in a few starts, and nothing of it was sent.
-bool isBlocked(const AnyError& error) {
-    const auto* known = error.as<TransferError>();
-    return known && known->value() == TransferError::Code::blocked;
-}
-
 DeliveryUpdate::Cause causeOf(const AnyError& error, const std::optional<TransferResponse>& response) {
     using Reason = DeliveryUpdate::Reason;
     const auto* known = error.as<TransferError>();
-    const bool isUnreachable = known && known->value() == TransferError::Code::unreachable;
-    const Reason reason = isUnreachable ? Reason::unreachable : isBlocked(error) ? Reason::blocked : Reason::failed;
+    const auto code = known ? known->value() : TransferError::Code::network;
+    const Reason reason = code == TransferError::Code::unreachable ? Reason::unreachable
+                          : code == TransferError::Code::blocked   ? Reason::blocked
+                          : code == TransferError::Code::cancelled ? Reason::cancelled
+                                                                   : Reason::failed;
     const bool isAnswered = response && response->isHTTP;
     return {reason, isAnswered ? std::optional(response->statusCode) : std::nullopt, error.what()};
 }
@@ -240,6 +237,14 @@ void UploadService::inFlight(std::function<void(const std::set<std::string>&)> a
     }
 }
 
+void UploadService::cancelAll() {
+    if (const auto opened = session()) {
+        opened->tasks([](const auto& tasks) {
+            for (const auto& task : tasks) task->cancel();
+        });
+    }
+}
+
 void UploadService::startMissing(const std::vector<PreparedUploadRequest>& requests,
                                  const std::vector<std::shared_ptr<TransferTask>>& tasks) {
     const auto inFlight = identifiersOfRunning(tasks);
@@ -324,7 +329,11 @@ UploadResult UploadService::result(const TransferTask& task, const std::optional
     if (error) {
         Log::shared().error("Upload failed, identifier=%{public}@, urlSessionTaskID=%{public}@, error=%{public}@",
                             identifier, taskID, error->what());
-        return UploadResult::retry(identifier, now(), !isBlocked(*error), causeOf(*error, response));
+        auto cause = causeOf(*error, response);
+        // A captive portal in the way would use up a document's attempts in a few starts, and nothing of it was sent.
+        const bool isCounted =
+            cause.reason != DeliveryUpdate::Reason::blocked && cause.reason != DeliveryUpdate::Reason::cancelled;
+        return UploadResult::retry(identifier, now(), isCounted, std::move(cause));
     }
     if (!response || !response->isHTTP) {
         Log::shared().default_("Upload unknown state, identifier=%{public}@, urlSessionTaskID=%{public}@", identifier,

@@ -288,14 +288,14 @@ void AgentConversation::reportForgotten(std::shared_ptr<Task> task, std::optiona
 }
 
 void AgentConversation::take(const agent::Trouble& reply) {
-    const bool isNews = reply.lasts ? troubles_.insert(reply.server).second : troubles_.erase(reply.server) > 0;
-    if (isNews) reporter_->reportHoldUp(reply.server, reply.lasts);
     if (reply.lasts) {
         Log::shared().error("Uploads wait for their server and are tried again, server=%{public}@, reason=%{public}@",
                             reply.server, reply.reason);
     } else {
         Log::shared().default_("Uploads to a server go on, server=%{public}@", reply.server);
     }
+    const bool isNews = reply.lasts ? troubles_.insert(reply.server).second : troubles_.erase(reply.server) > 0;
+    if (isNews) reporter_->reportHoldUp(reply.server, reply.lasts);
 }
 
 void AgentConversation::forgetTroubles() {

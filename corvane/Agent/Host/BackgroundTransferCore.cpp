@@ -86,13 +86,8 @@ void BackgroundTransferCore::start(const std::shared_ptr<Task>& task) {
 
 // Whoever brings a task from `suspended` to `submitting` decides what becomes of it.
 void BackgroundTransferCore::cancel(const std::shared_ptr<Task>& task) {
-    if (task->advanceTo(Stage::submitting)) {
-        reporter_->enqueueEnd(task, &TransferSessionDelegate::taskDidComplete, cancelledOutcome(),
-                              [tasks = tasks_, token = task->token()](bool) { tasks->remove(token); });
-        task->advanceTo(Stage::reporting);
-        return;
-    }
-    inside_->cancel(*task);
+    if (task->advanceTo(Stage::submitting)) return inside_->takeOver(task);
+    if (const auto inner = task->inner()) inner->cancel();
     if (conversation_) conversation_->taskChanged(task->token());
 }
 

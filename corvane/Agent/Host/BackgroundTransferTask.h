@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Platform/Mutex.h>
 #include <corvane/Transfer/SessionTask.h>
 #include <corvane/Transfer/TransferRequest.h>
 
@@ -9,6 +10,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 
 namespace corvane {
 
@@ -59,9 +61,20 @@ class BackgroundTransferTask final : public SessionTask, public std::enable_shar
     [[nodiscard]] const std::filesystem::path& bodyPath() const { return bodyPath_; }
     [[nodiscard]] bool isOfThisRun() const { return isOfThisRun_; }
 
-    /// Whether it is to stop. It goes its way to its end all the same: from `inside` as what runs there does; otherwise
-    /// with the agent's word that it has no such task any more, after the mark that takes it back was made.
+    /// Whether it is to stop. It goes its way to its end all the same: from `inside` as what runs there does; with the
+    /// agent's word that it has no such task any more, after the mark that takes it back was made; at once when there
+    /// is no agent to be had. One that was never resumed ends inside.
     [[nodiscard]] bool isCancelled() const { return isCancelled_; }
+
+    /// The task of the session inside the process that sends it; nothing before `inside`.
+    [[nodiscard]] std::shared_ptr<TransferTask> inner() const {
+        Lock lock(mutex_);
+        return inner_;
+    }
+    void setInner(std::shared_ptr<TransferTask> inner) {
+        Lock lock(mutex_);
+        inner_ = std::move(inner);
+    }
 
     [[nodiscard]] Stage stage() const { return stage_; }
     /// Goes on to a later stage; stages may be left out. False, and the task stays where it is, when the stage does not
@@ -78,6 +91,9 @@ class BackgroundTransferTask final : public SessionTask, public std::enable_shar
     const bool isOfThisRun_;
     std::atomic<Stage> stage_;
     std::atomic<bool> isCancelled_ = false;
+
+    mutable Mutex mutex_;
+    std::shared_ptr<TransferTask> inner_ CORVANE_GUARDED_BY(mutex_);
 };
 
 }  // namespace corvane

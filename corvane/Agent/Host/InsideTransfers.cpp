@@ -19,26 +19,14 @@ void InsideTransfers::takeOver(const std::shared_ptr<BackgroundTransferTask>& ta
     }
 }
 
-void InsideTransfers::start(const BackgroundTransferTask& task) {
+void InsideTransfers::start(BackgroundTransferTask& task) {
     const auto inside = session();
     if (!inside) return;
     const auto inner = inside->uploadTask(task.request(), task.bodyPath());
     inner->setDescription(task.token());
-    {
-        Lock lock(mutex_);
-        running_.emplace(task.token(), inner);
-    }
-    if (task.isCancelled()) inner->cancel();  // it may have been too early for `cancel`
+    task.setInner(inner);
+    if (task.isCancelled()) inner->cancel();  // whoever cancelled it may not have seen it
     inner->resume();
-}
-
-void InsideTransfers::cancel(const BackgroundTransferTask& task) {
-    std::shared_ptr<TransferTask> inner;
-    {
-        Lock lock(mutex_);
-        if (const auto found = running_.find(task.token()); found != running_.end()) inner = found->second;
-    }
-    if (inner) inner->cancel();
 }
 
 // The session, or nothing once it is closed: the reporter is before this is.
@@ -73,8 +61,6 @@ void InsideTransfers::taskDidComplete(const TransferTask& inner, const std::opti
 void InsideTransfers::end(BackgroundTransferTask& task, const TransferOutcome& outcome) {
     reporter_->reportEnd(task, &TransferSessionDelegate::taskDidComplete, outcome);
     tasks_->remove(task.token());
-    Lock lock(mutex_);
-    running_.erase(task.token());
 }
 
 }  // namespace corvane

@@ -6,10 +6,8 @@
 #include <corvane/Transfer/SessionReporter.h>
 
 #include <cstdint>
-#include <map>
 #include <memory>
 #include <optional>
-#include <string>
 
 namespace corvane {
 
@@ -20,11 +18,9 @@ class InsideTransfers final : public TransferSessionDelegate, public std::enable
     InsideTransfers(TransferSessionConfiguration configuration, std::shared_ptr<SessionReporter> reporter,
                     std::shared_ptr<TaskTable> tasks);
 
-    /// Starts a task inside the process, unless it is past that. One that cannot be started has failed: nobody else
-    /// would end it.
+    /// Starts a task inside the process, unless it is past that; one that was cancelled ends there at once. One that
+    /// cannot be started has failed: nobody else would end it.
     void takeOver(const std::shared_ptr<BackgroundTransferTask>& task);
-    /// Stops a task that was marked as cancelled, if it runs here; one that does not yet never starts here.
-    void cancel(const BackgroundTransferTask& task);
     /// Cancels what runs; nothing more is started.
     void close();
 
@@ -37,7 +33,7 @@ class InsideTransfers final : public TransferSessionDelegate, public std::enable
 
   private:
     [[nodiscard]] std::shared_ptr<InProcessTransferSession> session();
-    void start(const BackgroundTransferTask& task);
+    void start(BackgroundTransferTask& task);
     void end(BackgroundTransferTask& task, const TransferOutcome& outcome);
 
     const TransferSessionConfiguration configuration_;
@@ -46,7 +42,6 @@ class InsideTransfers final : public TransferSessionDelegate, public std::enable
 
     Mutex mutex_;
     std::shared_ptr<InProcessTransferSession> session_ CORVANE_GUARDED_BY(mutex_);
-    std::map<std::string, std::shared_ptr<TransferTask>> running_ CORVANE_GUARDED_BY(mutex_);  // by token
 };
 
 }  // namespace corvane

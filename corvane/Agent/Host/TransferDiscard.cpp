@@ -9,22 +9,28 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <map>
 #include <memory>
+#include <string>
 #include <system_error>
 #include <utility>
 #include <variant>
+#include <vector>
 
 namespace corvane {
 
 namespace {
 
 using Status = DiscardResult::Status;
-using Deadlines = std::map<std::filesystem::path, std::chrono::milliseconds>;
+using Agents = std::vector<std::pair<std::string, std::chrono::milliseconds>>;  // directories, and deadlines
+
+void add(Agents& agents, const std::string& directory, std::chrono::milliseconds deadline) {
+    const auto isSame = [&](const auto& one) { return one.first == directory; };
+    if (std::none_of(agents.begin(), agents.end(), isSame)) agents.emplace_back(directory, deadline);
+}
 
 struct Known {
     Mutex mutex;
-    Deadlines deadlines CORVANE_GUARDED_BY(mutex);
+    Agents used CORVANE_GUARDED_BY(mutex);
 };
 
 Known& known() {
@@ -32,16 +38,16 @@ Known& known() {
     return instance;
 }
 
-Deadlines used() {
+Agents used() {
     Lock lock(known().mutex);
-    return known().deadlines;
+    return known().used;
 }
 
 // The agent of the documents directory may be another process's alone.
-void addUsual(Deadlines& all) {
+void addUsual(Agents& all) {
     std::error_code missing;
     const auto usual = std::filesystem::canonical(DocumentsDirectory::path() / AgentDirectory::usualName, missing);
-    if (!missing) all.try_emplace(usual, TransferAgentOptions().deadline);
+    if (!missing) add(all, usual.string(), TransferAgentOptions().deadline);
 }
 
 // One call for all agents: tells what they made of it when the last of them has let go.
@@ -113,7 +119,7 @@ class Question final : public AgentLink::Listener, public std::enable_shared_fro
 
 void TransferDiscard::noteDirectory(const AgentDirectory& directory, std::chrono::milliseconds deadline) {
     Lock lock(known().mutex);
-    known().deadlines.insert_or_assign(directory.path(), deadline);
+    add(known().used, directory.path().string(), deadline);
 }
 
 void TransferDiscard::start(std::filesystem::path bodiesBeneath, std::function<void(DiscardResult)> done) {
@@ -127,8 +133,11 @@ void TransferDiscard::start(std::filesystem::path bodiesBeneath, std::function<v
                 round->note({Status::failed, 0, error.what()});
             }
         };
-        auto all = used();
-        tryTo([&] { addUsual(all); });
+        Agents all;
+        tryTo([&] {
+            all = used();
+            addUsual(all);
+        });
         for (const auto& [directory, deadline] : all) {
             tryTo([&] {
                 agentThread.assertCurrent("TransferDiscard");

@@ -39,7 +39,7 @@ class TransferDiscard {
     /// descriptor left for the library. Any thread.
     static void start(std::filesystem::path bodiesBeneath, std::function<void(DiscardResult)> done);
 
-    /// A session of this process uses an agent's directory. Any thread.
+    /// A session of this process uses an agent's directory; its first deadline counts. Any thread.
     static void noteDirectory(const AgentDirectory& directory, std::chrono::milliseconds deadline);
 };
 

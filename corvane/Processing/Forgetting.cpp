@@ -1,0 +1,165 @@
+#include <corvane/Processing/Forgetting.h>
+
+#include <corvane/Agent/Host/TransferDiscard.h>
+#include <corvane/Platform/Date.h>
+#include <corvane/Platform/DocumentsDirectory.h>
+#include <corvane/Platform/Log.h>
+#include <corvane/Platform/RecordingSwitch.h>
+#include <corvane/Platform/UUID.h>
+#include <corvane/Processing/UploadBatchEntity.h>
+#include <corvane/Store/DeferredStore.h>
+#include <corvane/Store/EpochEntity.h>
+#include <corvane/Transfer/TransferError.h>
+#include <corvane/Upload/SignedEntity.h>
+#include <corvane/Upload/UploadDropbox.h>
+
+#include <atomic>
+#include <chrono>
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <set>
+#include <string>
+#include <string_view>
+#include <utility>
+
+namespace corvane {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+std::atomic<std::int64_t> epochUnderWay = 0;
+
+struct Swept {
+    ForgottenRecords forgotten;
+    std::optional<AnyError> error;  // the first one
+};
+
+/// What stands between the two in a file's name, if anything does.
+std::optional<std::string> between(const fs::path& file, std::string_view opening, std::string_view closing) {
+    const std::string name = file.filename().string();
+    const bool fits = name.size() > opening.size() + closing.size() && name.compare(0, opening.size(), opening) == 0 &&
+                      name.compare(name.size() - closing.size(), closing.size(), closing) == 0;
+    if (!fits) return std::nullopt;
+    return name.substr(opening.size(), name.size() - opening.size() - closing.size());
+}
+
+std::set<std::string> storedDocuments(const std::shared_ptr<StoreConnection>& connection) {
+    auto keys = Store<SignedEntity>(connection).keys();
+    return {keys.begin(), keys.end()};
+}
+
+/// Removes the payloads that no row stands for: of a process that was killed before it wrote the row. One that is being
+/// written has none yet either, but it is younger than the epoch.
+void removeOrphans(const fs::path& payloads, const std::set<std::string>& stored, std::int64_t epoch) {
+    constexpr std::chrono::seconds granularity(1);  // of the file system's clock
+    const auto begin = dateFromMilliseconds(epoch).value_or(now()) - granularity;
+    std::error_code failed;
+    for (fs::directory_iterator entry(payloads, failed), end; !failed && entry != end; entry.increment(failed)) {
+        const auto name = entry->path().filename().string();
+        std::error_code unseen;
+        const auto written = std::chrono::file_clock::to_sys(entry->last_write_time(unseen));
+        if (!unseen && written < begin && isUUID(name) && !stored.contains(name)) fs::remove(entry->path(), unseen);
+    }
+}
+
+void removeDebuggingCopies(const fs::path& copies) {
+    std::error_code failed;
+    for (fs::directory_iterator entry(copies, failed), end; !failed && entry != end; entry.increment(failed)) {
+        auto document = between(entry->path(), "", ".request.json");
+        if (!document) document = between(entry->path(), "", ".response.json");
+        if (document && isUUID(*document)) fs::remove(entry->path(), failed);
+    }
+    if (failed && failed != std::errc::no_such_file_or_directory) {
+        throw SystemError("remove the debugging copies in " + copies.string(), failed.value());
+    }
+}
+
+ForgottenRecords sweepEndpoint(const std::string& name, std::int64_t epoch) {
+    const auto connection = std::make_shared<StoreConnection>(StoreLocation::default_(name));
+    connection->transaction([&] {
+        forgetBefore(epoch, connection, Store<SignedEntity>::table());
+        forgetBefore(epoch, connection, Store<UploadBatchEntity>::table());
+    });
+    ForgottenRecords forgotten;
+    for (const auto& known : Store<EpochEntity>(connection).fetchAll()) {
+        if (known.epoch < epoch) continue;
+        forgotten.events += known.forgotten.events;
+        forgotten.documents += known.forgotten.documents;
+    }
+    const auto payloads = UploadDropbox::directoryBeside(*connection);
+    removeOrphans(payloads, storedDocuments(connection), epoch);
+    removeDebuggingCopies(payloads.string() + ".debugging");
+    // The log of the database still has what the tables have no more; another process that reads keeps it for a while.
+    connection->run("PRAGMA wal_checkpoint(TRUNCATE);");
+    return forgotten;
+}
+
+Swept sweepDirectory(const fs::path& directory, std::int64_t epoch) {
+    Swept swept;
+    const auto note = [&] {
+        auto error = AnyError::current();
+        Log::shared().error("Failed to forget what was recorded, error=%{public}@", error.what());
+        if (!swept.error) swept.error = std::move(error);
+    };
+    try {
+        for (const auto& entry : fs::directory_iterator(directory)) {
+            const auto name = between(entry.path(), "com.veskar.corvane.", ".db");
+            if (!name || !entry.is_regular_file() || DocumentsDirectory::fileNamePart(*name) != *name) continue;
+            try {
+                const auto forgotten = sweepEndpoint(*name, epoch);
+                swept.forgotten.events += forgotten.events;
+                swept.forgotten.documents += forgotten.documents;
+            } catch (...) {
+                note();
+            }
+        }
+    } catch (...) {
+        note();
+    }
+    return swept;
+}
+
+void finish(std::int64_t epoch, Swept swept, const DiscardResult& discarded, const ForgetCompletion& done) {
+    if (discarded.status == DiscardResult::Status::failed) {
+        Log::shared().error("Failed to stop what the transfer agent sends, error=%{public}@", discarded.problem);
+        if (!swept.error)
+            swept.error = AnyError(TransferError(TransferError::Code::network,
+                                                 "the transfer agent was not stopped: " + discarded.problem));
+    }
+    try {
+        if (!swept.error) RecordingSwitch::finishEpoch(epoch);
+    } catch (...) {
+        swept.error = AnyError::current();
+    }
+    epochUnderWay = 0;
+    if (done) done(swept.forgotten, swept.error ? &*swept.error : nullptr);
+}
+
+}  // namespace
+
+void forgetDirectory(std::int64_t epoch, ForgetCompletion done) {
+    epochUnderWay = epoch;
+    DeferredStoreCore::queue().async([epoch, done = std::move(done)]() mutable {
+        const auto directory = fs::absolute(DocumentsDirectory::path());
+        const auto swept = sweepDirectory(directory, epoch);
+        try {
+            TransferDiscard::start(directory, [epoch, swept, done](const DiscardResult& result) {
+                DeferredStoreCore::queue().async([epoch, swept, done, result] { finish(epoch, swept, result, done); });
+            });
+        } catch (...) {
+            finish(epoch, swept, {.status = DiscardResult::Status::failed, .problem = AnyError::current().what()},
+                   done);
+        }
+    });
+}
+
+void finishForgetting() {
+    const auto epoch = RecordingSwitch::unfinishedEpoch();
+    if (epoch == 0 || epochUnderWay.exchange(epoch) == epoch) return;
+    Log::shared().default_("Forgetting what an earlier run was to forget");
+    forgetDirectory(epoch, {});
+}
+
+}  // namespace corvane
