@@ -44,6 +44,7 @@ using CVSessionData = BridgedSessionData;
 using CVSessionChange = SessionChange;
 using CVUploadBatchEventProcessor = BridgedUploadBatchEventProcessor;
 using CVUploadBatchEventConfig = UploadBatchEventConfig;
+using CVUploadBatchEventOptions = UploadBatchEventOptions;
 using CVLoggingEventProcessor = BridgingLoggingEventProcessor;
 using CVLoggingEventProcessorFormat = BridgedLoggingEventProcessorFormat;
 using CVSamplingEventProcessor = BridgingSamplingEventProcessor;

@@ -3,6 +3,7 @@
 #include <corvane/Platform/ForkMark.h>
 #include <corvane/Platform/Log.h>
 #include <corvane/Platform/Mutex.h>
+#include <corvane/Platform/QueueTimers.h>
 #include <corvane/Platform/Require.h>
 #include <corvane/Platform/TaskList.h>
 #include <corvane/Platform/Thread.h>
@@ -97,6 +98,8 @@ struct SerialQueue::State {
     // Written under the mutex; the worker reads them without between two tasks.
     std::atomic<int> suspensions = 0;
     std::atomic<bool> hasAhead = false;
+    QueueTimers timers;
+    int timerProblem CORVANE_GUARDED_BY(mutex) = 0;  // of the system, which has been logged
 
     // Of whoever runs tasks: what was left to the end of the run.
     TaskList writes;
@@ -111,6 +114,10 @@ struct SerialQueue::State {
 
     static void startWorker(const std::shared_ptr<State>& state);
     void work();
+    void sleep(Lock& lock) CORVANE_REQUIRES(mutex);
+    int sleepUntilTimer(Lock& lock) CORVANE_REQUIRES(mutex);
+    void takeDue() CORVANE_REQUIRES(mutex);
+    void wakeWorker();
     void workUntil(const bool& done, Lock& lock) CORVANE_REQUIRES(mutex);
     void runTaken(TaskList& taken);
     [[nodiscard]] Task begin(TaskList& taken) noexcept;
@@ -145,11 +152,11 @@ void SerialQueue::State::work() {
     Lock lock(mutex);
     startFailed = false;
     for (;;) {
+        takeDue();
         while (running || (waiting.empty() && waitingAhead.empty()) || suspended()) {
             if (closed && waiting.empty() && waitingAhead.empty()) return;
-            asleep = true;
-            lock.wait(wake);
-            asleep = false;
+            sleep(lock);
+            takeDue();
         }
         running = true;
         taken.takeAll(waiting);
@@ -158,6 +165,40 @@ void SerialQueue::State::work() {
         lock.lock();
         running = false;
     }
+}
+
+void SerialQueue::State::sleep(Lock& lock) {
+    asleep = true;
+    const int problem = timers.isEmpty() || suspended() ? (lock.wait(wake), 0) : sleepUntilTimer(lock);
+    asleep = false;
+    if (std::exchange(timerProblem, problem) == problem || problem == 0) return;
+    mutex.unlock();
+    Log::shared().error("Timers may be late, queue=%{public}@, error=%{public}@", label,
+                        SystemError("make a timer", problem).what());
+    mutex.lock();
+}
+
+// Returns why the system does not wait for the timer. Then it is looked after now and then, by a clock that stands
+// still while the machine is suspended.
+int SerialQueue::State::sleepUntilTimer(Lock& lock) {
+    if (const int problem = timers.prepareWait()) {
+        const auto longest = std::chrono::minutes(timerProblem == 0 ? 0 : 1);  // not before it is in the log
+        lock.waitUntil(wake, Clock::now() + std::min<Clock::duration>(timers.untilNext(), longest));
+        return problem;
+    }
+    mutex.unlock();
+    timers.wait();
+    mutex.lock();
+    return 0;
+}
+
+void SerialQueue::State::takeDue() {
+    if (!timers.isEmpty() && !suspended() && !closed) enqueued += timers.takeDue(waiting);
+}
+
+void SerialQueue::State::wakeWorker() {
+    wake.notify_one();
+    timers.wakeUp();
 }
 
 // For a caller that waits for its own task on a queue without a thread: runs what waits, in order, where it is. `done`
@@ -175,7 +216,7 @@ void SerialQueue::State::workUntil(const bool& done, Lock& lock) {
         runTaken(taken);
         mutex.lock();
         running = false;
-        if (workerStarted) wake.notify_one();
+        if (workerStarted) wakeWorker();
         syncDone.notify_all();
     }
 }
@@ -257,7 +298,7 @@ SerialQueue::~SerialQueue() {
     if (start) state_->workerStarted = true;
     lock.unlock();
     if (start) State::startWorker(state_);
-    state_->wake.notify_one();
+    state_->wakeWorker();
 }
 
 const std::string& SerialQueue::label() const noexcept {
@@ -306,7 +347,26 @@ void SerialQueue::enqueue(Task&& task, bool isAhead) {
         }
     }
     if (start) State::startWorker(state_);
-    if (wake) state.wake.notify_one();
+    if (wake) state.wakeWorker();
+}
+
+std::shared_ptr<QueueTimers> SerialQueue::addTimer(std::shared_ptr<TimerEntry> timer) {
+    State& state = *state_;
+    if (state.born.isInChild()) {
+        abandon([timer = std::move(timer)] {});
+        return nullptr;
+    }
+    state.timers.add(std::move(timer));
+    bool wake = false;
+    bool start = false;
+    {
+        const Lock lock(state.mutex);
+        start = !std::exchange(state.workerStarted, true);
+        wake = state.asleep;  // it has another time to wait for
+    }
+    if (start) State::startWorker(state_);
+    if (wake) state.wakeWorker();
+    return {state_, &state.timers};
 }
 
 void SerialQueue::runSync(FunctionRef function) {
@@ -328,7 +388,7 @@ void SerialQueue::runSync(FunctionRef function) {
                     wake = state->asleep && (!state->waiting.empty() || !state->waitingAhead.empty() || state->closed);
                     if (!state->workerStarted) state->syncDone.notify_all();
                 }
-                if (wake) state->wake.notify_one();
+                if (wake) state->wakeWorker();
             }
             std::shared_ptr<State> state;  // the function may release the queue
         } finish{state_};
@@ -366,7 +426,7 @@ void SerialQueue::runSync(FunctionRef function) {
     const bool wake = state.asleep && !state.running && !state.suspended();
     lock.unlock();
     if (start) State::startWorker(held);
-    if (wake) state.wake.notify_one();
+    if (wake) state.wakeWorker();
     lock.lock();
     state.workUntil(call.done, lock);
     lock.unlock();
@@ -385,6 +445,7 @@ void SerialQueue::resume() {
         --state_->suspensions;
     }
     state_->wake.notify_all();  // the worker, or a caller that works in its place
+    state_->timers.wakeUp();
     state_->syncDone.notify_all();
 }
 

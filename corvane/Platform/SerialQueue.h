@@ -13,6 +13,9 @@
 
 namespace corvane {
 
+class QueueTimers;
+struct TimerEntry;
+
 /// A first-in, first-out queue of tasks, of which at most one runs at any time.
 ///
 /// The queue owns one thread, started with its first asynchronous task; the thread carries the last
@@ -113,6 +116,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
     void assertNotCurrent(const char* operation) const;
 
   private:
+    friend class Timer;
     struct State;
     struct FunctionRef {
         void* object;
@@ -122,6 +126,7 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
     [[noreturn]] void failElsewhere(const char* operation) const;
     void enqueue(Task&& task, bool isAhead);
     void runSync(FunctionRef function);
+    CORVANE_LOCAL std::shared_ptr<QueueTimers> addTimer(std::shared_ptr<TimerEntry> timer);
 
     const std::shared_ptr<State> state_;
 };

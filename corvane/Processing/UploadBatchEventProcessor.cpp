@@ -16,6 +16,10 @@ UploadBatchEventConfig::UploadBatchEventConfig(const UploadBatchEventOptions& op
     if (options.maximumAge && options.maximumAge->count() < 1) {
         throw InvalidArgument("the maximum age must be at least 1 millisecond");
     }
+    if (options.maximumDelay && *options.maximumDelay < std::chrono::milliseconds(1))
+        throw InvalidArgument("the maximum delay must be at least 1 ms");
+    if (options.retryDelay && *options.retryDelay < std::chrono::milliseconds(1))
+        throw InvalidArgument("the retry delay must be at least 1 ms");
 }
 
 const UploadBatchEventConfig& UploadBatchEventConfig::default_() {

@@ -33,6 +33,17 @@ struct UploadBatchEventOptions {
     /// How old a stored document may get, in milliseconds since it was handed over, by the wall clock; at least 1. An
     /// older one is given up, as above, when the first session begins or another document is stored. Nothing: any age.
     std::optional<std::chrono::milliseconds> maximumAge = std::nullopt;
+
+    /// A session's open batch is sent when its oldest event has been in it for so long, and the session goes on; a
+    /// group's stays until it is left. The time counts while the machine is suspended, too. Without one a batch waits
+    /// until it is full, is flushed, or its session ends. At least 1 ms.
+    std::optional<std::chrono::milliseconds> maximumDelay = {};
+    /// A document that did not get through (there was no connection; the server answered 401, 429 or 5xx) is sent again
+    /// after so long while the process runs. The delay doubles, up to an hour, with each pass over such documents in
+    /// which nothing gets through, and is the first one again after a success; up to a quarter more is added at random.
+    /// A server's Retry-After is obeyed, up to a day at a time. A document that the server was sent a hundred times in
+    /// one run waits for the next one. Without a delay each waits for the next run. At least 1 ms.
+    std::optional<std::chrono::milliseconds> retryDelay = {};
 };
 
 /// How the batching processor batches. A value.
@@ -63,12 +74,12 @@ class CORVANE_EXPORT UploadBatchEventConfig {
 /// Turns events into uploads: collects them per session, or per group within a session, keeps a backup of every open
 /// batch on disk, and hands each finished batch to the upload manager as one user-events document.
 ///
-/// A session's batch is finished when it holds `batchSize` events or is flushed, a group's when the group is left, and
-/// all of them when the session ends. Backups that an earlier run left behind are sent when a session starts, a few at
-/// a time, so that the new session's events need not wait for all of them; one that cannot be read is logged, and
-/// stays. While the database is on disk and reports no error, an event whose submission succeeded is on disk before its
-/// completion is called; hand-over is at least once. Failures are logged, and never reach the code that submitted the
-/// event.
+/// A session's batch is finished when it holds `batchSize` events, is flushed or has waited for `maximumDelay`, a
+/// group's when the group is left, and all of them when the session ends. Backups that an earlier run left behind are
+/// sent when a session starts, a few at a time, so that the new session's events need not wait for all of them; one
+/// that cannot be read is logged, and stays. While the database is on disk and reports no error, an event whose
+/// submission succeeded is on disk before its completion is called; hand-over is at least once. Failures are logged,
+/// and never reach the code that submitted the event.
 ///
 /// The host makes it and adds it to one processor manager, which shares it. Its state lives on the access queue. When
 /// it is released, uploads in this process are cancelled; what is not delivered stays on disk for the next run.
@@ -89,7 +100,8 @@ class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType
 
     /// Waits until everything that was submitted before this call and is in a finished batch has an outcome, and at
     /// most until `deadline`. Returns what became of all documents so far: delivered, given up, or pending, which is
-    /// kept on disk and goes out again with the next run. Documents of earlier runs are waited for too.
+    /// kept on disk and goes out again with the next run. Documents of earlier runs are waited for too. One that has
+    /// failed and is sent again while the process runs is not waited for a second time: it is pending until it arrives.
     ///
     /// In a child made by `fork` it returns an empty report at once.
     ///

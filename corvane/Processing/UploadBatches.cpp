@@ -54,11 +54,11 @@ std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint
                                                    const UploadBatchEventConfig& config) {
     auto ledger = std::make_shared<DeliveryLedger>();
     auto book = std::make_shared<LedgerBook>();
-    auto manager =
-        UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
-                              std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
-                              std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()), ledger, book,
-                              {config.options().maximumBytesOnDisk, config.options().maximumAge});
+    auto manager = UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
+                                         std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
+                                         std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()),
+                                         ledger, book, config.options().retryDelay,
+                                         {config.options().maximumBytesOnDisk, config.options().maximumAge});
     return std::make_shared<UploadBatches>(
         std::move(client), std::move(manager), std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name()),
         config, std::move(ledger), std::move(book), std::make_shared<const EndpointUse>(endpoint));
@@ -84,9 +84,12 @@ void UploadBatches::flush() {
     if (!queue || born_.isInChild()) return;
     queue->async([self = shared_from_this()] {
         self->assertOnQueue("UploadBatchEventProcessor::flush");
-        if (self->currentSession_)
-            self->handOver(UploadBatchQueueKey::session(self->currentSession_->identifier), true);
+        self->handOverSession();
     });
+}
+
+void UploadBatches::handOverSession() {
+    if (currentSession_) handOver(UploadBatchQueueKey::session(currentSession_->identifier), true);
 }
 
 std::shared_ptr<SerialQueue> UploadBatches::registeredQueue() const {
@@ -123,10 +126,25 @@ void UploadBatches::process(const ProcessEvent& processEvent) {
     try {
         const UploadBatchQueueKey key = keyOf(processEvent);
         add(key, processEvent.payload());
-        if (!key.isGroup()) handOver(key, false);
+        if (!key.isGroup()) {
+            handOver(key, false);
+            limitDelay();
+        }
     } catch (...) {
         Log::shared().error("Failed to process event for batching, error=%{public}@", AnyError::current().what());
     }
+}
+
+void UploadBatches::limitDelay() {
+    const auto& delay = config_.options().maximumDelay;
+    if (!delay || delayTimer_.isSet() || !currentSession_) return;
+    if (!batchQueues_.contains(UploadBatchQueueKey::session(currentSession_->identifier))) return;
+    delayTimer_ = Timer::after(*accessQueue_, *delay, [weak = weak_from_this()] {
+        const auto self = weak.lock();
+        if (!self) return;
+        self->assertOnQueue("UploadBatchEventProcessor::handOverSession");
+        self->handOverSession();
+    });
 }
 
 void UploadBatches::add(const UploadBatchQueueKey& key, const JSON& payload) {
@@ -226,6 +244,7 @@ void UploadBatches::handOver(const UploadBatchQueueKey& key, bool force) {
     if (found->second.count() < config_.batchSize() && !force) return;
     // A manager of the host's may submit events from inside its call: they go into a batch of their own.
     auto handedOver = batchQueues_.extract(found);
+    if (!key.isGroup()) delayTimer_.cancel();
     try {
         if (!tryHandOver(handedOver.mapped())) {
             putBack(std::move(handedOver));
@@ -296,6 +315,7 @@ void UploadBatches::putBack(Queues::node_type refused) {
     auto back = batchQueues_.insert(std::move(refused));
     if (!back.inserted) back.position->second.prepend(std::move(back.node.mapped()));
     writeAtEndOfRun();
+    limitDelay();  // it is tried again then, if no event tries before
 }
 
 void UploadBatches::didLeaveGroup(const Group& group) {
@@ -318,6 +338,7 @@ void UploadBatches::didStartSession(const Session& session) {
         Log::shared().error("Failed to open handle to the store, error=%{public}@", AnyError::current().what());
     }
     uploadManager_->open();
+    delayTimer_.cancel();
     dropForgotten();
     setSession(session);
     // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
@@ -410,7 +431,7 @@ void UploadBatches::takeOut(const UploadBatchEntity& batch, const DocumentHandOv
 
 void UploadBatches::didUpdateSession(const Session& session, bool submitQueues) {
     assertOnQueue("UploadBatchEventProcessor::didUpdateSession");
-    if (currentSession_ && submitQueues) handOver(UploadBatchQueueKey::session(currentSession_->identifier), true);
+    if (submitQueues) handOverSession();
     setSession(session);
 }
 
@@ -431,6 +452,7 @@ void UploadBatches::didEndSession() {
     for (const auto& [key, queue] : batchQueues_) keys.push_back(key);
     for (const auto& key : keys) handOver(key, true);
     currentSession_.reset();
+    delayTimer_.cancel();
     try {
         deferredStore_->perform([](Rows& rows) { rows.close(); });
     } catch (...) {
@@ -467,6 +489,7 @@ std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
     }
     if (unsaved.events != 0) book_->addLater(LedgerEntry::givenUpForgotten, {unsaved.events, 0});
     batchQueues_.clear();
+    delayTimer_.cancel();
     unsaved_.clear();
     terminated_.clear();
     backupsAreBehind_ = false;

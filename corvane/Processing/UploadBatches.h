@@ -6,6 +6,7 @@
 #include <corvane/Platform/ForkMark.h>
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
+#include <corvane/Platform/Timer.h>
 #include <corvane/Processing/DocumentHandOver.h>
 #include <corvane/Processing/TerminatedBatches.h>
 #include <corvane/Processing/UploadBatch.h>
@@ -94,6 +95,9 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     /// Lets go of unsaved batches whose documents need no second attempt.
     void dropDelivered() CORVANE_REQUIRES(*accessQueue_);
 
+    /// Sees to it that the session's open batch, if there is one, is handed over when `maximumDelay` has passed.
+    void limitDelay() CORVANE_REQUIRES(*accessQueue_);
+    void handOverSession() CORVANE_REQUIRES(*accessQueue_);
     /// Hands a batch over when it is full, or in any case; one that is refused is open again.
     void handOver(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);
     /// Hands a batch over that is in no list any more, with the session's data as it is now.
@@ -141,6 +145,7 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     std::map<std::string, UploadBatch> unsaved_ CORVANE_GUARDED_BY(*accessQueue_);
     TerminatedBatches terminated_ CORVANE_GUARDED_BY(*accessQueue_);
     std::optional<Session> currentSession_ CORVANE_GUARDED_BY(*accessQueue_);
+    Timer delayTimer_ CORVANE_GUARDED_BY(*accessQueue_);  // of the session's batch; set while there is one
     // A row could not be written; once one can, all are.
     bool backupsAreBehind_ CORVANE_GUARDED_BY(*accessQueue_) = false;
     bool writesAtEndOfRun_ CORVANE_GUARDED_BY(*accessQueue_) = false;

@@ -1,5 +1,6 @@
 #include <corvane/Upload/Backlog.h>
 
+#include <iterator>
 #include <utility>
 
 namespace corvane {
@@ -21,6 +22,19 @@ std::vector<std::string> Backlog::take() {
         taken.push_back(std::move(next));
     }
     if (waiting_.empty()) endedBefore_.clear();
+    return taken;
+}
+
+bool Backlog::isIdle() {
+    const Lock lock(mutex_);
+    return underWay_.empty();
+}
+
+std::vector<std::string> Backlog::takeBack() {
+    const Lock lock(mutex_);
+    std::vector<std::string> taken(std::move_iterator(waiting_.begin()), std::move_iterator(waiting_.end()));
+    waiting_.clear();
+    endedBefore_.clear();
     return taken;
 }
 

@@ -20,6 +20,11 @@ class Backlog {
     void add(const std::vector<std::string>& identifiers);
     /// The next ones, which are under way from now on. None while a portion or more is.
     [[nodiscard]] std::vector<std::string> take();
+    /// Whether none is under way.
+    [[nodiscard]] bool isIdle();
+    /// Takes all back that has not been given out. Returns it in its order.
+    std::vector<std::string> takeBack();
+    /// Lets go of all.
     void clear();
     /// Notes that a document needs no sending (any more). Returns whether there is something to take.
     bool end(const std::string& identifier);

@@ -43,28 +43,46 @@ Step stepOf(DeliveryLedger::Outcome outcome) {
 
 }  // namespace
 
+void DeliveryLedger::keepPending() {
+    const Lock lock(mutex_);
+    keepsPending_ = true;
+}
+
 void DeliveryLedger::add(std::string_view identifier, std::optional<std::int64_t> events) {
     const Lock lock(mutex_);
+    if (pending_.contains(identifier)) return;
     if (onTheirWay_.try_emplace(std::string(identifier), Document{events, lastNumber_ + 1}).second) ++lastNumber_;
 }
 
 void DeliveryLedger::remove(std::string_view identifier) {
     const Lock lock(mutex_);
-    if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) strikeOut(found);
+    if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) {
+        strikeOut(found);
+    } else if (const auto again = pending_.find(identifier); again != pending_.end()) {
+        pending_.erase(again);
+    }
 }
 
-void DeliveryLedger::strikeOut(Documents::iterator document) {
-    onTheirWay_.erase(document);
+DeliveryLedger::Document* DeliveryLedger::find(std::string_view identifier) {
+    for (auto* documents : {&onTheirWay_, &pending_}) {
+        if (const auto found = documents->find(identifier); found != documents->end()) return &found->second;
+    }
+    return nullptr;
+}
+
+DeliveryLedger::Documents::node_type DeliveryLedger::strikeOut(Documents::iterator document) {
+    auto struckOut = onTheirWay_.extract(document);
     if (onTheirWay_.empty()) heldUpTo_ = 0;
     settled_.notify_all();
+    return struckOut;
 }
 
 void DeliveryLedger::begin(std::string_view identifier) {
     {
         const Lock lock(mutex_);
-        const auto found = onTheirWay_.find(identifier);
-        if (found == onTheirWay_.end() || std::exchange(found->second.isUnderWay, true)) return;
-        tell(Step::underWay, identifier, &found->second);
+        auto* const document = find(identifier);
+        if (!document || std::exchange(document->isUnderWay, true)) return;
+        tell(Step::underWay, identifier, document);
     }
     news_->post();
 }
@@ -72,10 +90,10 @@ void DeliveryLedger::begin(std::string_view identifier) {
 void DeliveryLedger::progress(std::string_view identifier, std::int64_t sent, std::int64_t expected) {
     {
         const Lock lock(mutex_);
-        const auto found = onTheirWay_.find(identifier);
-        if (found == onTheirWay_.end()) return;
+        const auto* const document = find(identifier);
+        if (!document) return;
         heldUpTo_ = 0;
-        tell(Step::progress, identifier, &found->second, {}, sent, expected);
+        tell(Step::progress, identifier, document, {}, sent, expected);
     }
     news_->post();
 }
@@ -84,17 +102,30 @@ void DeliveryLedger::settle(std::string_view identifier, Outcome outcome, const 
     {
         const Lock lock(mutex_);
         noteServer(cause.reason);
-        const auto found = onTheirWay_.find(identifier);
-        const bool isHere = found != onTheirWay_.end();
-        tell(stepOf(outcome), identifier, isHere ? &found->second : nullptr, cause);
-        if (isHere) {
-            addTo(countOf(totals_, outcome), found->second.events);
-            strikeOut(found);
+        tell(stepOf(outcome), identifier, find(identifier), cause);
+        if (const auto found = onTheirWay_.find(identifier); found != onTheirWay_.end()) {
+            fold(found, outcome);
             const auto followed = followed_.find(identifier);
             if (followed != followed_.end()) followed->second = Settled{outcome, cause};
+        } else if (const auto again = pending_.find(identifier); again != pending_.end()) {
+            again->second.isUnderWay = false;
+            if (outcome != Outcome::pending) {
+                addTo(countOf(totals_, outcome), again->second.events);
+                pending_.erase(again);
+            }
         }
     }
     news_->post();
+}
+
+void DeliveryLedger::fold(Documents::iterator document, Outcome outcome) {
+    auto settled = strikeOut(document);
+    if (outcome == Outcome::pending && keepsPending_) {
+        settled.mapped().isUnderWay = false;
+        pending_.insert(std::move(settled));
+    } else {
+        addTo(countOf(totals_, outcome), settled.mapped().events);
+    }
 }
 
 void DeliveryLedger::settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause) {
@@ -102,6 +133,7 @@ void DeliveryLedger::settleAll(Outcome outcome, const DeliveryUpdate::Cause& cau
     {
         const Lock lock(mutex_);
         for (const auto& [identifier, document] : onTheirWay_) identifiers.push_back(identifier);
+        for (const auto& [identifier, document] : pending_) identifiers.push_back(identifier);
     }
     for (const auto& identifier : identifiers) settle(identifier, outcome, cause);
 }
@@ -156,6 +188,7 @@ std::optional<DeliveryLedger::Settled> DeliveryLedger::takeOutcome(std::string_v
 DeliveryReport DeliveryLedger::reportLocked() const {
     auto report = totals_;
     for (const auto& [identifier, document] : onTheirWay_) addTo(report.pending, document.events);
+    for (const auto& [identifier, document] : pending_) addTo(report.pending, document.events);
     return report;
 }
 

@@ -31,13 +31,19 @@ class DeliveryLedger {
     /// Each enumerator says what happens next with the document.
     enum class Outcome {
         delivered,  ///< nothing: the collector has it
-        pending,    ///< it goes out again when a manager for its endpoint is next opened
-        givenUp,    ///< nothing: it was refused or dropped
+        pending,  ///< it goes out again when a manager for its endpoint is next opened, or before if that is asked for
+        givenUp,  ///< nothing: it was refused or dropped
     };
 
-    /// Enters a document that is about to be handed over. Entering one again changes nothing.
+    /// Remembers documents that are settled as pending from now on: they may begin again in this run, and their outcome
+    /// is then the later one. Nobody waits for them again.
+    void keepPending();
+
+    /// Enters a document that is about to be handed over. Entering one again changes nothing, nor does one that is
+    /// pending.
     void add(std::string_view identifier, std::optional<std::int64_t> events);
-    /// Strikes out a document whose hand-over was refused. Harmless for one that is not there.
+    /// Strikes out a document whose hand-over was refused, or that is another process's by now. Harmless for one that
+    /// is not there.
     void remove(std::string_view identifier);
     /// Enters a document of an earlier run, whose number of events is not known.
     void addEarlier(std::string_view identifier) { add(identifier, std::nullopt); }
@@ -46,7 +52,8 @@ class DeliveryLedger {
     void begin(std::string_view identifier);
     /// Notes how many bytes of a document have gone out, and of how many.
     void progress(std::string_view identifier, std::int64_t sent, std::int64_t expected);
-    /// Settles a document, for good. The observer is told also of one that is not there, which is otherwise harmless.
+    /// Settles a document, for good unless it is pending and `keepPending` was called. The observer is told also of one
+    /// that is not there, which is otherwise harmless.
     void settle(std::string_view identifier, Outcome outcome, const DeliveryUpdate::Cause& cause = {});
     /// Settles every document that is on its way.
     void settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause);
@@ -93,7 +100,11 @@ class DeliveryLedger {
     /// @param document what is known of it; nullptr for one that was not entered here
     void tell(DeliveryUpdate::Step step, std::string_view identifier, const Document* document,
               const DeliveryUpdate::Cause& cause = {}, std::int64_t sent = 0, std::int64_t expected = 0) noexcept;
-    void strikeOut(Documents::iterator document) CORVANE_REQUIRES(mutex_);
+    /// What is known of a document, pending ones included; nullptr for one that was not entered here.
+    [[nodiscard]] Document* find(std::string_view identifier) CORVANE_REQUIRES(mutex_);
+    Documents::node_type strikeOut(Documents::iterator document) CORVANE_REQUIRES(mutex_);
+    /// Enters an outcome in the books, for the document's events.
+    void fold(Documents::iterator document, Outcome outcome) CORVANE_REQUIRES(mutex_);
     /// What the end of a transfer says of the server.
     void noteServer(DeliveryUpdate::Reason reason) CORVANE_REQUIRES(mutex_);
     [[nodiscard]] bool isSettledLocked(bool onlyWhileReachable) const CORVANE_REQUIRES(mutex_);
@@ -104,6 +115,8 @@ class DeliveryLedger {
     mutable Mutex mutex_;
     mutable std::condition_variable settled_;
     Documents onTheirWay_ CORVANE_GUARDED_BY(mutex_);
+    Documents pending_ CORVANE_GUARDED_BY(mutex_);  // settled ones that may begin again; empty unless they are kept
+    bool keepsPending_ CORVANE_GUARDED_BY(mutex_) = false;
     std::uint64_t lastNumber_ CORVANE_GUARDED_BY(mutex_) = 0;
     // The documents up to this number wait for a server that is known to be unreachable.
     std::uint64_t heldUpTo_ CORVANE_GUARDED_BY(mutex_) = 0;

@@ -13,7 +13,7 @@ struct DeliveryReport {
     };
 
     Count delivered;  ///< the collector has them
-    Count pending;    ///< they are kept, and go out again with the next run, or are still on their way
+    Count pending;    ///< they are kept, and go out again with the next run or after `retryDelay`, or are on their way
     Count givenUp;    ///< refused by the collector, or dropped: they will not arrive
 
     bool operator==(const DeliveryReport&) const = default;

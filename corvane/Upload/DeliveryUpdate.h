@@ -10,8 +10,8 @@ namespace corvane {
 /// One step of a document's delivery, as a delivery observer is told of it. A value.
 ///
 /// A document is under way, may make progress, and has an outcome: delivered, deferred or given up. One that is
-/// deferred is under way again with a later run. Of documents that earlier runs or other processes have left the
-/// outcome may be all that is told.
+/// deferred is under way again with a later run, or later in this one where `retryDelay` is set. Of documents that
+/// earlier runs or other processes have left the outcome may be all that is told.
 struct DeliveryUpdate {
     enum class Step {
         underWay,   ///< taken over to be sent, and in its turn

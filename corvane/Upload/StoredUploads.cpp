@@ -34,6 +34,7 @@ void StoredUploads::registerAccessQueue(std::shared_ptr<SerialQueue> queue) {
 }
 
 void StoredUploads::begin() {
+    queue_->assertCurrent("StoredUploads::begin");
     try {
         list();
         bounds_->begin();  // what is given up is not sent before
@@ -71,9 +72,22 @@ void StoredUploads::sendPortion() {
             isMoreReady = backlog_.end(identifier);
         }
     }
+    send(std::move(requests));
+    if (isMoreReady) sendPortionLater();
+}
+
+void StoredUploads::send(std::vector<PreparedUploadRequest> requests) {
+    queue_->assertCurrent("StoredUploads::send");
     for (const auto& request : requests) ledger_->begin(request.identifier);
     service_->resubmit(std::move(requests));
-    if (isMoreReady) sendPortionLater();
+}
+
+std::optional<PreparedUploadRequest> StoredUploads::find(const std::string& identifier) {
+    queue_->assertCurrent("StoredUploads::find");
+    const auto row = rows_->find(identifier);
+    if (row) return preparedRequest(*row);
+    ledger_->remove(identifier);  // another process has had its outcome
+    return std::nullopt;
 }
 
 void StoredUploads::end(const std::vector<std::string>& identifiers) {
@@ -86,24 +100,24 @@ void StoredUploads::forget() {
     backlog_.clear();
 }
 
-// Behind the submissions that wait: results overtake them, so that a backlog that ends quickly would keep them waiting.
 void StoredUploads::sendPortionLater() {
-    const auto retry = [weak = weak_from_this()] {
+    runLater([weak = weak_from_this()] {
         const auto self = weak.lock();
         if (!self) return;
-        self->queue_->async([weak] {
-            const auto still = weak.lock();
-            if (!still) return;
-            still->queue_->assertCurrent("StoredUploads::sendPortion");
-            still->sendPortion();
-        });
-    };
-    std::shared_ptr<SerialQueue> accessQueue;
-    {
-        const Lock lock(mutex_);
-        accessQueue = accessQueue_;
-    }
-    accessQueue ? accessQueue->async(retry) : retry();
+        self->queue_->assertCurrent("StoredUploads::sendPortion");
+        self->sendPortion();
+    });
+}
+
+void StoredUploads::runLater(Task task) {
+    const auto behind = accessQueue();
+    if (behind == queue_) return queue_->async(std::move(task));
+    behind->async([queue = queue_, work = std::move(task)]() mutable { queue->async(std::move(work)); });
+}
+
+std::shared_ptr<SerialQueue> StoredUploads::accessQueue() {
+    const Lock lock(mutex_);
+    return accessQueue_ ? accessQueue_ : queue_;
 }
 
 std::optional<SignedEntity> StoredUploads::storedRow(const std::string& identifier) {

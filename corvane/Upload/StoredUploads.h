@@ -34,12 +34,24 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
 
     /// The queue of the submissions, which a next portion must not overtake. Any thread.
     void registerAccessQueue(std::shared_ptr<SerialQueue> queue);
-    /// Enters all that is stored, and sends the first portion. Logs what fails.
-    void begin() CORVANE_REQUIRES(*queue_);
+    /// Enters all that is stored, and sends the first portion. Logs what fails. On the manager's queue, as `find` and
+    /// `send` (the process is stopped with a message).
+    void begin();
     /// Uploads have ended here or elsewhere, of whichever run: the next portion may be due. Any thread.
     void end(const std::vector<std::string>& identifiers);
     /// Sends nothing more of what was listed. Any thread.
     void forget();
+
+    /// What is to be sent of a stored document, however often it was retried, or nothing when its row has gone or its
+    /// payload, with which the row goes, too. Throws `StoreError` and `DeferredStoreError`.
+    [[nodiscard]] std::optional<PreparedUploadRequest> find(const std::string& identifier);
+    /// Sends what is not in flight.
+    void send(std::vector<PreparedUploadRequest> requests);
+    /// Runs a task of this queue's behind the submissions that wait: results overtake them, so that a backlog that ends
+    /// quickly would keep them waiting. Any thread.
+    void runLater(Task task);
+    /// The queue of the submissions; this one when none was registered. Any thread.
+    [[nodiscard]] std::shared_ptr<SerialQueue> accessQueue();
 
   private:
     void list() CORVANE_REQUIRES(*queue_);

@@ -43,11 +43,15 @@ std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServi
                                                      std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                                                      std::shared_ptr<UploadDropboxType> dropbox,
                                                      std::shared_ptr<DeliveryLedger> ledger,
-                                                     std::shared_ptr<LedgerBook> book, const StorageLimits& limits) {
+                                                     std::shared_ptr<LedgerBook> book,
+                                                     std::optional<std::chrono::milliseconds> retryDelay,
+                                                     const StorageLimits& limits) {
     if (!ledger) ledger = std::make_shared<DeliveryLedger>();
     if (!book) book = std::make_shared<LedgerBook>();
-    std::shared_ptr<UploadManager> manager(new UploadManager(
-        std::move(service), std::move(deferredStore), std::move(dropbox), std::move(ledger), std::move(book), limits));
+    if (retryDelay) ledger->keepPending();
+    std::shared_ptr<UploadManager> manager(new UploadManager(std::move(service), std::move(deferredStore),
+                                                             std::move(dropbox), std::move(ledger), std::move(book),
+                                                             retryDelay, limits));
     manager->service_->setDelegate(manager);
     return manager;
 }
@@ -55,13 +59,15 @@ std::shared_ptr<UploadManager> UploadManager::create(std::shared_ptr<UploadServi
 UploadManager::UploadManager(std::shared_ptr<UploadServiceType> service,
                              std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                              std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger,
-                             std::shared_ptr<LedgerBook> book, const StorageLimits& limits)
+                             std::shared_ptr<LedgerBook> book, std::optional<std::chrono::milliseconds> retryDelay,
+                             const StorageLimits& limits)
     : service_(std::move(service)),
       rows_(std::make_shared<UploadRows>(std::move(deferredStore), book)),
       dropbox_(std::move(dropbox)),
       ledger_(std::move(ledger)),
       bounds_(std::make_shared<StorageBounds>(limits, queue_, service_, rows_, dropbox_, ledger_, std::move(book))),
-      stored_(std::make_shared<StoredUploads>(queue_, service_, rows_, dropbox_, ledger_, bounds_)) {}
+      stored_(std::make_shared<StoredUploads>(queue_, service_, rows_, dropbox_, ledger_, bounds_)),
+      retries_(retryDelay ? std::make_shared<UploadRetries>(*retryDelay, queue_, stored_) : nullptr) {}
 
 UploadManager::~UploadManager() = default;
 
@@ -99,6 +105,7 @@ void UploadManager::forget() {
         unrecorded_.clear();
     }
     stored_->forget();
+    if (retries_) retries_->forget();
     service_->cancelAll();
     ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
 }
@@ -177,6 +184,7 @@ void UploadManager::uploadServiceTogether(UploadServiceType&, const std::vector<
         }
     }
     stored_->end(all);
+    if (retries_) retries_->end(results);
 }
 
 void UploadManager::didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem) {
@@ -206,7 +214,8 @@ void UploadManager::didFailForNow(const UploadResult::Retry& retry) {
     if (const auto reason = bounds_->takeReason(retry.identifier)) return bounds_->giveUp(retry.identifier, *reason);
     bool goesOutAgain = true;
     try {
-        goesOutAgain = rows_->countRetry(retry) || wasUnrecorded;
+        const bool isFirstOfRun = !retries_ || retries_->isFirstCounted(retry);
+        goesOutAgain = rows_->countRetry(retry, isFirstOfRun) || wasUnrecorded;
     } catch (...) {
         Log::shared().error("Failed to mark retry, identifier=%{public}@, error=%{public}@", retry.identifier,
                             AnyError::current().what());
@@ -226,6 +235,7 @@ void UploadManager::uploadEndedElsewhere(const UploadResult& result) {
     forgetUnrecorded(identifier);
     bounds_->end(identifier);
     stored_->end({identifier});
+    if (retries_) retries_->endElsewhere(identifier);
     const auto cause = result.cause();
     if (std::holds_alternative<UploadResult::Success>(result.value)) {
         return ledger_->settle(identifier, Outcome::delivered, cause);

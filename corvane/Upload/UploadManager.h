@@ -10,11 +10,13 @@
 #include <corvane/Upload/UploadDropboxType.h>
 #include <corvane/Upload/UploadManagerType.h>
 #include <corvane/Upload/UploadResult.h>
+#include <corvane/Upload/UploadRetries.h>
 #include <corvane/Upload/UploadRows.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 #include <corvane/Upload/UploadServiceType.h>
 
 #include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -32,7 +34,8 @@ namespace corvane {
 /// One per batching processor, which owns it; the service holds it weakly as its delegate, and what ends after it has
 /// gone is found by the next manager. Rows and files outlive the process. An upload that ends with a retry stays, and
 /// goes out again when a manager for its endpoint is next opened, a portion at a time; one that was retried more than
-/// four times, or whose file has gone or lost its contents, is dropped then.
+/// four times, or whose file has gone or lost its contents, is dropped then. With a retry delay it goes out again in
+/// the same run, too, of which its row counts one retry at most.
 ///
 /// `open` and `upload` run on the manager's own queue, in the caller's time, and use the deferred store from there;
 /// results are handled where they arrive. States: built, opened (what was left over has been sent again, once), closed;
@@ -43,10 +46,13 @@ class UploadManager final : public UploadManagerType,
   public:
     /// Makes a manager and sets it as the service's delegate. Of the arguments, `ledger` and `book` may be
     /// empty; it then has such a one of its own.
+    /// @param retryDelay after which what ended with a retry is sent again in this run, see `UploadRetries`; not at all
+    ///        without one
     [[nodiscard]] static std::shared_ptr<UploadManager> create(
         std::shared_ptr<UploadServiceType> service, std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
         std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger = nullptr,
-        std::shared_ptr<LedgerBook> book = nullptr, const StorageLimits& limits = {});
+        std::shared_ptr<LedgerBook> book = nullptr, std::optional<std::chrono::milliseconds> retryDelay = std::nullopt,
+        const StorageLimits& limits = {});
     ~UploadManager() override;
 
     /// Opens the store, creates the table, and the first time sends again what is stored. Requires: not on the
@@ -75,7 +81,8 @@ class UploadManager final : public UploadManagerType,
     UploadManager(std::shared_ptr<UploadServiceType> service,
                   std::shared_ptr<DeferredStore<SignedEntity>> deferredStore,
                   std::shared_ptr<UploadDropboxType> dropbox, std::shared_ptr<DeliveryLedger> ledger,
-                  std::shared_ptr<LedgerBook> book, const StorageLimits& limits);
+                  std::shared_ptr<LedgerBook> book, std::optional<std::chrono::milliseconds> retryDelay,
+                  const StorageLimits& limits);
 
     UploadTaken uploadOnQueue(const UploadRequest& request) CORVANE_REQUIRES(*queue_);
     /// Writes the document's row, and has its backup removed, both or neither.
@@ -97,6 +104,7 @@ class UploadManager final : public UploadManagerType,
         std::make_shared<SerialQueue>("com.veskar.corvane.upload-manager", SerialQueue::QualityOfService::background);
     const std::shared_ptr<StorageBounds> bounds_;
     const std::shared_ptr<StoredUploads> stored_;
+    const std::shared_ptr<UploadRetries> retries_;  // nothing without a delay for them
     bool hasSentStored_ CORVANE_GUARDED_BY(*queue_) = false;
 
     Mutex mutex_;

@@ -4,6 +4,8 @@
 #include <corvane/Upload/DeliveryUpdate.h>
 #include <corvane/Upload/UploadResponse.h>
 
+#include <chrono>
+#include <optional>
 #include <string>
 #include <utility>
 #include <variant>
@@ -27,6 +29,7 @@ struct [[nodiscard]] UploadResult {
         Date after;             ///< the date from which it may be sent again
         bool isCounted = true;  ///< not when it is certain that nothing of the document was sent
         DeliveryUpdate::Cause cause = {};
+        std::optional<std::chrono::seconds> serverDelay = {};  ///< for which the server asks to be left alone
         bool operator==(const Retry&) const = default;
     };
     /// The collector will never take the document: forget it.
@@ -42,8 +45,8 @@ struct [[nodiscard]] UploadResult {
         return {Success{std::move(identifier), std::move(response)}};
     }
     static UploadResult retry(std::string identifier, Date after, bool isCounted = true,
-                              DeliveryUpdate::Cause cause = {}) {
-        return {Retry{std::move(identifier), after, isCounted, std::move(cause)}};
+                              DeliveryUpdate::Cause cause = {}, std::optional<std::chrono::seconds> serverDelay = {}) {
+        return {Retry{std::move(identifier), after, isCounted, std::move(cause), serverDelay}};
     }
     static UploadResult failed(std::string identifier, UploadResponse response) {
         return {Failed{std::move(identifier), std::move(response)}};

@@ -124,16 +124,18 @@ std::vector<UploadRows::Oldest> UploadRows::oldest(std::size_t count) {
     return oldest;
 }
 
-bool UploadRows::countRetry(const UploadResult::Retry& retry) {
+bool UploadRows::countRetry(const UploadResult::Retry& retry, bool isFirstOfRun) {
     bool isThere = false;
     change([&](Rows& rows, Changes& changes) {
         auto found = rows.fetchWhere("identifier", retry.identifier);
         isThere = !found.empty();
         if (!isThere || !retry.isCounted) return;
-        auto& entity = found.front();
-        ++entity.retries;
-        entity.retryAfterDate = retry.after;
-        rows.insert(entity);
+        if (isFirstOfRun) {
+            auto& entity = found.front();
+            ++entity.retries;
+            entity.retryAfterDate = retry.after;
+            rows.insert(entity);
+        }
         for (const auto& document : Store<DocumentEntity>(rows.connection()).fetchWhere("identifier", retry.identifier))
             addTotal(changes, LedgerEntry::sentAgain, document);
     });

@@ -53,8 +53,8 @@ class UploadRows {
     };
     /// So many of the documents that were handed over first, in that order.
     [[nodiscard]] std::vector<Oldest> oldest(std::size_t count);
-    /// Counts a retry in the upload's row. Returns false when there is no row.
-    bool countRetry(const UploadResult::Retry& retry);
+    /// Counts a retry, in the upload's row only the first of a run. Returns false when there is no row.
+    bool countRetry(const UploadResult::Retry& retry, bool isFirstOfRun = true);
     void end(const Ending& ending);
     /// Removes the rows of all of them or none, in which case it returns why. One whose row has gone already counts as
     /// nothing: who removed it has counted it.

@@ -13,6 +13,7 @@
 #include <corvane/Transfer/HTTPURL.h>
 #include <corvane/Transfer/TransferError.h>
 #include <corvane/Upload/PreparedUploadRequest.h>
+#include <corvane/Upload/RetryAfter.h>
 #include <corvane/Upload/UploadServiceDelegate.h>
 
 #include <algorithm>
@@ -383,7 +384,7 @@ UploadResult UploadService::result(const std::string& identifier, const std::str
         case Verdict::unavailable:
             log.default_("Upload HTTP failed, identifier=%{public}@, urlSessionTaskID=%{public}@, statusCode=%ld",
                          identifier, taskID, status);
-            return UploadResult::retry(identifier, now(), true, answer);
+            return UploadResult::retry(identifier, now(), true, answer, retryAfter(response, now()));
         case Verdict::unhandled:
             break;
     }

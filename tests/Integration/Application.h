@@ -36,12 +36,11 @@ inline void acknowledge(const EventSubmitResult& result) {
 struct Application {
     explicit Application(const std::string& url, int batchSize = 50, const std::string& endpoint = "main",
                          DeliveryObserver observer = {})
-        : Application(url, UploadBatchEventOptions{.batchSize = batchSize}, endpoint, std::move(observer)) {}
-    Application(const std::string& url, const UploadBatchEventOptions& options, const std::string& endpoint = "main",
+        : Application(url, UploadBatchEventConfig(batchSize, false), endpoint, std::move(observer)) {}
+    Application(const std::string& url, const UploadBatchEventConfig& config, const std::string& endpoint = "main",
                 DeliveryObserver observer = {})
         : uploads(std::make_shared<UploadBatchEventProcessor>(Client{"com.example.player", "Player", "2.3", 117},
-                                                              Endpoint{url, endpoint},
-                                                              UploadBatchEventConfig(options))) {
+                                                              Endpoint{url, endpoint}, config)) {
         uploads->setDeliveryObserver(std::move(observer));
         sessions.processorManager()->add(uploads);
         sessions.start(Session::Kind::userEvents());

@@ -1,6 +1,7 @@
 #include <corvane/Testing/ProcessSettings.h>
 
 #include "tests/Integration/FaultFixture.h"
+#include "tests/support/PassTime.h"
 
 #include <corvane/Signing/SHA1.h>
 #include <corvane/Upload/UploadService.h>
@@ -35,6 +36,38 @@ TEST_F(Delivery, ADocumentArrivesSignedCompressedAndWhole) {
     EXPECT_EQ(event["data"]["event"]["sessionID"].string(), document["data"]["session"]["sessionID"].string());
     EXPECT_EQ(eventIDs({document}).size(), 2u);
     EXPECT_TRUE(payloads().empty());
+}
+
+/// Knows the queue of the session manager to which it is added.
+struct QueueFinder final : EventProcessorType {
+    void registerAccessQueue(std::shared_ptr<SerialQueue> accessQueue) override { queue = std::move(accessQueue); }
+    void process(const ProcessEvent&) override {}
+    std::shared_ptr<SerialQueue> queue;
+};
+
+TEST_F(Delivery, WhatTheServerTurnsAwayArrivesInTheSameRunWhenItSaysSo) {
+    server.script(ScriptedServer::Reply::status(503, {{"Retry-After", "3600"}}));
+    server.script(ScriptedServer::Reply::status(503));
+    const auto time = std::make_shared<QueueFinder>();
+    std::promise<std::optional<std::int64_t>> delivered;
+    Application application(server.url(), UploadBatchEventConfig({.maximumDelay = 10min, .retryDelay = 1min}), "main",
+                            [&](const DeliveryUpdate& update) {
+                                if (update.step == DeliveryUpdate::Step::delivered) delivered.set_value(update.events);
+                            });
+    application.sessions.processorManager()->add(time);
+    application.submit(2);
+    passTime(*time->queue, 10min);
+    EXPECT_EQ(application.wait().pending, (DeliveryReport::Count{2, 1}));
+    passTime(*time->queue, 3500s);
+    EXPECT_EQ(server.requests().size(), 1u);
+    passTime(*time->queue, 1h);
+    ASSERT_TRUE(server.waitForRequests(2));
+    while (log.count("Upload HTTP failed, identifier=") < 2) std::this_thread::yield();
+    for (int minutes = 0; minutes < 3; ++minutes) passTime(*time->queue, 1min);
+    EXPECT_EQ(delivered.get_future().get(), 2);
+    EXPECT_EQ(application.wait(), (DeliveryReport{{2, 1}, {}, {}}));
+    EXPECT_EQ(eventIDs(server.documents()).size(), 6u);
+    EXPECT_TRUE(rows().empty() && payloads().empty());
 }
 
 TEST_F(Delivery, AWakeUpGoesFromTheProcessorManagerToTheMainQueueAndBack) {

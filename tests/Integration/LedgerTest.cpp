@@ -53,7 +53,8 @@ class Books : public ::testing::Test, protected FaultFixture {
     std::unique_ptr<Application> start(int batchSize) { return start({.batchSize = batchSize}); }
     std::unique_ptr<Application> start(const UploadBatchEventOptions& options) {
         settled = std::make_shared<RecordingProcessor>();
-        auto application = std::make_unique<Application>("https://collector.example.com/in", options);
+        auto application =
+            std::make_unique<Application>("https://collector.example.com/in", UploadBatchEventConfig(options));
         application->sessions.processorManager()->add(settled);
         settled->settle();
         return application;

@@ -5,6 +5,7 @@
 #include <corvane/Processing/UserEvents.h>
 #include <corvane/Upload/UploadRequest.h>
 
+#include "tests/support/PassTime.h"
 #include "tests/support/TrackingFixture.h"
 
 namespace corvane::test {
@@ -54,14 +55,14 @@ class UploadBatch : public ::testing::Test {
     void SetUp() override { launch(); }
 
     /// As a new run of the application does; the database stays.
-    void launch(int batchSize = 3) {
+    void launch(int batchSize = 3) { launch({.batchSize = batchSize}); }
+    void launch(const UploadBatchEventOptions& options) {
         sessions.reset();
         manager = std::make_shared<FakeUploadManager>();
         ledger = manager->ledger = std::make_shared<DeliveryLedger>();
         store = std::make_shared<DeferredStore<UploadBatchEntity>>("main");
-        batching = std::make_shared<UploadBatchEventProcessor>(
-            std::make_shared<UploadBatches>(Client{"com.example.app", "App", "1.0", 1}, manager, store,
-                                            UploadBatchEventConfig(batchSize, false), ledger));
+        batching = std::make_shared<UploadBatchEventProcessor>(std::make_shared<UploadBatches>(
+            Client{"com.example.app", "App", "1.0", 1}, manager, store, UploadBatchEventConfig(options), ledger));
         sessions = std::make_unique<SessionManager>();
         sessions->processorManager()->add(batching);
         root = sessions->tracker();
@@ -388,6 +389,59 @@ TEST_F(UploadBatch, WrappedItRecoversInADroppedSessionAndWritesWhatItAcknowledge
     EXPECT_EQ(manager->sizes(), std::vector<std::size_t>{1});
     EXPECT_EQ(sampling->droppedEvents(), 5u);
     EXPECT_TRUE(rows().empty());
+}
+
+TEST_F(UploadBatch, ASessionsBatchGoesOutWhenItsOldestEventHasWaitedLongEnough) {
+    for (const std::chrono::milliseconds bad : {0ms, -1ms}) {
+        EXPECT_THROW(UploadBatchEventConfig({.maximumDelay = bad}), InvalidArgument);
+        EXPECT_THROW(UploadBatchEventConfig({.retryDelay = bad}), InvalidArgument);
+    }
+    launch({.batchSize = 3, .maximumDelay = 1h});
+    sessions->start(Session::Kind::userEvents());
+    const auto group = root->chain("group");
+    group->enterGroup("g");
+    for (int i = 0; i < 5; ++i) group->submit<Mark>();
+    const auto pass = [&](std::chrono::minutes time) { passTime(*manager->queue, time); };
+    using Sizes = std::vector<std::size_t>;
+    pass(2h);
+    EXPECT_EQ(manager->sizes(), Sizes{}) << "a group's waits until it is left";
+
+    submit(1);
+    pass(40min);
+    submit(1);
+    pass(30min);
+    EXPECT_EQ(manager->sizes(), Sizes{2});
+    submit(4);  // a full batch, and the first of the next
+    pass(50min);
+    EXPECT_EQ(manager->sizes(), (Sizes{2, 3}));
+    batching->flush();
+    submit(1);
+    pass(50min);
+    EXPECT_EQ(manager->sizes(), (Sizes{2, 3, 1})) << "the time is that of the batch that is open";
+
+    manager->refuses = true;
+    pass(20min);
+    EXPECT_EQ(log.count("Failed to submit request for upload, error=refused"), 1);
+    submit(1);
+    manager->refuses = false;
+    sessions->setRecording(false);
+    root->suspend();
+    BootClock::advance(1h);
+    EXPECT_EQ(manager->sizes(), (Sizes{2, 3, 1})) << "not while the queue is suspended";
+    root->resume();
+    pass(0min);
+    EXPECT_EQ(manager->sizes(), (Sizes{2, 3, 1, 2})) << "what was recorded goes out";
+
+    sessions->setRecording(true);
+    submit(1);
+    sessions->endSync();
+    EXPECT_EQ(manager->documents.size(), 6u);
+    sessions->start(Session::Kind::userEvents());
+    pass(59min);
+    submit(1);
+    pass(59min);
+    EXPECT_EQ(manager->documents.size(), 6u) << "nothing is left of the last session's time";
+    EXPECT_EQ(rows().size(), 1u);
 }
 
 TEST_F(UploadBatch, WaitsForDeliveryNoLongerThanAsked) {

@@ -1,9 +1,11 @@
+#include <corvane/Upload/RetryAfter.h>
 #include <corvane/Upload/UploadDropbox.h>
 #include <corvane/Upload/UploadManager.h>
 #include <corvane/Upload/UploadRequest.h>
 #include <corvane/Upload/gzip.h>
 
 #include "tests/support/FakeUploadService.h"
+#include "tests/support/PassTime.h"
 #include "tests/support/Testing.h"
 #include "tests/support/TextResource.h"
 
@@ -12,9 +14,14 @@ namespace {
 
 /// What one run of a process has: a manager over the files that earlier runs left.
 struct ProcessRun {
-    explicit ProcessRun(std::optional<std::string> location = "main")
+    explicit ProcessRun(std::optional<std::string> location = "main",
+                        std::optional<std::chrono::milliseconds> retryDelay = {})
         : store(std::make_shared<DeferredStore<SignedEntity>>(std::move(location))),
-          manager(UploadManager::create(service, store, dropbox, ledger)) {}
+          manager(UploadManager::create(service, store, dropbox, ledger, nullptr, retryDelay)) {
+        if (!retryDelay) return;
+        manager->registerAccessQueue(accessQueue);
+        manager->open();
+    }
     ~ProcessRun() {
         manager.reset();
         store.reset();
@@ -25,6 +32,18 @@ struct ProcessRun {
         ledger->add(identifier, 10);
         return manager->upload(
             {{"com.example.player", "Player", "2.3", 117}, std::make_shared<TextResource>(identifier)});
+    }
+    /// Lets time pass, and returns what is sent again then.
+    std::vector<std::string> pass(std::chrono::seconds time) {
+        passTime(*accessQueue, time);
+        passTime(*accessQueue);  // a portion is behind what waits
+        manager->open();
+        const auto all = resubmitted();
+        return {all.begin() + std::exchange(seen, std::ssize(all)), all.end()};
+    }
+    void retry(const std::string& identifier, std::optional<std::chrono::seconds> serverDelay = {},
+               DeliveryUpdate::Reason reason = DeliveryUpdate::Reason::answer) {
+        service->complete(UploadResult::retry(identifier, now(), true, {.reason = reason}, serverDelay));
     }
     [[nodiscard]] std::vector<SignedEntity> rows() const {
         return store->perform([](Store<SignedEntity>& rows) { return rows.fetchAll(); });
@@ -43,6 +62,8 @@ struct ProcessRun {
         return identifiers;
     }
 
+    std::ptrdiff_t seen = 0;  // of what was sent again
+    std::shared_ptr<SerialQueue> accessQueue = std::make_shared<SerialQueue>("test");
     std::shared_ptr<FakeUploadService> service = std::make_shared<FakeUploadService>();
     std::shared_ptr<UploadDropbox> dropbox = std::make_shared<UploadDropbox>("main");
     std::shared_ptr<DeliveryLedger> ledger = std::make_shared<DeliveryLedger>();
@@ -189,6 +210,126 @@ TEST(UploadManager, SendsWhatIsStoredAPortionAtATimeAndEachOnce) {
     EXPECT_EQ(run.ledger->report(), (DeliveryReport{{0, std::ssize(sent) + 1}, {}, {0, 14}}));
     EXPECT_TRUE(run.rows().empty());
     EXPECT_EQ(log.count("Failed"), 0);
+}
+
+// The first delay is 100 s, and up to a quarter more.
+TEST(UploadManager, SendsAgainInTheSameRunWithGrowingDelays) {
+    using Names = std::vector<std::string>;
+    const TemporaryDocuments documents;
+    ProcessRun run("main", 100s);
+    for (const auto* name : {"I", "J"}) run.upload(name);
+    run.service->complete(UploadResult::retry("I", now(), false));  // nothing was sent
+    EXPECT_EQ(run.pass(99s), Names{});
+    run.retry("J");
+    EXPECT_EQ(run.pass(27s), (Names{"I", "J"})) << "with the first that failed";
+    EXPECT_TRUE(run.ledger->isSettled()) << "nobody waits for it again";
+    EXPECT_EQ(run.pass(1h), Names{}) << "one pass at a time";
+    for (const auto* name : {"I", "J"}) run.retry(name);
+    for (const auto& row : run.rows()) EXPECT_EQ(row.retries, 1) << "once for a run";
+
+    EXPECT_EQ(run.pass(199s), Names{});
+    EXPECT_EQ(run.pass(52s), (Names{"I", "J"}));
+    run.manager->close();
+    run.service->complete(UploadResult::success("I", {200}));
+    run.retry("J");
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{{10, 1}, {10, 1}, {}})) << "each counts once";
+    EXPECT_EQ(run.pass(126s), Names{"J"}) << "something got through";
+    run.retry("J", 3600s);
+    EXPECT_EQ(run.pass(3599s), Names{}) << "the server has asked for it";
+    EXPECT_EQ(run.pass(902s), Names{"J"});
+    for (int i = 0; i < 8; ++i, run.pass(4501s)) run.retry("J");
+    run.upload("K");
+    run.service->complete(UploadResult::success("K", {200}));
+    run.retry("J");
+    EXPECT_EQ(run.pass(126s), Names{"J"}) << "the server is there again";
+    run.retry("J");
+    run.upload("L");
+    run.service->complete(UploadResult::success("L", {200}));
+    EXPECT_EQ(run.pass(126s), Names{"J"});
+    run.manager->uploadEndedElsewhere(UploadResult::success("J", {200}));
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{{40, 4}, {}, {}}));
+    EXPECT_EQ(run.pass(5h), Names{});
+}
+
+TEST(UploadManager, GivesNothingUpHoweverOftenItIsSentAgainInOneRun) {
+    const TemporaryDocuments documents;
+    const CapturedLog log;
+    ProcessRun run("main", 1s);
+    run.insert(row("I", StoredUploads::maximumRetries));
+    run.dropbox->write("I", "x", TextResource("I"));
+    for (const auto* name : {"I", "another's", "no payload"}) run.ledger->add(name, 1);
+    for (const auto* name : {"no payload", "another's"}) run.insert(row(name, 0));
+    for (const auto* name : {"I", "another's"}) run.retry(name, {}, DeliveryUpdate::Reason::unreachable);
+    run.retry("no payload");
+    run.store->perform([](Store<SignedEntity>& rows) { rows.deleteWhere("identifier", "another's"); });
+    for (int i = 0; i < UploadRetries::maximumAttempts + 9; ++i) {
+        ASSERT_EQ(run.pass(2h), std::vector<std::string>{"I"}) << i;
+        run.retry("I", {}, i < 10 ? DeliveryUpdate::Reason::blocked : DeliveryUpdate::Reason::answer);
+    }
+    ASSERT_EQ(run.pass(2h).size(), 1u);
+    run.retry("I");
+    EXPECT_EQ(run.pass(2h), std::vector<std::string>{});
+    ASSERT_EQ(run.rows().size(), 1u);
+    EXPECT_EQ(run.rows().at(0).retries, StoredUploads::maximumRetries + 1);
+    EXPECT_EQ(log.count("Upload waits for the next run after 100 attempts, identifier=I"), 1);
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{{}, {1, 1}, {1, 1}}));
+}
+
+TEST(UploadManager, APassThatIsInVainSendsNoMore) {
+    const TemporaryDocuments documents;
+    const std::size_t all = 3 * Backlog::portion;
+    for (const bool isHeld : {false, true}) {
+        ProcessRun run("main", 1s);
+        for (std::size_t i = 0; i < all; ++i) run.upload(std::to_string(i));
+        for (std::size_t i = 0; i < all; ++i) run.retry(std::to_string(i));
+        auto sent = run.pass(2s);
+        EXPECT_EQ(sent.size(), Backlog::portion);
+        for (std::size_t i = 0; i < sent.size(); ++i) {
+            run.retry(sent[i], isHeld && i == 0 ? std::optional(1s) : std::nullopt);
+            if (!isHeld || i > 0) continue;
+            EXPECT_EQ(run.pass(0s).size(), 0u);
+        }
+        // The others come first, and all of them when something gets through.
+        std::set<std::string> later;
+        for (sent = run.pass(1h); !sent.empty(); sent = run.pass(0s)) {
+            EXPECT_LE(sent.size(), Backlog::portion);
+            for (const auto& one : sent) {
+                later.insert(one);
+                run.service->complete(UploadResult::success(one, {200}));
+            }
+        }
+        EXPECT_EQ(later.size(), all);
+        EXPECT_EQ(run.ledger->report(), (DeliveryReport{{10 * std::ssize(later), std::ssize(later)}, {}, {}}));
+    }
+}
+
+TEST(RetryAfter, IsANumberOfSecondsOrADateAndNeverLong) {
+    const Date date = *dateFromSeconds(784111777);
+    const struct {
+        const char* text;
+        std::optional<std::int64_t> seconds;
+    } cases[] = {
+        {"0", 0},
+        {"120", 120},
+        {"99999999999999999999999", 86400},
+        {"Sun, 06 Nov 1994 08:50:37 GMT", 60},
+        {"Sunday, 06-Nov-94 08:50:37 GMT", 60},
+        {"Sun Nov  6 08:50:37 1994", 60},
+        {"Fri, 31 Dec 9999 23:59:59 GMT", 86400},
+        {"Sun, 06 Nov 1994 08:49:37 GMT", {}},
+        {"Sun, 06 Nov 1993 08:49:37 GMT", {}},
+        {"", {}},
+        {"-5", {}},
+        {"1.5", {}},
+        {"soon", {}},
+        {"5, 6", {}},
+    };
+    for (const auto& [text, seconds] : cases) {
+        const auto found = retryAfter({503, {{"retry-after", text}}}, date);
+        EXPECT_EQ(found ? std::optional(found->count()) : std::nullopt, seconds) << text;
+        EXPECT_EQ(retryAfter({429, {{"Retry-After", text}}}, date), found) << text;
+        for (const int status : {200, 401, 500}) EXPECT_FALSE(retryAfter({status, {{"Retry-After", text}}}, date));
+    }
 }
 
 TEST(UploadManager, RemovesOldPayloadsThatNobodyHas) {
