@@ -48,7 +48,8 @@ UploadBatches::UploadBatches(Client client, std::shared_ptr<UploadManagerType> u
       config_(config),
       endpointUse_(std::move(endpointUse)),
       documents_(std::move(client), uploadManager_, deferredStore, ledger_),
-      terminated_(deferredStore, ledger_) {}
+      terminated_(deferredStore, ledger_),
+      counts_(book_) {}
 
 std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint& endpoint,
                                                    const UploadBatchEventConfig& config) {
@@ -122,7 +123,7 @@ UploadBatchQueueKey UploadBatches::keyOf(const ProcessEvent& processEvent) const
 void UploadBatches::process(const ProcessEvent& processEvent) {
     assertOnQueue("UploadBatchEventProcessor::process");
     dropForgotten();
-    ++counts_.accepted;
+    counts_.accept();
     try {
         const UploadBatchQueueKey key = keyOf(processEvent);
         add(key, processEvent.payload());
@@ -217,7 +218,7 @@ void UploadBatches::backUpAll() {
         const bool isSaved = backUp(one->second);
         if (isSaved) {
             ledger_->unfollow(one->first);
-            leave(one->second);
+            counts_.leave(one->second);
         }
         one = isSaved ? unsaved_.erase(one) : std::next(one);
     }
@@ -271,42 +272,27 @@ bool UploadBatches::tryHandOver(UploadBatch& batch) {
     if (removal.taken == UploadTaken::underWay || removal.isKept) {
         keep(batch, removal.document);
     } else {
-        counts_.handedOver += static_cast<std::int64_t>(batch.count());
+        counts_.handOver(batch);
     }
     return true;
 }
 
 void UploadBatches::keep(UploadBatch& batch, const std::string& document) {
-    if (batch.isBackedUp() || backUp(batch)) return leave(batch);
+    if (batch.isBackedUp() || backUp(batch)) return counts_.leave(batch);
     dropDelivered();
-    if (!ledger_->follow(document)) return leave(batch);
+    if (!ledger_->follow(document)) return counts_.leave(batch);
     unsaved_.emplace(document, std::move(batch));
     backupsAreBehind_ = true;
 }
 
-void UploadBatches::leave(const UploadBatch& batch) {
-    const auto events = static_cast<std::int64_t>(batch.count());
-    counts_.handedOver += events;
-    for (const auto& part : batch.parts()) {
-        book_->addOpenOfOthers({static_cast<std::int64_t>(part.saved), part.saved != 0 ? 1 : 0},
-                               static_cast<std::int64_t>(part.events->text().size()));
-    }
-}
-
-// There is no row whose going would count them.
 void UploadBatches::dropDelivered() {
-    assertOnQueue("UploadBatchEventProcessor::dropDelivered");
     for (auto one = unsaved_.begin(); one != unsaved_.end();) {
         const auto settled = ledger_->takeOutcome(one->first);
         if (!settled || settled->outcome == DeliveryLedger::Outcome::pending) {
             ++one;
             continue;
         }
-        const auto events = static_cast<std::int64_t>(one->second.count());
-        const bool isDelivered = settled->outcome == DeliveryLedger::Outcome::delivered;
-        book_->addLater(isDelivered ? LedgerEntry::delivered : refusalOf(settled->cause.status.value_or(0)),
-                        {events, 1});
-        counts_.handedOver += events;
+        counts_.settle(one->second, *settled);
         one = unsaved_.erase(one);
     }
 }
@@ -410,23 +396,19 @@ void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
 
 // The manager may be the host's, whose code may have changed the batches meanwhile.
 void UploadBatches::takeOut(const UploadBatchEntity& batch, const DocumentHandOver::Removal& removal) {
-    const auto& identifier = batch.identifier;
-    const auto events = static_cast<std::int64_t>(batch.events->count());
-    const auto bytes = static_cast<std::int64_t>(batch.events->text().size());
     for (auto queue = batchQueues_.begin(); queue != batchQueues_.end(); ++queue) {
-        UploadBatch handedOver = queue->second.take(identifier);
+        UploadBatch handedOver = queue->second.take(batch.identifier);
         if (handedOver.isEmpty()) continue;
         if (queue->second.isEmpty()) batchQueues_.erase(queue);
         if (removal.taken == UploadTaken::underWay) {
             keep(handedOver, removal.document);
         } else {
-            counts_.handedOver += static_cast<std::int64_t>(handedOver.count());
+            counts_.handOver(handedOver);
         }
         return publish();
     }
-    if (removal.isDone || !(removal.isKept || removal.error || removal.taken == UploadTaken::underWay)) {
-        book_->addOpenOfOthers({-events, -1}, -bytes);
-    }
+    const bool isGone = removal.taken == UploadTaken::recorded && !removal.isKept && !removal.error;
+    if (isGone) counts_.handOver(batch);
 }
 
 void UploadBatches::didUpdateSession(const Session& session, bool submitQueues) {
@@ -462,13 +444,8 @@ void UploadBatches::didEndSession() {
 }
 
 void UploadBatches::didReject(RejectedEvent::Reason reason) {
-    using Reason = RejectedEvent::Reason;
-    const auto entry = reason == Reason::noSession      ? LedgerEntry::noSession
-                       : reason == Reason::missingData  ? LedgerEntry::missingData
-                       : reason == Reason::encoding     ? LedgerEntry::encoding
-                       : reason == Reason::notRecording ? LedgerEntry::notRecording
-                                                        : LedgerEntry::otherProblem;
-    book_->addLater(entry, {1, 0});
+    assertOnQueue("UploadBatchEventProcessor::didReject");
+    counts_.reject(reason);
 }
 
 std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
@@ -476,18 +453,11 @@ std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
     if (epoch <= epoch_) return std::nullopt;
     epoch_ = epoch;
     ForgottenRecords unsaved;
-    const auto drop = [&](const UploadBatch& batch) {
-        counts_.forgotten += static_cast<std::int64_t>(batch.count());
-        for (const auto& part : batch.parts()) {
-            unsaved.events += static_cast<std::int64_t>(part.events->count() - part.saved);
-        }
-    };
-    for (const auto& [key, batch] : batchQueues_) drop(batch);
+    for (const auto& [key, batch] : batchQueues_) unsaved.events += counts_.forget(batch);
     for (const auto& [document, batch] : unsaved_) {
-        drop(batch);
+        unsaved.events += counts_.forget(batch);
         ledger_->unfollow(document);
     }
-    if (unsaved.events != 0) book_->addLater(LedgerEntry::givenUpForgotten, {unsaved.events, 0});
     batchQueues_.clear();
     delayTimer_.cancel();
     unsaved_.clear();
@@ -513,16 +483,12 @@ bool UploadBatches::isOpen(const std::string& identifier) {
 
 void UploadBatches::readStored() {
     try {
-        auto sizes = deferredStore_->perform([](Rows& rows) { return UploadBatchEntity::sizes(*rows.connection()); });
-        Ledger::Count count;
-        std::int64_t bytes = 0;
-        for (const auto& size : sizes) {
-            if (isOpen(size.identifier)) continue;
-            count.events += size.events;
-            ++count.documents;
-            bytes += size.bytes;
+        std::vector<UploadBatchEntity::Size> others;
+        for (auto& row :
+             deferredStore_->perform([](Rows& rows) { return UploadBatchEntity::sizes(*rows.connection()); })) {
+            if (!isOpen(row.identifier)) others.push_back(std::move(row));
         }
-        book_->setOpenOfOthers(count, bytes);
+        counts_.setOthers(others);
         uploadManager_->readLedger();  // behind the rows of batches, which are forgotten into the ledger
     } catch (...) {
         Log::shared().error("Failed to read the ledger, error=%{public}@", AnyError::current().what());
@@ -530,16 +496,9 @@ void UploadBatches::readStored() {
 }
 
 void UploadBatches::publish() {
-    counts_.open = {};
-    counts_.openBytes = 0;
-    const auto add = [&](const UploadBatch& batch) {
-        counts_.open.events += static_cast<std::int64_t>(batch.count());
-        counts_.open.documents += static_cast<std::int64_t>(batch.parts().size());
-        counts_.openBytes += static_cast<std::int64_t>(batch.bytes());
-    };
-    for (const auto& [key, batch] : batchQueues_) add(batch);
-    for (const auto& [document, batch] : unsaved_) add(batch);
-    book_->setBatches(counts_);
+    BatchCounts::Publication publication(counts_);
+    for (const auto& [key, batch] : batchQueues_) publication.add(batch);
+    for (const auto& [document, batch] : unsaved_) publication.add(batch);
 }
 
 void UploadBatches::readLedger(std::function<void(const Ledger&)> completion) {

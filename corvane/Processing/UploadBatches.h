@@ -7,6 +7,7 @@
 #include <corvane/Platform/Mutex.h>
 #include <corvane/Platform/SerialQueue.h>
 #include <corvane/Platform/Timer.h>
+#include <corvane/Processing/BatchCounts.h>
 #include <corvane/Processing/DocumentHandOver.h>
 #include <corvane/Processing/TerminatedBatches.h>
 #include <corvane/Processing/UploadBatch.h>
@@ -90,8 +91,6 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     bool backUp(UploadBatch& batch) CORVANE_REQUIRES(*accessQueue_);
     /// Writes the rows of all batches, after one could not be written.
     void backUpAll() CORVANE_REQUIRES(*accessQueue_);
-    /// Counts a batch that is left to its rows, as one of an earlier run.
-    void leave(const UploadBatch& batch) CORVANE_REQUIRES(*accessQueue_);
     /// Lets go of unsaved batches whose documents need no second attempt.
     void dropDelivered() CORVANE_REQUIRES(*accessQueue_);
 
@@ -152,7 +151,7 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     // In which all that is here was recorded.
     std::int64_t epoch_ CORVANE_GUARDED_BY(*accessQueue_) = 0;
     // What became of the events of this run.
-    LedgerBook::Batches counts_ CORVANE_GUARDED_BY(*accessQueue_);
+    BatchCounts counts_ CORVANE_GUARDED_BY(*accessQueue_);
 };
 
 }  // namespace corvane

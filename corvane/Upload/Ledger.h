@@ -26,6 +26,7 @@ struct Ledger {
         Count status3xx;  ///< a redirect, which is not followed
         Count other;      ///< an answer below 200
         [[nodiscard]] Count total() const;
+        bool operator==(const Refused&) const = default;
     } refused;
 
     /// What will not arrive, by the reason.
@@ -36,6 +37,7 @@ struct Ledger {
         Count payloadMissing;  ///< the payload file had gone or was empty
         Count forgotten;       ///< `SessionManager::forget`
         [[nodiscard]] Count total() const;
+        bool operator==(const GivenUp&) const = default;
     } givenUp;
 
     /// The row was removed by a program that keeps no ledger: it was delivered, refused or given up.

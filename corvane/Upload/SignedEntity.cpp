@@ -29,8 +29,8 @@ StoreTableExtras SignedEntity::extras() {
         // The payloads first: a kill in between leaves rows, and whoever comes next goes on.
         if (!connection->location().isMemory()) {
             const auto payloads = UploadDropbox::directoryBeside(*connection);
-            for (const auto& identifier : Store<SignedEntity>(connection).keys()) {
-                UploadDropbox::remove(payloads, identifier);
+            for (const auto& document : Store<SignedEntity>(connection).keys()) {
+                UploadDropbox::remove(payloads, document);
             }
         }
         Store<DocumentEntity> documents(connection);

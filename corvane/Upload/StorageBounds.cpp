@@ -36,6 +36,7 @@ StorageBounds::StorageBounds(StorageLimits limits, std::shared_ptr<SerialQueue> 
       book_(std::move(book)) {}
 
 void StorageBounds::begin() {
+    queue_->assertCurrent("StorageBounds::begin");
     const auto directory = dropbox_->payloadDirectory();
     std::error_code missing;
     std::filesystem::directory_iterator first(directory, missing);
@@ -66,6 +67,7 @@ void StorageBounds::checkPortion(std::shared_ptr<Check> check) {
 }
 
 void StorageBounds::keep() {
+    queue_->assertCurrent("StorageBounds::keep");
     try {
         auto found = excess();
         if (found.documents.empty()) return;
@@ -81,7 +83,6 @@ void StorageBounds::keepLater() {
     queue_->async([weak = weak_from_this()] {
         const auto self = weak.lock();
         if (!self) return;
-        self->queue_->assertCurrent("StorageBounds::keep");
         self->keep();
     });
 }

@@ -39,9 +39,10 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
                   std::shared_ptr<DeliveryLedger> ledger, std::shared_ptr<LedgerBook> book);
 
     /// Compares what was counted with the payloads that there are, a portion at a time, and keeps the bounds then.
-    void begin() CORVANE_REQUIRES(*queue_);
+    /// On the manager's queue, as the next (the process is stopped with a message).
+    void begin();
     /// Looks whether a bound is met. Logs what fails.
-    void keep() CORVANE_REQUIRES(*queue_);
+    void keep();
     /// A document is not under way any more, and has not got through. Returns why it is to be given up, if it is.
     [[nodiscard]] std::optional<DeliveryUpdate::Reason> takeReason(const std::string& identifier);
     /// Deletes row and payload of a document that is given up for such a reason. Any thread.
