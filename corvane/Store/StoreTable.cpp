@@ -46,6 +46,13 @@ std::string StoreTable::dropSQL() const {
     return "DROP TABLE IF EXISTS " + name_ + ";";
 }
 
+std::vector<StorableValue> StoreTable::values(FunctionRef<StorableValue(const std::string&)> valueOf) const {
+    std::vector<StorableValue> values;
+    values.reserve(columns_.size());
+    for (const auto& column : columns_) values.push_back(valueOf(column.name));
+    return values;
+}
+
 std::string StoreTable::deleteAllSQL() const {
     return "DELETE FROM " + name_ + ";";
 }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Platform/ForgottenRecords.h>
+#include <corvane/Platform/FunctionRef.h>
 #include <corvane/Store/StorableValue.h>
 #include <corvane/Store/StoreColumn.h>
 
@@ -35,6 +36,8 @@ class StoreTable {
     [[nodiscard]] std::string createSQL() const;
     [[nodiscard]] const StoreTableExtras& extras() const noexcept { return extras_; }
     [[nodiscard]] std::string dropSQL() const;
+    /// One value for each column, in table order.
+    [[nodiscard]] std::vector<StorableValue> values(FunctionRef<StorableValue(const std::string&)> valueOf) const;
     [[nodiscard]] std::string deleteAllSQL() const;
     /// @param values one for each column, in table order. Throws `InvalidArgument` when one cannot be written.
     [[nodiscard]] std::string insertSQL(const std::vector<StorableValue>& values) const;

@@ -34,11 +34,10 @@ std::vector<std::string> texts(const std::shared_ptr<StoreConnection>& connectio
 UploadRows::UploadRows(std::shared_ptr<DeferredStore<SignedEntity>> deferredStore, std::shared_ptr<LedgerBook> book)
     : deferredStore_(std::move(deferredStore)), book_(std::move(book)) {}
 
-template <class Operation>
-void UploadRows::change(Operation operation) {
+void UploadRows::change(FunctionRef<void(Rows&, Changes&)> operation) {
     deferredStore_->perform([&](Rows& rows) {
         try {
-            deferredStore_->transaction(rows, [&] {
+            deferredStore_->transaction([&] {
                 Changes changes;
                 operation(rows, changes);
                 write(book_->write(changes), rows.connection());

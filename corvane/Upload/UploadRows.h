@@ -68,8 +68,7 @@ class UploadRows {
     using Rows = Store<SignedEntity>;
 
     /// Runs `operation`, which notes what it changes, in a transaction that writes the ledger, too.
-    template <class Operation>
-    void change(Operation operation);
+    void change(FunctionRef<void(Rows&, LedgerBook::Changes&)> operation);
     void reconcile();
     void endAll(const std::vector<Ending>& endings);
 
