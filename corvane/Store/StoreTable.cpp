@@ -39,7 +39,7 @@ std::string StoreTable::createSQL() const {
     for (const auto& column : columns_) {
         if (column.primary) sql.append(separator).append("PRIMARY KEY (").append(column.name).append(")");
     }
-    return sql += ");";
+    return sql += extras_.isIndexOnly ? ") WITHOUT ROWID;" : ");";
 }
 
 std::string StoreTable::dropSQL() const {

@@ -18,6 +18,8 @@ class StoreConnection;
 
 /// What an entity has beside its own columns.
 struct StoreTableExtras {
+    /// Whether a row lies in its key's index alone: one page is written with it, not two, but rows have no order.
+    bool isIndexOnly = false;
     /// Statements that create further tables, which whoever writes this one needs too.
     std::vector<std::string> companions = {};
     /// Notes what all records hold before they are forgotten, inside the transaction; may be empty.
