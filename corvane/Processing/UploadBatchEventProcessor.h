@@ -31,7 +31,8 @@ struct UploadBatchEventOptions {
     /// yet. At least 1. What other processes store counts as of the first session's start.
     std::int64_t maximumBytesOnDisk = std::int64_t{1} << 30;
     /// How old a stored document may get, in milliseconds since it was handed over, by the wall clock; at least 1. An
-    /// older one is given up, as above, when the first session begins or another document is stored. Nothing: any age.
+    /// older one is given up, as above, when the first session begins, another document is stored, or some are sent
+    /// again. Nothing: any age.
     std::optional<std::chrono::milliseconds> maximumAge = std::nullopt;
 
     /// A session's open batch is sent when its oldest event has been in it for so long, and the session goes on; a

@@ -83,6 +83,7 @@ void StoredUploads::send(std::vector<PreparedUploadRequest> requests) {
 }
 
 std::optional<PreparedUploadRequest> StoredUploads::find(const std::string& identifier) {
+    if (bounds_->isWithdrawn(identifier)) return std::nullopt;
     queue_->assertCurrent("StoredUploads::find");
     const auto row = rows_->find(identifier);
     if (row) return preparedRequest(*row);

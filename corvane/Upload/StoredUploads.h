@@ -42,8 +42,10 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     /// Sends nothing more of what was listed. Any thread.
     void forget();
 
-    /// What is to be sent of a stored document, however often it was retried, or nothing when its row has gone or its
-    /// payload, with which the row goes, too. Throws `StoreError` and `DeferredStoreError`.
+    /// Gives up what is stored beyond the bounds.
+    void keepBounds() { bounds_->keep(); }
+    /// What is to be sent of a stored document, however often it was retried, or nothing when it is being given up, its
+    /// row has gone or its payload, with which the row goes, too. Throws `StoreError` and `DeferredStoreError`.
     [[nodiscard]] std::optional<PreparedUploadRequest> find(const std::string& identifier);
     /// Sends what is not in flight.
     void send(std::vector<PreparedUploadRequest> requests);

@@ -146,6 +146,7 @@ void UploadRetries::sendPortionLater() {
 }
 
 void UploadRetries::sendPortion() {
+    stored_->keepBounds();
     std::vector<PreparedUploadRequest> requests;
     bool isMoreReady = false;
     for (const auto& identifier : backlog_.take()) {
