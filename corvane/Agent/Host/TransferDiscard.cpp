@@ -122,29 +122,32 @@ void TransferDiscard::noteDirectory(const AgentDirectory& directory, std::chrono
     add(known().used, directory.path().string(), deadline);
 }
 
+namespace {
+
+void ask(const std::string& beneath, const std::shared_ptr<Round>& round, const std::string& directory,
+         std::chrono::milliseconds deadline) CORVANE_REQUIRES(agentThread) {
+    try {
+        if (!std::filesystem::is_directory(directory)) return;
+        std::make_shared<Question>(beneath, round)->ask(AgentDirectory(directory), deadline);
+    } catch (const std::exception& error) {
+        round->note({Status::failed, 0, error.what()});
+    }
+}
+
+}  // namespace
+
 void TransferDiscard::start(std::filesystem::path bodiesBeneath, std::function<void(DiscardResult)> done) {
     AgentThread::shared().post([beneath = std::filesystem::absolute(bodiesBeneath).string(), done = std::move(done)] {
         agentThread.assertCurrent("TransferDiscard");
         const auto round = std::make_shared<Round>(done);
-        const auto tryTo = [&](const auto& work) {
-            try {
-                work();
-            } catch (const std::exception& error) {
-                round->note({Status::failed, 0, error.what()});
-            }
-        };
         Agents all;
-        tryTo([&] {
+        try {
             all = used();
             addUsual(all);
-        });
-        for (const auto& [directory, deadline] : all) {
-            tryTo([&] {
-                agentThread.assertCurrent("TransferDiscard");
-                if (!std::filesystem::is_directory(directory)) return;
-                std::make_shared<Question>(beneath, round)->ask(AgentDirectory(directory), deadline);
-            });
+        } catch (const std::exception& error) {
+            round->note({Status::failed, 0, error.what()});
         }
+        for (const auto& [directory, deadline] : all) ask(beneath, round, directory, deadline);
     });
 }
 
