@@ -369,7 +369,7 @@ std::shared_ptr<QueueTimers> SerialQueue::addTimer(std::shared_ptr<TimerEntry> t
     return {state_, &state.timers};
 }
 
-void SerialQueue::runSync(FunctionRef function) {
+void SerialQueue::runSync(FunctionRef<void()> function) {
     CORVANE_REQUIRE(!isCurrent(), "sync on the queue it is already on would wait for itself, queue=" + label());
     State& state = *state_;
     CORVANE_REQUIRE(
@@ -397,13 +397,13 @@ void SerialQueue::runSync(FunctionRef function) {
             ~RunEnder() { state.endRun(); }
             State& state;
         } ender{state};
-        function.call(function.object);
+        function();
         return;
     }
 
     const auto held = state_;  // the last reference to the queue may go while the caller waits
     struct Call {
-        FunctionRef function;
+        FunctionRef<void()> function;
         const Frame* outer;
         std::exception_ptr error;
         bool done = false;
@@ -411,7 +411,7 @@ void SerialQueue::runSync(FunctionRef function) {
     state.waiting.push([&call, &state] {
         try {
             FrameScope scope(&state, call.outer);
-            call.function.call(call.function.object);
+            call.function();
         } catch (...) {
             call.error = std::current_exception();
         }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Export.h>
+#include <corvane/Platform/FunctionRef.h>
 #include <corvane/Platform/Task.h>
 #include <corvane/Platform/ThreadAnnotations.h>
 
@@ -83,12 +84,10 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
     CORVANE_LOCAL auto sync(F&& function) -> std::invoke_result_t<F&> {
         using Result = std::invoke_result_t<F&>;
         if constexpr (std::is_void_v<Result>) {
-            auto call = [&] { function(); };
-            runSync({&call, [](void* f) { (*static_cast<decltype(call)*>(f))(); }});
+            runSync(function);
         } else {
             std::optional<Result> result;
-            auto call = [&] { result.emplace(function()); };
-            runSync({&call, [](void* f) { (*static_cast<decltype(call)*>(f))(); }});
+            runSync([&] { result.emplace(function()); });
             return *std::move(result);
         }
     }
@@ -118,14 +117,10 @@ class CORVANE_EXPORT CORVANE_CAPABILITY("queue") SerialQueue {
   private:
     friend class Timer;
     struct State;
-    struct FunctionRef {
-        void* object;
-        void (*call)(void*);
-    };
 
     [[noreturn]] void failElsewhere(const char* operation) const;
     void enqueue(Task&& task, bool isAhead);
-    void runSync(FunctionRef function);
+    void runSync(FunctionRef<void()> function);
     CORVANE_LOCAL std::shared_ptr<QueueTimers> addTimer(std::shared_ptr<TimerEntry> timer);
 
     const std::shared_ptr<State> state_;

@@ -58,12 +58,12 @@ std::vector<UploadBatchEntity::Size> UploadBatchEntity::sizes(StoreConnection& c
 }
 
 StoreTableExtras UploadBatchEntity::extras() {
-    return {{}, [](const std::shared_ptr<StoreConnection>& connection) {
-                ForgottenRecords forgotten;
-                for (const auto& size : sizes(*connection)) forgotten.events += size.events;
-                noteForgotten(connection, forgotten);
-                return forgotten;
-            }};
+    return {.willForget = [](const std::shared_ptr<StoreConnection>& connection) {
+        ForgottenRecords forgotten;
+        for (const auto& size : sizes(*connection)) forgotten.events += size.events;
+        noteForgotten(connection, forgotten);
+        return forgotten;
+    }};
 }
 
 StorableValue UploadBatchEntity::storableValue(std::string_view columnName) const {

@@ -45,38 +45,26 @@ class DeferredStore {
     /// Requires: the caller is not on the shared queue; `operation` waits for no other queue.
     template <class Operation>
     auto perform(Operation&& operation) {
-        return DeferredStoreCore::queue().sync([&] {
-            Store<Entity> store(core_->connection());
-            if constexpr (std::is_void_v<std::invoke_result_t<Operation, Store<Entity>&>>) {
+        using Result = std::invoke_result_t<Operation, Store<Entity>&>;
+        if constexpr (std::is_void_v<Result>) {
+            core_->perform([&](const std::shared_ptr<StoreConnection>& connection) {
+                Store<Entity> store(connection);
                 operation(store);
-                core_->throwIfFileWasLost();
-            } else {
-                auto result = operation(store);
-                core_->throwIfFileWasLost();
-                return result;
-            }
-        });
+            });
+        } else {
+            std::optional<Result> result;
+            perform([&](Store<Entity>& store) { result.emplace(operation(store)); });
+            return *std::move(result);
+        }
     }
 
     /// Inside `perform`: calls `operations` in a transaction that finds nothing of an earlier epoch in the table. What
     /// they do is done all or not at all, and no other process writes, or begins an epoch that was not seen, before.
-    template <class Operations>
-    void transaction(Store<Entity>& store, Operations&& operations) {
-        const auto epoch = core_->epoch();
-        try {
-            store.transaction([&] {
-                core_->keepUp();
-                operations();
-            });
-        } catch (...) {
-            core_->restoreEpoch(epoch);
-            throw;
-        }
-    }
+    void transaction(FunctionRef<void()> operations) { core_->transaction(operations); }
     /// `perform` of one such transaction.
     template <class Operation>
     void change(Operation&& operation) {
-        perform([&](Store<Entity>& store) { transaction(store, [&] { operation(store); }); });
+        perform([&](Store<Entity>& store) { transaction([&] { operation(store); }); });
     }
 
     /// Whether a transaction on `connection` holds for this store too: both are on one file. Requires: on the shared

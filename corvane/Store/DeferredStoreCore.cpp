@@ -109,31 +109,37 @@ const std::shared_ptr<StoreConnection>& DeferredStoreCore::connection() {
         lost_ = connection_->location();
         makeAnew();
     }
-    if (RecordingSwitch::epoch() > epoch_) {
-        connection_->transaction([this] {
-            queue().assertCurrent("DeferredStoreCore::connection");
-            keepUp();
-        });
-    }
+    if (RecordingSwitch::epoch() > epoch_) transaction([] {});
     return connection_;
 }
 
+void DeferredStoreCore::perform(FunctionRef<void(const std::shared_ptr<StoreConnection>&)> operation) {
+    queue().sync([&] {
+        operation(connection());
+        throwIfFileWasLost();
+    });
+}
+
+void DeferredStoreCore::transaction(FunctionRef<void()> operations) {
+    queue().assertCurrent("DeferredStoreCore::transaction");
+    const auto before = epoch_;
+    try {
+        connection_->transaction([&] {
+            queue().assertCurrent("DeferredStoreCore::transaction");
+            keepUp();
+            operations();
+        });
+    } catch (...) {
+        epoch_ = before;
+        throw;
+    }
+}
+
 void DeferredStoreCore::keepUp() {
-    queue().assertCurrent("DeferredStoreCore::keepUp");
     RecordingSwitch::look();
     const auto epoch = RecordingSwitch::epoch();
     if (epoch <= epoch_) return;
     forgetBefore(epoch, connection_, table_);
-    epoch_ = epoch;
-}
-
-std::int64_t DeferredStoreCore::epoch() const {
-    queue().assertCurrent("DeferredStoreCore::epoch");
-    return epoch_;
-}
-
-void DeferredStoreCore::restoreEpoch(std::int64_t epoch) {
-    queue().assertCurrent("DeferredStoreCore::restoreEpoch");
     epoch_ = epoch;
 }
 

@@ -49,13 +49,10 @@ class DeferredStoreCore {
     /// The connection to use now. When its file has been removed or replaced, it is made anew first, with the table.
     /// Requires: on the queue. Throws `DeferredStoreError` noStore.
     [[nodiscard]] const std::shared_ptr<StoreConnection>& connection();
-    /// Drops what the table holds of earlier epochs, as of now. Inside a transaction on the connection, so that nothing
-    /// of an earlier epoch is written behind another process's back. Requires: on the queue. Throws `StoreError`.
-    void keepUp();
-    /// The epoch up to which the table is known to have forgotten; a transaction that fails puts it back. Requires: on
-    /// the queue.
-    [[nodiscard]] std::int64_t epoch() const;
-    void restoreEpoch(std::int64_t epoch);
+    /// Runs an operation on the queue, with the connection to use; throws when its file had been lost.
+    void perform(FunctionRef<void(const std::shared_ptr<StoreConnection>&)> operation);
+    /// Inside `perform`: calls `operations` in a transaction that finds nothing of an earlier epoch in the table.
+    void transaction(FunctionRef<void()> operations);
     /// Whether the connection is to the same file as `other`. As it was used last: a file that was lost since is not
     /// made anew, which would wait for the transaction that asks. Requires: on the queue.
     [[nodiscard]] bool sharesFileWith(const StoreConnection& other) const;
@@ -69,6 +66,9 @@ class DeferredStoreCore {
         : table_(table), schemaVersion_(schemaVersion) {}
 
     void makeAnew() CORVANE_REQUIRES(queue());
+    /// Drops what the table holds of earlier epochs, as of now. Inside a transaction on the connection, so that nothing
+    /// of an earlier epoch is written behind another process's back.
+    void keepUp() CORVANE_REQUIRES(queue());
 
     const StoreTable& table_;
     const std::int64_t schemaVersion_;

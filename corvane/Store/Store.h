@@ -86,10 +86,7 @@ class Store {
 
     /// Calls `operations`: what they do here is done all or not at all, and no other process writes in between. What
     /// they throw undoes them and comes through.
-    template <class Operations>
-    void transaction(Operations&& operations) {
-        connection_->transaction(std::forward<Operations>(operations));
-    }
+    void transaction(FunctionRef<void()> operations) { connection_->transaction(operations); }
 
     /// What the store works on, for other tables of the same file.
     [[nodiscard]] const std::shared_ptr<StoreConnection>& connection() const { return connection_; }
@@ -109,10 +106,7 @@ class Store {
         }
     }
     static std::vector<StorableValue> values(const Entity& entity) {
-        std::vector<StorableValue> values;
-        values.reserve(table().columns().size());
-        for (const auto& column : table().columns()) values.push_back(entity.storableValue(column.name));
-        return values;
+        return table().values([&](const std::string& column) { return entity.storableValue(column); });
     }
     std::vector<Entity> fetch(const std::string& sql) {
         std::vector<Entity> entities;

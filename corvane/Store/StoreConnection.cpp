@@ -193,7 +193,7 @@ void StoreConnection::createTable(const StoreTable& table) {
     for (const auto& companion : table.extras().companions) run(companion);
 }
 
-void StoreConnection::query(const std::string& sql, const std::function<void(StoreStepper&)>& readRow) {
+void StoreConnection::query(const std::string& sql, FunctionRef<void(StoreStepper&)> readRow) {
     const OnDemand open(*this);
     const Statement statement = open.prepare(sql);
     int result = SQLITE_OK;
@@ -206,7 +206,7 @@ void StoreConnection::query(const std::string& sql, const std::function<void(Sto
     if (result != SQLITE_DONE) throw StoreError::makeExecute(sql, sqlite3_errmsg(open.database()));
 }
 
-void StoreConnection::transaction(const std::function<void()>& statements) {
+void StoreConnection::transaction(FunctionRef<void()> statements) {
     const OnDemand open(*this);
     open.run(handle_->begin, "BEGIN IMMEDIATE;");
     try {

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Platform/FunctionRef.h>
 #include <corvane/Store/StoreError.h>
 #include <corvane/Store/StoreLocation.h>
 #include <corvane/Store/StoreStepper.h>
@@ -7,7 +8,6 @@
 
 #include <chrono>
 #include <cstdint>
-#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -58,10 +58,10 @@ class StoreConnection {
     void createTable(const StoreTable& table);
     /// Runs a query and calls `readRow` for every result row. Throws `StoreError`, or what `readRow` throws, which ends
     /// the query.
-    void query(const std::string& sql, const std::function<void(StoreStepper&)>& readRow);
+    void query(const std::string& sql, FunctionRef<void(StoreStepper&)> readRow);
     /// Calls `statements`, whose statements are done all or not at all, and with no other process's between them.
     /// Throws `StoreError`, or what `statements` throws, which undoes them.
-    void transaction(const std::function<void()>& statements);
+    void transaction(FunctionRef<void()> statements);
 
     /// The busy timeout of connections that are opened from now on, in the whole process.
     static void setBusyTimeout(std::chrono::milliseconds timeout) noexcept;

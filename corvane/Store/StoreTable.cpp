@@ -39,11 +39,18 @@ std::string StoreTable::createSQL() const {
     for (const auto& column : columns_) {
         if (column.primary) sql.append(separator).append("PRIMARY KEY (").append(column.name).append(")");
     }
-    return sql += ");";
+    return sql += extras_.isIndexOnly ? ") WITHOUT ROWID;" : ");";
 }
 
 std::string StoreTable::dropSQL() const {
     return "DROP TABLE IF EXISTS " + name_ + ";";
+}
+
+std::vector<StorableValue> StoreTable::values(FunctionRef<StorableValue(const std::string&)> valueOf) const {
+    std::vector<StorableValue> values;
+    values.reserve(columns_.size());
+    for (const auto& column : columns_) values.push_back(valueOf(column.name));
+    return values;
 }
 
 std::string StoreTable::deleteAllSQL() const {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Platform/ForgottenRecords.h>
+#include <corvane/Platform/FunctionRef.h>
 #include <corvane/Store/StorableValue.h>
 #include <corvane/Store/StoreColumn.h>
 
@@ -17,6 +18,8 @@ class StoreConnection;
 
 /// What an entity has beside its own columns.
 struct StoreTableExtras {
+    /// Whether a row lies in its key's index alone: one page is written with it, not two, but rows have no order.
+    bool isIndexOnly = false;
     /// Statements that create further tables, which whoever writes this one needs too.
     std::vector<std::string> companions = {};
     /// Notes what all records hold before they are forgotten, inside the transaction; may be empty.
@@ -35,6 +38,8 @@ class StoreTable {
     [[nodiscard]] std::string createSQL() const;
     [[nodiscard]] const StoreTableExtras& extras() const noexcept { return extras_; }
     [[nodiscard]] std::string dropSQL() const;
+    /// One value for each column, in table order.
+    [[nodiscard]] std::vector<StorableValue> values(FunctionRef<StorableValue(const std::string&)> valueOf) const;
     [[nodiscard]] std::string deleteAllSQL() const;
     /// @param values one for each column, in table order. Throws `InvalidArgument` when one cannot be written.
     [[nodiscard]] std::string insertSQL(const std::vector<StorableValue>& values) const;

@@ -20,6 +20,7 @@ struct LedgerEntity {
     static constexpr std::string_view tableName = "ledger";
     static constexpr std::int64_t schemaVersion = 0;  ///< never looked at: there may be further names
     static std::vector<StoreColumn> columns();
+    static StoreTableExtras extras() { return {.isIndexOnly = true}; }
     static LedgerEntity read(StoreStepper& stepper);
     [[nodiscard]] StorableValue storableValue(std::string_view columnName) const;
 
@@ -34,6 +35,7 @@ struct DocumentEntity {
     static constexpr std::string_view tableName = "documents";
     static constexpr std::int64_t schemaVersion = 0;  ///< never looked at
     static std::vector<StoreColumn> columns();
+    static StoreTableExtras extras() { return {.isIndexOnly = true}; }
     static DocumentEntity read(StoreStepper& stepper);
     [[nodiscard]] StorableValue storableValue(std::string_view columnName) const;
 

@@ -42,7 +42,8 @@ StoreTableExtras SignedEntity::extras() {
         noteForgotten(connection, forgotten);
         return forgotten;
     };
-    return {{Store<DocumentEntity>::table().createSQL(), Store<LedgerEntity>::table().createSQL()}, willForget};
+    return {.companions = {Store<DocumentEntity>::table().createSQL(), Store<LedgerEntity>::table().createSQL()},
+            .willForget = willForget};
 }
 
 SignedEntity SignedEntity::read(StoreStepper& stepper) {

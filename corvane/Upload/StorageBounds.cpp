@@ -89,26 +89,52 @@ void StorageBounds::keepLater() {
 
 StorageBounds::Excess StorageBounds::excess() {
     Excess excess;
-    auto bytes = book_->bytesOnDisk();
-    if (bytes <= limits_.maximumBytes && !limits_.maximumAge) return excess;
-    std::size_t beingWithdrawn = 0;
-    {
-        const Lock lock(mutex_);
-        beingWithdrawn = withdrawn_.size();
-    }
-    const auto oldest = rows_->oldest(beingWithdrawn + portion);
-    for (const auto& document : oldest) {
-        const bool isTooOld = limits_.maximumAge && now() - document.created > *limits_.maximumAge;
-        const bool isTooMuch = bytes > limits_.maximumBytes;
-        if (!isTooOld && !isTooMuch) return excess;
-        if (isTooMuch) logBound(bytes);
+    auto bytes = book_->bytesOnDisk() - bytesBeingWithdrawn();
+    while (const auto* oldest = oldestIfNeeded(bytes)) {
+        if (excess.documents.size() == portion) {
+            excess.isComplete = false;
+            break;
+        }
+        const bool isTooOld = this->isTooOld(*oldest);
+        if (!isTooOld && bytes <= limits_.maximumBytes) break;
+        const auto document = *oldest;
+        oldest_.pop_front();
+        if (isWithdrawn(document.identifier) || !rows_->find(document.identifier)) continue;  // gone meanwhile
+        if (bytes > limits_.maximumBytes) logBound(bytes);
         const auto size = sizeOf(document);
         bytes -= size;
-        const Withdrawn withdrawn{isTooOld ? Reason::tooOld : Reason::noRoom, size - document.bytes};
-        if (!isWithdrawn(document.identifier)) excess.documents.emplace(document.identifier, withdrawn);
+        excess.documents.emplace(document.identifier,
+                                 Withdrawn{isTooOld ? Reason::tooOld : Reason::noRoom, size, size - document.bytes});
     }
-    excess.isComplete = oldest.size() < beingWithdrawn + portion;
     return excess;
+}
+
+// Looked up many at a time: at the bound every new document asks for the oldest.
+const UploadRows::Oldest* StorageBounds::oldestIfNeeded(std::int64_t bytes) {
+    constexpr std::size_t atOnce = 256;
+    if (bytes <= limits_.maximumBytes && !limits_.maximumAge) return nullptr;
+    if (oldest_.empty()) {
+        for (auto& document : rows_->oldest(atOnce + countBeingWithdrawn())) {
+            if (!isWithdrawn(document.identifier)) oldest_.push_back(std::move(document));
+        }
+    }
+    return oldest_.empty() ? nullptr : &oldest_.front();
+}
+
+bool StorageBounds::isTooOld(const UploadRows::Oldest& document) const {
+    return limits_.maximumAge && now() - document.created > *limits_.maximumAge;
+}
+
+std::size_t StorageBounds::countBeingWithdrawn() {
+    const Lock lock(mutex_);
+    return withdrawn_.size();
+}
+
+std::int64_t StorageBounds::bytesBeingWithdrawn() {
+    const Lock lock(mutex_);
+    std::int64_t bytes = 0;
+    for (const auto& [identifier, withdrawn] : withdrawn_) bytes += withdrawn.size;
+    return bytes;
 }
 
 void StorageBounds::logBound(std::int64_t bytes) {

@@ -10,7 +10,9 @@
 
 #include <atomic>
 #include <chrono>
+#include <cstddef>
 #include <cstdint>
+#include <deque>
 #include <map>
 #include <memory>
 #include <optional>
@@ -56,6 +58,7 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
     struct Check;
     struct Withdrawn {
         DeliveryUpdate::Reason reason;
+        std::int64_t size = 0;       // of its payload
         std::int64_t uncounted = 0;  // bytes of its payload that its row does not know of
     };
     using Documents = std::map<std::string, Withdrawn>;
@@ -68,6 +71,11 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
     /// The oldest documents that are too old or too much, but for those that are being withdrawn; some of them, if they
     /// are many.
     [[nodiscard]] Excess excess() CORVANE_REQUIRES(*queue_);
+    /// The oldest stored document, if it matters with so many bytes stored.
+    [[nodiscard]] const UploadRows::Oldest* oldestIfNeeded(std::int64_t bytes) CORVANE_REQUIRES(*queue_);
+    [[nodiscard]] bool isTooOld(const UploadRows::Oldest& document) const;
+    [[nodiscard]] std::size_t countBeingWithdrawn();
+    [[nodiscard]] std::int64_t bytesBeingWithdrawn();
     void withdraw(Documents documents) CORVANE_REQUIRES(*queue_);
     void keepLater();
     /// Bytes of a document's payload as it is now, or as it was written.
@@ -85,6 +93,7 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
     const std::shared_ptr<LedgerBook> book_;
 
     std::atomic<bool> isMet_ = false;
+    std::deque<UploadRows::Oldest> oldest_ CORVANE_GUARDED_BY(*queue_);  // the next ones; some may be gone by now
 
     Mutex mutex_;
     Documents withdrawn_ CORVANE_GUARDED_BY(mutex_);

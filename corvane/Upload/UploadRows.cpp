@@ -34,11 +34,10 @@ std::vector<std::string> texts(const std::shared_ptr<StoreConnection>& connectio
 UploadRows::UploadRows(std::shared_ptr<DeferredStore<SignedEntity>> deferredStore, std::shared_ptr<LedgerBook> book)
     : deferredStore_(std::move(deferredStore)), book_(std::move(book)) {}
 
-template <class Operation>
-void UploadRows::change(Operation operation) {
+void UploadRows::change(FunctionRef<void(Rows&, Changes&)> operation) {
     deferredStore_->perform([&](Rows& rows) {
         try {
-            deferredStore_->transaction(rows, [&] {
+            deferredStore_->transaction([&] {
                 Changes changes;
                 operation(rows, changes);
                 write(book_->write(changes), rows.connection());
@@ -112,9 +111,9 @@ std::vector<UploadRows::Oldest> UploadRows::oldest(std::size_t count) {
     std::vector<Oldest> oldest;
     deferredStore_->perform([&](Rows& rows) {
         const std::string sql =
-            "SELECT identifier, bytes, createdDate FROM documents JOIN signed_requests USING (identifier) ORDER BY "
-            "documents.rowid LIMIT " +
-            std::to_string(count) + ";";
+            "SELECT identifier, bytes, createdDate FROM (SELECT identifier, createdDate FROM signed_requests ORDER BY "
+            "createdDate LIMIT " +
+            std::to_string(count) + ") JOIN documents USING (identifier) ORDER BY createdDate;";
         rows.connection()->query(sql, [&](StoreStepper& stepper) {
             Oldest one{.identifier = stepper.text(), .bytes = stepper.integer(), .created = now()};
             one.created = dateFromSeconds(stepper.double_()).value_or(one.created);

@@ -51,7 +51,7 @@ class UploadRows {
         std::int64_t bytes = 0;
         Date created;
     };
-    /// So many of the documents that were handed over first, in that order.
+    /// So many of the documents that were handed over first, by the wall clock, in that order. Looks at every row.
     [[nodiscard]] std::vector<Oldest> oldest(std::size_t count);
     /// Counts a retry, in the upload's row only the first of a run. Returns false when there is no row.
     bool countRetry(const UploadResult::Retry& retry, bool isFirstOfRun = true);
@@ -68,8 +68,7 @@ class UploadRows {
     using Rows = Store<SignedEntity>;
 
     /// Runs `operation`, which notes what it changes, in a transaction that writes the ledger, too.
-    template <class Operation>
-    void change(Operation operation);
+    void change(FunctionRef<void(Rows&, LedgerBook::Changes&)> operation);
     void reconcile();
     void endAll(const std::vector<Ending>& endings);
 
