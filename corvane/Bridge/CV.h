@@ -53,6 +53,9 @@ using CVDeliveryUpdate = DeliveryUpdate;
 using CVDeliveryObserver = DeliveryObserver;
 using CVDeliveryReport = DeliveryReport;
 using CVDeliveryWaitOptions = DeliveryWaitOptions;
+using CVLedger = Ledger;
+using CVRejectedEvent = RejectedEvent;
+using CVForgottenRecords = ForgottenRecords;
 using CVClient = Client;
 using CVEndpoint = Endpoint;
 

@@ -121,8 +121,8 @@ class CORVANE_EXPORT UploadBatchEventProcessor final : public EventProcessorType
     /// processes what was on disk when the first session began, or at the last `readLedger`. For the moment in which a
     /// batch is handed over its events may count both as open and as waiting. Any thread; waits for nothing.
     [[nodiscard]] Ledger ledger() const;
-    /// Reads the ledger on disk again, and calls the completion with it, on the queue of the session manager. Any
-    /// thread. Does nothing for a processor that was never added.
+    /// Reads the ledger on disk again, and calls the completion, if any, with it, on the queue of the session manager.
+    /// Any thread. Does nothing for a processor that was never added.
     void readLedger(std::function<void(const Ledger& ledger)> completion);
 
     /// Has `observer` told of every document of the endpoint as it happens, from now on and in order, in place of an

@@ -507,7 +507,7 @@ void UploadBatches::readLedger(std::function<void(const Ledger&)> completion) {
     queue->async([self = shared_from_this(), completion = std::move(completion)] {
         self->assertOnQueue("UploadBatchEventProcessor::readLedger");
         self->readStored();
-        callHost("ledger completion", [&] { completion(self->ledger()); });
+        if (completion) callHost("ledger completion", [&] { completion(self->ledger()); });
     });
 }
 

@@ -148,6 +148,21 @@ TEST_F(BridgeProcessors, UploadBatchesThroughTheBridge) {
     }
     EXPECT_FALSE(uploads->resumeBackgroundProcessingForIdentifier("not mine", [] {}));
 
+    std::promise<CVLedger> read;
+    uploads->readLedger([&](const CVLedger& ledger) { read.set_value(ledger); });
+    EXPECT_EQ(read.get_future().get(), uploads->ledger());
+    EXPECT_EQ(uploads->ledger().accepted(), (CVLedger::Count{3, 2}));
+
+    server.script(ScriptedServer::Reply::status(503));
+    sessions->startSessionForKind(CVSessionKind::userEvents);
+    for (int i = 0; i < 3; ++i) root->submitRawEvent({"View", {}});
+    std::promise<CVForgottenRecords> dropped;
+    sessions->forget([&](const CVForgottenRecords& forgotten, const CVError* left) {
+        EXPECT_EQ(left, nullptr);
+        dropped.set_value(forgotten);
+    });
+    EXPECT_EQ(dropped.get_future().get(), (CVForgottenRecords{3, 1}));
+
     std::promise<bool> isKept;
     sessions->setRecording(false, [&](const CVError* kept) { isKept.set_value(!kept); });
     EXPECT_TRUE(isKept.get_future().get());

@@ -25,6 +25,10 @@ Session::Kind libraryKind(BridgedSessionKind kind, const std::optional<std::stri
     throw BridgeError(BridgeError::unknownValue, "the session's kind");
 }
 
+std::optional<BridgedError> bridgedError(const AnyError* error) {
+    return error ? std::optional(BridgedError::of(*error)) : std::nullopt;
+}
+
 /// Takes the handle away from whoever kept it, also when the block throws.
 class Ending {
   public:
@@ -62,13 +66,22 @@ void BridgedSessionManager::endSessionWithCompletion(std::function<void()> compl
 void BridgedSessionManager::setRecording(bool isOn, std::function<void(const BridgedError*)> completion) {
     if (!completion) return sessionManager_->setRecording(isOn);
     sessionManager_->setRecording(isOn, [completion = std::move(completion)](const AnyError* error) {
-        const std::optional<BridgedError> bridged = error ? std::optional(BridgedError::of(*error)) : std::nullopt;
+        const auto bridged = bridgedError(error);
         completion(bridged ? &*bridged : nullptr);
     });
 }
 
 bool BridgedSessionManager::isRecording() const {
     return sessionManager_->isRecording();
+}
+
+void BridgedSessionManager::forget(std::function<void(const ForgottenRecords&, const BridgedError*)> completion) {
+    if (!completion) return sessionManager_->forget();
+    sessionManager_->forget(
+        [completion = std::move(completion)](const ForgottenRecords& forgotten, const AnyError* error) {
+            const auto bridged = bridgedError(error);
+            completion(forgotten, bridged ? &*bridged : nullptr);
+        });
 }
 
 bool BridgedSessionManager::pushSessionData(const BridgedSessionData& data, BridgedDataEventTraits traits,

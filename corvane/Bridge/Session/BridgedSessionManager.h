@@ -6,6 +6,7 @@
 #include <corvane/Bridge/Models/BridgedSession.h>
 #include <corvane/Bridge/Session/BridgedEventProcessorType.h>
 #include <corvane/Export.h>
+#include <corvane/Platform/ForgottenRecords.h>
 #include <corvane/Processing/ProcessorManager.h>
 #include <corvane/Session/AccessSessionManager.h>
 #include <corvane/Session/SessionManager.h>
@@ -109,6 +110,9 @@ class CORVANE_EXPORT BridgedSessionManager {
     /// be written.
     void setRecording(bool isOn, std::function<void(const BridgedError*)> completion = {});
     [[nodiscard]] bool isRecording() const;
+    /// As `SessionManager::forget`. The completion, if any, gets how much was dropped, and nullptr or the reason why
+    /// something may be left.
+    void forget(std::function<void(const ForgottenRecords&, const BridgedError*)> completion = {});
 
     /// Puts data into this and later sessions, under its key. It is converted before the call returns, on the caller's
     /// thread. Refused, with no effect: a missing object, a name or key that is not UTF-8, data that cannot become

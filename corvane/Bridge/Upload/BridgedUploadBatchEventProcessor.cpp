@@ -20,6 +20,12 @@ DeliveryReport BridgedUploadBatchEventProcessor::waitForDelivery(std::chrono::st
 void BridgedUploadBatchEventProcessor::flush() {
     proxyEventProcessor_->flush();
 }
+Ledger BridgedUploadBatchEventProcessor::ledger() const {
+    return proxyEventProcessor_->ledger();
+}
+void BridgedUploadBatchEventProcessor::readLedger(std::function<void(const Ledger& ledger)> completion) {
+    proxyEventProcessor_->readLedger(std::move(completion));
+}
 void BridgedUploadBatchEventProcessor::setDeliveryObserver(DeliveryObserver observer) {
     proxyEventProcessor_->setDeliveryObserver(std::move(observer));
 }

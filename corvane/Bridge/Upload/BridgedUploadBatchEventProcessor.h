@@ -5,6 +5,7 @@
 #include <corvane/Processing/UploadBatchEventProcessor.h>
 
 #include <chrono>
+#include <functional>
 #include <memory>
 
 namespace corvane {
@@ -24,6 +25,8 @@ class CORVANE_EXPORT BridgedUploadBatchEventProcessor final : public BridgingEve
     DeliveryReport waitForDelivery(std::chrono::steady_clock::time_point deadline,
                                    const DeliveryWaitOptions& options = {}) const;
     void flush();
+    [[nodiscard]] Ledger ledger() const;
+    void readLedger(std::function<void(const Ledger& ledger)> completion);
     void setDeliveryObserver(DeliveryObserver observer);
 
     /// The library's own processor.
