@@ -323,9 +323,9 @@ void UploadBatches::didStartSession(const Session& session) {
     } catch (...) {
         Log::shared().error("Failed to open handle to the store, error=%{public}@", AnyError::current().what());
     }
+    dropForgotten();  // the manager sends what is stored: that is none of it
     uploadManager_->open();
     delayTimer_.cancel();
-    dropForgotten();
     setSession(session);
     // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
     // rest.
@@ -451,7 +451,7 @@ void UploadBatches::didReject(RejectedEvent::Reason reason) {
 std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
     const auto epoch = RecordingSwitch::epoch();
     if (epoch <= epoch_) return std::nullopt;
-    epoch_ = epoch;
+    if (std::exchange(epoch_, epoch) == noEpoch) return std::nullopt;
     ForgottenRecords unsaved;
     for (const auto& [key, batch] : batchQueues_) unsaved.events += counts_.forget(batch);
     for (const auto& [document, batch] : unsaved_) {

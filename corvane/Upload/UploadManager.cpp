@@ -106,8 +106,9 @@ void UploadManager::forget() {
     }
     stored_->forget();
     if (retries_) retries_->forget();
-    service_->cancelAll();
-    ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
+    auto documents = ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
+    // By name: what comes meanwhile is not among them.
+    if (!documents.empty()) service_->cancel(std::move(documents), [](const std::set<std::string>&) {});
 }
 
 bool UploadManager::shouldResume(std::string_view identifier, std::function<void()> completion) {

@@ -229,6 +229,27 @@ TEST_F(Books, ForgetIsObeyedByOthersAndFinishedByTheNext) {
     EXPECT_EQ(ledger(*application), "forgotten 7/3");
 }
 
+TEST_F(Books, WhatIsRecordedAfterForgettingIsSentByThisRunAndTheNext) {
+    auto application = start(1);
+    application->submit(2);
+    application->sessions.tracker()->suspend();
+    std::promise<void> forgotten;
+    application->sessions.forget([&](auto&&...) { forgotten.set_value(); });
+    application->submit(2);  // handed over before the transfers of before are listed
+    application->sessions.tracker()->resume();
+    forgotten.get_future().wait();
+    settled->settle();
+    for (const auto& task : session->made()) EXPECT_EQ(task->wasCancelled(), task->identifier() <= 2);
+    for (const int task : {3, 4}) session->complete(task, 503);
+    application->abandon();
+    application = start(1);
+    settled->settle();
+    ASSERT_TRUE(session->waitForTasks(2));
+    settled->settle();
+    for (const auto& task : session->made()) EXPECT_FALSE(task->wasCancelled()) << "it has nothing of before";
+    EXPECT_EQ(application->uploads->waitForDelivery({}).pending.documents, 2);
+}
+
 TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) {
     settings.setTransfers([this, open = FakeTransferSession::factory(session)](auto... arguments) {
         auto opened = open(std::move(arguments)...);
