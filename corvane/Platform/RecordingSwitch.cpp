@@ -23,6 +23,7 @@
 #include <string>
 #include <string_view>
 #include <thread>
+#include <utility>
 
 namespace corvane {
 
@@ -112,10 +113,12 @@ struct RecordingSwitch::State {
     bool isUnsaved CORVANE_GUARDED_BY(mutex) = false;
     std::int64_t finishedEpoch CORVANE_GUARDED_BY(mutex) = 0;
 
+    bool isUnread CORVANE_GUARDED_BY(mutex) = false;
     std::optional<AnyError> problem CORVANE_GUARDED_BY(mutex);  // of the last reading, until it is in the log
 
     void findFile() CORVANE_REQUIRES(mutex);
     void read() CORVANE_REQUIRES(mutex);
+    void failToRead(bool isForGood) CORVANE_REQUIRES(mutex);
     void logProblem();
 };
 
@@ -143,10 +146,20 @@ void RecordingSwitch::State::read() {
         if (word.epoch > epoch_) epoch_ = word.epoch;
         finishedEpoch = std::max(finishedEpoch, word.finished);
         answer_ = word.isOn ? Answer::on : Answer::off;
+        isUnread = false;
+    } catch (const InvalidArgument&) {
+        failToRead(true);
     } catch (...) {
-        answer_ = Answer::off;
-        problem = AnyError::current();
+        failToRead(false);
     }
+}
+
+// Inside a handler. What may be readable at the next look, as when there was no descriptor left, is read again then.
+void RecordingSwitch::State::failToRead(bool isForGood) {
+    constexpr FileStamp ofNoFile{.size = -1};
+    if (!isForGood) seen = ofNoFile;
+    answer_ = Answer::off;
+    if (!std::exchange(isUnread, true)) problem = AnyError::current();
 }
 
 // Without the lock: the log's sink is the host's, and may call what takes it.

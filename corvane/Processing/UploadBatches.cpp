@@ -122,6 +122,8 @@ UploadBatchQueueKey UploadBatches::keyOf(const ProcessEvent& processEvent) const
 
 void UploadBatches::process(const ProcessEvent& processEvent) {
     assertOnQueue("UploadBatchEventProcessor::process");
+    // With the first of a run: what comes after another process has forgotten is no part of what that was about.
+    if (!writesAtEndOfRun_) RecordingSwitch::look();
     dropForgotten();
     counts_.accept();
     try {
@@ -507,6 +509,7 @@ void UploadBatches::readLedger(std::function<void(const Ledger&)> completion) {
     queue->async([self = shared_from_this(), completion = std::move(completion)] {
         self->assertOnQueue("UploadBatchEventProcessor::readLedger");
         self->readStored();
+        self->dropForgotten();  // as far as is known by now
         callHost("ledger completion", [&] { completion(self->ledger()); });
     });
 }

@@ -107,6 +107,10 @@ void UploadManager::forget() {
     stored_->forget();
     if (retries_) retries_->forget();
     auto documents = ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
+    // Rows that are no more, or never were on disk, have payloads that are.
+    for (const auto& document : documents) {
+        if (dropbox_->existingFile(document)) removeForgotten(document);
+    }
     // By name: what comes meanwhile is not among them.
     if (!documents.empty()) service_->cancel(std::move(documents), [](const std::set<std::string>&) {});
 }
