@@ -106,6 +106,7 @@ void UploadManager::forget() {
     }
     stored_->forget();
     if (retries_) retries_->forget();
+    bounds_->forget();
     auto documents = ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
     // Rows that are no more, or never were on disk, have payloads that are.
     for (const auto& document : documents) {
@@ -141,7 +142,7 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     }
     service_->submit(prepared(entity, std::move(file)));
     ledger_->begin(entity.identifier);
-    bounds_->keep();
+    bounds_->keep(static_cast<std::int64_t>(body.size()));
     return taken;
 }
 

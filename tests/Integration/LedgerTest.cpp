@@ -6,6 +6,7 @@
 
 #include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/UUID.h>
+#include <corvane/Upload/LedgerEntity.h>
 
 #include <future>
 #include <map>
@@ -298,6 +299,31 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     settled->settle();
     ASSERT_TRUE(session->waitForTasks(1));
     EXPECT_EQ(ledger(*application), "waiting 1/1, delivered 2/1, size 5/3, age 1/1, again 3/3");
+
+    // Another process has delivered what this one counts, and writes what it does not.
+    application->submit(2);
+    settled->settle();
+    const auto size = static_cast<std::int64_t>(std::filesystem::file_size(dropbox() / rows().at(1).identifier));
+    session->complete(2, 503);
+    session->complete(1, 200);
+    application->abandon();
+    application = start({.batchSize = 2, .maximumBytesOnDisk = size * 2});
+    ASSERT_TRUE(session->waitForTasks(1));
+    const auto other = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
+    for (int i = 0; i < 4; ++i) {
+        application->submit(2);
+        settled->settle();
+        for (const char* table : {"signed_requests", "documents"})
+            other->run("DELETE FROM " + std::string(table) + ";");
+    }
+    for (const auto& task : session->made()) EXPECT_FALSE(task->wasCancelled());
+    old.identifier = "another's";
+    old.createdDate = now();
+    Store<SignedEntity>(other).insert(old);
+    Store<DocumentEntity>(other).insert({old.identifier, 7, 1'000'000});
+    application->submit(2);
+    settled->settle();  // it is withdrawn first
+    EXPECT_NE(ledger(*application).find("size 12/4"), std::string::npos);
     for (const UploadBatchEventOptions& bad :
          {UploadBatchEventOptions{.maximumBytesOnDisk = 0}, {.maximumAge = std::chrono::milliseconds(0)}}) {
         EXPECT_THROW(UploadBatchEventConfig{bad}, InvalidArgument);
