@@ -78,6 +78,11 @@ class WriteLock {
         }
     }
 
+    WriteLock(const WriteLock&) = delete;
+    WriteLock& operator=(const WriteLock&) = delete;
+    // A child made by fork meanwhile has the descriptor, too, and would keep the lock for as long as it lives.
+    ~WriteLock() { ::flock(directory_.get(), LOCK_UN); }
+
   private:
     const Descriptor directory_;
 };

@@ -109,13 +109,21 @@ const std::shared_ptr<StoreConnection>& DeferredStoreCore::connection() {
         lost_ = connection_->location();
         makeAnew();
     }
-    if (RecordingSwitch::epoch() > epoch_) {
+    if (RecordingSwitch::epoch() > epoch_) forgetEarlier();
+    return connection_;
+}
+
+void DeferredStoreCore::forgetEarlier() {
+    const auto before = epoch_;
+    try {
         connection_->transaction([this] {
-            queue().assertCurrent("DeferredStoreCore::connection");
+            queue().assertCurrent("DeferredStoreCore::forgetEarlier");
             keepUp();
         });
+    } catch (...) {  // with a commit, too, that finds the disk full
+        epoch_ = before;
+        throw;
     }
-    return connection_;
 }
 
 void DeferredStoreCore::keepUp() {

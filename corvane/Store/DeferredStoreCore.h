@@ -69,6 +69,7 @@ class DeferredStoreCore {
         : table_(table), schemaVersion_(schemaVersion) {}
 
     void makeAnew() CORVANE_REQUIRES(queue());
+    void forgetEarlier() CORVANE_REQUIRES(queue());
 
     const StoreTable& table_;
     const std::int64_t schemaVersion_;
