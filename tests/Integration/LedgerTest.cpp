@@ -307,10 +307,10 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     session->complete(2, 503);
     session->complete(1, 200);
     application->abandon();
-    application = start({.batchSize = 2, .maximumBytesOnDisk = size * 2});
+    application = start({.batchSize = 2, .maximumBytesOnDisk = size * 4});
     ASSERT_TRUE(session->waitForTasks(1));
     const auto other = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
-    for (int i = 0; i < 4; ++i) {
+    for (int i = 0; i < 8; ++i) {
         application->submit(2);
         settled->settle();
         for (const char* table : {"signed_requests", "documents"})
