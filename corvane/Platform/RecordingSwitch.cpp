@@ -150,7 +150,7 @@ void RecordingSwitch::State::read() {
         const auto word = seen ? Word::parse(readWholeFile(file)) : Word();
         if (word.epoch > epoch_) epoch_ = word.epoch;
         finishedEpoch = std::max(finishedEpoch, word.finished);
-        answer_ = word.isOn ? Answer::on : Answer::off;
+        if (!isUnsaved) answer_ = word.isOn ? Answer::on : Answer::off;
         isUnread = false;
     } catch (const InvalidArgument&) {
         failToRead(true);
@@ -163,6 +163,7 @@ void RecordingSwitch::State::read() {
 void RecordingSwitch::State::failToRead(bool isForGood) {
     constexpr FileStamp ofNoFile{.size = -1};
     if (!isForGood) seen = ofNoFile;
+    if (isUnsaved) return;  // this process was told
     answer_ = Answer::off;
     if (!std::exchange(isUnread, true)) problem = AnyError::current();
 }
@@ -247,7 +248,7 @@ void RecordingSwitch::look() {
     {
         const Lock lock(state().mutex);
         state().findFile();
-        if (!state().isUnsaved && stampOf(state().file) != state().seen) state().read();
+        if (stampOf(state().file) != state().seen) state().read();
     }
     state().logProblem();
 }

@@ -116,8 +116,14 @@ TEST_F(Recording, AnotherProcesssWordCountsAndOneThatCannotBeReadIsNo) {
     EXPECT_EQ(log.count("Failed to keep whether to record"), 1);
     EXPECT_EQ(submit<Identified>(), "recorded") << "this process was told";
     std::filesystem::remove(file);
+    replacePrivateFile(file, "off 6 6\n");
+    EXPECT_EQ(submit<Identified>(), "recorded") << "until it is saved";
+    EXPECT_EQ(RecordingSwitch::epoch(), 7) << "what was to be forgotten still is";
+    replacePrivateFile(file, "off 9 7\n");
+    RecordingSwitch::look();
+    EXPECT_EQ(RecordingSwitch::epoch(), 9) << "whatever is not saved";
     EXPECT_EQ(choose(true), "");
-    EXPECT_EQ(readWholeFile(file), "on 7 7\n") << "what was to be forgotten still is";
+    EXPECT_EQ(readWholeFile(file), "on 9 7\n");
 }
 
 }  // namespace
