@@ -454,10 +454,11 @@ std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
     const auto epoch = RecordingSwitch::epoch();
     if (epoch <= epoch_) return std::nullopt;
     if (std::exchange(epoch_, epoch) == noEpoch) return std::nullopt;
+    const bool hasRows = DeferredStoreCore::queue().sync([this] { return !deferredStore_->isInMemory(); });
     ForgottenRecords unsaved;
-    for (const auto& [key, batch] : batchQueues_) unsaved.events += counts_.forget(batch);
+    for (const auto& [key, batch] : batchQueues_) unsaved.events += counts_.forget(batch, hasRows);
     for (const auto& [document, batch] : unsaved_) {
-        unsaved.events += counts_.forget(batch);
+        unsaved.events += counts_.forget(batch, hasRows);
         ledger_->unfollow(document);
     }
     batchQueues_.clear();
