@@ -72,7 +72,7 @@ struct Look {
     static constexpr bool isAnswered = true;
     void visit(auto&&) {}
 };
-/// Drops every task, of every owner, whose body lies beneath a directory.
+/// Drops every task, of every owner, whose body lay beneath a directory and is gone.
 struct Discard {
     static constexpr std::uint8_t kind = 9;
     static constexpr bool isAnswered = true;

@@ -23,6 +23,7 @@
 #include <string>
 #include <string_view>
 #include <thread>
+#include <utility>
 
 namespace corvane {
 
@@ -77,6 +78,11 @@ class WriteLock {
         }
     }
 
+    WriteLock(const WriteLock&) = delete;
+    WriteLock& operator=(const WriteLock&) = delete;
+    // A child made by fork meanwhile has the descriptor, too, and would keep the lock for as long as it lives.
+    ~WriteLock() { ::flock(directory_.get(), LOCK_UN); }
+
   private:
     const Descriptor directory_;
 };
@@ -112,10 +118,12 @@ struct RecordingSwitch::State {
     bool isUnsaved CORVANE_GUARDED_BY(mutex) = false;
     std::int64_t finishedEpoch CORVANE_GUARDED_BY(mutex) = 0;
 
+    bool isUnread CORVANE_GUARDED_BY(mutex) = false;
     std::optional<AnyError> problem CORVANE_GUARDED_BY(mutex);  // of the last reading, until it is in the log
 
     void findFile() CORVANE_REQUIRES(mutex);
     void read() CORVANE_REQUIRES(mutex);
+    void failToRead(bool isForGood) CORVANE_REQUIRES(mutex);
     void logProblem();
 };
 
@@ -142,11 +150,22 @@ void RecordingSwitch::State::read() {
         const auto word = seen ? Word::parse(readWholeFile(file)) : Word();
         if (word.epoch > epoch_) epoch_ = word.epoch;
         finishedEpoch = std::max(finishedEpoch, word.finished);
-        answer_ = word.isOn ? Answer::on : Answer::off;
+        if (!isUnsaved) answer_ = word.isOn ? Answer::on : Answer::off;
+        isUnread = false;
+    } catch (const InvalidArgument&) {
+        failToRead(true);
     } catch (...) {
-        answer_ = Answer::off;
-        problem = AnyError::current();
+        failToRead(false);
     }
+}
+
+// Inside a handler. What may be readable at the next look, as when there was no descriptor left, is read again then.
+void RecordingSwitch::State::failToRead(bool isForGood) {
+    constexpr FileStamp ofNoFile{.size = -1};
+    if (!isForGood) seen = ofNoFile;
+    if (isUnsaved) return;  // this process was told
+    answer_ = Answer::off;
+    if (!std::exchange(isUnread, true)) problem = AnyError::current();
 }
 
 // Without the lock: the log's sink is the host's, and may call what takes it.
@@ -229,7 +248,7 @@ void RecordingSwitch::look() {
     {
         const Lock lock(state().mutex);
         state().findFile();
-        if (!state().isUnsaved && stampOf(state().file) != state().seen) state().read();
+        if (stampOf(state().file) != state().seen) state().read();
     }
     state().logProblem();
 }

@@ -53,10 +53,10 @@ void BatchCounts::settle(const UploadBatch& batch, const DeliveryLedger::Settled
                     {eventsOf(batch), 1});
 }
 
-std::int64_t BatchCounts::forget(const UploadBatch& batch) {
+std::int64_t BatchCounts::forget(const UploadBatch& batch, bool hasRows) {
     counts_.forgotten += eventsOf(batch);
     std::int64_t unsaved = eventsOf(batch);
-    for (const auto& part : batch.parts()) unsaved -= static_cast<std::int64_t>(part.saved);
+    for (const auto& part : batch.parts()) unsaved -= hasRows ? static_cast<std::int64_t>(part.saved) : 0;
     if (unsaved != 0) book_->addLater(LedgerEntry::givenUpForgotten, {unsaved, 0});
     return unsaved;
 }

@@ -27,7 +27,8 @@ class BatchCounts {
     /// There was neither a row of a batch nor one of its document, whose going would count its events.
     void settle(const UploadBatch& batch, const DeliveryLedger::Settled& settled);
     /// A batch is dropped. Returns how many of its events were in no row, where they are counted otherwise.
-    std::int64_t forget(const UploadBatch& batch);
+    /// @param hasRows whether its rows, if it has any, are in the database of the ledger
+    std::int64_t forget(const UploadBatch& batch, bool hasRows);
 
     /// The rows of earlier runs and other processes, and one that has become a document.
     void setOthers(const std::vector<UploadBatchEntity::Size>& rows);

@@ -45,22 +45,39 @@ std::optional<std::string> between(const fs::path& file, std::string_view openin
     return name.substr(opening.size(), name.size() - opening.size() - closing.size());
 }
 
-std::set<std::string> storedDocuments(const std::shared_ptr<StoreConnection>& connection) {
-    auto keys = Store<SignedEntity>(connection).keys();
-    return {keys.begin(), keys.end()};
+bool namesEndpoint(const std::string& name) {
+    try {
+        return DocumentsDirectory::fileNamePart(name) == name;
+    } catch (const InvalidArgument&) {
+        return false;  // somebody else's file
+    }
 }
 
-/// Removes the payloads that no row stands for: of a process that was killed before it wrote the row. One that is being
-/// written has none yet either, but it is younger than the epoch.
-void removeOrphans(const fs::path& payloads, const std::set<std::string>& stored, std::int64_t epoch) {
+/// The documents that stay; nothing where they cannot be told.
+std::optional<std::set<std::string>> storedDocuments(const std::shared_ptr<StoreConnection>& connection) {
+    try {
+        const auto keys = Store<SignedEntity>(connection).keys();
+        return std::set<std::string>(keys.begin(), keys.end());
+    } catch (const StoreError&) {
+        return std::nullopt;
+    }
+}
+
+/// Removes the payloads that no row stands for: of a process that was killed before it wrote the row, or beside a
+/// database that is lost. One that is being written has none yet either, but it is younger than the epoch. Where the
+/// clock was put back since, its age says little.
+void removeOrphans(const fs::path& payloads, const std::optional<std::set<std::string>>& stored, std::int64_t epoch) {
     constexpr std::chrono::seconds granularity(1);  // of the file system's clock
-    const auto begin = dateFromMilliseconds(epoch).value_or(now()) - granularity;
+    const auto time = dateFromMilliseconds(epoch).value_or(Date::max());
+    if (time > now() && !stored) return;
+    const auto begin = time > now() ? now() - std::chrono::hours(1) : time - granularity;
     std::error_code failed;
     for (fs::directory_iterator entry(payloads, failed), end; !failed && entry != end; entry.increment(failed)) {
         const auto name = entry->path().filename().string();
         std::error_code unseen;
         const auto written = std::chrono::file_clock::to_sys(entry->last_write_time(unseen));
-        if (!unseen && written < begin && isUUID(name) && !stored.contains(name)) fs::remove(entry->path(), unseen);
+        const bool isStored = stored && stored->contains(name);
+        if (!unseen && written < begin && isUUID(name) && !isStored) fs::remove(entry->path(), unseen);
     }
 }
 
@@ -76,50 +93,77 @@ void removeDebuggingCopies(const fs::path& copies) {
     }
 }
 
-ForgottenRecords sweepEndpoint(const std::string& name, std::int64_t epoch) {
-    const auto connection = std::make_shared<StoreConnection>(StoreLocation::default_(name));
-    connection->transaction([&] {
-        forgetBefore(epoch, connection, Store<SignedEntity>::table());
-        forgetBefore(epoch, connection, Store<UploadBatchEntity>::table());
-    });
-    ForgottenRecords forgotten;
-    for (const auto& known : Store<EpochEntity>(connection).fetchAll()) {
-        if (known.epoch < epoch) continue;
-        forgotten.events += known.forgotten.events;
-        forgotten.documents += known.forgotten.documents;
-    }
-    const auto payloads = UploadDropbox::directoryBeside(*connection);
-    removeOrphans(payloads, storedDocuments(connection), epoch);
-    removeDebuggingCopies(payloads.string() + ".debugging");
-    // The log of the database still has what the tables have no more; another process that reads keeps it for a while.
-    connection->run("PRAGMA wal_checkpoint(TRUNCATE);");
-    return forgotten;
-}
+/// Forgets what a documents directory holds of before an epoch. What fails is logged, and keeps the rest from nothing.
+class Sweep {
+  public:
+    Sweep(fs::path directory, std::int64_t epoch) : directory_(std::move(directory)), epoch_(epoch) {}
 
-Swept sweepDirectory(const fs::path& directory, std::int64_t epoch) {
-    Swept swept;
-    const auto note = [&] {
-        auto error = AnyError::current();
-        Log::shared().error("Failed to forget what was recorded, error=%{public}@", error.what());
-        if (!swept.error) swept.error = std::move(error);
-    };
-    try {
-        for (const auto& entry : fs::directory_iterator(directory)) {
-            const auto name = between(entry.path(), "com.veskar.corvane.", ".db");
-            if (!name || !entry.is_regular_file() || DocumentsDirectory::fileNamePart(*name) != *name) continue;
-            try {
-                const auto forgotten = sweepEndpoint(*name, epoch);
-                swept.forgotten.events += forgotten.events;
-                swept.forgotten.documents += forgotten.documents;
-            } catch (...) {
-                note();
+    [[nodiscard]] Swept run() {
+        attempt([this] {
+            if (fs::absolute(DocumentsDirectory::path()) != directory_) {
+                throw InvalidArgument("another documents directory was set meanwhile");
+            }
+            for (const auto& name : endpoints()) sweep(name);
+        });
+        return std::move(swept_);
+    }
+
+  private:
+    template <class Work>
+    void attempt(const Work& work) {
+        try {
+            work();
+        } catch (...) {
+            auto error = AnyError::current();
+            Log::shared().error("Failed to forget what was recorded, error=%{public}@", error.what());
+            if (!swept_.error) swept_.error = std::move(error);
+        }
+    }
+
+    /// Also those that have lost their database.
+    [[nodiscard]] std::set<std::string> endpoints() const {
+        std::set<std::string> names;
+        for (const auto& entry : fs::directory_iterator(directory_)) {
+            for (const auto* kind : {".db", ".upload-dropbox", ".upload-dropbox.debugging"}) {
+                const auto name = between(entry.path(), "com.veskar.corvane.", kind);
+                if (name && namesEndpoint(*name)) names.insert(*name);
             }
         }
-    } catch (...) {
-        note();
+        return names;
     }
-    return swept;
-}
+
+    void sweep(const std::string& name) {
+        const auto files = (directory_ / "com.veskar.corvane.").string() + name;
+        std::optional<std::set<std::string>> stored;
+        attempt([&] {
+            if (!fs::is_regular_file(files + ".db")) return;
+            const auto connection = std::make_shared<StoreConnection>(StoreLocation::default_(name));
+            attempt([&] { sweepDatabase(connection); });
+            stored = storedDocuments(connection);
+        });
+        removeOrphans(files + ".upload-dropbox", stored, epoch_);
+        attempt([&] { removeDebuggingCopies(files + ".upload-dropbox.debugging"); });
+    }
+
+    void sweepDatabase(const std::shared_ptr<StoreConnection>& connection) {
+        connection->transaction([&] {
+            forgetBefore(epoch_, connection, Store<SignedEntity>::table());
+            forgetBefore(epoch_, connection, Store<UploadBatchEntity>::table());
+        });
+        for (const auto& known : Store<EpochEntity>(connection).fetchAll()) {
+            if (known.epoch < epoch_) continue;
+            swept_.forgotten.events += known.forgotten.events;
+            swept_.forgotten.documents += known.forgotten.documents;
+        }
+        // The log of the database still has what the tables have no more; another process that reads keeps it for a
+        // while.
+        connection->run("PRAGMA wal_checkpoint(TRUNCATE);");
+    }
+
+    const fs::path directory_;
+    const std::int64_t epoch_;
+    Swept swept_;
+};
 
 void finish(std::int64_t epoch, Swept swept, const DiscardResult& discarded, const ForgetCompletion& done) {
     if (discarded.status == DiscardResult::Status::failed) {
@@ -141,9 +185,9 @@ void finish(std::int64_t epoch, Swept swept, const DiscardResult& discarded, con
 
 void forgetDirectory(std::int64_t epoch, ForgetCompletion done) {
     epochUnderWay = epoch;
-    DeferredStoreCore::queue().async([epoch, done = std::move(done)]() mutable {
-        const auto directory = fs::absolute(DocumentsDirectory::path());
-        const auto swept = sweepDirectory(directory, epoch);
+    DeferredStoreCore::queue().async([epoch, directory = fs::absolute(DocumentsDirectory::path()),
+                                      done = std::move(done)] {
+        const auto swept = Sweep(directory, epoch).run();
         try {
             TransferDiscard::start(directory, [epoch, swept, done](const DiscardResult& result) {
                 DeferredStoreCore::queue().async([epoch, swept, done, result] { finish(epoch, swept, result, done); });

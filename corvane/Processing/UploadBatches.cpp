@@ -122,6 +122,8 @@ UploadBatchQueueKey UploadBatches::keyOf(const ProcessEvent& processEvent) const
 
 void UploadBatches::process(const ProcessEvent& processEvent) {
     assertOnQueue("UploadBatchEventProcessor::process");
+    // With the first of a run: what comes after another process has forgotten is no part of what that was about.
+    if (!writesAtEndOfRun_) RecordingSwitch::look();
     dropForgotten();
     counts_.accept();
     try {
@@ -323,9 +325,9 @@ void UploadBatches::didStartSession(const Session& session) {
     } catch (...) {
         Log::shared().error("Failed to open handle to the store, error=%{public}@", AnyError::current().what());
     }
+    dropForgotten();  // the manager sends what is stored: that is none of it
     uploadManager_->open();
     delayTimer_.cancel();
-    dropForgotten();
     setSession(session);
     // What could be neither handed over nor backed up when its session ended, as on a full disk, goes out with the
     // rest.
@@ -451,11 +453,12 @@ void UploadBatches::didReject(RejectedEvent::Reason reason) {
 std::optional<ForgottenRecords> UploadBatches::dropForgotten() {
     const auto epoch = RecordingSwitch::epoch();
     if (epoch <= epoch_) return std::nullopt;
-    epoch_ = epoch;
+    if (std::exchange(epoch_, epoch) == noEpoch) return std::nullopt;
+    const bool hasRows = DeferredStoreCore::queue().sync([this] { return !deferredStore_->isInMemory(); });
     ForgottenRecords unsaved;
-    for (const auto& [key, batch] : batchQueues_) unsaved.events += counts_.forget(batch);
+    for (const auto& [key, batch] : batchQueues_) unsaved.events += counts_.forget(batch, hasRows);
     for (const auto& [document, batch] : unsaved_) {
-        unsaved.events += counts_.forget(batch);
+        unsaved.events += counts_.forget(batch, hasRows);
         ledger_->unfollow(document);
     }
     batchQueues_.clear();
@@ -507,6 +510,7 @@ void UploadBatches::readLedger(std::function<void(const Ledger&)> completion) {
     queue->async([self = shared_from_this(), completion = std::move(completion)] {
         self->assertOnQueue("UploadBatchEventProcessor::readLedger");
         self->readStored();
+        self->dropForgotten();  // as far as is known by now
         if (completion) callHost("ledger completion", [&] { completion(self->ledger()); });
     });
 }

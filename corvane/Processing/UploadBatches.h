@@ -148,8 +148,9 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
     // A row could not be written; once one can, all are.
     bool backupsAreBehind_ CORVANE_GUARDED_BY(*accessQueue_) = false;
     bool writesAtEndOfRun_ CORVANE_GUARDED_BY(*accessQueue_) = false;
-    // In which all that is here was recorded.
-    std::int64_t epoch_ CORVANE_GUARDED_BY(*accessQueue_) = 0;
+    // In which all that is here was recorded; none as long as nothing can be.
+    static constexpr std::int64_t noEpoch = -1;
+    std::int64_t epoch_ CORVANE_GUARDED_BY(*accessQueue_) = noEpoch;
     // What became of the events of this run.
     BatchCounts counts_ CORVANE_GUARDED_BY(*accessQueue_);
 };

@@ -115,6 +115,8 @@ void SessionCore::process(const ProcessEvent& event) {
 }
 
 void SessionCore::didReject(const RejectedEvent& event) {
+    // Nothing is stored meanwhile, with which another process's word would be heard.
+    if (event.reason == RejectedEvent::Reason::notRecording) RecordingSwitch::look();
     processorManager_->didReject(event);
 }
 

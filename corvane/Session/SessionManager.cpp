@@ -59,6 +59,7 @@ void SessionManager::push(AnyDataEventEntry entry, bool submitEventQueues) {
 }
 
 void SessionManager::setRecording(bool isOn, std::function<void(const AnyError*)> completion) {
+    if (core_->isInForkedChild()) return;
     RecordingSwitch::set(isOn);
     DeferredStoreCore::queue().async([queue = core_->accessQueue(), completion = std::move(completion)]() mutable {
         std::optional<AnyError> error;

@@ -4,7 +4,6 @@
 #include <limits>
 #include <string>
 #include <utility>
-#include <vector>
 
 namespace corvane {
 
@@ -128,14 +127,15 @@ void DeliveryLedger::fold(Documents::iterator document, Outcome outcome) {
     }
 }
 
-void DeliveryLedger::settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause) {
-    std::vector<std::string> identifiers;
+std::set<std::string> DeliveryLedger::settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause) {
+    std::set<std::string> identifiers;
     {
         const Lock lock(mutex_);
-        for (const auto& [identifier, document] : onTheirWay_) identifiers.push_back(identifier);
-        for (const auto& [identifier, document] : pending_) identifiers.push_back(identifier);
+        for (const auto& [identifier, document] : onTheirWay_) identifiers.insert(identifier);
+        for (const auto& [identifier, document] : pending_) identifiers.insert(identifier);
     }
     for (const auto& identifier : identifiers) settle(identifier, outcome, cause);
+    return identifiers;
 }
 
 void DeliveryLedger::noteServer(DeliveryUpdate::Reason reason) {
@@ -180,7 +180,7 @@ std::optional<DeliveryLedger::Settled> DeliveryLedger::takeOutcome(std::string_v
     const Lock lock(mutex_);
     const auto found = followed_.find(identifier);
     if (found == followed_.end() || !found->second) return std::nullopt;
-    const auto settled = found->second;
+    auto settled = found->second;
     followed_.erase(found);
     return settled;
 }

@@ -33,7 +33,7 @@ Ledger LedgerBook::ledger() const {
 
 std::int64_t LedgerBook::bytesOnDisk() const {
     const Lock lock(mutex_);
-    return stored_.waitingBytes + openBytesOfOthers_ + batches_.openBytes;
+    return stored_.waitingBytes + uncountedBytes_ + openBytesOfOthers_ + batches_.openBytes;
 }
 
 std::int64_t LedgerBook::waitingBytes() const {
@@ -51,9 +51,14 @@ void LedgerBook::setStored(const Changes& stored) {
     stored_ = stored;
 }
 
-void LedgerBook::correctWaitingBytes(std::int64_t difference) {
+void LedgerBook::setUncountedBytes(std::int64_t bytes) {
     const Lock lock(mutex_);
-    stored_.waitingBytes += difference;
+    uncountedBytes_ = bytes;
+}
+
+void LedgerBook::addUncountedBytes(std::int64_t bytes) {
+    const Lock lock(mutex_);
+    uncountedBytes_ += bytes;
 }
 
 void LedgerBook::setOpenOfOthers(const Ledger::Count& count, std::int64_t bytes) {

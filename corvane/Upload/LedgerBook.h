@@ -39,8 +39,9 @@ class LedgerBook {
     void setStored(const Changes& stored);
     /// Of payloads alone.
     [[nodiscard]] std::int64_t waitingBytes() const;
-    /// How much the bytes that wait differ from what was counted.
-    void correctWaitingBytes(std::int64_t difference);
+    /// Payloads hold so much more than their rows say, which whatever is read of rows leaves as it is.
+    void setUncountedBytes(std::int64_t bytes);
+    void addUncountedBytes(std::int64_t bytes);
     /// What there is in batches of earlier runs and other processes, and what has come to it or, negative, gone.
     void setOpenOfOthers(const Ledger::Count& count, std::int64_t bytes);
     void addOpenOfOthers(const Ledger::Count& count, std::int64_t bytes);
@@ -56,6 +57,7 @@ class LedgerBook {
   private:
     mutable Mutex mutex_;
     Changes stored_ CORVANE_GUARDED_BY(mutex_);
+    std::int64_t uncountedBytes_ CORVANE_GUARDED_BY(mutex_) = 0;
     Ledger::Count openOfOthers_ CORVANE_GUARDED_BY(mutex_);
     std::int64_t openBytesOfOthers_ CORVANE_GUARDED_BY(mutex_) = 0;
     Batches batches_ CORVANE_GUARDED_BY(mutex_);

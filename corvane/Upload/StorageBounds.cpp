@@ -3,6 +3,7 @@
 #include <corvane/Platform/Date.h>
 #include <corvane/Platform/Log.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <utility>
 
@@ -55,7 +56,8 @@ void StorageBounds::checkPortion(std::shared_ptr<Check> check) {
         check->next.increment(failed);
     }
     if (check->next == std::filesystem::directory_iterator()) {
-        if (!failed) book_->correctWaitingBytes(check->found - check->counted);
+        // Rows whose payloads have gone are dropped before long, with what they count.
+        if (!failed) book_->setUncountedBytes(std::max<std::int64_t>(0, check->found - check->counted));
         return keep();
     }
     queue_->async([weak = weak_from_this(), check = std::move(check)]() mutable {
@@ -66,8 +68,9 @@ void StorageBounds::checkPortion(std::shared_ptr<Check> check) {
     });
 }
 
-void StorageBounds::keep() {
+void StorageBounds::keep(std::int64_t added) {
     queue_->assertCurrent("StorageBounds::keep");
+    addedSince_ += added;
     try {
         auto found = excess();
         if (found.documents.empty()) return;
@@ -89,6 +92,10 @@ void StorageBounds::keepLater() {
 
 StorageBounds::Excess StorageBounds::excess() {
     Excess excess;
+    if (book_->bytesOnDisk() > limits_.maximumBytes || addedSince_ > limits_.maximumBytes / 16) {
+        rows_->readLedger();
+        addedSince_ = 0;
+    }
     auto bytes = book_->bytesOnDisk() - bytesBeingWithdrawn();
     while (const auto* oldest = oldestIfNeeded(bytes)) {
         if (excess.documents.size() == portion) {
@@ -174,7 +181,7 @@ std::optional<Reason> StorageBounds::takeReason(const std::string& identifier) {
         taken = withdrawn_.extract(identifier);
     }
     if (!taken) return std::nullopt;
-    book_->correctWaitingBytes(-taken.mapped().uncounted);
+    book_->addUncountedBytes(-taken.mapped().uncounted);
     return taken.mapped().reason;
 }
 

@@ -44,7 +44,10 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
     /// On the manager's queue, as the next (the process is stopped with a message).
     void begin();
     /// Looks whether a bound is met. Logs what fails.
-    void keep();
+    /// @param added bytes of a payload that has come
+    void keep(std::int64_t added = 0);
+    /// All documents have gone. Any thread.
+    void forget() { book_->setUncountedBytes(0); }
     /// A document is not under way any more, and has not got through. Returns why it is to be given up, if it is.
     [[nodiscard]] std::optional<DeliveryUpdate::Reason> takeReason(const std::string& identifier);
     /// Deletes row and payload of a document that is given up for such a reason. Any thread.
@@ -94,6 +97,9 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
 
     std::atomic<bool> isMet_ = false;
     std::deque<UploadRows::Oldest> oldest_ CORVANE_GUARDED_BY(*queue_);  // the next ones; some may be gone by now
+    // What other processes write and remove is in no sum of ours: before anything is given up, and once in a while, the
+    // rows are looked at.
+    std::int64_t addedSince_ CORVANE_GUARDED_BY(*queue_) = 0;
 
     Mutex mutex_;
     Documents withdrawn_ CORVANE_GUARDED_BY(mutex_);

@@ -106,8 +106,14 @@ void UploadManager::forget() {
     }
     stored_->forget();
     if (retries_) retries_->forget();
-    service_->cancelAll();
-    ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
+    bounds_->forget();
+    auto documents = ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
+    // Rows that are no more, or never were on disk, have payloads that are.
+    for (const auto& document : documents) {
+        if (dropbox_->existingFile(document)) removeForgotten(document);
+    }
+    // By name: what comes meanwhile is not among them.
+    if (!documents.empty()) service_->cancel(std::move(documents), [](const std::set<std::string>&) {});
 }
 
 bool UploadManager::shouldResume(std::string_view identifier, std::function<void()> completion) {
@@ -136,7 +142,7 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     }
     service_->submit(prepared(entity, std::move(file)));
     ledger_->begin(entity.identifier);
-    bounds_->keep();
+    bounds_->keep(static_cast<std::int64_t>(body.size()));
     return taken;
 }
 

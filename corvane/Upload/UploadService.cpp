@@ -237,24 +237,19 @@ void UploadService::inFlight(std::function<void(const std::set<std::string>&)> a
     }
 }
 
-void UploadService::cancelAll() {
-    if (const auto opened = session()) {
-        opened->tasks([](const auto& tasks) {
-            for (const auto& task : tasks) task->cancel();
-        });
-    }
-}
-
 void UploadService::cancel(std::set<std::string> identifiers,
                            std::function<void(const std::set<std::string>&)> answer) {
     const auto opened = session();
     if (!opened) return;
-    opened->tasks([identifiers = std::move(identifiers), answer = std::move(answer)](const auto& tasks) mutable {
+    opened->tasks([identifiers = std::move(identifiers), answer = std::move(answer)](const auto& tasks) {
+        auto notRunning = identifiers;
         for (const auto& task : tasks) {
-            const auto identifier = task->description();
-            if (identifier && identifiers.erase(*identifier) > 0) task->cancel();
+            const auto identifier = task->description().value_or(unknown);
+            if (task->state() == TransferTask::State::completed || !identifiers.contains(identifier)) continue;
+            notRunning.erase(identifier);
+            task->cancel();
         }
-        answer(identifiers);
+        answer(notRunning);
     });
 }
 

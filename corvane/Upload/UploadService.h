@@ -72,7 +72,6 @@ class UploadService final : public UploadServiceType,
     void submit(const PreparedUploadRequest& request) override;
     void resubmit(std::vector<PreparedUploadRequest> requests) override;
     void inFlight(std::function<void(const std::set<std::string>&)> answer) override;
-    void cancelAll() override;
     void cancel(std::set<std::string> identifiers, std::function<void(const std::set<std::string>&)> answer) override;
     bool shouldResume(std::string_view identifier, std::function<void()> completion) override;
 

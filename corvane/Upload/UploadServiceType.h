@@ -40,10 +40,6 @@ class UploadServiceType {
     /// happens here.
     virtual void inFlight(std::function<void(const std::set<std::string>&)> /*answer*/) {}
 
-    /// Cancels the uploads that are running, also those of earlier runs and other processes where transfers outlive
-    /// them; they end as a retry, later. Returns before that is done. A service that cannot does nothing, as here.
-    virtual void cancelAll() {}
-
     /// Cancels those of `identifiers` that are running, which end as a retry or as they would have, and tells, later
     /// and on the registered queue, which were not. A service that cannot never answers, which is what happens here.
     virtual void cancel(std::set<std::string> /*identifiers*/,

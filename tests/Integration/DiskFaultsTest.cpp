@@ -1,11 +1,14 @@
 #include "tests/Integration/FaultFixture.h"
 
+#include <corvane/Platform/PrivateFile.h>
 #include <corvane/Processing/UploadBatchEntity.h>
 
 #include <signal.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
+
+#include <future>
 
 namespace corvane::test {
 namespace {
@@ -86,6 +89,25 @@ TEST_F(DiskFaults, AMissingDirectoryIsMade) {
     EXPECT_EQ(application.wait().delivered, (DeliveryReport::Count{1, 1}));
     EXPECT_EQ(permissions(documents / "not"), 0700u);
     EXPECT_EQ(log.count("Failed"), 0);
+}
+
+TEST_F(DiskFaults, WhatAFullDiskKeepsFromBeingForgottenIsForgottenOnceThereIsRoom) {
+    Application application(server.url(), 10);
+    submitSaved(application, 2);
+    const auto look = [&] {
+        std::promise<void> told;
+        application.uploads->readLedger([&](const Ledger&) { told.set_value(); });
+        told.get_future().wait();
+    };
+    replacePrivateFile(documents / "com.veskar.corvane.recording", "on 5000000000000 0\n");  // another process
+    {
+        const FullDisk full;
+        look();
+    }
+    EXPECT_EQ(log.count("Failed to read the ledger, error="), 2);
+    look();
+    EXPECT_TRUE(Store<UploadBatchEntity>(StoreLocation::default_("main")).fetchAll().empty());
+    EXPECT_EQ(application.uploads->ledger().givenUp.forgotten.events, 2);
 }
 
 TEST_F(DiskFaults, WithoutADirectoryTheStoreIsInMemoryAndADocumentWaitsUntilItsPayloadCanBeWritten) {

@@ -6,6 +6,7 @@
 
 #include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/UUID.h>
+#include <corvane/Upload/LedgerEntity.h>
 
 #include <future>
 #include <map>
@@ -176,12 +177,22 @@ TEST_F(Books, ForgetDropsWhatIsNotDeliveredEverywhereAndKeepsWhatComesLater) {
     std::filesystem::create_directory(documents / "com.veskar.corvane.other.upload-dropbox.debugging");
     const auto copy = documents / "com.veskar.corvane.other.upload-dropbox.debugging" / (newUUID() + ".request.json");
     replacePrivateFile(copy, "{}");
+    // Of one endpoint the database is damaged, of another one gone.
+    replacePrivateFile(documents / "com.veskar.corvane.damaged.db", std::string(4096, 'x'));
+    std::filesystem::create_directory(documents / ("com.veskar.corvane." + std::string(200, 'x') + ".db"));
+    for (const char* endpoint : {"damaged", "gone"}) {
+        const auto payload =
+            documents / ("com.veskar.corvane." + std::string(endpoint) + ".upload-dropbox") / newUUID();
+        std::filesystem::create_directory(payload.parent_path());
+        replacePrivateFile(payload, "{}");
+        std::filesystem::last_write_time(payload, std::filesystem::file_time_type::clock::now() - 1h);
+    }
     auto application = start(2);
     application->submit(5);
     settled->settle();
     session->complete(1, 200);
     settled->settle();
-    EXPECT_EQ(kept(documents.path()), ".debugging 1 .upload-dropbox 2 ");
+    EXPECT_EQ(kept(documents.path()), ".debugging 1 .upload-dropbox 4 ");
 
     int told = 0;
     application->sessions.tracker()->submit<ScreenView>([&](const EventSubmitResult& result) {
@@ -191,7 +202,8 @@ TEST_F(Books, ForgetDropsWhatIsNotDeliveredEverywhereAndKeepsWhatComesLater) {
     std::vector<std::string> heard;
     application->uploads->setDeliveryObserver(
         [&](const DeliveryUpdate& update) { heard.push_back(std::to_string(static_cast<int>(update.cause.reason))); });
-    EXPECT_EQ(forget(*application), "8/3") << "the other endpoint's 3/1 among them";
+    EXPECT_EQ(forget(*application).substr(0, 5), "8/3: ") << "the other endpoint's 3/1 among them";
+    std::filesystem::remove(documents / "com.veskar.corvane.damaged.db");
     EXPECT_EQ(told, 1);
     EXPECT_EQ(kept(documents.path()), "");
     for (const int task : {2, 3}) EXPECT_TRUE(session->task(task)->wasCancelled());
@@ -210,10 +222,10 @@ TEST_F(Books, ForgetIsObeyedByOthersAndFinishedByTheNext) {
     settled->settle();
     replacePrivateFile(file, "on 5000000000000 0\n");  // another process, which is killed
     application->submit(1);
-    EXPECT_EQ(ledger(*application), "forgotten 4/1") << "with the one that was on its way when it was noticed";
+    EXPECT_EQ(ledger(*application), "open 1/1, forgotten 3/1") << "what comes later is kept";
     application->submit(3);
-    EXPECT_EQ(ledger(*application), "open 1/1, waiting 2/1, forgotten 4/1");
-    EXPECT_EQ(payloads().size(), 1u);
+    EXPECT_EQ(ledger(*application), "waiting 4/2, forgotten 3/1");
+    EXPECT_EQ(payloads().size(), 2u);
     application->sessions.endSync();
     {
         const auto writer = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
@@ -227,6 +239,27 @@ TEST_F(Books, ForgetIsObeyedByOthersAndFinishedByTheNext) {
     DeferredStoreCore::queue().sync([] {});
     EXPECT_EQ(rows().size() + payloads().size(), 0u);
     EXPECT_EQ(ledger(*application), "forgotten 7/3");
+}
+
+TEST_F(Books, WhatIsRecordedAfterForgettingIsSentByThisRunAndTheNext) {
+    auto application = start(1);
+    application->submit(2);
+    application->sessions.tracker()->suspend();
+    std::promise<void> forgotten;
+    application->sessions.forget([&](auto&&...) { forgotten.set_value(); });
+    application->submit(2);  // handed over before the transfers of before are listed
+    application->sessions.tracker()->resume();
+    forgotten.get_future().wait();
+    settled->settle();
+    for (const auto& task : session->made()) EXPECT_EQ(task->wasCancelled(), task->identifier() <= 2);
+    for (const int task : {3, 4}) session->complete(task, 503);
+    application->abandon();
+    application = start(1);
+    settled->settle();
+    ASSERT_TRUE(session->waitForTasks(2));
+    settled->settle();
+    for (const auto& task : session->made()) EXPECT_FALSE(task->wasCancelled()) << "it has nothing of before";
+    EXPECT_EQ(application->uploads->waitForDelivery({}).pending.documents, 2);
 }
 
 TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) {
@@ -266,6 +299,31 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     settled->settle();
     ASSERT_TRUE(session->waitForTasks(1));
     EXPECT_EQ(ledger(*application), "waiting 1/1, delivered 2/1, size 5/3, age 1/1, again 3/3");
+
+    // Another process has delivered what this one counts, and writes what it does not.
+    application->submit(2);
+    settled->settle();
+    const auto size = static_cast<std::int64_t>(std::filesystem::file_size(dropbox() / rows().at(1).identifier));
+    session->complete(2, 503);
+    session->complete(1, 200);
+    application->abandon();
+    application = start({.batchSize = 2, .maximumBytesOnDisk = size * 4});
+    ASSERT_TRUE(session->waitForTasks(1));
+    const auto other = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
+    for (int i = 0; i < 8; ++i) {
+        application->submit(2);
+        settled->settle();
+        for (const char* table : {"signed_requests", "documents"})
+            other->run("DELETE FROM " + std::string(table) + ";");
+    }
+    for (const auto& task : session->made()) EXPECT_FALSE(task->wasCancelled());
+    old.identifier = "another's";
+    old.createdDate = now();
+    Store<SignedEntity>(other).insert(old);
+    Store<DocumentEntity>(other).insert({old.identifier, 7, 1'000'000});
+    application->submit(2);
+    settled->settle();  // it is withdrawn first
+    EXPECT_NE(ledger(*application).find("size 12/4"), std::string::npos);
     for (const UploadBatchEventOptions& bad :
          {UploadBatchEventOptions{.maximumBytesOnDisk = 0}, {.maximumAge = std::chrono::milliseconds(0)}}) {
         EXPECT_THROW(UploadBatchEventConfig{bad}, InvalidArgument);

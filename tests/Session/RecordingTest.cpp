@@ -1,8 +1,11 @@
 #include <corvane/Models/EventData.h>
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/PrivateFile.h>
+#include <corvane/Platform/RecordingSwitch.h>
 
 #include "tests/support/TrackingFixture.h"
+
+#include <sys/resource.h>
 
 #include <future>
 
@@ -87,9 +90,25 @@ TEST_F(Recording, AnotherProcesssWordCountsAndOneThatCannotBeReadIsNo) {
     };
     EXPECT_EQ(next("off\n"), "recording is off");
     EXPECT_EQ(next("on 7 7 and what a later version has to say\n"), "recorded");
-    EXPECT_EQ(log.count("Nothing is recorded"), 0);
+    // A session that goes on hears of it, too, and no lack of descriptors is for good.
+    replacePrivateFile(file, "off 7 7\n");
+    RecordingSwitch::look();
+    EXPECT_EQ(submit<Identified>(), "recording is off");
+    replacePrivateFile(file, "on 7 7\n");
+    EXPECT_EQ(submit<Identified>(), "recording is off") << "it is looked at behind the one that is refused";
+    EXPECT_EQ(submit<Identified>(), "recorded");
+    replacePrivateFile(file, "on 7 7 again\n");
+    rlimit limit{};
+    getrlimit(RLIMIT_NOFILE, &limit);
+    const rlimit no{0, limit.rlim_max};
+    setrlimit(RLIMIT_NOFILE, &no);
+    RecordingSwitch::look();
+    setrlimit(RLIMIT_NOFILE, &limit);
+    EXPECT_EQ(log.count("Nothing is recorded"), 1);
+    EXPECT_EQ(submit<Identified>(), "recording is off");
+    EXPECT_EQ(submit<Identified>(), "recorded");
     EXPECT_EQ(next(""), "recording is off");
-    EXPECT_EQ(log.count("Nothing is recorded: whether to record is not known"), 1);
+    EXPECT_EQ(log.count("Nothing is recorded: whether to record is not known"), 2);
     std::filesystem::remove(file);
     std::filesystem::create_directory(file);
     EXPECT_EQ(submit<Identified>(), "recording is off");
@@ -97,8 +116,14 @@ TEST_F(Recording, AnotherProcesssWordCountsAndOneThatCannotBeReadIsNo) {
     EXPECT_EQ(log.count("Failed to keep whether to record"), 1);
     EXPECT_EQ(submit<Identified>(), "recorded") << "this process was told";
     std::filesystem::remove(file);
+    replacePrivateFile(file, "off 6 6\n");
+    EXPECT_EQ(submit<Identified>(), "recorded") << "until it is saved";
+    EXPECT_EQ(RecordingSwitch::epoch(), 7) << "what was to be forgotten still is";
+    replacePrivateFile(file, "off 9 7\n");
+    RecordingSwitch::look();
+    EXPECT_EQ(RecordingSwitch::epoch(), 9) << "whatever is not saved";
     EXPECT_EQ(choose(true), "");
-    EXPECT_EQ(readWholeFile(file), "on 7 7\n") << "what was to be forgotten still is";
+    EXPECT_EQ(readWholeFile(file), "on 9 7\n");
 }
 
 }  // namespace

@@ -115,7 +115,7 @@ void ClientDesk::take(Client& client, const agent::Discard& request) {
     const std::filesystem::path directory(request.directory);
     if (!directory.is_absolute()) throw FormatError("not an absolute path");
     intake_.acceptSpooled();
-    const auto numbers = book_.withBodiesBeneath(directory);
+    const auto numbers = book_.withBodiesGoneBeneath(directory);
     for (const auto number : numbers) drop(number);
     client.discarded.push_back({std::ssize(numbers)});
 }

@@ -18,6 +18,11 @@ std::filesystem::path resolved(const std::filesystem::path& path) {
     return normal.has_filename() ? normal : normal.parent_path();  // without a slash at its end
 }
 
+bool isThere(const std::filesystem::path& path) {
+    std::error_code failed;
+    return std::filesystem::exists(path, failed);
+}
+
 bool isSameOrBeneath(const std::filesystem::path& path, const std::filesystem::path& directory) {
     return std::mismatch(directory.begin(), directory.end(), path.begin(), path.end()).first == directory.end();
 }
@@ -143,7 +148,7 @@ bool TaskBook::settleOneByOne() {
     }
 }
 
-std::vector<std::int64_t> TaskBook::withBodiesBeneath(const std::filesystem::path& directory) {
+std::vector<std::int64_t> TaskBook::withBodiesGoneBeneath(const std::filesystem::path& directory) {
     std::vector<std::int64_t> numbers;
     const auto top = resolved(directory);
     std::map<std::filesystem::path, bool> folders;  // most bodies are in few of them
@@ -152,7 +157,7 @@ std::vector<std::int64_t> TaskBook::withBodiesBeneath(const std::filesystem::pat
         const auto folder = std::filesystem::path(task.submission.bodyPath).parent_path();
         auto [found, isNew] = folders.try_emplace(folder);
         if (isNew) found->second = isSameOrBeneath(resolved(folder), top);
-        if (found->second) numbers.push_back(task.number);
+        if (found->second && !isThere(task.submission.bodyPath)) numbers.push_back(task.number);
     });
     return numbers;
 }

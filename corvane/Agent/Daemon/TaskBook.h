@@ -73,9 +73,9 @@ class TaskBook {
     [[nodiscard]] bool isDamaged() const { return journal_.isDamaged(); }
     void describe(std::int64_t number, const std::string& description) { journal_.describe(number, description); }
 
-    /// The tasks, over or not, whose bodies lie beneath a directory, whatever both are called on the way there; it and
-    /// they need not exist.
-    [[nodiscard]] std::vector<std::int64_t> withBodiesBeneath(const std::filesystem::path& directory);
+    /// The tasks, over or not, whose bodies lay beneath a directory, whatever both are called on the way there, and are
+    /// there no more; nor need the directory be.
+    [[nodiscard]] std::vector<std::int64_t> withBodiesGoneBeneath(const std::filesystem::path& directory);
     [[nodiscard]] std::optional<std::int64_t> find(std::string_view token) const;
     [[nodiscard]] Task& task(std::int64_t number) { return tasks_.at(number); }
     [[nodiscard]] bool contains(std::int64_t number) const { return tasks_.contains(number); }

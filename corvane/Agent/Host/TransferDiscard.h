@@ -24,10 +24,11 @@ struct DiscardResult {
     std::string problem;
 };
 
-/// Has transfer agents drop every task whose body lies beneath a directory, whoever its owner is. Internal.
+/// Has transfer agents drop every task whose body has been removed from beneath a directory, whoever its owner is, also
+/// one whose transfer has it open. What was submitted since has its body, and goes on. Internal.
 ///
 /// The agents are that of the documents directory and those that sessions of this process have used. None is started:
-/// the bodies are to be gone by now, and the tasks that an agent's journal and spool keep fail with `TransferError`
+/// the tasks that an agent's journal and spool keep fail with `TransferError`
 /// bodyUnavailable when the next one runs. Sessions of these tasks, in every process, are told of them by
 /// `taskDidEndElsewhere`, or of how they had ended; a task that runs inside a process is its session's to cancel.
 class TransferDiscard {
