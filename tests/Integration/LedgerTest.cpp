@@ -199,15 +199,22 @@ TEST_F(Books, ForgetDropsWhatIsNotDeliveredEverywhereAndKeepsWhatComesLater) {
         EXPECT_TRUE(result.succeeded() && told++ == 0) << "before it is dropped";
     });
     application->sessions.tracker()->submit<ScreenView>();
-    std::vector<std::string> heard;
-    application->uploads->setDeliveryObserver(
-        [&](const DeliveryUpdate& update) { heard.push_back(std::to_string(static_cast<int>(update.cause.reason))); });
+    int heard = 0;  // on the main queue
+    application->uploads->setDeliveryObserver([&](const DeliveryUpdate& update) {
+        heard += update.cause.reason == DeliveryUpdate::Reason::forgotten ? 1 : 0;
+    });
     EXPECT_EQ(forget(*application).substr(0, 5), "8/3: ") << "the other endpoint's 3/1 among them";
     std::filesystem::remove(documents / "com.veskar.corvane.damaged.db");
     EXPECT_EQ(told, 1);
     EXPECT_EQ(kept(documents.path()), "");
     for (const int task : {2, 3}) EXPECT_TRUE(session->task(task)->wasCancelled());
     EXPECT_EQ(application->wait().givenUp, (DeliveryReport::Count{4, 2}));
+    std::promise<int> hadHeard;
+    MainQueue::async([&] {
+        application->uploads->setDeliveryObserver({});
+        hadHeard.set_value(heard);
+    });
+    EXPECT_EQ(hadHeard.get_future().get(), 2);
     application->submit(3);
     EXPECT_EQ(ledger(*application), "open 1/1, waiting 2/1, delivered 2/1, forgotten 5/2");
     EXPECT_EQ(ledgerOnDisk(*application), ledger(*application));
