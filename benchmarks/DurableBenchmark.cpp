@@ -105,6 +105,22 @@ Figures bareInserts() {
     });
 }
 
+/// What a look at the ledger costs, alone or while events are recorded.
+Figures readLedger(bool whileRecording) {
+    constexpr int reads = 200'000;
+    const test::TemporaryDocuments documents;
+    const auto uploads = backupOnly("ledger", batchSize);
+    Host host(uploads);
+    for (int i = 0; i < events; ++i) host.tracker->submit<ScreenView>();
+    if (!whileRecording) host.drain();
+    std::int64_t accepted = 0;
+    const auto before = nanoseconds();
+    for (int i = 0; i < reads; ++i) accepted += uploads->ledger().acceptedInRun;
+    const auto elapsed = static_cast<double>(nanoseconds() - before);
+    host.drain();
+    return {{"ns/read", accepted < 0 ? 0 : elapsed / reads}};
+}
+
 }  // namespace
 
 void addDurableBenchmarks() {
@@ -119,6 +135,10 @@ void addDurableBenchmarks() {
     add(
         group + "~batch of 50", [] { return oneAtATime(0); }, 3);
     setBar(group + "~batch of 50", "us/event", 1.25);
+    add(
+        "ledger/read", [] { return readLedger(false); }, 3);
+    add(
+        "ledger/read, while events are recorded", [] { return readLedger(true); }, 3);
 }
 
 }  // namespace corvane::bench
