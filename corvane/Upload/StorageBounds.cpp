@@ -92,7 +92,8 @@ void StorageBounds::keepLater() {
 
 StorageBounds::Excess StorageBounds::excess() {
     Excess excess;
-    if (book_->bytesOnDisk() > limits_.maximumBytes || addedSince_ > limits_.maximumBytes / 16) {
+    const bool isMetAnew = !isMet_ && book_->bytesOnDisk() > limits_.maximumBytes;
+    if (isMetAnew || addedSince_ > limits_.maximumBytes / 16) {
         rows_->readLedger();
         addedSince_ = 0;
     }

@@ -97,8 +97,8 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
 
     std::atomic<bool> isMet_ = false;
     std::deque<UploadRows::Oldest> oldest_ CORVANE_GUARDED_BY(*queue_);  // the next ones; some may be gone by now
-    // What other processes write and remove is in no sum of ours: before anything is given up, and once in a while, the
-    // rows are looked at.
+    // What other processes write and remove is in no sum of ours: when the bound is met, and once in a while, the rows
+    // are looked at.
     std::int64_t addedSince_ CORVANE_GUARDED_BY(*queue_) = 0;
 
     Mutex mutex_;
