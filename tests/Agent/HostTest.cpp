@@ -92,8 +92,10 @@ TEST_F(HostTest, RunsACommandForAHostThatIsNotThereOnce) {
     const auto woken = documents / "woken", program = body("wake", "#!/bin/sh\necho \"$1\" $(umask) $(pwd) >> '" +
                                                                        (documents / "woken").string() + "'\n");
     chmod(program.c_str(), 0700);
+    server.script(ScriptedServer::Reply::status(200).hold(), 5);  // a fast server leaves nothing to wake up for
     const HostProcess killed = run("main", 5, "kill", program);
     ASSERT_TRUE(killed.wasKilled());
+    server.release(5);
     ASSERT_TRUE(eventually([&] { return std::filesystem::exists(woken) && !readFile(woken).empty(); }));
     EXPECT_TRUE(run("main", 1, "wait").succeeded()) << "a host that is there is told, not woken";
     FILE* own = popen("umask", "re");
