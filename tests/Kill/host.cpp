@@ -5,9 +5,9 @@
 // AGENT is the transfer agent's program, or "-" for transfers inside the process. MODE:
 //
 //   leave    records 7 events in batches of 5, and waits to be killed
-//   record   records 12 events, ends the session, and waits until each document has an outcome
-//   forget   records 7 events, forgets them, and records 3 behind that; then as "record"
-//   collect  records one event; then as "record", and waits until what was to be forgotten is
+//   record   records 12 events, each behind the one before, ends the session, and waits until each document has an
+//   outcome forget   records 7 events, forgets them, and records 3 behind that; then as "record" collect  records one
+//   event; then as "record", and waits until what was to be forgotten is
 //
 // Writes to standard output a line for each event that was acknowledged, "before ID" or "after ID" by whether
 // forgetting is to drop it, "forgotten" when that has succeeded, and at the end "unaccounted N", as the ledger has it.
@@ -34,12 +34,18 @@ void say(const std::string& line) {
     if (write(STDOUT_FILENO, text.data(), text.size()) < 0) std::_Exit(3);
 }
 
-void submit(Application& application, int count, const std::string& when) {
+/// @param oneByOne whether each waits for the one before: those that are at hand together share a write
+void submit(Application& application, int count, const std::string& when, bool oneByOne = false) {
     application.sessions.tracker()->push(Screen{when});
     for (int i = 0; i < count; ++i) {
-        application.sessions.tracker()->submit<ScreenView>([when](const EventSubmitResult& result) {
-            if (result.succeeded()) say(when + " " + *result.event()->json()["event"]["eventID"].string());
-        });
+        std::promise<void> told;
+        auto wait = told.get_future();
+        application.sessions.tracker()->submit<ScreenView>(
+            [when, told = std::make_shared<std::promise<void>>(std::move(told))](const EventSubmitResult& result) {
+                if (result.succeeded()) say(when + " " + *result.event()->json()["event"]["eventID"].string());
+                told->set_value();
+            });
+        if (oneByOne) wait.wait();
     }
 }
 
@@ -74,7 +80,7 @@ int main(int argc, char** argv) {
     });
     TransferSession::setFactory(transfers(argv[3], argv[2]));
     Application application(argv[1], 5);
-    if (mode == "record") submit(application, 12, "before");
+    if (mode == "record") submit(application, 12, "before", true);
     if (mode == "leave" || mode == "forget") submit(application, 7, "before");
     if (mode == "leave") pause();
     if (mode == "forget") {
