@@ -141,6 +141,11 @@ void Journal::open(const std::filesystem::path& path) {
     run("PRAGMA cache_size=-256;");
     run("PRAGMA journal_mode=WAL;");
     run("PRAGMA synchronous=NORMAL;");
+    // What SQLite cannot open for writing, for want of a descriptor or of room, it takes as read-only, the side files
+    // too. An agent that kept it so could neither take a task nor let go of one, and would never end.
+    const int writable = sqlite3_exec(opened, "BEGIN IMMEDIATE; ROLLBACK;", nullptr, nullptr, nullptr);
+    if ((writable & 0xff) == SQLITE_READONLY) fail(writable);
+    if (sqlite3_db_readonly(opened, "main") == 1) throw JournalError("the journal cannot be opened for writing");
     std::int64_t found = 0;
     {
         Statement stored(*this, "PRAGMA user_version;");

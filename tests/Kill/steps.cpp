@@ -1,0 +1,224 @@
+// Preloaded into a host and its agent: numbers the effects that a process has outside itself, and kills it, or lets the
+// call fail, at a chosen one. A step is named by program, call, kind of file and ordinal among those ("host pwrite64
+// wal 3"): the number of calls is constant, while threads change their order.
+//
+// STEPS_ROOT   files below this directory count, and sockets that are connected to somebody
+// STEPS_TRACE  each step is written to this file
+// STEPS_AT     the chosen step
+// STEPS_DO     "before" or "after" (SIGKILL), "half" (a write does half of it), or the number of the error
+// STEPS_MARK   made when the step was reached, which is once in all processes together
+
+#include <dlfcn.h>
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/socket.h>
+#include <sys/syscall.h>
+#include <sys/uio.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <cerrno>
+#include <cstdarg>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <string_view>
+
+namespace {
+
+struct Kind {
+    const char* name;
+    std::string_view part;  // of the path
+};
+// The first one that fits.
+constexpr Kind kinds[] = {{"server", ""},
+                          {"agent", "agent.socket"},
+                          {"journal-wal", "journal.db-wal"},
+                          {"journal", "journal.db"},
+                          {"lock", "agent.lock"},
+                          {"spool", "/spool/"},
+                          {"withdrawn", "/withdrawn/"},
+                          {"payload", ".upload-dropbox/"},
+                          {"shm", ".db-shm"},
+                          {"wal", ".db-wal"},
+                          {"database", ".db"},
+                          {"key", "signing-key"},
+                          {"recording", ".recording"},
+                          {"other", ""}};
+constexpr int kindCount = sizeof kinds / sizeof *kinds, server = 0, agent = 1, none = -1;
+
+// NOLINTNEXTLINE(concurrency-mt-unsafe): nobody changes the environment before main
+const char* setting(const char* name) {
+    return getenv(name);
+}
+
+struct Plan {
+    const char* root = setting("STEPS_ROOT");
+    const char* trace = setting("STEPS_TRACE");
+    const char* at = setting("STEPS_AT");
+    const char* what = setting("STEPS_DO");
+    const char* mark = setting("STEPS_MARK");
+    const char* program = "host";
+    Plan() {
+        char path[4096] = {};
+        if (readlink("/proc/self/exe", path, sizeof path - 1) > 0 && strstr(path, "corvane-transferd"))
+            program = "agent";
+    }
+};
+
+const Plan& plan() {
+    static const Plan made;
+    return made;
+}
+
+int kindOf(std::string_view path) {
+    if (!plan().root || path.substr(0, strlen(plan().root)) != plan().root) return none;
+    for (int kind = agent; kind < kindCount; ++kind) {
+        if (path.find(kinds[kind].part) != path.npos) return kind;
+    }
+    return none;
+}
+
+int kindOf(int descriptor) {
+    const int error = errno;
+    char link[64], path[4096] = {};
+    snprintf(link, sizeof link, "/proc/self/fd/%d", descriptor);
+    const bool isKnown = readlink(link, path, sizeof path - 1) > 0;
+    int kind = none;
+    if (isKnown && strncmp(path, "socket:", 7) == 0) {
+        // One of the two ends has a name, but for pairs with which threads wake one another.
+        for (const auto name : {getsockname, getpeername}) {
+            sockaddr_un address{};
+            socklen_t size = sizeof address;
+            if (name(descriptor, reinterpret_cast<sockaddr*>(&address), &size) != 0) continue;
+            if (address.sun_family != AF_UNIX)
+                kind = server;
+            else if (size > sizeof address.sun_family)
+                kind = agent;
+        }
+    } else if (isKnown) {
+        kind = kindOf(std::string_view(path));
+    }
+    errno = error;
+    return plan().root ? kind : none;
+}
+
+[[noreturn]] void die() {
+    syscall(SYS_kill, getpid(), SIGKILL);
+    for (;;) pause();
+}
+
+/// Whether this is the chosen step, for the first time in any process.
+bool isChosen(const char* step) {
+    if (!plan().at || strcmp(step, plan().at) != 0) return false;
+    const long made = syscall(SYS_openat, AT_FDCWD, plan().mark, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
+    if (made >= 0) syscall(SYS_close, made);
+    return made >= 0;
+}
+
+void note(const char* step) {
+    if (!plan().trace) return;
+    char line[160];
+    const int length = snprintf(line, sizeof line, "%s\n", step);
+    const long file = syscall(SYS_openat, AT_FDCWD, plan().trace, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0600);
+    syscall(SYS_write, file, line, length);
+    syscall(SYS_close, file);
+}
+
+/// Does what `act` does, unless something else was chosen for this step. `act` is told whether to do half of it only.
+template <class Act>
+auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, const Act& act) -> decltype(act(false)) {
+    if (kind == none) return act(false);
+    const int error = errno;
+    char step[128];
+    snprintf(step, sizeof step, "%s %s %s %d", plan().program, call, kinds[kind].name, ++counts[kind]);
+    note(step);
+    const bool chosen = isChosen(step);
+    errno = error;
+    if (!chosen) return act(false);
+    const std::string_view what = plan().what;
+    if (what == "before") die();
+    if (what == "half") return act(true);
+    if (what != "after") return errno = atoi(plan().what), -1;
+    act(false);
+    die();
+}
+
+}  // namespace
+
+// The function that would have been called, and the steps of this call.
+#define STEP(call, kind, act)                                                              \
+    static const auto real = reinterpret_cast<decltype(&::call)>(dlsym(RTLD_NEXT, #call)); \
+    static std::atomic<int> counts[kindCount];                                             \
+    return effect(counts, #call, kind, [&]([[maybe_unused]] bool half) { return act; })
+
+extern "C" {
+
+ssize_t write(int file, const void* bytes, size_t size) {
+    STEP(write, kindOf(file), real(file, bytes, half ? (size + 1) / 2 : size));
+}
+ssize_t pwrite64(int file, const void* bytes, size_t size, off64_t offset) {
+    STEP(pwrite64, kindOf(file), real(file, bytes, half ? (size + 1) / 2 : size, offset));
+}
+ssize_t writev(int file, const iovec* parts, int count) {
+    STEP(writev, kindOf(file), real(file, parts, half ? (count + 1) / 2 : count));
+}
+ssize_t send(int socket, const void* bytes, size_t size, int flags) {
+    STEP(send, kindOf(socket), real(socket, bytes, half ? (size + 1) / 2 : size, flags));
+}
+ssize_t sendto(int socket, const void* bytes, size_t size, int flags, const sockaddr* to, socklen_t length) {
+    STEP(sendto, kindOf(socket), real(socket, bytes, half ? (size + 1) / 2 : size, flags, to, length));
+}
+ssize_t sendmsg(int socket, const msghdr* message, int flags) {
+    STEP(sendmsg, kindOf(socket), real(socket, message, flags));
+}
+int fsync(int file) {
+    STEP(fsync, kindOf(file), real(file));
+}
+int fdatasync(int file) {
+    STEP(fdatasync, kindOf(file), real(file));
+}
+int ftruncate64(int file, off64_t size) noexcept {
+    STEP(ftruncate64, kindOf(file), real(file, size));
+}
+int ftruncate(int file, off_t size) noexcept {
+    STEP(ftruncate, kindOf(file), real(file, size));
+}
+int rename(const char* from, const char* to) noexcept {
+    STEP(rename, kindOf(to), real(from, to));
+}
+int link(const char* from, const char* to) noexcept {
+    STEP(link, kindOf(to), real(from, to));
+}
+int unlink(const char* file) noexcept {
+    STEP(unlink, kindOf(file), real(file));
+}
+int remove(const char* file) noexcept {
+    STEP(remove, kindOf(file), real(file));
+}
+int mkdir(const char* directory, mode_t mode) noexcept {
+    STEP(mkdir, kindOf(directory), real(directory, mode));
+}
+int bind(int socket, const sockaddr* address, socklen_t size) noexcept {
+    const bool isAgent = address->sa_family == AF_UNIX && plan().root;
+    STEP(bind, isAgent ? agent : none, real(socket, address, size));
+}
+
+// Only where it may make a file.
+int open(const char* file, int flags, ...) {
+    va_list more;
+    va_start(more, flags);
+    const auto mode = (flags & O_CREAT) != 0 ? va_arg(more, mode_t) : mode_t{};
+    va_end(more);
+    STEP(open, (flags & O_CREAT) != 0 ? kindOf(file) : none, real(file, flags, mode));
+}
+int open64(const char* file, int flags, ...) {
+    va_list more;
+    va_start(more, flags);
+    const auto mode = (flags & O_CREAT) != 0 ? va_arg(more, mode_t) : mode_t{};
+    va_end(more);
+    STEP(open64, (flags & O_CREAT) != 0 ? kindOf(file) : none, real(file, flags, mode));
+}
+
+}  // extern "C"
