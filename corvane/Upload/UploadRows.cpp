@@ -1,5 +1,6 @@
 #include <corvane/Upload/UploadRows.h>
 
+#include <corvane/Platform/Log.h>
 #include <corvane/Platform/RecordingSwitch.h>
 
 #include <map>
@@ -95,8 +96,12 @@ bool UploadRows::record(const SignedEntity& entity, const DocumentEntity& docume
 }
 
 UploadRows::Stored UploadRows::stored() {
-    reconcile();
-    readLedger();
+    try {
+        reconcile();
+        readLedger();
+    } catch (...) {  // books that are behind are no reason not to send
+        Log::shared().error("Failed to bring the ledger up to date, error=%{public}@", AnyError::current().what());
+    }
     return deferredStore_->perform([](Rows& rows) {
         return Stored{.identifiers = rows.keys(), .isInMemory = rows.connection()->location().isMemory()};
     });

@@ -43,7 +43,8 @@ class UploadRows {
     /// done nothing, when `epoch`, in which its contents were recorded, is over.
     [[nodiscard]] bool record(const SignedEntity& entity, const DocumentEntity& document, std::int64_t epoch,
                               const RemoveBackup& removeBackup);
-    /// What is stored, once the books are in line with what releases that keep none have done.
+    /// What is stored, once the books are in line with what releases that keep none have done. That they cannot be is
+    /// logged.
     [[nodiscard]] Stored stored();
     [[nodiscard]] std::optional<SignedEntity> find(const std::string& identifier);
     struct Oldest {

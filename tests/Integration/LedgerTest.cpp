@@ -153,6 +153,22 @@ TEST_F(Books, NameWhatProgramsThatKeepNoneHaveDoneAndWhatNoRowStoodFor) {
     EXPECT_EQ(ledger(*application), "waiting 3/3, delivered 1/1, 4xx 1/1, payload 0/1, unknown 1/1, again 2/2");
 }
 
+TEST_F(Books, ThatCannotBeWrittenKeepNoDocumentFromBeingSentAgain) {
+    auto application = start(1);
+    application->submit();
+    settled->settle();
+    session->complete(1, 503);
+    application->abandon();
+    StoreConnection other(StoreLocation::default_("main"));
+    other.run("DELETE FROM documents;");
+    other.run("CREATE TRIGGER no BEFORE INSERT ON documents BEGIN SELECT RAISE(ABORT, 'full'); END;");
+    application = start(1);
+    EXPECT_TRUE(session->waitForTasks(1));
+    EXPECT_EQ(log.count("Failed to bring the ledger up to date"), 1);
+    session->complete(1, 200);
+    EXPECT_EQ(application->wait().delivered.documents, 1);
+}
+
 /// What the documents directory holds of events, without the names that change.
 std::string kept(const std::filesystem::path& directory) {
     std::map<std::string, int> kinds;
