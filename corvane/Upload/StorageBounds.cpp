@@ -98,7 +98,7 @@ StorageBounds::Excess StorageBounds::excess() {
         addedSince_ = 0;
     }
     auto bytes = book_->bytesOnDisk() - bytesBeingWithdrawn();
-    while (const auto* oldest = oldestIfNeeded(bytes)) {
+    while (const auto* oldest = oldestIfNeeded(bytes, excess.documents)) {
         if (excess.documents.size() == portion) {
             excess.isComplete = false;
             break;
@@ -118,12 +118,13 @@ StorageBounds::Excess StorageBounds::excess() {
 }
 
 // Looked up many at a time: at the bound every new document asks for the oldest.
-const UploadRows::Oldest* StorageBounds::oldestIfNeeded(std::int64_t bytes) {
+const UploadRows::Oldest* StorageBounds::oldestIfNeeded(std::int64_t bytes, const Documents& chosen) {
     constexpr std::size_t atOnce = 256;
     if (bytes <= limits_.maximumBytes && !limits_.maximumAge) return nullptr;
     if (oldest_.empty()) {
-        for (auto& document : rows_->oldest(atOnce + countBeingWithdrawn())) {
-            if (!isWithdrawn(document.identifier)) oldest_.push_back(std::move(document));
+        for (auto& document : rows_->oldest(atOnce + countBeingWithdrawn() + chosen.size())) {
+            if (isWithdrawn(document.identifier) || chosen.contains(document.identifier)) continue;
+            oldest_.push_back(std::move(document));
         }
     }
     return oldest_.empty() ? nullptr : &oldest_.front();
