@@ -38,13 +38,6 @@ std::vector<std::string> Backlog::takeBack() {
     return taken;
 }
 
-void Backlog::clear() {
-    const Lock lock(mutex_);
-    waiting_.clear();
-    underWay_.clear();
-    endedBefore_.clear();
-}
-
 bool Backlog::end(const std::string& identifier) {
     const Lock lock(mutex_);
     if (underWay_.erase(identifier) == 0 && !waiting_.empty()) endedBefore_.insert(identifier);

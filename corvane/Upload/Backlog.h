@@ -24,8 +24,6 @@ class Backlog {
     [[nodiscard]] bool isIdle();
     /// Takes all back that has not been given out. Returns it in its order.
     std::vector<std::string> takeBack();
-    /// Lets go of all.
-    void clear();
     /// Notes that a document needs no sending (any more). Returns whether there is something to take.
     bool end(const std::string& identifier);
 

@@ -127,14 +127,11 @@ void DeliveryLedger::fold(Documents::iterator document, Outcome outcome) {
     }
 }
 
-std::set<std::string> DeliveryLedger::settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause) {
+std::set<std::string> DeliveryLedger::unsettled() {
+    const Lock lock(mutex_);
     std::set<std::string> identifiers;
-    {
-        const Lock lock(mutex_);
-        for (const auto& [identifier, document] : onTheirWay_) identifiers.insert(identifier);
-        for (const auto& [identifier, document] : pending_) identifiers.insert(identifier);
-    }
-    for (const auto& identifier : identifiers) settle(identifier, outcome, cause);
+    for (const auto& [identifier, document] : onTheirWay_) identifiers.insert(identifier);
+    for (const auto& [identifier, document] : pending_) identifiers.insert(identifier);
     return identifiers;
 }
 

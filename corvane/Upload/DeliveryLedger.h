@@ -56,8 +56,8 @@ class DeliveryLedger {
     /// Settles a document, for good unless it is pending and `keepPending` was called. The observer is told also of one
     /// that is not there, which is otherwise harmless.
     void settle(std::string_view identifier, Outcome outcome, const DeliveryUpdate::Cause& cause = {});
-    /// Settles every document that is on its way. Returns which these were.
-    std::set<std::string> settleAll(Outcome outcome, const DeliveryUpdate::Cause& cause);
+    /// The documents that are on their way.
+    [[nodiscard]] std::set<std::string> unsettled();
     /// Notes that the transfer session holds all uploads up because their server cannot be reached, or no longer.
     void holdUp(bool lasts);
 

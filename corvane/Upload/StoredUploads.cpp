@@ -97,10 +97,6 @@ void StoredUploads::end(const std::vector<std::string>& identifiers) {
     if (isMoreReady) sendPortionLater();
 }
 
-void StoredUploads::forget() {
-    backlog_.clear();
-}
-
 void StoredUploads::sendPortionLater() {
     runLater([weak = weak_from_this()] {
         const auto self = weak.lock();

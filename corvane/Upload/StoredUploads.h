@@ -39,8 +39,6 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     void begin();
     /// Uploads have ended here or elsewhere, of whichever run: the next portion may be due. Any thread.
     void end(const std::vector<std::string>& identifiers);
-    /// Sends nothing more of what was listed. Any thread.
-    void forget();
 
     /// Gives up what is stored beyond the bounds.
     void keepBounds() { bounds_->keep(); }

@@ -104,16 +104,29 @@ void UploadManager::forget() {
         const Lock lock(mutex_);
         unrecorded_.clear();
     }
-    stored_->forget();
-    if (retries_) retries_->forget();
     bounds_->forget();
-    auto documents = ledger_->settleAll(Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
-    // Rows that are no more, or never were on disk, have payloads that are.
+    auto documents = ledger_->unsettled();
+    for (const auto& kept : storedDocuments()) documents.erase(kept);
     for (const auto& document : documents) {
+        ledger_->settle(document, Outcome::givenUp, {.reason = DeliveryUpdate::Reason::forgotten});
+        if (retries_) retries_->endElsewhere(document);
+        // Rows that are no more, or never were on disk, have payloads that are.
         if (dropbox_->existingFile(document)) removeForgotten(document);
     }
+    stored_->end({documents.begin(), documents.end()});
     // By name: what comes meanwhile is not among them.
     if (!documents.empty()) service_->cancel(std::move(documents), [](const std::set<std::string>&) {});
+}
+
+// What earlier epochs have left is not among them: they are another process's, which had begun the epoch before this one
+// heard of it.
+std::vector<std::string> UploadManager::storedDocuments() {
+    try {
+        return rows_->identifiers();
+    } catch (...) {
+        Log::shared().error("Failed to tell what is not to be forgotten, error=%{public}@", AnyError::current().what());
+        return {};
+    }
 }
 
 bool UploadManager::shouldResume(std::string_view identifier, std::function<void()> completion) {

@@ -92,6 +92,7 @@ class UploadManager final : public UploadManagerType,
     void didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem);
     void didFailForNow(const UploadResult::Retry& retry);
     /// Notes the end of an upload. Returns whether it was under way without a row.
+    [[nodiscard]] std::vector<std::string> storedDocuments();
     bool forgetUnrecorded(const std::string& identifier);
     [[nodiscard]] bool hasRow(const std::string& identifier);
 

@@ -79,15 +79,6 @@ void UploadRetries::endElsewhere(const std::string& identifier) {
     proceed(isMoreReady);
 }
 
-void UploadRetries::forget() {
-    const Lock lock(mutex_);
-    backlog_.clear();
-    documents_.clear();
-    waiting_ = 0;
-    pass_ = {};
-    setTimer();
-}
-
 void UploadRetries::setWaiting(Document& document, bool isWaiting) {
     if (document.isWaiting == isWaiting) return;
     document.isWaiting = isWaiting;

@@ -43,10 +43,8 @@ class UploadRetries : public std::enable_shared_from_this<UploadRetries> {
     [[nodiscard]] bool isFirstCounted(const UploadResult::Retry& retry);
     /// Uploads have ended, and their rows and the ledger say so.
     void end(const std::vector<UploadResult>& results);
-    /// One has ended of which another process was told.
+    /// One has ended of which another process was told, or is to be forgotten.
     void endElsewhere(const std::string& identifier);
-    /// Lets go of all of them.
-    void forget();
 
   private:
     struct Document {

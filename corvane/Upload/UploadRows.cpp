@@ -107,6 +107,10 @@ UploadRows::Stored UploadRows::stored() {
     });
 }
 
+std::vector<std::string> UploadRows::identifiers() {
+    return deferredStore_->perform([](Rows& rows) { return rows.keys(); });
+}
+
 std::optional<SignedEntity> UploadRows::find(const std::string& identifier) {
     auto found = deferredStore_->perform([&](Rows& rows) { return rows.fetchWhere("identifier", identifier); });
     return found.empty() ? std::nullopt : std::optional(std::move(found.front()));

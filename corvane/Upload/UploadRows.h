@@ -46,6 +46,8 @@ class UploadRows {
     /// What is stored, once the books are in line with what releases that keep none have done. That they cannot be is
     /// logged.
     [[nodiscard]] Stored stored();
+    /// The documents that are stored now.
+    [[nodiscard]] std::vector<std::string> identifiers();
     [[nodiscard]] std::optional<SignedEntity> find(const std::string& identifier);
     struct Oldest {
         std::string identifier;
