@@ -16,8 +16,8 @@ import zlib
 
 ROOT = pathlib.Path(__file__).resolve().parent.parent
 BUILD = ROOT / "build/dev"
-HOST, STEPS, AGENT = (BUILD / path for path in ("tests/Kill/kill_host", "tests/Kill/libkill_steps.so",
-                                                "corvane/Agent/Daemon/corvane-transferd"))
+HOST, DRIVEN, STEPS, AGENT = (BUILD / path for path in (
+    "tests/Kill/kill_host", "tests/Kill/kill_driven", "tests/Kill/libkill_steps.so", "corvane/Agent/Daemon/corvane-transferd"))
 DEADLINE = 30  # seconds, for what takes milliseconds
 
 Scenario = collections.namedtuple("Scenario", "agent mode left")

@@ -7,10 +7,13 @@
 // STEPS_AT     the chosen step
 // STEPS_DO     "before" or "after" (SIGKILL), "half" (a write does half of it), or the number of the error
 // STEPS_MARK   made when the step was reached, which is once in all processes together
+// STEPS_WORLD  a file of four numbers of 64 bits, which may change at any time: how many seconds the wall clock is off;
+//              1 while the disk is full; after how many steps a host is killed, and an agent (0: never)
 
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <signal.h>
+#include <sys/mman.h>
 #include <sys/socket.h>
 #include <sys/syscall.h>
 #include <sys/uio.h>
@@ -23,6 +26,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <string_view>
 
 namespace {
@@ -53,12 +57,25 @@ const char* setting(const char* name) {
     return getenv(name);
 }
 
+struct World {
+    std::atomic<std::int64_t> clock, isFull, hostDies, agentDies;
+
+    static World* at(const char* path) {
+        const int file = path ? static_cast<int>(syscall(SYS_openat, AT_FDCWD, path, O_RDWR | O_CLOEXEC)) : -1;
+        if (file < 0) return nullptr;
+        void* memory = mmap(nullptr, sizeof(World), PROT_READ | PROT_WRITE, MAP_SHARED, file, 0);
+        syscall(SYS_close, file);
+        return memory == MAP_FAILED ? nullptr : static_cast<World*>(memory);
+    }
+};
+
 struct Plan {
     const char* root = setting("STEPS_ROOT");
     const char* trace = setting("STEPS_TRACE");
     const char* at = setting("STEPS_AT");
     const char* what = setting("STEPS_DO");
     const char* mark = setting("STEPS_MARK");
+    World* world = World::at(setting("STEPS_WORLD"));
     const char* program = "host";
     Plan() {
         char path[4096] = {};
@@ -126,6 +143,29 @@ void note(const char* step) {
     syscall(SYS_close, file);
 }
 
+/// Kills this process at its step in the world; says whether the disk is full for what the step does.
+bool isRefused(const char* call, int kind) {
+    auto* world = plan().world;
+    if (!world) return false;
+    auto& deaths = *plan().program == 'h' ? world->hostDies : world->agentDies;
+    if (deaths > 0 && deaths.fetch_sub(1) == 1) die();
+    constexpr std::string_view growing = " write pwrite64 writev mkdir ";
+    return world->isFull != 0 && kind != server && kind != agent && growing.find(call) != growing.npos;
+}
+
+/// Gives a file that was written the time of the world's clock, as a machine has one clock for both.
+ssize_t dated(int file, ssize_t written) {
+    const auto* world = plan().world;
+    if (!world || world->clock == 0 || written < 0) return written;
+    const int error = errno;
+    timespec times[2]{};
+    clock_gettime(CLOCK_REALTIME, times);
+    times[1] = times[0];
+    syscall(SYS_utimensat, file, nullptr, times, 0);
+    errno = error;
+    return written;
+}
+
 /// Does what `act` does, unless something else was chosen for this step. `act` is told whether to do half of it only.
 template <class Act>
 auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, const Act& act) -> decltype(act(false)) {
@@ -135,6 +175,7 @@ auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, c
     snprintf(step, sizeof step, "%s %s %s %d", plan().program, call, kinds[kind].name, ++counts[kind]);
     note(step);
     const bool chosen = isChosen(step);
+    if (isRefused(call, kind)) return errno = ENOSPC, -1;
     errno = error;
     if (!chosen) return act(false);
     const std::string_view what = plan().what;
@@ -156,7 +197,7 @@ auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, c
 extern "C" {
 
 ssize_t write(int file, const void* bytes, size_t size) {
-    STEP(write, kindOf(file), real(file, bytes, half ? (size + 1) / 2 : size));
+    STEP(write, kindOf(file), dated(file, real(file, bytes, half ? (size + 1) / 2 : size)));
 }
 ssize_t pwrite64(int file, const void* bytes, size_t size, off64_t offset) {
     STEP(pwrite64, kindOf(file), real(file, bytes, half ? (size + 1) / 2 : size, offset));
@@ -203,6 +244,13 @@ int mkdir(const char* directory, mode_t mode) noexcept {
 int bind(int socket, const sockaddr* address, socklen_t size) noexcept {
     const bool isAgent = address->sa_family == AF_UNIX && plan().root;
     STEP(bind, isAgent ? agent : none, real(socket, address, size));
+}
+
+int clock_gettime(clockid_t clock, timespec* time) noexcept {
+    static const auto real = reinterpret_cast<decltype(&::clock_gettime)>(dlsym(RTLD_NEXT, "clock_gettime"));
+    const int result = real(clock, time);
+    if (const auto* world = plan().world; world && clock == CLOCK_REALTIME) time->tv_sec += world->clock;
+    return result;
 }
 
 // Only where it may make a file.

@@ -142,6 +142,21 @@ TEST(UploadManager, WhatEndedElsewhereIsWaitedForNoLongerAndLeftToWhoeverWasTold
     }
 }
 
+// The others were another process's, which had begun the epoch before this one heard of it.
+TEST(UploadManager, ForgetsTheDocumentsThatHaveLostTheirRows) {
+    const TemporaryDocuments documents;
+    ProcessRun run("main", 1s);
+    for (const auto* identifier : {"old", "new", "later"}) run.upload(identifier);
+    run.retry("later");
+    StoreConnection(StoreLocation::default_("main")).run("DELETE FROM signed_requests WHERE identifier = 'old';");
+    run.manager->forget();
+    EXPECT_FALSE(run.dropbox->existingFile("old"));
+    EXPECT_TRUE(run.dropbox->existingFile("new"));
+    EXPECT_EQ(run.service->cancelled, (std::vector<std::set<std::string>>{{"old"}}));
+    EXPECT_EQ(run.ledger->report(), (DeliveryReport{.delivered = {}, .pending = {20, 2}, .givenUp = {10, 1}}));
+    EXPECT_EQ(run.pass(2s), (std::vector<std::string>{"later"}));
+}
+
 TEST(UploadManager, ARetrysWholeLife) {
     const TemporaryDocuments documents;
     const Date later = now() + std::chrono::hours(1);

@@ -22,6 +22,9 @@ class FakeUploadService final : public UploadServiceType {
     void submit(const PreparedUploadRequest& request) override { submitted.push_back(request); }
     void resubmit(std::vector<PreparedUploadRequest> requests) override { resubmitted.push_back(std::move(requests)); }
     void inFlight(std::function<void(const std::set<std::string>&)> answer) override { answer(running); }
+    void cancel(std::set<std::string> identifiers, std::function<void(const std::set<std::string>&)>) override {
+        cancelled.push_back(std::move(identifiers));
+    }
     bool shouldResume(std::string_view identifier, std::function<void()>) override { return identifier == "mine"; }
 
     /// Ends an upload.
@@ -31,6 +34,7 @@ class FakeUploadService final : public UploadServiceType {
 
     std::vector<PreparedUploadRequest> submitted;
     std::vector<std::vector<PreparedUploadRequest>> resubmitted;  // one list per call
+    std::vector<std::set<std::string>> cancelled;                 // the same
     std::set<std::string> running;
     std::shared_ptr<SerialQueue> accessQueue;
 
