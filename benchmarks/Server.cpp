@@ -11,6 +11,8 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <mutex>
+#include <optional>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -25,7 +27,16 @@ std::size_t bodyLength(std::string_view head) {
     return at == std::string_view::npos ? 0 : std::strtoull(head.data() + at + 16, nullptr, 10);
 }
 
-void serve(int connection) {
+/// Whether this body was the first of all.
+bool isFirst(std::string_view body) {
+    static std::mutex mutex;
+    static std::optional<std::string> first;
+    const std::lock_guard lock(mutex);
+    if (!first) first = body;
+    return *first == body;
+}
+
+void serve(int connection, Server::Manner manner) {
     const int on = 1;
     setsockopt(connection, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
     std::string buffer;
@@ -33,7 +44,8 @@ void serve(int connection) {
     for (;;) {
         auto end = buffer.find("\r\n\r\n");
         while (end == std::string::npos || buffer.size() < end + 4 + bodyLength(buffer)) {
-            const ssize_t n = read(connection, piece, sizeof piece);
+            if (manner == Server::Manner::trickles) sleep(1);
+            const ssize_t n = read(connection, piece, manner == Server::Manner::trickles ? 1 : sizeof piece);
             if (n <= 0) {
                 close(connection);
                 return;
@@ -42,17 +54,23 @@ void serve(int connection) {
             if (end == std::string::npos) end = buffer.find("\r\n\r\n");
         }
         const bool answers = buffer.find(" /never") > buffer.find('\r');
-        buffer.erase(0, end + 4 + bodyLength(buffer));
-        constexpr std::string_view answer = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n";
+        const std::size_t length = bodyLength(buffer);
+        const bool isRefused =
+            manner == Server::Manner::refusesOne && isFirst(std::string_view(buffer).substr(end + 4, length));
+        buffer.erase(0, end + 4 + length);
+        const std::string_view answer = isRefused ? "HTTP/1.1 503 Later\r\nContent-Length: 0\r\n\r\n"
+                                                  : "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n";
         if (answers && write(connection, answer.data(), answer.size()) < 0) return;
     }
 }
 
 }  // namespace
 
-Server::Server() {
+Server::Server(Manner manner) {
     const int listener = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
     sockaddr_in address{};
+    const int least = 1;
+    if (manner == Manner::trickles) setsockopt(listener, SOL_SOCKET, SO_RCVBUF, &least, sizeof least);
     address.sin_family = AF_INET;
     address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
     socklen_t length = sizeof address;
@@ -66,7 +84,7 @@ Server::Server() {
     if (process_ == 0) {
         prctl(PR_SET_PDEATHSIG, SIGKILL);
         for (int connection = 0; (connection = accept(listener, nullptr, nullptr)) >= 0;) {
-            std::thread(serve, connection).detach();
+            std::thread(serve, connection, manner).detach();
         }
         _exit(1);
     }

@@ -11,7 +11,13 @@ namespace corvane::bench {
 /// ends with this object, or with the process.
 class Server {
   public:
-    Server();
+    enum class Manner {
+        answers,
+        trickles,    ///< takes one byte a second
+        refusesOne,  ///< answers 503 to the first body that came, whenever it comes
+    };
+
+    explicit Server(Manner manner = Manner::answers);
     Server(const Server&) = delete;
     Server& operator=(const Server&) = delete;
     ~Server();
