@@ -7,6 +7,7 @@ import http.server
 import json
 import os
 import pathlib
+import re
 import signal
 import sqlite3
 import subprocess
@@ -47,7 +48,7 @@ class Server:
                     body = self.rfile.read(length)
                     if len(body) < length:
                         raise ConnectionError("the client has gone")
-                    status = owner.receive(self.path, json.loads(gzip.decompress(body)))
+                    status = owner.take(self.path, self.headers, body)
                     self.send_response(status)
                     self.send_header("Content-Length", "0")
                     self.end_headers()
@@ -65,9 +66,17 @@ class Server:
         """Says of which run of which trial a document comes, however late it is read."""
         return f"http://127.0.0.1:{self.http.server_port}/{number}/{phase}"
 
-    def receive(self, path, document):
+    def take(self, path, headers, body):
         _, number, phase = path.split("/")
-        return self.trials[int(number)].receive(document, int(phase))
+        trial = self.trials[int(number)]
+        try:
+            document = json.loads(gzip.decompress(body))
+        except (OSError, EOFError, ValueError, zlib.error) as error:
+            trial.garbage.append(repr(error))
+            return 400
+        if not re.fullmatch("[A-Za-z0-9+/]{86}==|SigningFailure=.*", headers["X-Veskar-ActionSignature"] or ""):
+            trial.garbage.append("a signature that is none")
+        return trial.receive(document, int(phase))
 
 
 class Failure(Exception):
@@ -86,6 +95,7 @@ class Trial:
         self.errors = ""
         self.lock = threading.Condition()
         self.documents = {}  # the events of each document that was answered with 200
+        self.garbage = []  # what was no document
         self.received = []  # each time that a document came
         self.late = []  # what was recorded before forgetting, and handed over behind it
         self.phase = 0 if scenario.left else 1
@@ -226,6 +236,7 @@ def expect(condition, what):
 
 
 def check(trial, is_exact, forgets):
+    expect(not trial.garbage, f"what was no document has arrived: {trial.garbage}")
     acknowledged = trial.acknowledged
     arrived = [event for events in trial.documents.values() for event in events]
     due = trial.after if forgets else acknowledged
