@@ -40,20 +40,19 @@ struct Kind {
 // The first one that fits.
 constexpr Kind kinds[] = {{"server", ""},
                           {"agent", "agent.socket"},
+                          {"shm", ".db-shm"},
                           {"journal-wal", "journal.db-wal"},
                           {"journal", "journal.db"},
                           {"lock", "agent.lock"},
                           {"spool", "/spool/"},
                           {"withdrawn", "/withdrawn/"},
                           {"payload", ".upload-dropbox/"},
-                          {"shm", ".db-shm"},
                           {"wal", ".db-wal"},
                           {"database", ".db"},
                           {"key", "signing-key"},
                           {"recording", ".recording"},
                           {"other", ""}};
-constexpr int kindCount = sizeof kinds / sizeof *kinds, server = 0, agent = 1, sharedMemory = 8, none = -1;
-static_assert(kinds[sharedMemory].part == ".db-shm");
+constexpr int kindCount = sizeof kinds / sizeof *kinds, server = 0, agent = 1, sharedMemory = 2, none = -1;
 
 // NOLINTNEXTLINE(concurrency-mt-unsafe): nobody changes the environment before main
 const char* setting(const char* name) {
@@ -181,7 +180,7 @@ template <class Act>
 auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, const Subject& subject, const Act& act)
     -> decltype(act(false)) {
     const bool isSaid = subject.file == STDOUT_FILENO && subject.data;
-    if (plan().disk && (isSaid || (kind > agent && kind != sharedMemory))) return recorded(call, subject, act);
+    if (plan().disk && (isSaid || kind > sharedMemory)) return recorded(call, subject, act);
     if (kind == none) return act(false);
     const int error = errno;
     char step[128];
