@@ -221,7 +221,10 @@ class Trial:
     def payloads(self):
         """The documents in the payload directory, as text, also the half-written ones."""
         for file in self.home.glob("*.upload-dropbox/*"):
-            yield zlib.decompressobj(31).decompress(file.read_bytes()).decode(errors="replace")
+            try:
+                yield zlib.decompressobj(31).decompress(file.read_bytes()).decode(errors="replace")
+            except (OSError, zlib.error):  # gone meanwhile, or torn
+                pass
 
     def has_raised_epoch(self):
         try:

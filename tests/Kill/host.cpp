@@ -1,6 +1,6 @@
 // The host that scripts/check-steps kills.
 //
-//   kill_host URL DIRECTORY AGENT MODE [DURABILITY]
+//   kill_host URL DIRECTORY AGENT MODE ["powerCut"]
 //
 // AGENT is the transfer agent's program, or "-" for transfers inside the process. MODE:
 //
@@ -73,7 +73,7 @@ TransferSession::Factory transfers(const std::string& agent, const std::string& 
 }  // namespace
 
 int main(int argc, char** argv) {
-    if (argc != 5) return 2;
+    if (argc < 5) return 2;
     const std::string mode = argv[4];
     DocumentsDirectory::set(argv[2]);
     Log::shared().setSink([](LogLevel level, std::string_view message) {
@@ -81,7 +81,9 @@ int main(int argc, char** argv) {
             dprintf(STDERR_FILENO, "%.*s\n", static_cast<int>(message.size()), message.data());
     });
     TransferSession::setFactory(transfers(argv[3], argv[2]));
-    Application application(argv[1], 5);
+    UploadBatchEventOptions options{.batchSize = 5};
+    if (argc > 5) options.durability = Durability::powerCut;
+    Application application(argv[1], UploadBatchEventConfig(options));
     if (mode == "record") submit(application, 12, "before", true);
     for (int i = 0; i < 2 && mode == "pauses"; ++i) {
         submit(application, 7, "before", true);
