@@ -58,6 +58,7 @@ class Server:
             def log_message(self, *_):
                 pass
 
+        http.server.ThreadingHTTPServer.request_queue_size = 128  # many trials at a time
         self.http = http.server.ThreadingHTTPServer(("127.0.0.1", 0), Handler)
         self.http.handle_error = lambda *_: None
         threading.Thread(target=self.http.serve_forever, daemon=True).start()

@@ -313,6 +313,8 @@ TEST_F(DiskFaults, APayloadThatIsNotWhatItWasEndsItsDocumentAlone) {
     } cases[] = {
         {"missing", [](const Path& first, const Path&) { std::filesystem::remove(first); }, oneLost, 1},
         {"empty", [](const Path& first, const Path&) { std::filesystem::resize_file(first, 0); }, oneLost, 1},
+        {"torn", [](const Path& first, const Path&) { std::filesystem::resize_file(first, 100); }, oneLost, 1},
+        {"zeros", [](const Path& first, const Path&) { writeFile(first, std::string(100, '\0')); }, oneLost, 1},
         {"swapped", swap, bothArrive, 2},
     };
     for (const auto& one : cases) {
