@@ -15,7 +15,7 @@ struct CloseFile {
 
 }  // namespace
 
-bool isWholeGZIPFile(const std::filesystem::path& file) noexcept {
+bool isDamagedGZIPFile(const std::filesystem::path& file) noexcept {
     std::error_code failed;
     if (!std::filesystem::is_regular_file(file, failed)) return false;
     const std::unique_ptr<gzFile_s, CloseFile> opened(gzopen(file.c_str(), "rbe"));
@@ -27,7 +27,8 @@ bool isWholeGZIPFile(const std::filesystem::path& file) noexcept {
     } while (count > 0 && gzdirect(opened.get()) == 0);
     int status = Z_OK;
     gzerror(opened.get(), &status);
-    return count == 0 && status == Z_OK && gzdirect(opened.get()) == 0;
+    if (status == Z_OK) return gzdirect(opened.get()) != 0;
+    return status == Z_DATA_ERROR || status == Z_BUF_ERROR;
 }
 
 }  // namespace corvane

@@ -13,11 +13,11 @@ namespace {
 
 // A file that lost its contents, all or some, would be taken for delivered by a server that accepts anything, and be
 // refused for good by one that does not.
-bool isWhole(const std::filesystem::path& file) {
-    if (isWholeGZIPFile(file)) return true;
+bool isDamaged(const std::filesystem::path& file) {
+    if (!isDamagedGZIPFile(file)) return false;
     Log::shared().error("Payload is empty or damaged, as after a power cut, and is not sent, identifier=%{public}@",
                         file.filename().string());
-    return false;
+    return true;
 }
 
 }  // namespace
@@ -156,7 +156,7 @@ void StoredUploads::dropExceeded(const SignedEntity& entity) {
 
 std::optional<PreparedUploadRequest> StoredUploads::preparedRequest(const SignedEntity& entity) {
     auto file = dropbox_->existingFile(entity.identifier);
-    if (file && isWhole(*file))
+    if (file && !isDamaged(*file))
         return PreparedUploadRequest{entity.identifier, entity.contentType, entity.userAgent, *std::move(file)};
     Log::shared().default_("Retry dropped for missing upload file, identifier=%{public}@", entity.identifier);
     try {

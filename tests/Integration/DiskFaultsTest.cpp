@@ -335,7 +335,8 @@ TEST_F(DiskFaults, APayloadThatIsNotWhatItWasEndsItsDocumentAlone) {
         EXPECT_TRUE(rows().empty());
         EXPECT_TRUE(payloads().empty());
     }
-    EXPECT_EQ(log.count("Retry dropped for missing upload file, identifier="), 2);
+    EXPECT_EQ(log.count("Retry dropped for missing upload file, identifier="), 4);
+    EXPECT_EQ(log.count("Payload is empty or damaged"), 3);
 }
 
 }  // namespace

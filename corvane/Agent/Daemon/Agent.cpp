@@ -32,8 +32,8 @@ void checkBody(const TransferSubmission& submission) {
     const bool isPacked = std::any_of(headers.begin(), headers.end(), [](const auto& header) {
         return header.first == "Content-Encoding" && header.second == "gzip";
     });
-    if (!isPacked || isWholeGZIPFile(submission.bodyPath)) return;
-    throw TransferError(TransferError::Code::bodyUnavailable, submission.bodyPath + " is missing or damaged");
+    if (!isPacked || !isDamagedGZIPFile(submission.bodyPath)) return;
+    throw TransferError(TransferError::Code::bodyUnavailable, submission.bodyPath + " is damaged");
 }
 
 }  // namespace
