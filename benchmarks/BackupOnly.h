@@ -22,10 +22,12 @@ class NullUploadManager final : public UploadManagerType {
 };
 
 /// A batching processor whose full batches go nowhere.
-inline std::shared_ptr<UploadBatchEventProcessor> backupOnly(const std::string& name, int batchSize) {
+inline std::shared_ptr<UploadBatchEventProcessor> backupOnly(const std::string& name, int batchSize,
+                                                             Durability durability = Durability::processKill) {
+    const UploadBatchEventOptions options{.batchSize = batchSize, .durability = durability};
     return std::make_shared<UploadBatchEventProcessor>(std::make_shared<UploadBatches>(
         Client{"com.example.bench", "Bench", "1.0", 1}, std::make_shared<NullUploadManager>(),
-        std::make_shared<DeferredStore<UploadBatchEntity>>(name), UploadBatchEventConfig(batchSize, false),
+        std::make_shared<DeferredStore<UploadBatchEntity>>(name, durability), UploadBatchEventConfig(options),
         std::make_shared<DeliveryLedger>()));
 }
 

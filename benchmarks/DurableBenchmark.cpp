@@ -56,9 +56,9 @@ constexpr int events = 5'000, batchSize = 50;
 
 /// Each event durable before the next one is submitted, without a change of threads.
 /// @param inGroup that many are in the tracker's group before; otherwise batches are handed over when they are full
-Figures oneAtATime(int inGroup) {
+Figures oneAtATime(int inGroup, Durability durability = Durability::processKill) {
     const test::TemporaryDocuments documents;
-    Host host(backupOnly("paced", batchSize));
+    Host host(backupOnly("paced", batchSize, durability));
     if (inGroup > 0) host.tracker->enterGroup("checkout");
     for (int i = 0; i < inGroup; ++i) host.tracker->submit<ScreenView>();
     host.drain();
@@ -135,6 +135,11 @@ void addDurableBenchmarks() {
     add(
         group + "~batch of 50", [] { return oneAtATime(0); }, 3);
     setBar(group + "~batch of 50", "us/event", 1.25);
+    const std::string powerCut = "durable/one at a time, power cut";
+    add(
+        powerCut, [] { return oneAtATime(0, Durability::powerCut); }, 3);
+    add(
+        powerCut + "~process kill", [] { return oneAtATime(0); }, 3);
     add(
         "ledger/read", [] { return readLedger(false); }, 3);
     add(

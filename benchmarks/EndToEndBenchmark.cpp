@@ -40,10 +40,12 @@ Figures perEvent(int events, CPU&& cpu, Work&& work) {
 }
 
 /// Until the server has answered for the last event.
-Figures delivered(const std::string& url, int events, const std::function<double()>& cpu) {
+Figures delivered(const std::string& url, int events, const std::function<double()>& cpu,
+                  Durability durability = Durability::processKill) {
     const test::TemporaryDocuments documents;
-    const auto processor = std::make_shared<UploadBatchEventProcessor>(Client{"com.example.bench", "Bench", "1.0", 1},
-                                                                       Endpoint{url, "end"});
+    const auto processor = std::make_shared<UploadBatchEventProcessor>(
+        Client{"com.example.bench", "Bench", "1.0", 1}, Endpoint{url, "end"},
+        UploadBatchEventConfig({.durability = durability}));
     Host host(processor);
     const auto deliver = [&](int count) {
         const auto before = processor->waitForDelivery(std::chrono::steady_clock::now()).delivered.events;
@@ -115,6 +117,10 @@ void addEndToEndBenchmarks(const std::string& serverURL) {
                 });
             },
             3);
+        add(
+            name + ", power cut", [=] { return delivered(url, events, cpuNanoseconds, Durability::powerCut); }, 3);
+        add(
+            name + ", power cut~process kill", [=] { return delivered(url, events, cpuNanoseconds); }, 3);
         if (events == together) {
             add(
                 name + "~that, and bare documents", [=] { return bareSum(url); }, 3);

@@ -70,10 +70,12 @@ Figures perDocument(CPU&& cpu, Work&& work) {
 /// What takes documents over from a batching processor, and the session's queue.
 class Uploads {
   public:
-    explicit Uploads(const std::string& url, TransferSession::Factory factory = {}) : endpoint_{url, "upload"} {
+    explicit Uploads(const std::string& url, TransferSession::Factory factory = {},
+                     Durability durability = Durability::processKill)
+        : endpoint_{url, "upload"}, durability_(durability) {
         manager_ = UploadManager::create(
             std::make_shared<UploadService>(endpoint_, std::make_shared<OstrelSigner>(), std::move(factory)),
-            std::make_shared<DeferredStore<SignedEntity>>(endpoint_.name()),
+            std::make_shared<DeferredStore<SignedEntity>>(endpoint_.name(), durability_),
             std::make_shared<UploadDropbox>(endpoint_.name(), false), ledger_);
         queue_->sync([this] {
             manager_->registerAccessQueue(queue_);
@@ -101,10 +103,13 @@ class Uploads {
     void upload() {
         const auto document = std::make_shared<UserEvents>(session_, UserEvents::Events{events_}, newUUID());
         ledger_->add(document->identifier(), eventsEach);
-        manager_->upload(UploadRequest{client_, document});
+        UploadRequest request{client_, document};
+        request.durability = durability_;
+        manager_->upload(request);
     }
 
     const Endpoint endpoint_;
+    const Durability durability_;
     const Client client_{"com.example.bench", "Bench", "1.0", 1};
     const JSON session_{sessionText};
     const std::shared_ptr<const EncodedEvents> events_ = makeEvents();
@@ -113,9 +118,9 @@ class Uploads {
     std::shared_ptr<UploadManager> manager_;
 };
 
-Figures inProcess(const std::string& url) {
+Figures inProcess(const std::string& url, Durability durability) {
     const test::TemporaryDocuments directory;
-    Uploads uploads(url);
+    Uploads uploads(url, {}, durability);
     return perDocument(cpuNanoseconds, [&] { uploads.send(documents); });
 }
 
@@ -183,7 +188,13 @@ void addUploadBenchmarks(const std::string& serverURL) {
             name + survives, [=] { return bareDocuments(url, true); }, 3);
         setBar(name + survives, "CPU us/document", bar);
     };
-    addWith("upload/document of 50 events", inProcess, 1.25);
+    const auto killed = [](const std::string& to) { return inProcess(to, Durability::processKill); };
+    const std::string powerCut = "upload/document, power cut";
+    add(
+        powerCut, [=] { return inProcess(url, Durability::powerCut); }, 3);
+    add(
+        powerCut + "~process kill", [=] { return killed(url); }, 3);
+    addWith("upload/document of 50 events", killed, 1.25);
 #ifdef CORVANE_AGENT
     addWith("upload/document with the agent", withAgent, 2.5);
 #endif

@@ -116,7 +116,7 @@ class Load {
     void finish(std::chrono::seconds patience) {
         host_->sessions.endSync();
         std::printf("  session ended after %.1f s\n", seconds(Clock::now() - began_));
-        const auto report = uploads_->waitForDelivery(Clock::now() + patience);
+        uploads_->waitForDelivery(Clock::now() + patience);
         const double last = seconds(Clock::now() - began_);
         isOver_ = true;
         watch_.join();

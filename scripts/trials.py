@@ -7,6 +7,7 @@ import http.server
 import json
 import os
 import pathlib
+import re
 import signal
 import sqlite3
 import subprocess
@@ -47,7 +48,7 @@ class Server:
                     body = self.rfile.read(length)
                     if len(body) < length:
                         raise ConnectionError("the client has gone")
-                    status = owner.receive(self.path, json.loads(gzip.decompress(body)))
+                    status = owner.take(self.path, self.headers, body)
                     self.send_response(status)
                     self.send_header("Content-Length", "0")
                     self.end_headers()
@@ -57,6 +58,7 @@ class Server:
             def log_message(self, *_):
                 pass
 
+        http.server.ThreadingHTTPServer.request_queue_size = 128  # many trials at a time
         self.http = http.server.ThreadingHTTPServer(("127.0.0.1", 0), Handler)
         self.http.handle_error = lambda *_: None
         threading.Thread(target=self.http.serve_forever, daemon=True).start()
@@ -65,9 +67,17 @@ class Server:
         """Says of which run of which trial a document comes, however late it is read."""
         return f"http://127.0.0.1:{self.http.server_port}/{number}/{phase}"
 
-    def receive(self, path, document):
+    def take(self, path, headers, body):
         _, number, phase = path.split("/")
-        return self.trials[int(number)].receive(document, int(phase))
+        trial = self.trials[int(number)]
+        try:
+            document = json.loads(gzip.decompress(body))
+        except (OSError, EOFError, ValueError, zlib.error) as error:
+            trial.garbage.append(repr(error))
+            return 400
+        if not re.fullmatch("[A-Za-z0-9+/]{86}==|SigningFailure=.*", headers["X-Veskar-ActionSignature"] or ""):
+            trial.garbage.append("a signature that is none")
+        return trial.receive(document, int(phase))
 
 
 class Failure(Exception):
@@ -86,6 +96,7 @@ class Trial:
         self.errors = ""
         self.lock = threading.Condition()
         self.documents = {}  # the events of each document that was answered with 200
+        self.garbage = []  # what was no document
         self.received = []  # each time that a document came
         self.late = []  # what was recorded before forgetting, and handed over behind it
         self.phase = 0 if scenario.left else 1
@@ -211,7 +222,10 @@ class Trial:
     def payloads(self):
         """The documents in the payload directory, as text, also the half-written ones."""
         for file in self.home.glob("*.upload-dropbox/*"):
-            yield zlib.decompressobj(31).decompress(file.read_bytes()).decode(errors="replace")
+            try:
+                yield zlib.decompressobj(31).decompress(file.read_bytes()).decode(errors="replace")
+            except (OSError, zlib.error):  # gone meanwhile, or torn
+                pass
 
     def has_raised_epoch(self):
         try:
@@ -226,6 +240,7 @@ def expect(condition, what):
 
 
 def check(trial, is_exact, forgets):
+    expect(not trial.garbage, f"what was no document has arrived: {trial.garbage}")
     acknowledged = trial.acknowledged
     arrived = [event for events in trial.documents.values() for event in events]
     due = trial.after if forgets else acknowledged

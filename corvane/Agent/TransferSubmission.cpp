@@ -4,6 +4,8 @@
 #include <corvane/Agent/WireWriter.h>
 #include <corvane/Platform/UUID.h>
 
+#include <zlib.h>
+
 #include <algorithm>
 
 namespace corvane {
@@ -11,6 +13,10 @@ namespace corvane {
 namespace {
 constexpr std::string_view magic = "CVTS";
 constexpr std::int64_t version = 2;
+// A power cut may leave zeros where a part of the file should be.
+std::int64_t checksum(std::string_view bytes) {
+    return static_cast<std::int64_t>(crc32_z(0, reinterpret_cast<const Bytef*>(bytes.data()), bytes.size()));
+}
 // Beyond it a sum with the time of day could overflow.
 constexpr std::int64_t longestTime = std::int64_t{1000} * 60 * 60 * 24 * 365 * 100;
 }  // namespace
@@ -44,7 +50,10 @@ std::string TransferSubmission::encoded() const {
           std::int64_t{limits.answer.count()}, std::int64_t{limits.transfersPerHost}, std::int64_t{patience.count()},
           wakeCommand);
     write(trustedCertificates, proxy.url, proxy.exceptions, extras);
-    return write.take();
+    std::string bytes = write.take();
+    WireWriter writeChecksum;
+    writeChecksum(checksum(bytes));
+    return bytes += writeChecksum.take();
 }
 
 void TransferSubmission::checkNames(std::string_view session, std::string_view owner,
@@ -73,9 +82,15 @@ TransferSubmission TransferSubmission::decode(std::string_view bytes) {
     std::int64_t body = 0, progress = 0, answer = 0, perHost = 0, patience = 0;
     read(made.token, made.session, made.owner, made.description, made.request.url, made.request.method,
          made.request.headers, made.bodyPath, body, progress, answer, perHost, patience, made.wakeCommand);
-    // Version 1 ends here, and behind the last value of this one there may be more.
+    // Version 1 ends here. Earlier releases of this one have no checksum, and behind the last value there may be more.
     if (format == 1) read.finish();
     if (format > 1) read(made.trustedCertificates, made.proxy.url, made.proxy.exceptions, made.extras);
+    if (format > 1 && read.rest() > 0) {
+        const auto content = bytes.substr(0, bytes.size() - read.rest());
+        std::int64_t stored = 0;
+        read(stored);
+        if (stored != checksum(content)) throw FormatError("the submission is damaged");
+    }
     const bool inRange = body >= 0 && progress > 0 && progress <= longestTime && answer > 0 && answer <= longestTime &&
                          perHost > 0 && perHost <= 1000 && patience >= 0 && patience <= longestTime;
     if (!inRange || !isToken(made.token)) throw FormatError("a value of the submission is out of range");

@@ -63,6 +63,9 @@ class WireReader {
         if (!bytes_.empty()) throw FormatError("there are bytes behind the last value");
     }
 
+    /// How many bytes are left.
+    [[nodiscard]] std::size_t rest() const noexcept { return bytes_.size(); }
+
   private:
     std::string_view take(std::size_t count) {
         if (count > bytes_.size()) throw FormatError("a value is cut off");

@@ -2,7 +2,9 @@
 
 #include <corvane/Platform/Bundle.h>
 #include <corvane/Platform/Error.h>
+#include <corvane/Platform/Log.h>
 #include <corvane/Platform/Mutex.h>
+#include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/RecordingSwitch.h>
 
 #include <pwd.h>
@@ -47,6 +49,16 @@ std::string applicationName() {
     }
     auto name = executablePath().filename().string();
     return name.empty() ? "corvane" : name;
+}
+
+// With its directory a power cut would take all that is synced in there later. One of which the parent cannot be read,
+// or cannot be synced, serves all the same.
+void syncName(const std::filesystem::path& directory) {
+    try {
+        syncDirectory(directory.parent_path());
+    } catch (const SystemError& error) {
+        Log::shared().default_("A new directory may not survive a power cut, error=%{public}@", error.what());
+    }
 }
 
 bool isSpace(char c) {
@@ -101,12 +113,12 @@ void createPrivateDirectories(const std::filesystem::path& directory) {
     std::error_code ignored;
     if (std::filesystem::is_directory(directory, ignored)) return;
     createPrivateDirectories(directory.parent_path() == directory ? std::filesystem::path() : directory.parent_path());
-    if (mkdir(directory.c_str(), 0700) != 0 && errno != EEXIST) {
-        throw SystemError("create directory " + directory.string(), errno);
-    }
+    const bool isNew = mkdir(directory.c_str(), 0700) == 0;
+    if (!isNew && errno != EEXIST) throw SystemError("create directory " + directory.string(), errno);
     if (!std::filesystem::is_directory(directory, ignored)) {
         throw SystemError("create directory " + directory.string(), ENOTDIR);
     }
+    if (isNew) syncName(directory);
 }
 
 }  // namespace corvane

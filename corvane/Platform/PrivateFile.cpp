@@ -29,13 +29,30 @@ bool writeAll(int descriptor, std::string_view contents) {
     return true;
 }
 
+// What a file system does not know how to do for a directory it does by itself.
+bool sync(int descriptor, bool isDirectory) {
+    while (::fsync(descriptor) != 0) {
+        if (errno == EINTR) continue;
+        return isDirectory && (errno == EINVAL || errno == ENOTSUP);
+    }
+    return true;
+}
+
+void sync(const std::filesystem::path& path, bool isDirectory) {
+    const Descriptor opened(::open(path.c_str(), O_RDONLY | O_CLOEXEC | (isDirectory ? O_DIRECTORY : O_NONBLOCK)));
+    if (!opened || !sync(opened.get(), isDirectory)) throw SystemError("write to the disk " + path.string(), errno);
+}
+
 /// A file beside `target` that holds `contents`; removed at the end unless it was renamed.
 class PartialFile {
   public:
-    PartialFile(const std::filesystem::path& target, std::string_view contents) : path_(partialPath(target.native())) {
+    PartialFile(const std::filesystem::path& target, std::string_view contents, Durability durability)
+        : path_(partialPath(target.native())) {
         Descriptor descriptor(::open(path_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
         if (descriptor.get() < 0) throw SystemError("create file " + target.string(), errno);
-        if (!writeAll(descriptor.get(), contents) || !descriptor.close()) {
+        const bool isSynced = durability == Durability::powerCut;
+        if (!writeAll(descriptor.get(), contents) || (isSynced && !sync(descriptor.get(), false)) ||
+            !descriptor.close()) {
             const int error = errno;
             ::unlink(path_.c_str());
             throw SystemError("write file " + target.string(), error);
@@ -67,20 +84,36 @@ class PartialFile {
 
 }  // namespace
 
-void replacePrivateFile(const std::filesystem::path& file, std::string_view contents) {
-    PartialFile partial(file, contents);
+void replacePrivateFile(const std::filesystem::path& file, std::string_view contents, Durability durability) {
+    PartialFile partial(file, contents, durability);
     if (::rename(partial.path(), file.c_str()) != 0) throw SystemError("write file " + file.string(), errno);
     partial.keep();
+    if (durability == Durability::powerCut) syncDirectory(file.parent_path());
 }
 
 // Once linked the file is never written again, so a power cut must not leave the name without the contents.
 bool createPrivateFile(const std::filesystem::path& file, std::string_view contents) {
-    const PartialFile partial(file, contents);
-    const Descriptor written(::open(partial.path(), O_RDONLY | O_CLOEXEC));
-    if (!written || ::fsync(written.get()) != 0) throw SystemError("write file " + file.string(), errno);
-    if (::link(partial.path(), file.c_str()) == 0) return true;
+    const PartialFile partial(file, contents, Durability::powerCut);
+    if (::link(partial.path(), file.c_str()) == 0) {
+        syncDirectory(file.parent_path());
+        return true;
+    }
     if (errno == EEXIST) return false;
     throw SystemError("create file " + file.string(), errno);
+}
+
+// The name is in its place by then: most file systems write it with the contents.
+void syncFile(const std::filesystem::path& file) {
+    sync(file, false);
+    syncDirectory(file.parent_path());
+}
+
+void syncDirectory(const std::filesystem::path& directory) {
+    sync(directory.empty() ? std::filesystem::path(".") : directory, true);
+}
+
+bool isPartialFile(std::string_view name) noexcept {
+    return name.starts_with('.') && name.ends_with(partialExtension);
 }
 
 void removeAbandonedPartialFiles(const std::filesystem::path& directory) noexcept {
@@ -89,9 +122,8 @@ void removeAbandonedPartialFiles(const std::filesystem::path& directory) noexcep
     const int at = ::dirfd(opened.get());
     const std::time_t oldest = std::time(nullptr) - std::time_t{60} * 60;
     while (const dirent* entry = ::readdir(opened.get())) {
-        const std::string_view name = entry->d_name;
         struct stat status {};
-        const bool isAbandoned = name.starts_with('.') && name.ends_with(partialExtension) &&
+        const bool isAbandoned = isPartialFile(entry->d_name) &&
                                  ::fstatat(at, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) == 0 &&
                                  S_ISREG(status.st_mode) && status.st_mtime < oldest;
         if (isAbandoned) ::unlinkat(at, entry->d_name, 0);

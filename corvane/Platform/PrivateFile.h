@@ -1,5 +1,7 @@
 #pragma once
 
+#include <corvane/Platform/Durability.h>
+
 #include <filesystem>
 #include <string>
 #include <string_view>
@@ -10,12 +12,23 @@ namespace corvane {
 // file beside the target, which then takes the target's name. Safe from any thread and with several processes. They
 // throw `SystemError`, and leave no file of their own behind.
 
-/// Writes the file, in place of one of that name.
-void replacePrivateFile(const std::filesystem::path& file, std::string_view contents);
+/// Writes the file, in place of one of that name. Where it must survive a power cut, one leaves the earlier file or,
+/// once this has returned, the new one.
+void replacePrivateFile(const std::filesystem::path& file, std::string_view contents,
+                        Durability durability = Durability::processKill);
 
-/// Writes the file unless there is one of that name. Returns whether it was written; its contents then survive a power
-/// cut if its name does.
+/// Writes the file unless there is one of that name. Returns whether it was written; it then survives a power cut.
 bool createPrivateFile(const std::filesystem::path& file, std::string_view contents);
+
+/// Waits until a file, with its name, is on the disk. Throws `SystemError`.
+void syncFile(const std::filesystem::path& file);
+
+/// Waits until the names of a directory are on the disk. A file system that knows no such thing is no error. Throws
+/// `SystemError`.
+void syncDirectory(const std::filesystem::path& directory);
+
+/// Whether a name is that of a file that is being written, or was when its process was killed.
+[[nodiscard]] bool isPartialFile(std::string_view name) noexcept;
 
 /// Removes from a directory what a process that was killed left half written. Files younger than an hour stay: another
 /// process may be at work on them. What cannot be looked at or removed stays.

@@ -199,23 +199,31 @@ void RecordingSwitch::set(bool isOn) {
 
 void RecordingSwitch::rewrite(const std::function<void(Word&)>& change) {
     const WriteLock writing(DocumentsDirectory::create());
-    const Lock lock(state().mutex);
-    state().findFile();
     Word word;
-    try {
-        if (stampOf(state().file)) word = Word::parse(readWholeFile(state().file));
-    } catch (const InvalidArgument&) {  // its answer is replaced, or off
-        word.isOn = false;
+    std::filesystem::path file;
+    {
+        const Lock lock(state().mutex);
+        state().findFile();
+        file = state().file;
+        try {
+            if (stampOf(file)) word = Word::parse(readWholeFile(file));
+        } catch (const InvalidArgument&) {  // its answer is replaced, or off
+            word.isOn = false;
+        }
+        // A file that somebody has removed does not turn the clock back.
+        word.epoch = std::max<std::int64_t>(word.epoch, epoch_);
+        word.finished = std::max(word.finished, state().finishedEpoch);
+        if (state().isUnsaved) word.isOn = answer_ == Answer::on;
     }
-    // A file that somebody has removed does not turn the clock back.
-    word.epoch = std::max<std::int64_t>(word.epoch, epoch_);
-    word.finished = std::max(word.finished, state().finishedEpoch);
-    if (state().isUnsaved) word.isOn = answer_ == Answer::on;
     change(word);
-    replacePrivateFile(state().file, word.text());
-    state().isUnsaved = false;
-    state().finishedEpoch = word.finished;
-    epoch_ = word.epoch;
+    // A power cut must neither bring back what was forgotten nor leave a file that says nothing. Without the lock: a
+    // caller's thread may ask, or answer anew, while the disk takes its time.
+    replacePrivateFile(file, word.text(), Durability::powerCut);
+    const Lock lock(state().mutex);
+    if (state().file != file) return;
+    if (word.isOn == (answer_ == Answer::on)) state().isUnsaved = false;
+    state().finishedEpoch = std::max(state().finishedEpoch, word.finished);
+    if (word.epoch > epoch_) epoch_ = word.epoch;
     state().seen.reset();  // by now it may be another's
 }
 

@@ -28,6 +28,7 @@ DocumentHandOver::Removal DocumentHandOver::handOver(const Contents& contents, c
         UploadRequest request{client_, document};
         request.events = static_cast<std::int64_t>(count);
         request.epoch = contents.epoch;
+        request.durability = contents.durability;
         request.removeBackup = [&](const std::shared_ptr<StoreConnection>& connection) {
             removeBackup(connection, contents, mayDelete, removal);
         };

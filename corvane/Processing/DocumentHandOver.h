@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Models/Client.h>
+#include <corvane/Platform/Durability.h>
 #include <corvane/Platform/Error.h>
 #include <corvane/Processing/UploadBatchEntity.h>
 #include <corvane/Processing/UserEvents.h>
@@ -29,6 +30,7 @@ class DocumentHandOver {
         UserEvents::Events events;
         std::vector<std::string> rows;
         std::int64_t epoch = 0;  // in which they were recorded
+        Durability durability = Durability::powerCut;
     };
     /// Whether a batch's rows may go: asked inside the transaction that deletes it.
     using MayDelete = std::function<bool(Rows&)>;

@@ -4,6 +4,7 @@
 #include <corvane/Platform/Date.h>
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/Log.h>
+#include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/RecordingSwitch.h>
 #include <corvane/Platform/UUID.h>
 #include <corvane/Processing/UploadBatchEntity.h>
@@ -63,9 +64,9 @@ std::optional<std::set<std::string>> storedDocuments(const std::shared_ptr<Store
     }
 }
 
-/// Removes the payloads that no row stands for: of a process that was killed before it wrote the row, or beside a
-/// database that is lost. One that is being written has none yet either, but it is younger than the epoch. Where the
-/// clock was put back since, its age says little.
+/// Removes the payloads that no row stands for: of a process that was killed before it wrote the row, or in the midst
+/// of the payload, or beside a database that is lost. One that is being written has none yet either, but it is younger
+/// than the epoch. Where the clock was put back since, its age says little.
 void removeOrphans(const fs::path& payloads, const std::optional<std::set<std::string>>& stored, std::int64_t epoch) {
     constexpr std::chrono::seconds granularity(1);  // of the file system's clock
     const auto time = dateFromMilliseconds(epoch).value_or(Date::max());
@@ -77,7 +78,8 @@ void removeOrphans(const fs::path& payloads, const std::optional<std::set<std::s
         std::error_code unseen;
         const auto written = std::chrono::file_clock::to_sys(entry->last_write_time(unseen));
         const bool isStored = stored && stored->contains(name);
-        if (!unseen && written < begin && isUUID(name) && !isStored) fs::remove(entry->path(), unseen);
+        const bool isOurs = isUUID(name) || isPartialFile(name);
+        if (!unseen && written < begin && isOurs && !isStored) fs::remove(entry->path(), unseen);
     }
 }
 
@@ -141,7 +143,11 @@ class Sweep {
             attempt([&] { sweepDatabase(connection); });
             stored = storedDocuments(connection);
         });
-        removeOrphans(files + ".upload-dropbox", stored, epoch_);
+        attempt([&] {
+            if (!fs::is_directory(files + ".upload-dropbox")) return;
+            removeOrphans(files + ".upload-dropbox", stored, epoch_);
+            syncDirectory(files + ".upload-dropbox");  // what a power cut brought back nobody would look for
+        });
         attempt([&] { removeDebuggingCopies(files + ".upload-dropbox.debugging"); });
     }
 

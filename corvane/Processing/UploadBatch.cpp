@@ -22,6 +22,7 @@ bool fit(const EncodedEvents& first, const EncodedEvents& second) {
 }  // namespace
 
 void UploadBatch::append(const JSON& payload, const JSON& session) {
+    if (count_ == 0) begin_ = Clock::now();
     const bool isNewPart = parts_.empty() || isFull(*parts_.back().events);
     if (isNewPart) {
         // A part is never empty, not even without memory: a document would have a gap.
@@ -52,12 +53,14 @@ void UploadBatch::prepend(UploadBatch earlier) {
     earlier.parts_.insert(earlier.parts_.end(), std::make_move_iterator(parts_.begin()),
                           std::make_move_iterator(parts_.end()));
     parts_ = std::move(earlier.parts_);
+    begin_ = earlier.begin_;
     count_ += earlier.count_;
     bytes_ += earlier.bytes_;
 }
 
 UploadBatch UploadBatch::take(const std::string& identifier) {
     UploadBatch taken;
+    taken.begin_ = begin_;
     if (Part* const part = find(identifier)) {
         taken.count_ = part->events->count();
         taken.bytes_ = part->events->text().size();

@@ -3,6 +3,7 @@
 #include <corvane/Models/JSON.h>
 #include <corvane/Processing/EncodedEvents.h>
 
+#include <chrono>
 #include <cstddef>
 #include <memory>
 #include <string>
@@ -17,6 +18,8 @@ class UploadBatch {
   public:
     static constexpr std::size_t eventsOfPart = 50;
     static constexpr std::size_t bytesOfPart = std::size_t{64} * 1024;
+
+    using Clock = std::chrono::steady_clock;
 
     struct Part {
         std::string identifier;  // the row's
@@ -38,6 +41,8 @@ class UploadBatch {
     /// Of the events' text.
     [[nodiscard]] std::size_t bytes() const { return bytes_; }
     [[nodiscard]] bool isEmpty() const { return parts_.empty(); }
+    /// When the first event was added.
+    [[nodiscard]] Clock::time_point begin() const { return begin_; }
     [[nodiscard]] bool isBackedUp() const;
     /// Never empty, once an event was added.
     [[nodiscard]] std::vector<Part>& parts() { return parts_; }
@@ -50,6 +55,7 @@ class UploadBatch {
   private:
     std::vector<Part> parts_;
     std::size_t count_ = 0, bytes_ = 0;
+    Clock::time_point begin_ = {};
 };
 
 }  // namespace corvane

@@ -2,6 +2,7 @@
 
 #include <corvane/Export.h>
 #include <corvane/Models/Client.h>
+#include <corvane/Platform/Durability.h>
 #include <corvane/Processing/EventProcessorType.h>
 #include <corvane/Upload/DeliveryReport.h>
 #include <corvane/Upload/DeliveryUpdate.h>
@@ -45,6 +46,12 @@ struct UploadBatchEventOptions {
     /// A server's Retry-After is obeyed, up to a day at a time. A document that the server was sent a hundred times in
     /// one run waits for the next one. Without a delay each waits for the next run. At least 1 ms.
     std::optional<std::chrono::milliseconds> retryDelay = {};
+
+    /// What survives a power cut of what was acknowledged. With `powerCut` all of it does, as far as the file system
+    /// and the disk keep their word: completions, and calls that wait for them, wait for the disk. Without it, all but
+    /// the last moments; see `Durability`. It is the endpoint's files that count: whoever shares them in another
+    /// process says so, too.
+    Durability durability = Durability::processKill;
 };
 
 /// How the batching processor batches. A value.

@@ -53,16 +53,18 @@ UploadBatches::UploadBatches(Client client, std::shared_ptr<UploadManagerType> u
 
 std::shared_ptr<UploadBatches> UploadBatches::make(Client client, const Endpoint& endpoint,
                                                    const UploadBatchEventConfig& config) {
+    const auto durability = config.options().durability;
     auto ledger = std::make_shared<DeliveryLedger>();
     auto book = std::make_shared<LedgerBook>();
     auto manager = UploadManager::create(std::make_shared<UploadService>(endpoint, std::make_shared<OstrelSigner>()),
-                                         std::make_shared<DeferredStore<SignedEntity>>(endpoint.name()),
+                                         std::make_shared<DeferredStore<SignedEntity>>(endpoint.name(), durability),
                                          std::make_shared<UploadDropbox>(endpoint.name(), config.batchDebugging()),
                                          ledger, book, config.options().retryDelay,
                                          {config.options().maximumBytesOnDisk, config.options().maximumAge});
     return std::make_shared<UploadBatches>(
-        std::move(client), std::move(manager), std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name()),
-        config, std::move(ledger), std::move(book), std::make_shared<const EndpointUse>(endpoint));
+        std::move(client), std::move(manager),
+        std::make_shared<DeferredStore<UploadBatchEntity>>(endpoint.name(), durability), config, std::move(ledger),
+        std::move(book), std::make_shared<const EndpointUse>(endpoint));
 }
 
 DeliveryReport UploadBatches::waitForDelivery(std::chrono::steady_clock::time_point deadline,
@@ -91,6 +93,15 @@ void UploadBatches::flush() {
 
 void UploadBatches::handOverSession() {
     if (currentSession_) handOver(UploadBatchQueueKey::session(currentSession_->identifier), true);
+}
+
+// The row of a batch goes with the transaction that writes its document's, and the system may write that to the disk
+// before the document's payload. What has only just been acknowledged may be lost anyway: its document is not waited
+// for, so that a host that records much waits for the disk once in a while, and not for each document.
+Durability UploadBatches::durabilityOf(const UploadBatch& batch) const {
+    constexpr std::chrono::seconds isOld(1);
+    const bool holdsOld = UploadBatch::Clock::now() - batch.begin() >= isOld;
+    return holdsOld ? Durability::powerCut : config_.options().durability;
 }
 
 std::shared_ptr<SerialQueue> UploadBatches::registeredQueue() const {
@@ -261,7 +272,7 @@ void UploadBatches::handOver(const UploadBatchQueueKey& key, bool force) {
 }
 
 bool UploadBatches::tryHandOver(UploadBatch& batch) {
-    DocumentHandOver::Contents contents{currentSession_->sessionData, {}, {}, epoch_};
+    DocumentHandOver::Contents contents{currentSession_->sessionData, {}, {}, epoch_, durabilityOf(batch)};
     for (const auto& part : batch.parts()) {
         contents.events.push_back(part.events);
         if (part.hasRow) contents.rows.push_back(part.identifier);
@@ -382,7 +393,8 @@ void UploadBatches::handOverTerminated(UploadBatchEntity batch) {
     };
     DocumentHandOver::Removal removal;
     try {
-        removal = documents_.handOver({batch.session, {batch.events}, {batch.identifier}, epoch_}, hasNotGrown);
+        removal = documents_.handOver({batch.session, {batch.events}, {batch.identifier}, epoch_, Durability::powerCut},
+                                      hasNotGrown);
         if (removal.taken == UploadTaken::forgotten) return;
         if (removal.error) {
             Log::shared().error("Failed to remove queue from disk, identifier=%{public}@, error=%{public}@",

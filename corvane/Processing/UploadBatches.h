@@ -96,6 +96,8 @@ class UploadBatches : public std::enable_shared_from_this<UploadBatches> {
 
     /// Sees to it that the session's open batch, if there is one, is handed over when `maximumDelay` has passed.
     void limitDelay() CORVANE_REQUIRES(*accessQueue_);
+    /// What a batch's payload must survive before its rows go.
+    [[nodiscard]] Durability durabilityOf(const UploadBatch& batch) const;
     void handOverSession() CORVANE_REQUIRES(*accessQueue_);
     /// Hands a batch over when it is full, or in any case; one that is refused is open again.
     void handOver(const UploadBatchQueueKey& key, bool force) CORVANE_REQUIRES(*accessQueue_);

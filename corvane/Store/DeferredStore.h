@@ -32,8 +32,10 @@ class DeferredStore {
     using Errors = DeferredStoreError;
 
     /// @param location the name of the database file; nothing for a database in memory.
-    explicit DeferredStore(std::optional<std::string> location)
-        : core_(DeferredStoreCore::make(Store<Entity>::table(), Entity::schemaVersion, std::move(location))) {}
+    /// @param durability what is stored survives that, once an operation has returned
+    explicit DeferredStore(std::optional<std::string> location, Durability durability = Durability::processKill)
+        : core_(DeferredStoreCore::make(Store<Entity>::table(), Entity::schemaVersion, std::move(location),
+                                        durability)) {}
     DeferredStore(const DeferredStore&) = delete;
     DeferredStore& operator=(const DeferredStore&) = delete;
 

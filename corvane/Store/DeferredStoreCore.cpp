@@ -55,10 +55,10 @@ std::shared_ptr<StoreConnection> fallBack(const StoreTable& table, const std::ex
 }
 
 std::shared_ptr<StoreConnection> openOrFallBack(const StoreTable& table, std::int64_t version,
-                                                const StoreLocation& location) {
+                                                const StoreLocation& location, Durability durability) {
     try {
         Log::shared().default_("Attempting to create store, tableName=%@", table.name());
-        auto connection = std::make_shared<StoreConnection>(location);
+        auto connection = std::make_shared<StoreConnection>(location, durability);
         openVersioned(connection, table, version);
         return connection;
     } catch (const std::exception& error) {
@@ -80,15 +80,15 @@ SerialQueue& DeferredStoreCore::queue() {
 }
 
 std::shared_ptr<DeferredStoreCore> DeferredStoreCore::make(const StoreTable& table, std::int64_t schemaVersion,
-                                                           std::optional<std::string> location) {
+                                                           std::optional<std::string> location, Durability durability) {
     std::shared_ptr<DeferredStoreCore> made(new DeferredStoreCore(table, schemaVersion));
     auto place = location ? StoreLocation::default_(*std::move(location)) : StoreLocation::memory();
-    queue().async([weak = std::weak_ptr(made), place = std::move(place)] {
+    queue().async([weak = std::weak_ptr(made), place = std::move(place), durability] {
         const auto core = weak.lock();
         if (!core) return;
         queue().assertCurrent("DeferredStoreCore::make");
         try {
-            core->connection_ = openOrFallBack(core->table_, core->schemaVersion_, place);
+            core->connection_ = openOrFallBack(core->table_, core->schemaVersion_, place, durability);
         } catch (const std::exception& error) {
             Log::shared().default_("Failed to create deferred store, error=%{public}@", error.what());
         }

@@ -39,7 +39,8 @@ class DeferredStoreCore {
     /// @param table must outlive the process's use of the core.
     /// @param location the name of the database file; nothing for memory.
     [[nodiscard]] static std::shared_ptr<DeferredStoreCore> make(const StoreTable& table, std::int64_t schemaVersion,
-                                                                 std::optional<std::string> location);
+                                                                 std::optional<std::string> location,
+                                                                 Durability durability = Durability::processKill);
 
     DeferredStoreCore(const DeferredStoreCore&) = delete;
     DeferredStoreCore& operator=(const DeferredStoreCore&) = delete;

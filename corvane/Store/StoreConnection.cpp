@@ -103,7 +103,8 @@ class StoreConnection::OnDemand {
     const bool wasOpen_;
 };
 
-StoreConnection::StoreConnection(StoreLocation location) : location_(std::move(location)) {
+StoreConnection::StoreConnection(StoreLocation location, Durability durability)
+    : location_(std::move(location)), durability_(durability) {
     open();
 }
 
@@ -139,7 +140,9 @@ void StoreConnection::open() {
     if (location_.isMemory()) return;
     opened_ = fileIdentity();
     applyPatience();
-    for (const char* pragma : {"PRAGMA journal_mode=WAL;", "PRAGMA synchronous=NORMAL;"}) {
+    const bool isSynced = durability_ == Durability::powerCut;
+    for (const char* pragma :
+         {"PRAGMA journal_mode=WAL;", isSynced ? "PRAGMA synchronous=FULL;" : "PRAGMA synchronous=NORMAL;"}) {
         if (sqlite3_exec(opened, pragma, nullptr, nullptr, nullptr) == SQLITE_BUSY) setPatient(false);
     }
 }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Platform/Durability.h>
 #include <corvane/Platform/FunctionRef.h>
 #include <corvane/Store/StoreError.h>
 #include <corvane/Store/StoreLocation.h>
@@ -26,7 +27,8 @@ namespace corvane {
 class StoreConnection {
   public:
     /// Opens the database. Throws what `open` throws.
-    explicit StoreConnection(StoreLocation location);
+    /// @param durability what a change survives that was done
+    explicit StoreConnection(StoreLocation location, Durability durability = Durability::processKill);
     StoreConnection(const StoreConnection&) = delete;
     StoreConnection& operator=(const StoreConnection&) = delete;
     ~StoreConnection();
@@ -85,6 +87,7 @@ class StoreConnection {
     const std::string& path();
 
     const StoreLocation location_;
+    const Durability durability_;
     std::string path_;
     std::unique_ptr<Handle> handle_;
     std::optional<FileIdentity> opened_;  // the file of the last opening

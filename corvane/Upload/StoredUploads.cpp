@@ -1,5 +1,6 @@
 #include <corvane/Upload/StoredUploads.h>
 
+#include <corvane/Platform/GZIPFile.h>
 #include <corvane/Platform/Log.h>
 
 #include <filesystem>
@@ -10,10 +11,13 @@ namespace corvane {
 
 namespace {
 
-// A payload never is; a file that lost its contents would be taken for delivered by a server that accepts anything.
-bool isEmpty(const std::filesystem::path& file) {
-    std::error_code failed;
-    return std::filesystem::file_size(file, failed) == 0 && !failed;
+// A file that lost its contents, all or some, would be taken for delivered by a server that accepts anything, and be
+// refused for good by one that does not.
+bool isDamaged(const std::filesystem::path& file) {
+    if (!isDamagedGZIPFile(file)) return false;
+    Log::shared().error("Payload is empty or damaged, as after a power cut, and is not sent, identifier=%{public}@",
+                        file.filename().string());
+    return true;
 }
 
 }  // namespace
@@ -148,7 +152,7 @@ void StoredUploads::dropExceeded(const SignedEntity& entity) {
 
 std::optional<PreparedUploadRequest> StoredUploads::preparedRequest(const SignedEntity& entity) {
     auto file = dropbox_->existingFile(entity.identifier);
-    if (file && !isEmpty(*file))
+    if (file && !isDamaged(*file))
         return PreparedUploadRequest{entity.identifier, entity.contentType, entity.userAgent, *std::move(file)};
     Log::shared().default_("Retry dropped for missing upload file, identifier=%{public}@", entity.identifier);
     try {

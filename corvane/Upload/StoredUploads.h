@@ -64,7 +64,7 @@ class StoredUploads : public std::enable_shared_from_this<StoredUploads> {
     [[nodiscard]] std::optional<PreparedUploadRequest> retryRequest(const SignedEntity& entity);
     /// Deletes the row and the file of an upload that was retried too often.
     void dropExceeded(const SignedEntity& entity);
-    /// The row's request, or nothing when its payload file has gone or is empty; the row is then deleted.
+    /// The row's request, or nothing when its payload file has gone or is damaged; the row is then deleted.
     [[nodiscard]] std::optional<PreparedUploadRequest> preparedRequest(const SignedEntity& entity);
     void giveUp(const std::string& identifier, DeliveryUpdate::Reason reason);
 

@@ -76,6 +76,16 @@ std::filesystem::path UploadDropbox::write(std::string_view identifier, std::str
     return payload;
 }
 
+void UploadDropbox::sync(std::string_view identifier) {
+    const auto payload = file(baseURL(), identifier);
+    try {
+        syncFile(payload);
+    } catch (...) {
+        ::unlink(payload.c_str());  // what a disk has lost once it may have lost for good
+        throw;
+    }
+}
+
 void UploadDropbox::finish(std::string_view identifier, const std::optional<UploadResponse>& response) {
     const auto payload = file(baseURL(), identifier);
     if (::unlink(payload.c_str()) != 0) throw SystemError("remove file " + payload.string(), errno);

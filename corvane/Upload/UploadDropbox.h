@@ -54,6 +54,7 @@ class UploadDropbox final : public UploadDropboxType {
     /// With debugging, a copy of the document that cannot be written is an error too, and leaves no payload.
     std::filesystem::path write(std::string_view identifier, std::string_view data,
                                 const ResourceType& resource) override;
+    void sync(std::string_view identifier) override;
     void finish(std::string_view identifier, const std::optional<UploadResponse>& response) override;
     /// Of names that are UUIDs, as those of the library's own documents are: anything else may be somebody else's file.
     [[nodiscard]] std::vector<std::string> abandonedPayloads(const std::set<std::string>& recorded) override;

@@ -23,6 +23,10 @@ class UploadDropboxType {
     virtual std::filesystem::path write(std::string_view identifier, std::string_view data,
                                         const ResourceType& resource) = 0;
 
+    /// Waits until the payload survives a power cut. Throws when that cannot be had; the payload is gone then. Does
+    /// nothing where payloads are in no files, as here.
+    virtual void sync(std::string_view /*identifier*/) {}
+
     /// Removes the payload of an upload that is over; `response` is what the collector answered, nothing when it was
     /// given up. Throws when there is no such file or it cannot be removed.
     virtual void finish(std::string_view identifier, const std::optional<UploadResponse>& response) = 0;

@@ -147,6 +147,7 @@ UploadTaken UploadManager::uploadOnQueue(const UploadRequest& request) {
     const auto json = resource.jsonObject();
     const auto body = json.isObject() ? gzipCompressed(json.text()) : gzipCompressed(json.toData());
     auto file = dropbox_->write(identifier, body, resource);
+    if (request.durability == Durability::powerCut) dropbox_->sync(identifier);
     const auto entity = newEntity(request, std::move(identifier));
     const auto taken = record(entity, static_cast<std::int64_t>(body.size()), request);
     if (taken == UploadTaken::forgotten) {

@@ -34,7 +34,7 @@ namespace corvane {
 /// One per batching processor, which owns it; the service holds it weakly as its delegate, and what ends after it has
 /// gone is found by the next manager. Rows and files outlive the process. An upload that ends with a retry stays, and
 /// goes out again when a manager for its endpoint is next opened, a portion at a time; one that was retried more than
-/// four times, or whose file has gone or lost its contents, is dropped then. With a retry delay it goes out again in
+/// four times, or whose file has gone or lost of its contents, is dropped then. With a retry delay it goes out again in
 /// the same run, too, of which its row counts one retry at most.
 ///
 /// `open` and `upload` run on the manager's own queue, in the caller's time, and use the deferred store from there;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <corvane/Models/Client.h>
+#include <corvane/Platform/Durability.h>
 #include <corvane/Upload/ResourceType.h>
 
 #include <cstdint>
@@ -24,6 +25,8 @@ struct UploadRequest {
     std::shared_ptr<const ResourceType> resource;  ///< never null
     std::int64_t events = 0;                       ///< in the document
     std::int64_t epoch = 0;                        ///< in which they were recorded: see `RecordingSwitch`
+    /// What the payload must survive from the moment at which the backup goes: what the backup survives by then.
+    Durability durability = Durability::processKill;
     /// Called at most once, on the queue of the deferred stores, inside the transaction that has written the document's
     /// row on the connection that it is given. Must not throw. May be empty.
     std::function<void(const std::shared_ptr<StoreConnection>&)> removeBackup = {};

@@ -178,6 +178,7 @@ TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {
     const std::pair<const char*, std::string> cases[] = {
         {"garbage", std::string(1000, 'x')},
         {"cut off", good.encoded().substr(0, 90)},
+        {"damaged", good.encoded().replace(good.encoded().find("tmp/x"), 3, "pmt")},
         {"too long", good.encoded() + std::string(TransferSubmission::longest, 'x')},
         {"another task's", other.encoded()},
         {"another owner's", foreign.encoded()},

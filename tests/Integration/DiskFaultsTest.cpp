@@ -313,6 +313,8 @@ TEST_F(DiskFaults, APayloadThatIsNotWhatItWasEndsItsDocumentAlone) {
     } cases[] = {
         {"missing", [](const Path& first, const Path&) { std::filesystem::remove(first); }, oneLost, 1},
         {"empty", [](const Path& first, const Path&) { std::filesystem::resize_file(first, 0); }, oneLost, 1},
+        {"torn", [](const Path& first, const Path&) { std::filesystem::resize_file(first, 100); }, oneLost, 1},
+        {"zeros", [](const Path& first, const Path&) { writeFile(first, std::string(100, '\0')); }, oneLost, 1},
         {"swapped", swap, bothArrive, 2},
     };
     for (const auto& one : cases) {
@@ -333,7 +335,8 @@ TEST_F(DiskFaults, APayloadThatIsNotWhatItWasEndsItsDocumentAlone) {
         EXPECT_TRUE(rows().empty());
         EXPECT_TRUE(payloads().empty());
     }
-    EXPECT_EQ(log.count("Retry dropped for missing upload file, identifier="), 2);
+    EXPECT_EQ(log.count("Retry dropped for missing upload file, identifier="), 4);
+    EXPECT_EQ(log.count("Payload is empty or damaged"), 3);
 }
 
 }  // namespace

@@ -1,6 +1,6 @@
 // The host that scripts/check-steps kills.
 //
-//   kill_host URL DIRECTORY AGENT MODE
+//   kill_host URL DIRECTORY AGENT MODE ["powerCut"]
 //
 // AGENT is the transfer agent's program, or "-" for transfers inside the process. MODE:
 //
@@ -8,6 +8,8 @@
 //   record   records 12 events, each behind the one before, ends the session, and waits until each document has an
 //   outcome forget   records 7 events, forgets them, and records 3 behind that; then as "record" collect  records one
 //   event; then as "record", and waits until what was to be forgotten is
+//   pauses   records 7 events, waits until the disk's last moments are over, says "later", records 7 more and does the
+//            same; then as "record"
 //
 // Writes to standard output a line for each event that was acknowledged, "before ID" or "after ID" by whether
 // forgetting is to drop it, "forgotten" when that has succeeded, and at the end "unaccounted N", as the ledger has it.
@@ -71,7 +73,7 @@ TransferSession::Factory transfers(const std::string& agent, const std::string& 
 }  // namespace
 
 int main(int argc, char** argv) {
-    if (argc != 5) return 2;
+    if (argc < 5) return 2;
     const std::string mode = argv[4];
     DocumentsDirectory::set(argv[2]);
     Log::shared().setSink([](LogLevel level, std::string_view message) {
@@ -79,8 +81,15 @@ int main(int argc, char** argv) {
             dprintf(STDERR_FILENO, "%.*s\n", static_cast<int>(message.size()), message.data());
     });
     TransferSession::setFactory(transfers(argv[3], argv[2]));
-    Application application(argv[1], 5);
+    UploadBatchEventOptions options{.batchSize = 5};
+    if (argc > 5) options.durability = Durability::powerCut;
+    Application application(argv[1], UploadBatchEventConfig(options));
     if (mode == "record") submit(application, 12, "before", true);
+    for (int i = 0; i < 2 && mode == "pauses"; ++i) {
+        submit(application, 7, "before", true);
+        std::this_thread::sleep_for(1200ms);
+        say("later");
+    }
     if (mode == "leave" || mode == "forget") submit(application, 7, "before");
     if (mode == "leave") pause();
     if (mode == "forget") {

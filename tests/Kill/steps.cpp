@@ -9,12 +9,17 @@
 // STEPS_MARK   made when the step was reached, which is once in all processes together
 // STEPS_WORLD  a file of four numbers of 64 bits, which may change at any time: how many seconds the wall clock is off;
 //              1 while the disk is full; after how many steps a host is killed, and an agent (0: never)
+// STEPS_DISK   instead: each effect on a file is written to this file, with its data and in order, and each line on
+//              standard output, so that scripts/check-power can make what a disk may hold after a power cut. A record:
+//              call, node, number (offset or size) and the size of what follows in a line, then that: data or a path
 
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <signal.h>
+#include <sys/file.h>
 #include <sys/mman.h>
 #include <sys/socket.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 #include <sys/uio.h>
 #include <sys/un.h>
@@ -27,6 +32,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <ctime>
+#include <string>
 #include <string_view>
 
 namespace {
@@ -38,19 +44,19 @@ struct Kind {
 // The first one that fits.
 constexpr Kind kinds[] = {{"server", ""},
                           {"agent", "agent.socket"},
+                          {"shm", ".db-shm"},
                           {"journal-wal", "journal.db-wal"},
                           {"journal", "journal.db"},
                           {"lock", "agent.lock"},
                           {"spool", "/spool/"},
                           {"withdrawn", "/withdrawn/"},
                           {"payload", ".upload-dropbox/"},
-                          {"shm", ".db-shm"},
                           {"wal", ".db-wal"},
                           {"database", ".db"},
                           {"key", "signing-key"},
                           {"recording", ".recording"},
                           {"other", ""}};
-constexpr int kindCount = sizeof kinds / sizeof *kinds, server = 0, agent = 1, none = -1;
+constexpr int kindCount = sizeof kinds / sizeof *kinds, server = 0, agent = 1, sharedMemory = 2, none = -1;
 
 // NOLINTNEXTLINE(concurrency-mt-unsafe): nobody changes the environment before main
 const char* setting(const char* name) {
@@ -76,6 +82,7 @@ struct Plan {
     const char* what = setting("STEPS_DO");
     const char* mark = setting("STEPS_MARK");
     World* world = World::at(setting("STEPS_WORLD"));
+    const char* disk = setting("STEPS_DISK");
     const char* program = "host";
     Plan() {
         char path[4096] = {};
@@ -166,9 +173,54 @@ ssize_t dated(int file, ssize_t written) {
     return written;
 }
 
+/// What a call is about, as far as a disk is concerned.
+struct Subject {
+    int file = -1;
+    const char* path = nullptr;
+    const char* from = nullptr;
+    const void* data = nullptr;
+    off64_t number = -1;
+    bool isOpening = false;
+};
+
+long nodeOf(const Subject& subject, int opened) {
+    const int file = subject.isOpening ? opened : subject.file;
+    struct stat status {};
+    const int failed = file >= 0 ? fstat(file, &status) : lstat(subject.path, &status);
+    return failed != 0 ? 0 : static_cast<long>(status.st_ino);
+}
+
+/// Writes the effect down. The record of effects is locked over both: theirs is one order, in all threads and
+/// processes.
+template <class Act>
+auto recorded(const char* call, const Subject& subject, const Act& act) -> decltype(act(false)) {
+    const int trace =
+        static_cast<int>(syscall(SYS_openat, AT_FDCWD, plan().disk, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0600));
+    while (flock(trace, LOCK_EX) != 0) continue;
+    const bool isNew = subject.isOpening && nodeOf(subject, -1) == 0;
+    const auto result = act(false);
+    const int error = errno;
+    if (result >= 0 && (!subject.isOpening || isNew)) {
+        std::string more = subject.path ? subject.path : "";
+        if (subject.from) more.append(1, '\0').append(subject.from);
+        if (subject.data) more.assign(static_cast<const char*>(subject.data), static_cast<std::size_t>(result));
+        const auto number =
+            subject.data && subject.number < 0 ? lseek64(subject.file, 0, SEEK_CUR) - result : subject.number;
+        const auto head = std::to_string(nodeOf(subject, static_cast<int>(result))) + ' ' + std::to_string(number);
+        const auto record = std::string(call) + ' ' + head + ' ' + std::to_string(more.size()) + '\n' + more;
+        syscall(SYS_write, trace, record.data(), record.size());
+    }
+    syscall(SYS_close, trace);
+    errno = error;
+    return result;
+}
+
 /// Does what `act` does, unless something else was chosen for this step. `act` is told whether to do half of it only.
 template <class Act>
-auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, const Act& act) -> decltype(act(false)) {
+auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, const Subject& subject, const Act& act)
+    -> decltype(act(false)) {
+    const bool isSaid = subject.file == STDOUT_FILENO && subject.data;
+    if (plan().disk && (isSaid || kind > sharedMemory)) return recorded(call, subject, act);
     if (kind == none) return act(false);
     const int error = errno;
     char step[128];
@@ -188,19 +240,21 @@ auto effect(std::atomic<int> (&counts)[kindCount], const char* call, int kind, c
 
 }  // namespace
 
-// The function that would have been called, and the steps of this call.
-#define STEP(call, kind, act)                                                              \
+// The function that would have been called, and the steps of this call. Behind the act: the members of its subject.
+#define STEP(call, kind, act, ...)                                                         \
     static const auto real = reinterpret_cast<decltype(&::call)>(dlsym(RTLD_NEXT, #call)); \
     static std::atomic<int> counts[kindCount];                                             \
-    return effect(counts, #call, kind, [&]([[maybe_unused]] bool half) { return act; })
+    return effect(counts, #call, kind, Subject{__VA_ARGS__}, [&]([[maybe_unused]] bool half) { return act; })
 
 extern "C" {
 
 ssize_t write(int file, const void* bytes, size_t size) {
-    STEP(write, kindOf(file), dated(file, real(file, bytes, half ? (size + 1) / 2 : size)));
+    STEP(write, kindOf(file), dated(file, real(file, bytes, half ? (size + 1) / 2 : size)), .file = file,
+         .data = bytes);
 }
 ssize_t pwrite64(int file, const void* bytes, size_t size, off64_t offset) {
-    STEP(pwrite64, kindOf(file), real(file, bytes, half ? (size + 1) / 2 : size, offset));
+    STEP(pwrite64, kindOf(file), real(file, bytes, half ? (size + 1) / 2 : size, offset), .file = file, .data = bytes,
+         .number = offset);
 }
 ssize_t writev(int file, const iovec* parts, int count) {
     STEP(writev, kindOf(file), real(file, parts, half ? (count + 1) / 2 : count));
@@ -215,31 +269,31 @@ ssize_t sendmsg(int socket, const msghdr* message, int flags) {
     STEP(sendmsg, kindOf(socket), real(socket, message, flags));
 }
 int fsync(int file) {
-    STEP(fsync, kindOf(file), real(file));
+    STEP(fsync, kindOf(file), real(file), .file = file);
 }
 int fdatasync(int file) {
-    STEP(fdatasync, kindOf(file), real(file));
+    STEP(fdatasync, kindOf(file), real(file), .file = file);
 }
 int ftruncate64(int file, off64_t size) noexcept {
-    STEP(ftruncate64, kindOf(file), real(file, size));
+    STEP(ftruncate64, kindOf(file), real(file, size), .file = file, .number = size);
 }
 int ftruncate(int file, off_t size) noexcept {
-    STEP(ftruncate, kindOf(file), real(file, size));
+    STEP(ftruncate, kindOf(file), real(file, size), .file = file, .number = size);
 }
 int rename(const char* from, const char* to) noexcept {
-    STEP(rename, kindOf(to), real(from, to));
+    STEP(rename, kindOf(to), real(from, to), .path = to, .from = from);
 }
 int link(const char* from, const char* to) noexcept {
-    STEP(link, kindOf(to), real(from, to));
+    STEP(link, kindOf(to), real(from, to), .path = to, .from = from);
 }
 int unlink(const char* file) noexcept {
-    STEP(unlink, kindOf(file), real(file));
+    STEP(unlink, kindOf(file), real(file), .path = file);
 }
 int remove(const char* file) noexcept {
-    STEP(remove, kindOf(file), real(file));
+    STEP(remove, kindOf(file), real(file), .path = file);
 }
 int mkdir(const char* directory, mode_t mode) noexcept {
-    STEP(mkdir, kindOf(directory), real(directory, mode));
+    STEP(mkdir, kindOf(directory), real(directory, mode), .path = directory);
 }
 int bind(int socket, const sockaddr* address, socklen_t size) noexcept {
     const bool isAgent = address->sa_family == AF_UNIX && plan().root;
@@ -259,14 +313,15 @@ int open(const char* file, int flags, ...) {
     va_start(more, flags);
     const auto mode = (flags & O_CREAT) != 0 ? va_arg(more, mode_t) : mode_t{};
     va_end(more);
-    STEP(open, (flags & O_CREAT) != 0 ? kindOf(file) : none, real(file, flags, mode));
+    STEP(open, (flags & O_CREAT) != 0 ? kindOf(file) : none, real(file, flags, mode), .path = file, .isOpening = true);
 }
 int open64(const char* file, int flags, ...) {
     va_list more;
     va_start(more, flags);
     const auto mode = (flags & O_CREAT) != 0 ? va_arg(more, mode_t) : mode_t{};
     va_end(more);
-    STEP(open64, (flags & O_CREAT) != 0 ? kindOf(file) : none, real(file, flags, mode));
+    STEP(open64, (flags & O_CREAT) != 0 ? kindOf(file) : none, real(file, flags, mode), .path = file,
+         .isOpening = true);
 }
 
 }  // extern "C"

@@ -2,6 +2,7 @@
 #include <corvane/Platform/DocumentsDirectory.h>
 #include <corvane/Platform/PrivateFile.h>
 #include <corvane/Platform/RecordingSwitch.h>
+#include <corvane/Store/DeferredStoreCore.h>
 
 #include "tests/support/TrackingFixture.h"
 
@@ -27,6 +28,10 @@ class Recording : public ::testing::Test {
         sessions.start(Session::Kind::userEvents());
         processor->settle();
     }
+
+    ~Recording() override {
+        DeferredStoreCore::queue().sync([] {});
+    }  // choices that nobody waited for
 
     /// Waits until the choice is on disk; returns why it is not.
     std::string choose(bool isOn) {

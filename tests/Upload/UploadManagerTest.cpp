@@ -207,7 +207,7 @@ TEST(UploadManager, SendsWhatIsStoredAPortionAtATimeAndEachOnce) {
     std::vector<std::string> sent;
     for (std::size_t i = 0; i < all; ++i) {
         run.insert(row(name(i), i % 7 ? 0 : 9));  // every seventh is dropped
-        run.dropbox->write(name(i), "x", TextResource(name(i)));
+        run.dropbox->write(name(i), gzipCompressed("x"), TextResource(name(i)));
         if (i % 7 && i + 1 != all) sent.push_back(name(i));
     }
     run.manager->open();
@@ -271,7 +271,7 @@ TEST(UploadManager, GivesNothingUpHoweverOftenItIsSentAgainInOneRun) {
     const CapturedLog log;
     ProcessRun run("main", 1s);
     run.insert(row("I", StoredUploads::maximumRetries));
-    run.dropbox->write("I", "x", TextResource("I"));
+    run.dropbox->write("I", gzipCompressed("x"), TextResource("I"));
     for (const auto* name : {"I", "another's", "no payload"}) run.ledger->add(name, 1);
     for (const auto* name : {"no payload", "another's"}) run.insert(row(name, 0));
     for (const auto* name : {"I", "another's"}) run.retry(name, {}, DeliveryUpdate::Reason::unreachable);

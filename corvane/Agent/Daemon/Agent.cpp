@@ -2,7 +2,9 @@
 
 #include <corvane/Agent/Daemon/WakeUp.h>
 #include <corvane/Agent/Daemon/WallClock.h>
+#include <corvane/Platform/GZIPFile.h>
 #include <corvane/Platform/PrivateFile.h>
+#include <corvane/Transfer/TransferError.h>
 
 #include <poll.h>
 #include <unistd.h>
@@ -23,6 +25,16 @@ using namespace std::chrono_literals;
 constexpr auto beforeAcceptingAgain = 100ms;
 constexpr auto beforeSettlingAgain = 100ms;
 constexpr auto longestSettleDelay = std::chrono::milliseconds(10s);
+
+// The journal may have outlived a power cut that the body has not.
+void checkBody(const TransferSubmission& submission) {
+    const auto& headers = submission.request.headers;
+    const bool isPacked = std::any_of(headers.begin(), headers.end(), [](const auto& header) {
+        return header.first == "Content-Encoding" && header.second == "gzip";
+    });
+    if (!isPacked || !isDamagedGZIPFile(submission.bodyPath)) return;
+    throw TransferError(TransferError::Code::bodyUnavailable, submission.bodyPath + " is damaged");
+}
 
 }  // namespace
 
@@ -111,6 +123,7 @@ std::optional<HTTPTransfer> Agent::transfer(std::int64_t number) {
         return std::nullopt;
     }
     TransferSubmission submission = book_.submission(number);
+    if (intake_.isEarlier(number)) checkBody(submission);
     HTTPTransfer transfer;
     transfer.request = std::move(submission.request);
     transfer.bodyPath = std::move(submission.bodyPath);

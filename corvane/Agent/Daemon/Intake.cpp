@@ -9,22 +9,28 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <exception>
 
 namespace corvane::transferd {
 
 void Intake::load() {
-    book_.load([this](std::int64_t number, const TransferSubmission& submission) { enqueue(number, submission); });
+    book_.load([this](std::int64_t number, const TransferSubmission& submission) {
+        lastEarlier_ = number;  // in the order in which they were accepted
+        enqueue(number, submission);
+    });
 }
 
 void Intake::acceptSpooled() {
     for (const auto& token : directory_.spooled()) {
         try {
-            accept(token);
+            const auto number = accept(token);
+            if (isFirstLook_) lastEarlier_ = std::max(lastEarlier_, number);
         } catch (const std::exception&) {
         }
     }
+    isFirstLook_ = false;
 }
 
 // Removes the submission once the journal has it, or once it is clear that it never will.

@@ -28,6 +28,9 @@ class Intake {
     /// `SystemError` when it cannot be had or kept now.
     std::int64_t accept(const std::string& token);
 
+    /// Whether a task may be older than this agent: the machine may have lost its power since.
+    [[nodiscard]] bool isEarlier(std::int64_t number) const { return number <= lastEarlier_; }
+
     /// There may be something new in the spool, or among the marks.
     void noteChange() { isChanged_ = true; }
     [[nodiscard]] bool isChanged() const { return isChanged_; }
@@ -43,6 +46,8 @@ class Intake {
     TaskBook& book_;
     UploadQueue& queue_;
     bool isChanged_ = true;
+    bool isFirstLook_ = true;
+    std::int64_t lastEarlier_ = 0;
 };
 
 }  // namespace corvane::transferd
