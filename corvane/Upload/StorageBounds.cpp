@@ -130,7 +130,7 @@ const UploadRows::Oldest* StorageBounds::oldestIfNeeded(std::int64_t bytes) {
 }
 
 bool StorageBounds::isTooOld(const UploadRows::Oldest& document) const {
-    return limits_.maximumAge && now() - document.created > *limits_.maximumAge;
+    return limits_.maximumAge && millisecondsBetween(document.created, now()) > limits_.maximumAge->count();
 }
 
 std::size_t StorageBounds::countBeingWithdrawn() {
