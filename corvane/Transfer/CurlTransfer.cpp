@@ -211,6 +211,9 @@ std::optional<AnyError> CurlTransfer::error(int curlCode) const {
     if (curlCode == CURLE_OK && isProxyRefusal()) {
         return AnyError(TransferError(Code::blocked, "the proxy wants to know who asks (407)"));
     }
+    if (curlCode == CURLE_OK && !headComplete_) {  // which is no failure to every libcurl
+        return AnyError(TransferError(Code::network, "the connection ended inside the head of the answer"));
+    }
     if (curlCode == CURLE_OK || capReached_) return std::nullopt;
     if (!bodyProblem_.empty()) return AnyError(TransferError(Code::bodyUnavailable, bodyProblem_));
     if (curlCode == CURLE_OPERATION_TIMEDOUT) return timeoutError();
