@@ -35,7 +35,6 @@ HTTPTransfer request() {
 
 /// Sends to nobody, and has the answer come in packets of at most `piece` bytes before the connection ends.
 TransferOutcome outcome(std::string_view answer, std::size_t piece) {
-    static CurlTransfer::Easy spare;
     int pair[2];
     CORVANE_REQUIRE(socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, pair) == 0, "no sockets");
     const Descriptor server(pair[1]);
@@ -43,7 +42,7 @@ TransferOutcome outcome(std::string_view answer, std::size_t piece) {
         if (send(server.get(), answer.data(), std::min(piece, answer.size()), MSG_NOSIGNAL | MSG_DONTWAIT) < 0) break;
     }
     shutdown(server.get(), SHUT_WR);
-    CurlTransfer transfer(request(), std::move(spare));
+    CurlTransfer transfer(request());
     const curl_opensocket_callback open = [](void* pair, curlsocktype, curl_sockaddr*) {
         return *static_cast<int*>(pair);
     };
@@ -52,9 +51,7 @@ TransferOutcome outcome(std::string_view answer, std::size_t piece) {
     curl_easy_setopt(transfer.handle(), CURLOPT_FORBID_REUSE, 1L);
     const int code = curl_easy_perform(transfer.handle());
     transfer.update(CurlTransfer::Clock::now());
-    TransferOutcome ended{transfer.error(code), transfer.response()};
-    spare = transfer.takeHandle();
-    return ended;
+    return {transfer.error(code), transfer.response()};
 }
 
 void checkResponse(UploadResponse response) {

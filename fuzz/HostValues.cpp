@@ -48,7 +48,7 @@ HostValue::Dictionary makeDictionary(FuzzedDataProvider& in, int depth) {
 }
 
 HostValue make(FuzzedDataProvider& in, int depth) {
-    switch (depth > 300 ? 0 : in.ConsumeIntegralInRange(0, 11)) {
+    switch (depth > 300 ? 0 : in.ConsumeIntegralInRange(0, 9)) {
         case 1:
             return in.ConsumeBool();
         case 2:
@@ -75,12 +75,6 @@ HostValue make(FuzzedDataProvider& in, int depth) {
             const auto object = std::make_shared<Object>(make(in, depth + 1), behaviour);
             if (in.ConsumeBool()) return HostValue(std::shared_ptr<BridgedDataEventType>(object));
             return HostValue(std::shared_ptr<BridgedDataType>(object));
-        }
-        case 10: {  // deeper than anything that may be written
-            HostValue value = make(in, depth + 1);
-            for (int levels = in.ConsumeIntegralInRange(100, 140); levels > 0; --levels)
-                value = HostValue::Array{value};
-            return value;
         }
         default:
             return nullptr;

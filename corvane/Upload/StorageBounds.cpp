@@ -98,7 +98,10 @@ StorageBounds::Excess StorageBounds::excess() {
         addedSince_ = 0;
     }
     auto bytes = book_->bytesOnDisk() - bytesBeingWithdrawn();
-    while (const auto* oldest = oldestIfNeeded(bytes)) {
+    bool isGettingOn = true;  // since the oldest were looked up: what was found here comes up again, as do damaged rows
+    while (!oldest_.empty() || std::exchange(isGettingOn, false)) {
+        const auto* oldest = oldestIfNeeded(bytes);
+        if (!oldest) break;
         if (excess.documents.size() == portion) {
             excess.isComplete = false;
             break;
@@ -107,7 +110,9 @@ StorageBounds::Excess StorageBounds::excess() {
         if (!isTooOld && bytes <= limits_.maximumBytes) break;
         const auto document = *oldest;
         oldest_.pop_front();
-        if (isWithdrawn(document.identifier) || !rows_->find(document.identifier)) continue;  // gone meanwhile
+        if (excess.documents.contains(document.identifier) || isWithdrawn(document.identifier)) continue;
+        if (!isStored(document.identifier)) continue;  // gone meanwhile
+        isGettingOn = true;
         if (bytes > limits_.maximumBytes) logBound(bytes);
         const auto size = sizeOf(document);
         bytes -= size;
@@ -115,6 +120,17 @@ StorageBounds::Excess StorageBounds::excess() {
                                  Withdrawn{isTooOld ? Reason::tooOld : Reason::noRoom, size, size - document.bytes});
     }
     return excess;
+}
+
+// A row that cannot be read takes room, too, and goes in its turn; a name that no statement can hold is nobody's.
+bool StorageBounds::isStored(const std::string& identifier) {
+    try {
+        return rows_->find(identifier).has_value();
+    } catch (const StoreStepperError&) {
+        return true;
+    } catch (const InvalidArgument&) {
+        return false;
+    }
 }
 
 // Looked up many at a time: at the bound every new document asks for the oldest.

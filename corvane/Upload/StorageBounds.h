@@ -76,6 +76,7 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
     [[nodiscard]] Excess excess() CORVANE_REQUIRES(*queue_);
     /// The oldest stored document, if it matters with so many bytes stored.
     [[nodiscard]] const UploadRows::Oldest* oldestIfNeeded(std::int64_t bytes) CORVANE_REQUIRES(*queue_);
+    [[nodiscard]] bool isStored(const std::string& identifier);
     [[nodiscard]] bool isTooOld(const UploadRows::Oldest& document) const;
     [[nodiscard]] std::size_t countBeingWithdrawn();
     [[nodiscard]] std::int64_t bytesBeingWithdrawn();
