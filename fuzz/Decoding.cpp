@@ -5,41 +5,34 @@
 
 #include "fuzz/FuzzTarget.h"
 
-#include <chrono>
 #include <map>
 #include <set>
-#include <vector>
 
 namespace corvane::fuzz {
 
-namespace decoding {
-
 enum class Level : std::int8_t { low, high };
 enum class Word { one, two };
-std::string_view toText(Word word) {
+static std::string_view toText(Word word) {
     return word == Word::one ? "one" : "two";
 }
-bool fromText(std::string_view text, Word& word) {
+static bool fromText(std::string_view text, Word& word) {
     word = text == "one" ? Word::one : Word::two;
     return text == toText(word);
 }
 
 struct Numbers {
     std::optional<std::int8_t> a;
-    std::optional<std::uint16_t> b;
-    std::optional<std::int64_t> c;
-    std::optional<std::uint64_t> d;
-    std::optional<float> e;
-    std::optional<double> f;
-    std::optional<bool> g;
+    std::optional<std::uint64_t> b;
+    std::optional<float> c;
+    std::optional<double> d;
+    std::optional<bool> e;
 };
 struct Times {
     std::optional<Date> a;
     std::optional<std::chrono::sys_time<std::chrono::days>> b;
     std::optional<std::chrono::nanoseconds> c;
     std::optional<std::chrono::duration<std::int16_t>> d;
-    std::optional<std::chrono::duration<double>> e;
-    std::optional<std::chrono::duration<float, std::nano>> f;
+    std::optional<std::chrono::duration<float, std::nano>> e;
 };
 struct Everything {
     std::optional<Numbers> numbers;
@@ -47,44 +40,36 @@ struct Everything {
     std::map<std::string, std::vector<std::optional<Level>>> levels;
     std::optional<std::set<Word>> words;
     std::optional<std::u8string> text;
-    std::optional<std::vector<TimedData>> spans;
+    std::optional<TimedData> span;
     std::optional<JSON> any;
 };
 
-}  // namespace decoding
-
 template <class T>
-void check(const JSON& json) {
+static void check(const JSON& json) {
     std::optional<T> value;
     try {
         value = decode<T>(json);
     } catch (const DecodingError& error) {
-        CORVANE_REQUIRE(std::string_view(error.what()).size() > 5, "an error says nothing");
+        CORVANE_REQUIRE(*error.what(), "an error says nothing");
         return;
     }
     const JSON made = encoded(*value);
     const auto& text = made.text();
-    CORVANE_REQUIRE(JSON(text).exists() && jsontext::isUTF8(text), "what was decoded encodes as no JSON");
     CORVANE_REQUIRE(encoded(decode<T>(made)).text() == text, "what was encoded decodes as something else");
     CORVANE_REQUIRE(encoded(decode<T>(JSON(text))).text() == text, "what was written reads as something else");
 }
 
 }  // namespace corvane::fuzz
 
-using namespace corvane;
-using namespace corvane::fuzz;
-using namespace corvane::fuzz::decoding;
-
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+    using namespace corvane;
     const auto text = fuzz::textOf(data, size);
-    const JSON json(text);
-    if (jsontext::nesting(json.text()) >= jsontext::maximumDepth) return 0;  // decodes, and is too deep to be encoded
-    for (const JSON& one : {json, JSON::fromEncodedText(std::string(text))}) {
-        check<Everything>(one);
-        check<Numbers>(one);
-        check<Times>(one);
-        check<std::map<std::string, JSON>>(one);
-        check<std::vector<std::optional<double>>>(one);
+    for (const JSON& json : {JSON(text), JSON::fromEncodedText(std::string(text))}) {
+        // What is deeper decodes, but cannot be encoded.
+        if (!json.exists() || jsontext::nesting(json.text()) >= jsontext::maximumDepth) return 0;
+        fuzz::check<fuzz::Everything>(json);
+        fuzz::check<std::map<std::string, JSON>>(json);
+        fuzz::check<std::vector<std::optional<double>>>(json);
     }
     return 0;
 }

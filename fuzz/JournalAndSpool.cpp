@@ -1,26 +1,20 @@
 // The files in which an agent finds its tasks: any rows or bytes in the journal, any submissions in the spool.
 
 #include <corvane/Agent/Daemon/Intake.h>
-#include <corvane/Agent/Daemon/JournalError.h>
 #include <corvane/Agent/OutcomeCodec.h>
 #include <corvane/Testing/TemporaryDocuments.h>
 
 #include "fuzz/FuzzTarget.h"
-#include "fuzz/Rows.h"
 #include "tests/support/Files.h"
 
 #include <sqlite3.h>
 
-#include <array>
-#include <map>
-#include <set>
-
-namespace {
-
 using namespace corvane;
 using namespace corvane::transferd;
 
-const std::string markedToken = "FFFFFFFFFFFFFFFF-0000-0000-000000000";
+namespace {
+
+const std::string marked = "FFFFFFFFFFFFFFFF-0000-0000-000000000";
 
 /// An agent without its transfers: what it makes of its files at a start.
 struct Start final : UploadQueue::Source {
@@ -32,32 +26,29 @@ struct Start final : UploadQueue::Source {
     std::optional<HTTPTransfer> transfer(std::int64_t) override { return std::nullopt; }
     bool mayWait(std::int64_t) override { return false; }
     void troubleChanged(const UploadQueue::Trouble&, const std::vector<std::int64_t>&) override {}
-
+    /// What is told of every task, and how it may end.
+    void endAll() {
+        static_cast<void>(book.withBodiesGoneBeneath("/"));
+        queue.proceed(UploadQueue::Clock::now());
+        for (auto& [name, owner] : book.owners()) {
+            for (const auto number : std::set(owner.open)) {
+                static_cast<void>(book.submission(number).encoded());
+                book.complete(number, {std::nullopt, TransferResponse{}});
+            }
+            for (const auto& [number, client] : std::map(owner.over)) {
+                static_cast<void>(decodeOutcome(book.outcome(number)));
+                book.describe(number, book.description(number).value_or("text"));
+                if (number % 2 == 0) book.forget(number);
+            }
+            book.setWakeCommand(owner, {"wake"}, 1);
+        }
+        CORVANE_REQUIRE(book.settle() || journal.isDamaged(), "the journal does not take what has ended");
+    }
     std::string problem;
     Journal journal;
     TaskBook book{journal};
     UploadQueue queue{*this, std::chrono::milliseconds(1)};
 };
-
-/// What is told of every task, and how it may end.
-void endAll(Start& agent, const AgentDirectory& directory) {
-    static_cast<void>(agent.book.withBodiesGoneBeneath(directory.path()));
-    agent.queue.proceed(UploadQueue::Clock::now());
-    for (auto& [name, owner] : agent.book.owners()) {
-        for (const auto number : std::set(owner.open)) {
-            static_cast<void>(agent.book.submission(number).encoded());
-            agent.book.complete(number, {std::nullopt, TransferResponse{}});
-        }
-        for (const auto& [number, client] : std::map(owner.over)) {
-            static_cast<void>(agent.book.description(number));
-            static_cast<void>(decodeOutcome(agent.book.outcome(number)));
-            agent.book.describe(number, "text");
-            if (number % 2 == 0) agent.book.forget(number);
-        }
-        agent.book.setWakeCommand(owner, {"wake"}, 1);
-    }
-    CORVANE_REQUIRE(agent.book.settle() || agent.journal.isDamaged(), "the journal does not take what has ended");
-}
 
 TransferSubmission submission(const std::string& token) {
     TransferSubmission made;
@@ -65,14 +56,7 @@ TransferSubmission submission(const std::string& token) {
     made.session = made.owner = "s";
     made.request.url = "http://127.0.0.1/";
     made.bodyPath = "/body";
-    made.wakeCommand = {"a", "b"};
     return made;
-}
-
-std::string literal(std::string_view bytes) {
-    std::string text = "x'";
-    appendHexDigits(text, bytes);
-    return text + "'";
 }
 
 /// Runs statements, as far as the database lets them.
@@ -83,7 +67,7 @@ void run(const std::filesystem::path& path, const std::string& sql) {
     sqlite3_close(database);
 }
 
-/// A journal with a few tasks, and one of this agent's layout but for the columns' types, whose rules did not hold.
+/// A journal with a few tasks, and one whose columns have neither types nor rules.
 std::array<std::string, 2> makeImages(const AgentDirectory& directory) {
     const auto path = directory.journalPath();
     std::string problem;
@@ -91,7 +75,6 @@ std::array<std::string, 2> makeImages(const AgentDirectory& directory) {
         Journal made(path, problem);
         for (int i = 0; i < 3; ++i) made.accept(submission(TransferSubmission::newToken()), 1);
         made.complete(2, encodeOutcome(unreadableOutcome()));
-        made.setWake("s", "s", {"a"}, 1);
     }
     run(path, "PRAGMA journal_mode=DELETE;");
     std::array<std::string, 2> images{test::readFile(path)};
@@ -103,27 +86,28 @@ std::array<std::string, 2> makeImages(const AgentDirectory& directory) {
     return images;
 }
 
-/// Bytes with some of them changed.
 std::string changed(FuzzedDataProvider& in, std::string bytes) {
     for (auto count = in.ConsumeIntegralInRange(0, 6); count > 0; --count) {
         const auto at = in.ConsumeIntegralInRange<std::size_t>(0, bytes.size());
         const auto part = in.ConsumeRandomLengthString(16);
         bytes.replace(at, std::min(part.size(), bytes.size() - at), part);
     }
-    if (in.ConsumeIntegralInRange(0, 9) == 9) bytes.resize(in.ConsumeIntegralInRange<std::size_t>(0, bytes.size()));
-    return bytes;
+    return in.ConsumeIntegralInRange(0, 9) == 9 ? bytes.substr(0, in.ConsumeIntegral<std::uint16_t>()) : bytes;
 }
 
 void addRows(FuzzedDataProvider& in, const std::filesystem::path& path) {
-    const std::string good = literal(submission("EEEEEEEEEEEEEEEE-0000-0000-000000000").encoded());
-    const auto any = [&] { return fuzz::anyLiteral(in, {"'s'", "1", "'EEEEEEEEEEEEEEEE-0000-0000-000000000'", good}); };
-    std::string sql = "BEGIN;";
+    const std::string known = "EEEEEEEEEEEEEEEE-0000-0000-000000000";
+    const std::string good = fuzz::literal(submission(known).encoded()), name = "'" + known + "'";
+    const auto row = [&](int columns) {
+        std::string values = fuzz::anyLiteral(in, {"1", name});
+        while (--columns > 0) values += ", " + fuzz::anyLiteral(in, {"'s'", "1", name, good});
+        return " VALUES (" + values + "); ";
+    };
+    std::string sql;
     for (auto count = in.ConsumeIntegralInRange(1, 4); count > 0; --count) {
-        sql += "INSERT OR IGNORE INTO tasks VALUES (" + any();
-        for (int column = 1; column < 8; ++column) sql += ", " + any();
-        sql += "); INSERT OR IGNORE INTO wakes VALUES (" + any() + ", " + any() + ", " + any() + ", " + any() + ");";
+        sql += "INSERT OR IGNORE INTO tasks" + row(8) + "INSERT OR IGNORE INTO wakes" + row(4);
     }
-    run(path, sql + "COMMIT;");
+    run(path, "BEGIN; " + sql + "COMMIT;");
 }
 
 }  // namespace
@@ -140,17 +124,16 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     test::writeFile(path, hasRows ? image : changed(in, image));
     if (hasRows) addRows(in, path);
     for (auto count = in.ConsumeIntegralInRange(0, 3); count > 0; --count) {
-        const auto token = std::string("000000000000000") + std::to_string(count) + "-0000-0000-000000000";
-        const auto bytes = changed(in, in.ConsumeBool() ? submission(token).encoded() : in.ConsumeRandomLengthString());
-        test::writeFile(directory.submissionPath(token), bytes);
+        const auto token = "000000000000000" + std::to_string(count) + "-0000-0000-000000000";
+        test::writeFile(directory.submissionPath(token), changed(in, submission(token).encoded()));
     }
-    test::writeFile(directory.submissionPath(markedToken), submission(markedToken).encoded());
+    test::writeFile(directory.submissionPath(marked), submission(marked).encoded());
     try {
         Start agent(directory);
-        CORVANE_REQUIRE(!hasRows || agent.book.find(markedToken), "a submission was not accepted");
-        CORVANE_REQUIRE(agent.book.find(markedToken) || directory.spooled() == std::vector{markedToken},
+        const bool isAccepted = agent.book.find(marked).has_value();
+        CORVANE_REQUIRE(isAccepted || (!hasRows && directory.spooled() == std::vector{marked}),
                         "a submission was lost");
-        endAll(agent, directory);
+        agent.endAll();
     } catch (const std::exception& error) {
         CORVANE_REQUIRE(!hasRows && *error.what(), error.what());
     }

@@ -1,34 +1,20 @@
-// Runs a fuzz target on files, without a fuzzer: what its corpus holds, and what once stopped it.
-//
-//     replay FILE-OR-DIRECTORY...
+// Runs a fuzz target, without a fuzzer, on the files of some directories: its corpus, and what once stopped it.
 
 #include "fuzz/FuzzTarget.h"
 
-#include <algorithm>
+#include "tests/support/Files.h"
+
 #include <cstdio>
-#include <exception>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
-#include <string>
-#include <vector>
 
 int main(int argc, char** argv) {
-    std::vector<std::filesystem::path> files;
-    for (const std::filesystem::path path : std::vector<std::string>(argv + 1, argv + argc)) {
-        if (is_directory(path)) {
-            files.insert(files.end(), std::filesystem::directory_iterator(path), {});
-        } else {
-            files.push_back(path);
+    int count = 0;
+    for (int i = 1; i < argc; ++i) {
+        for (const auto& file : std::filesystem::directory_iterator(argv[i])) {
+            std::fprintf(stderr, "%s\n", file.path().c_str());  // the last line before a stop
+            const auto bytes = corvane::test::readFile(file.path());
+            LLVMFuzzerTestOneInput(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
+            ++count;
         }
     }
-    std::sort(files.begin(), files.end());
-    for (const auto& path : files) {
-        std::fprintf(stderr, "%s\n", path.c_str());  // the last line before a stop
-        std::ifstream file(path, std::ios::binary);
-        const std::string bytes{std::istreambuf_iterator<char>(file), {}};
-        if (!file) return 1;
-        LLVMFuzzerTestOneInput(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
-    }
-    return files.empty() ? 1 : 0;
+    return count > 0 ? 0 : 1;
 }
