@@ -32,7 +32,7 @@ struct Times {
     std::optional<std::chrono::sys_time<std::chrono::days>> b;
     std::optional<std::chrono::nanoseconds> c;
     std::optional<std::chrono::duration<std::int16_t>> d;
-    std::optional<std::chrono::duration<float, std::nano>> e;
+    std::optional<std::chrono::minutes> e;
 };
 struct Everything {
     std::optional<Numbers> numbers;
