@@ -3,6 +3,7 @@
 #include <corvane/Export.h>
 #include <corvane/Models/Encoding.h>
 
+#include <cmath>
 #include <limits>
 #include <string>
 #include <string_view>
@@ -69,6 +70,14 @@ T decodeInteger(const JSON& json) {
         if (auto number = json.unsignedInteger()) return narrow<T>(*number);
     }
     return narrow<T>(require(json.integer()));
+}
+
+template <class T>
+T decodeReal(const JSON& json) {
+    const auto number = json.double_();
+    const auto real = static_cast<T>(number ? *number : static_cast<double>(require(json.integer())));
+    if (!std::isfinite(real)) throw DecodingError(DecodingError::outOfRange, {});  // of a float
+    return real;
 }
 
 template <class T>
@@ -154,8 +163,7 @@ CORVANE_LOCAL T decode(const JSON& json) {
     } else if constexpr (std::integral<T>) {
         return detail::decodeInteger<T>(json);
     } else if constexpr (std::floating_point<T>) {
-        if (auto number = json.double_()) return static_cast<T>(*number);
-        return static_cast<T>(detail::require(json.integer()));
+        return detail::decodeReal<T>(json);
     } else if constexpr (std::same_as<T, std::string>) {
         return detail::require(json.string());
     } else if constexpr (std::same_as<T, std::u8string>) {

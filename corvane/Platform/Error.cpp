@@ -5,8 +5,18 @@
 
 namespace corvane {
 
+namespace {
+
+// A message may quote text of the host's: a NUL in it would be the end for whoever reads what().
+std::string withoutNUL(std::string text) {
+    for (auto at = text.find('\0'); at != std::string::npos; at = text.find('\0', at)) text.replace(at, 1, "\\x00");
+    return text;
+}
+
+}  // namespace
+
 Error::Error(std::string_view domain, int code, std::string message)
-    : domain_(domain), code_(code), message_(std::move(message)) {}
+    : domain_(domain), code_(code), message_(withoutNUL(std::move(message))) {}
 Error::~Error() = default;
 
 InvalidArgument::InvalidArgument(std::string message) : Error("Corvane.InvalidArgument", 0, std::move(message)) {}

@@ -49,9 +49,9 @@ std::vector<UploadBatchEntity::Size> UploadBatchEntity::sizes(StoreConnection& c
         "FROM "
         "(SELECT identifier, CAST(events AS TEXT) AS text, length(events) AS bytes FROM upload_batches);",
         [&](StoreStepper& stepper) {
-            Size size{stepper.text()};
-            size.events = stepper.integer();
-            size.bytes = stepper.integer();
+            Size size{stepper.optionalText().value_or("")};
+            size.events = stepper.count();
+            size.bytes = stepper.count();
             sizes.push_back(std::move(size));
         });
     return sizes;

@@ -14,9 +14,9 @@ std::vector<StoreColumn> EpochEntity::columns() {
 EpochEntity EpochEntity::read(StoreStepper& stepper) {
     EpochEntity entity;
     entity.entityName = stepper.text();
-    entity.epoch = stepper.integer();
-    entity.forgotten.events = stepper.integer();
-    entity.forgotten.documents = stepper.integer();
+    entity.epoch = stepper.count();
+    entity.forgotten.events = stepper.count();
+    entity.forgotten.documents = stepper.count();
     return entity;
 }
 

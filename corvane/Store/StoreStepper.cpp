@@ -44,6 +44,11 @@ std::int64_t StoreStepper::integer() {
     return sqlite3_column_int64(statement_, column);
 }
 
+std::int64_t StoreStepper::count() {
+    const auto number = integer();
+    return number >= 0 && number <= largestCount ? number : 0;
+}
+
 double StoreStepper::double_() {
     const int column = take();
     return sqlite3_column_double(statement_, column);

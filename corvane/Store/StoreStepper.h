@@ -44,6 +44,9 @@ class StoreStepper {
     [[nodiscard]] std::optional<std::string> optionalText();
     /// The next column as an integer, converted as the database converts; NULL is 0.
     [[nodiscard]] std::int64_t integer();
+    /// The next column as a count of something: 0 for what can be none, as in a damaged row. Sums of counts fit.
+    [[nodiscard]] std::int64_t count();
+    static constexpr std::int64_t largestCount = std::int64_t{1} << 48;
     /// The next column as a floating-point number, converted as the database converts; NULL is 0.
     [[nodiscard]] double double_();
     /// The next column's bytes. Throws `badColumn` for NULL and for no bytes at all.

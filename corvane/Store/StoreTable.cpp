@@ -1,6 +1,7 @@
 #include <corvane/Store/StoreTable.h>
 
 #include <corvane/Platform/Require.h>
+#include <corvane/Store/StoreStepper.h>
 
 #include <algorithm>
 #include <utility>
@@ -13,6 +14,12 @@ std::string comparison(std::string opening, std::string_view column, const Stora
     opening.append(column).append(" = ");
     value.appendSQLLiteral(opening);
     return opening += ';';
+}
+
+// As StoreStepper::count reads it: a damaged number must neither end a sum nor be added to for good.
+std::string countOf(const std::string& column) {
+    return "CASE WHEN " + column + " BETWEEN 0 AND " + std::to_string(StoreStepper::largestCount) + " THEN " + column +
+           " ELSE 0 END";
 }
 
 }  // namespace
@@ -93,7 +100,7 @@ std::string StoreTable::addSQL(const std::vector<StorableValue>& values) const {
     const char* separator = "";
     for (const auto& column : columns_) {
         if (column.primary) continue;
-        sql.append(separator).append(column.name).append(" = ").append(column.name);
+        sql.append(separator).append(column.name).append(" = ").append(countOf(column.name));
         sql.append(" + excluded.").append(column.name);
         separator = ", ";
     }
@@ -103,7 +110,7 @@ std::string StoreTable::addSQL(const std::vector<StorableValue>& values) const {
 std::string StoreTable::sumsSQL() const {
     std::string sql = "SELECT count(*)";
     for (const auto& column : columns_) {
-        if (column.type == "INTEGER") sql.append(", sum(").append(column.name).append(")");
+        if (column.type == "INTEGER") sql.append(", sum(").append(countOf(column.name)).append(")");
     }
     return sql.append(" FROM ").append(name_).append(";");
 }

@@ -50,9 +50,10 @@ class StoreTable {
     [[nodiscard]] std::string takeSQL(std::string_view column, const StorableValue& value) const;
     /// Throws `InvalidArgument` when the value cannot be written.
     [[nodiscard]] std::string selectSQL(std::string_view column, const StorableValue& value) const;
-    /// @param values as with `insertSQL`. Adds the numbers to those of a row that has the key already.
+    /// @param values as with `insertSQL`. Adds the numbers, which are counts, to those of a row that has the key
+    /// already.
     [[nodiscard]] std::string addSQL(const std::vector<StorableValue>& values) const;
-    /// Selects the number of rows and the sums of the columns of type INTEGER.
+    /// Selects the number of rows and the sums of the columns of type INTEGER, which are counts.
     [[nodiscard]] std::string sumsSQL() const;
     /// Throws `InvalidArgument` when the value cannot be written.
     [[nodiscard]] std::string deleteSQL(std::string_view column, const StorableValue& value) const;

@@ -49,11 +49,11 @@ void CurlTransfer::HeaderListDeleter::operator()(void* list) const noexcept {
     curl_slist_free_all(static_cast<curl_slist*>(list));
 }
 
-CurlTransfer::CurlTransfer(const HTTPTransfer& transfer, Easy spare)
+CurlTransfer::CurlTransfer(const HTTPTransfer& transfer)
     : limits_(transfer.limits),
       didSend_(transfer.didSend),
       deadline_(Clock::now() + limits_.timeWithoutProgress),
-      easy_(spare ? std::move(spare) : Easy(curl_easy_init())) {
+      easy_(curl_easy_init()) {
     if (!easy_) throw std::bad_alloc();
     if (transfer.bodyPath) openBody(*transfer.bodyPath, transfer.bodyMustBeOwn);
     setHeaders(transfer.request);
@@ -61,11 +61,6 @@ CurlTransfer::CurlTransfer(const HTTPTransfer& transfer, Easy spare)
 }
 
 CurlTransfer::~CurlTransfer() = default;
-
-CurlTransfer::Easy CurlTransfer::takeHandle() {
-    curl_easy_reset(easy_.get());
-    return std::move(easy_);
-}
 
 void CurlTransfer::openBody(const std::filesystem::path& file, bool mustBeOwn) {
     // Not to wait for the other end where somebody put a pipe in the file's place.
@@ -211,6 +206,9 @@ std::optional<AnyError> CurlTransfer::error(int curlCode) const {
     if (curlCode == CURLE_OK && isProxyRefusal()) {
         return AnyError(TransferError(Code::blocked, "the proxy wants to know who asks (407)"));
     }
+    if ((curlCode == CURLE_OK || capReached_) && !headComplete_) {  // which is no failure to every libcurl
+        return AnyError(TransferError(Code::network, "the connection ended inside the head of the answer"));
+    }
     if (curlCode == CURLE_OK || capReached_) return std::nullopt;
     if (!bodyProblem_.empty()) return AnyError(TransferError(Code::bodyUnavailable, bodyProblem_));
     if (curlCode == CURLE_OPERATION_TIMEDOUT) return timeoutError();
@@ -279,8 +277,8 @@ void CurlTransfer::takeHeader(std::string_view line) {
         spellings_.clear();
         headComplete_ = false;
     } else if (headComplete_) {
-        return;  // a trailer
-    } else if (trimmed(line).empty()) {
+        return;                                                     // a trailer
+    } else if (line.starts_with('\r') || line.starts_with('\n')) {  // the end for libcurl, whatever else is there
         long status = 0;
         curl_easy_getinfo(easy_.get(), CURLINFO_RESPONSE_CODE, &status);
         answer_.statusCode = status;

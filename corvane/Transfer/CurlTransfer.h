@@ -27,7 +27,8 @@ class CurlTransfer {
     struct EasyDeleter {
         void operator()(void* easy) const noexcept;
     };
-    /// A handle as libcurl makes it, or as one that has done its work is set back.
+    /// Each transfer has one of its own. One that was set back for another transfer keeps a pointer, in libcurl 7.88,
+    /// to the last field of the answer before; it is read when the next answer begins with a folded line.
     using Easy = std::unique_ptr<void, EasyDeleter>;
 
     /// While it lives, the system drops what it has still to send on a connection that this thread has curl close: it
@@ -40,16 +41,13 @@ class CurlTransfer {
         ~UnsentIsDropped();
     };
 
-    /// Opens the body file and sets a handle up: `spare`, or one of its own. Throws `TransferError`.
-    explicit CurlTransfer(const HTTPTransfer& transfer, Easy spare = nullptr);
+    /// Opens the body file and sets a handle up. Throws `TransferError`.
+    explicit CurlTransfer(const HTTPTransfer& transfer);
     CurlTransfer(const CurlTransfer&) = delete;
     CurlTransfer& operator=(const CurlTransfer&) = delete;
     ~CurlTransfer();
 
     [[nodiscard]] void* handle() const { return easy_.get(); }
-
-    /// Gives the handle away, for the next transfer. Requires: curl has let go of it; nothing else is called any more.
-    [[nodiscard]] Easy takeHandle();
 
     /// Looks at how far the transfer has come: reports what was sent, and moves the deadline when a byte went either
     /// way.

@@ -19,8 +19,6 @@ namespace corvane {
 
 namespace {
 
-constexpr std::size_t mostSpare = 4;
-
 // A wait that the system refuses (no memory, a lowered limit of descriptors) must not become a spin.
 void rest(int milliseconds) {
     constexpr int longest = 50;
@@ -42,7 +40,6 @@ TransferScheduler::TransferScheduler() : wakeUp_(eventfd(0, EFD_CLOEXEC | EFD_NO
     OPENSSL_thread_stop();  // this thread may end after OpenSSL's exit handler, which leaves it nothing to free with
     multi_.reset(curl_multi_init());
     if (!multi_) throw std::bad_alloc();
-    spare_.reserve(mostSpare);
 }
 
 // A handle must not outlive the multi handle that it was added to.
@@ -52,7 +49,7 @@ TransferScheduler::~TransferScheduler() {
 
 bool TransferScheduler::start(Ticket ticket, HTTPTransfer transfer) {
     try {
-        auto curl = std::make_unique<CurlTransfer>(transfer, takeSpare());
+        auto curl = std::make_unique<CurlTransfer>(transfer);
         makeRoom();
         if (curl_multi_add_handle(multi_.get(), curl->handle()) != CURLM_OK) throw std::bad_alloc();
         running_.push_back({ticket, std::move(transfer), std::move(curl)});
@@ -149,19 +146,7 @@ void TransferScheduler::finishEnded() {
         if (found == running_.end()) continue;
         const Running ended = takeOut(found);
         finish(ended, [&] { return ended.curl->error(code); });
-        if (code == CURLE_OK) keepSpare(*ended.curl);
     }
-}
-
-CurlTransfer::Easy TransferScheduler::takeSpare() {
-    if (spare_.empty()) return nullptr;
-    auto taken = std::move(spare_.back());
-    spare_.pop_back();
-    return taken;
-}
-
-void TransferScheduler::keepSpare(CurlTransfer& ended) {
-    if (spare_.size() < mostSpare) spare_.push_back(ended.takeHandle());
 }
 
 void TransferScheduler::checkProgress() {

@@ -81,14 +81,10 @@ class TransferScheduler {
     void finishEnded();
     void checkProgress();
     Running takeOut(std::vector<Running>::iterator position);
-    [[nodiscard]] CurlTransfer::Easy takeSpare();
-    /// Keeps the handle of a transfer that is over, unless there are enough: making one takes a tenth of a transfer.
-    void keepSpare(CurlTransfer& ended);
 
     Descriptor wakeUp_;  // libcurl goes on without one of its own when the process has none left
     std::unique_ptr<void, MultiDeleter> multi_;
     std::vector<Running> running_;
-    std::vector<CurlTransfer::Easy> spare_;  // handles that were set back
 };
 
 }  // namespace corvane

@@ -12,9 +12,9 @@ std::vector<StoreColumn> LedgerEntity::columns() {
 
 LedgerEntity LedgerEntity::read(StoreStepper& stepper) {
     LedgerEntity entity;
-    entity.entry = stepper.text();
-    entity.events = stepper.integer();
-    entity.documents = stepper.integer();
+    entity.entry = stepper.optionalText().value_or("");
+    entity.events = stepper.count();
+    entity.documents = stepper.count();
     return entity;
 }
 
@@ -30,9 +30,9 @@ std::vector<StoreColumn> DocumentEntity::columns() {
 
 DocumentEntity DocumentEntity::read(StoreStepper& stepper) {
     DocumentEntity entity;
-    entity.identifier = stepper.text();
-    entity.events = stepper.integer();
-    entity.bytes = stepper.integer();
+    entity.identifier = stepper.optionalText().value_or("");
+    entity.events = stepper.count();
+    entity.bytes = stepper.count();
     return entity;
 }
 

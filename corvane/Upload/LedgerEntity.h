@@ -15,7 +15,7 @@
 namespace corvane {
 
 /// One of the ledger's totals: a row of the table "ledger". A value. A name that is not known here is a later
-/// release's.
+/// release's. Whatever the columns of a damaged row hold, it is read, so that it costs no other row.
 struct LedgerEntity {
     static constexpr std::string_view tableName = "ledger";
     static constexpr std::int64_t schemaVersion = 0;  ///< never looked at: there may be further names

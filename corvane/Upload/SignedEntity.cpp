@@ -52,7 +52,7 @@ SignedEntity SignedEntity::read(StoreStepper& stepper) {
     entity.createdDate = readDate(stepper);
     entity.contentType = stepper.text();
     entity.userAgent = stepper.text();
-    entity.retries = stepper.integer();
+    entity.retries = stepper.count();
     entity.retryAfterDate = readDate(stepper);
     entity.signature = stepper.optionalText();
     return entity;

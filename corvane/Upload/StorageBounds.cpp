@@ -98,7 +98,10 @@ StorageBounds::Excess StorageBounds::excess() {
         addedSince_ = 0;
     }
     auto bytes = book_->bytesOnDisk() - bytesBeingWithdrawn();
-    while (const auto* oldest = oldestIfNeeded(bytes, excess.documents)) {
+    bool isGettingOn = true;  // since the oldest were looked up: what was found here comes up again, as do damaged rows
+    while (!oldest_.empty() || std::exchange(isGettingOn, false)) {
+        const auto* oldest = oldestIfNeeded(bytes);
+        if (!oldest) break;
         if (excess.documents.size() == portion) {
             excess.isComplete = false;
             break;
@@ -107,7 +110,9 @@ StorageBounds::Excess StorageBounds::excess() {
         if (!isTooOld && bytes <= limits_.maximumBytes) break;
         const auto document = *oldest;
         oldest_.pop_front();
-        if (isWithdrawn(document.identifier) || !rows_->find(document.identifier)) continue;  // gone meanwhile
+        if (excess.documents.contains(document.identifier) || isWithdrawn(document.identifier)) continue;
+        if (!isStored(document.identifier)) continue;  // gone meanwhile
+        isGettingOn = true;
         if (bytes > limits_.maximumBytes) logBound(bytes);
         const auto size = sizeOf(document);
         bytes -= size;
@@ -117,21 +122,31 @@ StorageBounds::Excess StorageBounds::excess() {
     return excess;
 }
 
+// A row that cannot be read takes room, too, and goes in its turn; a name that no statement can hold is nobody's.
+bool StorageBounds::isStored(const std::string& identifier) {
+    try {
+        return rows_->find(identifier).has_value();
+    } catch (const StoreStepperError&) {
+        return true;
+    } catch (const InvalidArgument&) {
+        return false;
+    }
+}
+
 // Looked up many at a time: at the bound every new document asks for the oldest.
-const UploadRows::Oldest* StorageBounds::oldestIfNeeded(std::int64_t bytes, const Documents& chosen) {
+const UploadRows::Oldest* StorageBounds::oldestIfNeeded(std::int64_t bytes) {
     constexpr std::size_t atOnce = 256;
     if (bytes <= limits_.maximumBytes && !limits_.maximumAge) return nullptr;
     if (oldest_.empty()) {
-        for (auto& document : rows_->oldest(atOnce + countBeingWithdrawn() + chosen.size())) {
-            if (isWithdrawn(document.identifier) || chosen.contains(document.identifier)) continue;
-            oldest_.push_back(std::move(document));
+        for (auto& document : rows_->oldest(atOnce + countBeingWithdrawn())) {
+            if (!isWithdrawn(document.identifier)) oldest_.push_back(std::move(document));
         }
     }
     return oldest_.empty() ? nullptr : &oldest_.front();
 }
 
 bool StorageBounds::isTooOld(const UploadRows::Oldest& document) const {
-    return limits_.maximumAge && now() - document.created > *limits_.maximumAge;
+    return limits_.maximumAge && millisecondsBetween(document.created, now()) > limits_.maximumAge->count();
 }
 
 std::size_t StorageBounds::countBeingWithdrawn() {

@@ -74,9 +74,9 @@ class StorageBounds : public std::enable_shared_from_this<StorageBounds> {
     /// The oldest documents that are too old or too much, but for those that are being withdrawn; some of them, if they
     /// are many.
     [[nodiscard]] Excess excess() CORVANE_REQUIRES(*queue_);
-    /// The oldest stored document but for those that are chosen already, if it matters with so many bytes stored.
-    [[nodiscard]] const UploadRows::Oldest* oldestIfNeeded(std::int64_t bytes, const Documents& chosen)
-        CORVANE_REQUIRES(*queue_);
+    /// The oldest stored document, if it matters with so many bytes stored.
+    [[nodiscard]] const UploadRows::Oldest* oldestIfNeeded(std::int64_t bytes) CORVANE_REQUIRES(*queue_);
+    [[nodiscard]] bool isStored(const std::string& identifier);
     [[nodiscard]] bool isTooOld(const UploadRows::Oldest& document) const;
     [[nodiscard]] std::size_t countBeingWithdrawn();
     [[nodiscard]] std::int64_t bytesBeingWithdrawn();

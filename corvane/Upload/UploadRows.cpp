@@ -26,7 +26,9 @@ void write(const std::map<LedgerEntry, Ledger::Count>& totals, const std::shared
 
 std::vector<std::string> texts(const std::shared_ptr<StoreConnection>& connection, const char* sql) {
     std::vector<std::string> texts;
-    connection->query(sql, [&](StoreStepper& stepper) { texts.push_back(stepper.text()); });
+    connection->query(sql, [&](StoreStepper& stepper) {
+        if (auto text = stepper.optionalText()) texts.push_back(*std::move(text));
+    });
     return texts;
 }
 
@@ -124,7 +126,7 @@ std::vector<UploadRows::Oldest> UploadRows::oldest(std::size_t count) {
             "createdDate LIMIT " +
             std::to_string(count) + ") JOIN documents USING (identifier) ORDER BY createdDate;";
         rows.connection()->query(sql, [&](StoreStepper& stepper) {
-            Oldest one{.identifier = stepper.text(), .bytes = stepper.integer(), .created = now()};
+            Oldest one{.identifier = stepper.text(), .bytes = stepper.count(), .created = now()};
             one.created = dateFromSeconds(stepper.double_()).value_or(one.created);
             oldest.push_back(std::move(one));
         });

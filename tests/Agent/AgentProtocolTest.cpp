@@ -14,8 +14,6 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <random>
-
 namespace corvane::test {
 namespace {
 
@@ -150,19 +148,6 @@ TEST_F(AgentProtocolTest, WaitsForDescriptorsWhenThereAreNone) {
     ASSERT_EQ(prlimit(process, RLIMIT_NOFILE, &before, nullptr), 0);
     EXPECT_TRUE(client.gets<agent::Welcome>());
     expectAgentWorks();
-}
-
-TEST(AgentMessage, AnyBytesAreAMessageOrAFormatError) {
-    std::mt19937 random(11);
-    const std::string hello = agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {"a", "b"}});
-    for (int i = 0; i < 3000; ++i) {
-        std::string bytes = hello;
-        for (int change = 0; change < 3; ++change) bytes[random() % bytes.size()] = static_cast<char>(random());
-        try {
-            static_cast<void>(agent::decodeRequest(bytes));
-        } catch (const FormatError&) {
-        }
-    }
 }
 
 TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {

@@ -7,6 +7,7 @@
 
 #include <sqlite3.h>
 
+#include <limits>
 #include <system_error>
 
 namespace corvane::transferd {
@@ -155,6 +156,7 @@ void Journal::open(const std::filesystem::path& path) {
     if (found < 0 || found > version) throw JournalError("the journal is of version " + std::to_string(found));
     check();
     if (found != version) takeOver(found);
+    checkNumbers();
 }
 
 void Journal::takeOver(std::int64_t found) {
@@ -172,6 +174,16 @@ void Journal::check() {
         isDamaged_ = true;
         throw JournalError("the journal cannot be used: " + checked.contents(0));
     }
+}
+
+// A single damaged row takes all numbers behind its own: no task would ever be accepted.
+void Journal::checkNumbers() {
+    Statement last(*this,
+                   "SELECT max(coalesce(max(number), 0), "
+                   "coalesce((SELECT max(seq) FROM sqlite_sequence WHERE name = 'tasks'), 0)) FROM tasks;");
+    if (!last.step() || last.integer(0) < std::numeric_limits<std::int64_t>::max() / 2) return;
+    isDamaged_ = true;
+    throw JournalError("the journal cannot be used: there are no numbers left for tasks");
 }
 
 void Journal::run(const char* sql) {

@@ -81,6 +81,8 @@ class Journal {
     void takeOver(std::int64_t found);
     /// Looks at every page.
     void check();
+    /// Looks whether tasks can have further numbers.
+    void checkNumbers();
     void run(const char* sql);
     /// Notes whether the result tells of damage, and throws it.
     [[noreturn]] void fail(int code);

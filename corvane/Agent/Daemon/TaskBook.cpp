@@ -89,8 +89,9 @@ std::int64_t TaskBook::accept(const TransferSubmission& submission, std::int64_t
 
 void TaskBook::index(std::int64_t number, std::int64_t accepted, const TransferSubmission& submission, bool isOver) {
     Owner& by = owner(submission.session, submission.owner);
-    tasks_.emplace(number,
-                   Task{submission.token, &by, accepted + submission.patience.count(), submission.wantsProgress()});
+    std::int64_t expires = 0;
+    if (__builtin_add_overflow(accepted, submission.patience.count(), &expires)) expires = accepted;  // a damaged row's
+    tasks_.emplace(number, Task{submission.token, &by, expires, submission.wantsProgress()});
     numbers_.emplace(submission.token, number);
     if (isOver) {
         by.over.emplace(number, 0);
