@@ -98,20 +98,5 @@ TEST(Store, FailedStatementsCarryTheirTextAndKeepDataOutOfTheMessage) {
     EXPECT_EQ(interrupted.value(), StoreError::execute) << "what was read by then is not all there is";
 }
 
-TEST(StoreStepper, AReadTakesItsColumnWhetherItFailsOrNot) {
-    StoreStepper nowhere(nullptr);
-    EXPECT_THROW(static_cast<void>(nowhere.integer()), StoreStepperError);
-    EXPECT_EQ(nowhere.index(), 1);
-
-    StoreConnection connection(StoreLocation::memory());
-    connection.query("SELECT NULL, 'text', NULL, x'', 1.5;", [](StoreStepper& stepper) {
-        EXPECT_THROW(static_cast<void>(stepper.text()), StoreStepperError);
-        EXPECT_EQ(stepper.text(), "text");
-        EXPECT_EQ(stepper.optionalText(), std::nullopt);
-        EXPECT_THROW(static_cast<void>(stepper.bytes()), StoreStepperError);
-        EXPECT_EQ(stepper.double_(), 1.5);
-    });
-}
-
 }  // namespace
 }  // namespace corvane::test
