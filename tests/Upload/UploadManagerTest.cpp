@@ -75,30 +75,6 @@ SignedEntity row(std::string identifier, std::int64_t retries) {
     return {.identifier = std::move(identifier), .contentType = "c", .userAgent = "u", .retries = retries};
 }
 
-TEST(UploadManager, TakesADocumentOverAndForgetsItOnceTheCollectorHasAnswered) {
-    const TemporaryDocuments documents;
-    const CapturedLog log;
-    ProcessRun run;
-    run.manager->open();
-    for (const bool delivered : {true, false}) {
-        run.upload("I");
-        const auto sent = run.service->submitted.back();
-        EXPECT_EQ(sent, (PreparedUploadRequest{"I", "application/test+json; version=0.1.0",
-                                               "com.example.player/2.3.117", run.dropbox->baseURL() / "I"}));
-        EXPECT_EQ(readFile(sent.dataFileURL), gzipCompressed(R"({"data":[1,2,3]})"));
-        const auto stored = run.rows().at(0);
-        EXPECT_EQ(stored.signature, "");
-        EXPECT_EQ(stored.retries, 0);
-        EXPECT_LT(std::chrono::abs(now() - stored.createdDate), std::chrono::minutes(1));
-
-        run.service->complete(delivered ? UploadResult::success("I", {200}) : UploadResult::failed("I", {404}));
-        EXPECT_TRUE(run.rows().empty());
-        EXPECT_EQ(run.dropbox->existingFile("I"), std::nullopt);
-    }
-    EXPECT_EQ(run.ledger->report(), (DeliveryReport{.delivered = {10, 1}, .pending = {}, .givenUp = {10, 1}}));
-    EXPECT_EQ(log.count("Failed"), 0);
-}
-
 TEST(UploadManager, DocumentsThatEndTogetherGoTogether) {
     const TemporaryDocuments documents;
     const CapturedLog log;
@@ -384,24 +360,6 @@ TEST(UploadManager, RefusesWhatItCannotWriteAndLeavesNoRow) {
     for (const char* type : {"a\rb", "a\nX-Y: b"}) EXPECT_THROW(upload("I", "{}", type), InvalidArgument);
     EXPECT_TRUE(run.rows().empty());
     EXPECT_TRUE(run.service->submitted.empty());
-}
-
-TEST(UploadManager, TellsOfABrokenTableAndGoesOn) {
-    const TemporaryDocuments documents;
-    const CapturedLog log;
-    ProcessRun run;
-    // A view in the table's place can neither be read as rows of the table nor written to.
-    run.store->perform([](Store<SignedEntity>& rows) { rows.open(); });
-    StoreConnection(StoreLocation::default_("main")).run("CREATE VIEW signed_requests AS SELECT 'I' AS identifier;");
-    run.manager->open();
-    run.upload("I");
-    run.service->complete(UploadResult::retry("I", now()));
-    run.service->complete(UploadResult::success("I", {200}));
-    EXPECT_EQ(log.count("Failed to requeue cancelled requests, error="), 1);
-    EXPECT_EQ(log.count("Failed to mark retry, identifier=I, error="), 1);
-    EXPECT_EQ(log.count("Completed upload but failed to cleanup tracking data, identifier=I, error="), 1);
-    EXPECT_NE(run.dropbox->existingFile("I"), std::nullopt);  // kept with its row
-    EXPECT_EQ(run.service->submitted.size(), 1U);
 }
 
 }  // namespace
