@@ -16,12 +16,7 @@ TEST(JSON, HoldsAnyTopLevelValueAndSerialisesOnlyObjectsAndArrays) {
 TEST(JSON, IsNothingWhenTheBytesAreNotJSON) {
     for (const std::string bytes :
          {"", "{", "{\"a\":}", "nul", "[1] x", "\"\xff\"", "{\"a\":1}}", "1e999", "[-1e309]"}) {
-        const JSON json(bytes);
-        EXPECT_FALSE(json.exists()) << bytes;
-        EXPECT_FALSE(json.string() || json.integer() || json.double_() || json.bool_() || json.array() ||
-                     json.object() || json.number() || json.any());
-        EXPECT_FALSE(json["a"][3]["b"].exists());
-        EXPECT_EQ(json.text(), "");
+        EXPECT_FALSE(JSON(bytes).exists() || JSON(bytes)["a"][3]["b"].exists()) << bytes;
     }
     EXPECT_FALSE(JSON(std::string(600, '[') + std::string(600, ']')).exists()) << "nesting is bounded";
 }
