@@ -12,6 +12,7 @@ TEST_F(Submission, IsStampedWithTimePathAndSession) {
     struct Twice {
         EventProperty<EventData> first = required;
         EventProperty<EventData> second = required;
+        std::string note = "not a property";
     };
     const auto tracker = root->chain("b")->chain("c");
     EXPECT_EQ(tracker->path(), (std::vector<std::string>{"root", "b", "c"}));
@@ -25,22 +26,6 @@ TEST_F(Submission, IsStampedWithTimePathAndSession) {
 
     tracker->explicitSubmit<Identified>(Date(1500ms));
     EXPECT_EQ(processor->events().at(1).json()["event"]["eventTimestamp"].integer(), 1500);
-}
-
-struct Three {
-    EventProperty<Screen> first = required;
-    EventProperty<int> number = required;
-    EventProperty<Viewer> second = required;
-    std::string note = "not a property";
-};
-
-TEST_F(Submission, ListsEveryMissingPropertyInDeclarationOrder) {
-    std::optional<TrackerError> error;
-    root->submit<Three>([&](const EventSubmitResult& result) { error = *result.error()->as<TrackerError>(); });
-    processor->settle();
-    EXPECT_EQ(error->missingData().at(1), (TrackerError::MissingData{"number", DataType::of<int>(), "int"}));
-    EXPECT_STREQ(error->what(), "required data is missing: first (Screen) number (int) second (Viewer)");
-    EXPECT_TRUE(processor->events().empty());
 }
 
 namespace other {
