@@ -52,15 +52,6 @@ struct Start final : UploadQueue::Source {
     UploadQueue queue{*this, std::chrono::milliseconds(1)};
 };
 
-TransferSubmission submission(const std::string& token) {
-    TransferSubmission made;
-    made.token = token;
-    made.session = made.owner = "s";
-    made.request.url = "http://127.0.0.1/";
-    made.bodyPath = "/body";
-    return made;
-}
-
 /// Runs statements, as far as the database lets them.
 void run(const std::filesystem::path& path, const std::string& sql) {
     sqlite3* database = nullptr;
@@ -75,7 +66,7 @@ std::array<std::string, 2> makeImages(const AgentDirectory& directory) {
     std::string problem;
     {
         Journal made(path, problem);
-        for (int i = 0; i < 3; ++i) made.accept(submission(TransferSubmission::newToken()), 1);
+        for (int i = 0; i < 3; ++i) made.accept(test::submission(TransferSubmission::newToken(), "s"), 1);
         made.complete(2, encodeOutcome(unreadableOutcome()));
     }
     run(path, "PRAGMA journal_mode=DELETE;");
@@ -99,7 +90,7 @@ std::string changed(FuzzedDataProvider& in, std::string bytes) {
 
 void addRows(FuzzedDataProvider& in, const std::filesystem::path& path) {
     const std::string known = "EEEEEEEEEEEEEEEE-0000-0000-000000000";
-    const std::string good = fuzz::literal(submission(known).encoded()), name = "'" + known + "'";
+    const std::string good = test::literal(test::submission(known, "s").encoded()), name = "'" + known + "'";
     const auto row = [&](int columns) {
         std::string values = fuzz::anyLiteral(in, {"1", name});
         while (--columns > 0) values += ", " + fuzz::anyLiteral(in, {"'s'", "1", name, good});
@@ -127,9 +118,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     if (hasRows) addRows(in, path);
     for (auto count = in.ConsumeIntegralInRange(0, 3); count > 0; --count) {
         const auto token = "000000000000000" + std::to_string(count) + "-0000-0000-000000000";
-        test::writeFile(directory.submissionPath(token), changed(in, submission(token).encoded()));
+        test::writeFile(directory.submissionPath(token), changed(in, test::submission(token, "s").encoded()));
     }
-    test::writeFile(directory.submissionPath(marked), submission(marked).encoded());
+    test::writeFile(directory.submissionPath(marked), test::submission(marked, "s").encoded());
     try {
         Start agent(directory);
         const auto left = directory.spooled();  // by a damaged journal that takes nothing

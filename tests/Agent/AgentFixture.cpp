@@ -88,10 +88,11 @@ std::filesystem::path AgentFixture::body(const std::string& name, const std::str
     return documents / name;
 }
 
-std::size_t AgentFixture::files(const std::string& folder) const {
-    std::error_code none;
-    const std::filesystem::directory_iterator found(options.directory / folder, none);
-    return none ? 0 : static_cast<std::size_t>(std::distance(found, std::filesystem::directory_iterator()));
+std::size_t AgentFixture::processes(const std::string& arguments) {
+    const auto all = filesIn("/proc");
+    return static_cast<std::size_t>(std::count_if(all.begin(), all.end(), [&](const auto& one) {
+        return readFile(one / "cmdline").find(arguments) != std::string::npos;
+    }));
 }
 
 long AgentFixture::agent(const std::filesystem::path& directory) {

@@ -71,7 +71,11 @@ class AgentFixture : public ::testing::Test {
     /// Descriptions of the running tasks.
     [[nodiscard]] static std::vector<std::string> running(TransferSession& session);
     std::filesystem::path body(const std::string& name, const std::string& contents = "the body");
-    [[nodiscard]] std::size_t files(const std::string& folder) const;
+    [[nodiscard]] std::size_t files(const std::string& folder) const {
+        return filesIn(options.directory / folder).size();
+    }
+    /// How many processes have these among their arguments.
+    [[nodiscard]] static std::size_t processes(const std::string& arguments);
 
     /// The agent of the directory, or 0.
     [[nodiscard]] static long agent(const std::filesystem::path& directory);

@@ -1,4 +1,6 @@
-#include <corvane/Agent/Host/AgentLink.h>
+#include <corvane/Agent/Host/Acknowledgements.h>
+#include <corvane/Agent/Host/BackgroundTransferCore.h>
+#include <corvane/Agent/OutcomeCodec.h>
 
 #include "tests/support/Testing.h"
 
@@ -123,6 +125,28 @@ TEST_F(AgentLinkTest, GivesUpAnAgentThatOwesAnAnswerAndAsksASilentOneForASignOfL
     pass(200ms);
     EXPECT_EQ(heard, std::string("ready FBIfailed "));
     EXPECT_EQ(log.count("error=no answer in time"), 1);
+}
+
+// Nobody would tell the next session of a completion that was acknowledged here.
+TEST(AgentConversation, ACompletionForASessionThatHasJustGoneIsLeftToTheNext) {
+    const TemporaryDocuments documents;
+    const auto tasks = std::make_shared<TaskTable>();
+    const auto reporter = std::make_shared<SessionReporter>(std::weak_ptr<TransferSessionDelegate>(), nullptr);
+    const AgentLink::Way nowhere{[] { return Descriptor(); }, [] { return AgentProgram::Started(); }, {}};
+    const auto conversation = std::make_shared<AgentConversation>(
+        AgentDirectory(documents / "agent"),
+        std::make_shared<AgentLink>(nowhere, std::chrono::seconds(1), agent::Hello{}, AgentLink::Clock::now()),
+        std::chrono::seconds(1),
+        AgentConversation::Session{
+            {}, tasks, reporter, std::make_shared<InsideTransfers>(TransferSessionConfiguration{}, reporter, tasks)});
+    tasks->close();
+    std::promise<bool> isAcknowledged;
+    AgentThread::shared().post([&] {
+        agentThread.assertCurrent("the test");
+        conversation->agentSaid(agent::Completed{"token", {}, encodeOutcome({})});
+        isAcknowledged.set_value(Acknowledgements::shared().contains("token"));
+    });
+    EXPECT_FALSE(isAcknowledged.get_future().get());
 }
 
 }  // namespace

@@ -117,14 +117,8 @@ TEST_F(AgentProcessTest, ThereIsOneHoweverManyStartIt) {
     for (int i = 0; i < 8; ++i) sessions.push_back(open(recorder, "owner " + std::to_string(i)));
     for (const auto& session : sessions) upload(*session, server.url(), "a");
     ASSERT_TRUE(recorder->wait(8));
-    const auto agents = [&] {
-        int found = 0;
-        for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
-            found += readFile(entry.path() / "cmdline").find(options.directory.string() + '\0') != std::string::npos;
-        }
-        return found;
-    };
-    EXPECT_TRUE(eventually([&] { return agents() == 1; })) << "those that came late are gone";
+    EXPECT_TRUE(eventually([&] { return processes(options.directory.string() + '\0') == 1; }))
+        << "those that came late are gone";
     EXPECT_EQ(log.count("agent"), 0);
 }
 

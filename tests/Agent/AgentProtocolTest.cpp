@@ -2,9 +2,9 @@
 #include <corvane/Agent/AgentMessage.h>
 #include <corvane/Agent/FormatError.h>
 #include <corvane/Agent/FrameSocket.h>
-#include <corvane/Agent/TransferSubmission.h>
 
 #include "tests/Agent/AgentFixture.h"
+#include "tests/support/AgentFiles.h"
 
 #include <poll.h>
 #include <sys/resource.h>
@@ -79,8 +79,8 @@ class AgentProtocolTest : public AgentFixture {
 };
 
 TEST_F(AgentProtocolTest, ClosesTheConnectionOfWhoeverBreaksTheRulesAndNoOther) {
-    const std::string hello = frame(agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {}}));
-    const std::string cut = agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {}});
+    const std::string message = agent::encode(agent::Hello{.session = "s", .owner = "o", .wakeCommand = {}});
+    const std::string hello = frame(message);
     const std::pair<const char*, std::string> cases[] = {
         {"an empty message", frame("")},
         {"a message that is too long", std::string("\xff\xff\xff\x7f", 4)},
@@ -88,8 +88,7 @@ TEST_F(AgentProtocolTest, ClosesTheConnectionOfWhoeverBreaksTheRulesAndNoOther) 
         {"a reply for a request", frame(agent::encode(agent::Welcome{}))},
         {"a request before the greeting", frame(agent::encode(agent::List{}))},
         {"a second greeting", hello + hello},
-        {"a greeting that is cut off", frame(cut.substr(0, cut.size() - 2))},
-        {"a list that is longer than its message", frame(cut.substr(0, cut.size() - 4) + "\xff\xff\xff\xff")},
+        {"a greeting that is cut off", frame(message.substr(0, message.size() - 2))},
         {"a session with too long a name",
          frame(agent::encode(agent::Hello{.session = std::string(9000, 's'), .owner = "o", .wakeCommand = {}}))},
         {"too long a wake command",
@@ -109,7 +108,7 @@ TEST_F(AgentProtocolTest, ClosesTheConnectionOfWhoeverBreaksTheRulesAndNoOther) 
     EXPECT_FALSE(other.reply());
     // What a later library has to say beyond what this agent knows.
     RawClient later(options.directory);
-    later.sendBytes(frame(cut + "more") + frame("\x7fmore") + frame(agent::encode(agent::Ping{}) + "more"));
+    later.sendBytes(frame(message + "more") + frame("\x7fmore") + frame(agent::encode(agent::Ping{}) + "more"));
     EXPECT_TRUE(later.gets<agent::Welcome>());
     EXPECT_TRUE(later.gets<agent::Unsupported>());
     EXPECT_TRUE(later.gets<agent::Pong>());
@@ -152,21 +151,13 @@ TEST_F(AgentProtocolTest, WaitsForDescriptorsWhenThereAreNone) {
 
 TEST_F(AgentProtocolTest, RefusesSubmissionsThatAreNone) {
     const auto token = TransferSubmission::newToken();
-    TransferSubmission good;
-    good.token = token;
-    good.session = "s";
-    good.owner = "o";
-    good.bodyPath = "/tmp/x";
-    auto foreign = good, other = good;
-    foreign.owner = "p";
-    other.token = TransferSubmission::newToken();
+    const std::string good = submission(token, "o").encoded();
     const std::pair<const char*, std::string> cases[] = {
-        {"garbage", std::string(1000, 'x')},
-        {"cut off", good.encoded().substr(0, 90)},
-        {"damaged", good.encoded().replace(good.encoded().find("tmp/x"), 3, "pmt")},
-        {"too long", good.encoded() + std::string(TransferSubmission::longest, 'x')},
-        {"another task's", other.encoded()},
-        {"another owner's", foreign.encoded()},
+        {"cut off", good.substr(0, 90)},
+        {"damaged", std::string(good).replace(good.find("body"), 4, "ydob")},
+        {"too long", good + std::string(TransferSubmission::longest, 'x')},
+        {"another task's", submission(TransferSubmission::newToken(), "o").encoded()},
+        {"another owner's", submission(token, "p").encoded()},
     };
     RawClient client(options.directory);
     client.greet();

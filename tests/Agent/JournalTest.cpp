@@ -4,6 +4,7 @@
 #include <corvane/Agent/WireWriter.h>
 #include <corvane/Transfer/TransferError.h>
 
+#include "tests/support/AgentFiles.h"
 #include "tests/support/Testing.h"
 
 #include <sqlite3.h>
@@ -24,18 +25,12 @@ constexpr const char* version1 =
 // A submission as version 1 wrote it.
 std::string submission1(const std::string& token) {
     WireWriter write;
-    write(std::string("CVTS"), std::int64_t{1}, token, std::string("session"), std::string("owner"),
-          std::optional<std::string>(), std::string("http://127.0.0.1/"), std::string("PUT"),
-          std::vector<std::pair<std::string, std::string>>{}, std::string("/body"));
+    write(std::string("CVTS"), std::int64_t{1}, token, std::string("s"), std::string("o"), std::optional<std::string>(),
+          std::string("http://127.0.0.1/"), std::string("PUT"), std::vector<std::pair<std::string, std::string>>{},
+          std::string("/body"));
     for (const std::int64_t number : {65'536, 60'000, 300'000, 4, 86'400'000}) write(number);
     write(std::vector<std::string>{});
     return write.take();
-}
-
-std::string literal(const std::string& bytes) {
-    std::string text = "x'";
-    for (const unsigned char byte : bytes) text += {"0123456789ABCDEF"[byte >> 4], "0123456789ABCDEF"[byte & 15]};
-    return text + "'";
 }
 
 /// A journal with its book. Every test has the file `path`, into which it looks by itself.
@@ -63,16 +58,7 @@ class JournalTest : public testing::Test {
         sqlite3_close(database);
         return text;
     }
-    static TransferSubmission submission() {
-        return {.token = TransferSubmission::newToken(),
-                .session = "session",
-                .owner = "owner",
-                .description = "text",
-                .request = {.url = "http://127.0.0.1/", .headers = {}},
-                .bodyPath = "/body",
-                .limits = {},
-                .wakeCommand = {}};
-    }
+    static TransferSubmission submission() { return test::submission(TransferSubmission::newToken(), "o"); }
     static int code(TaskBook& book, std::int64_t number) {
         const auto outcome = decodeOutcome(book.outcome(number));
         return outcome.error ? outcome.error->as<TransferError>()->code() : int(outcome.response->statusCode);
@@ -94,7 +80,7 @@ TEST_F(JournalTest, TakesOverWhatAnEarlierVersionHasLeft) {
     insert(2, submission1(token(2)), literal(encodeOutcome({std::nullopt, TransferResponse{true, 204, {}}})));
     insert(3, submission1(token(3)), "'x'");
     insert(4, "x", "NULL");  // nobody knows whose
-    ask("INSERT INTO wakes VALUES ('session', 'owner', 'x')");
+    ask("INSERT INTO wakes VALUES ('s', 'o', 'x')");
     {
         Opened now(path);
         EXPECT_EQ(now.open, std::vector<std::int64_t>{1});
@@ -108,7 +94,7 @@ TEST_F(JournalTest, TakesOverWhatAnEarlierVersionHasLeft) {
     }
     Opened again(path);
     EXPECT_EQ(code(again.book, 5), network);
-    EXPECT_EQ(again.book.owner("session", "owner").over.size(), 3u);
+    EXPECT_EQ(again.book.owner("s", "o").over.size(), 3u);
 }
 
 TEST_F(JournalTest, OneThatIsDamagedIsMovedAsideAndALaterVersionsIsLeftAlone) {

@@ -30,12 +30,7 @@ TEST_F(WakeUpExample, EndsAtOnceAndIsWokenWhenItsDocumentIsThrough) {
               "com.veskar.corvane.upload-session: all events delivered, 1 documents delivered, 0 pending\n");
     EXPECT_EQ(server.requests().size(), 1u);
     // The woken one is nobody's child here; it must not meet the end of the agent.
-    EXPECT_TRUE(eventually([&] {
-        for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
-            if (readFile(entry.path() / "cmdline").find(url + '\0' + directory) != std::string::npos) return false;
-        }
-        return true;
-    }));
+    EXPECT_TRUE(eventually([&] { return processes(url + '\0' + directory) == 0; }));
 }
 
 }  // namespace

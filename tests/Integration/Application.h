@@ -7,6 +7,7 @@
 
 #include <chrono>
 #include <cstdlib>
+#include <future>
 #include <memory>
 #include <string>
 #include <utility>
@@ -49,6 +50,13 @@ struct Application {
 
     void submit(int count = 1) {
         for (int i = 0; i < count; ++i) sessions.tracker()->submit<ScreenView>();
+    }
+
+    /// Waits until everything that was called so far has run.
+    void drain() {
+        std::promise<void> done;
+        sessions.transaction([&](AccessSessionManager&) { done.set_value(); });
+        done.get_future().wait();
     }
 
     DeliveryReport wait() { return uploads->waitForDelivery(std::chrono::steady_clock::now() + 20s); }

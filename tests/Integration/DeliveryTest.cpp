@@ -1,10 +1,7 @@
-#include <corvane/Testing/ProcessSettings.h>
-
 #include "tests/Integration/FaultFixture.h"
 #include "tests/support/PassTime.h"
 
 #include <corvane/Signing/SHA1.h>
-#include <corvane/Upload/UploadService.h>
 
 namespace corvane::test {
 namespace {
@@ -68,24 +65,6 @@ TEST_F(Delivery, WhatTheServerTurnsAwayArrivesInTheSameRunWhenItSaysSo) {
     EXPECT_EQ(application.wait(), (DeliveryReport{{2, 1}, {}, {}}));
     EXPECT_EQ(eventIDs(server.documents()).size(), 6u);
     EXPECT_TRUE(rows().empty() && payloads().empty());
-}
-
-TEST_F(Delivery, AWakeUpGoesFromTheProcessorManagerToTheMainQueueAndBack) {
-    std::promise<std::thread::id> woken;
-    std::promise<std::function<void()>> posted;
-    ProcessSettings settings;
-    settings.setMainQueue([&](std::function<void()> task) { posted.set_value(std::move(task)); });
-    Application application(server.url());
-    application.submit();
-    const auto manager = application.sessions.processorManager();
-    manager->resumeBackgroundProcessing(std::string(UploadService::sessionIdentifier),
-                                        [&] { woken.set_value(std::this_thread::get_id()); });
-    posted.get_future().get()();  // this thread is the host's event loop
-    EXPECT_EQ(woken.get_future().get(), std::this_thread::get_id());
-    EXPECT_TRUE(
-        log.waitFor("Event processor handled background resuming for identifier=com.veskar.corvane.upload-session"));
-    manager->resumeBackgroundProcessing("another", [] {});
-    EXPECT_TRUE(log.waitFor("Deferring background resuming"));
 }
 
 }  // namespace

@@ -16,12 +16,7 @@ struct FaultFixture {
     [[nodiscard]] std::filesystem::path database() const { return documents / "com.veskar.corvane.main.db"; }
     [[nodiscard]] std::filesystem::path dropbox() const { return documents / "com.veskar.corvane.main.upload-dropbox"; }
 
-    [[nodiscard]] std::vector<std::filesystem::path> payloads() const {
-        std::error_code missing;
-        const std::filesystem::directory_iterator found(dropbox(), missing);
-        if (missing) return {};
-        return {begin(found), end(found)};
-    }
+    [[nodiscard]] std::vector<std::filesystem::path> payloads() const { return filesIn(dropbox()); }
     /// The rows of documents that are not finished. Requires: there is a database.
     [[nodiscard]] static std::vector<SignedEntity> rows() {
         return Store<SignedEntity>(StoreLocation::default_("main")).fetchAll();

@@ -64,13 +64,6 @@ class HostCode : public ::testing::Test, protected FaultFixture {
         return done->get_future();
     }
 
-    /// Waits until everything enqueued so far has run.
-    void drain() {
-        std::promise<void> drained;
-        application->sessions.transaction([&](AccessSessionManager&) { drained.set_value(); });
-        drained.get_future().wait();
-    }
-
     std::unique_ptr<Application> application = std::make_unique<Application>(server.url());
 };
 
@@ -124,8 +117,8 @@ TEST_F(HostCode, MayUseEverythingElseFromInside) {
         tracker->suspend();
         tracker->resume();
     }).wait();
-    while (rounds < 100) drain();
-    drain();
+    while (rounds < 100) application->drain();
+    application->drain();
     application->sessions.endSync();
     EXPECT_EQ(completed, submitted);
     const auto report = application->wait();

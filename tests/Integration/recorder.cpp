@@ -1,15 +1,20 @@
 // A host application in a process of its own, for tests that kill it or let it exit.
 //
-//   recorder URL DIRECTORY BATCH EVENTS MODE
+//   recorder URL DIRECTORY BATCH EVENTS MODE [ENDPOINT AGENT [WAKE...]]
+//
+// AGENT is the program of a transfer agent, without which transfers run inside the process, and WAKE the command that
+// it runs for this host.
 //
 // Records EVENTS events and writes the identifier of each acknowledged one to standard output, from its completion.
-// MODE says what happens then: "kill" (SIGKILL in the last completion), "exit" (main returns at once), "quit"
+// MODE says what happens then: "kill" (SIGKILL in the last completion), "handOver" (SIGKILL as soon as every document
+// was handed over), "exit" (main returns at once), "quit"
 // (std::exit with the session manager alive), "wait" (the session ends, and what was handed over is waited for),
 // "static" (static objects are the host's last users of the library), "fork" (children made in the midst of the events
 // end in every way that they may; then as "wait").
 
 #include "tests/Integration/Application.h"
 
+#include <corvane/Agent/Host/BackgroundTransferSession.h>
 #include <corvane/Transfer/InProcessTransferSession.h>
 
 #include <signal.h>
@@ -57,16 +62,26 @@ int forkChildren(int count) {
     return clean;
 }
 
+TransferSession::Factory background(const std::string& directory, int count, char** command) {
+    TransferAgentOptions options;
+    options.program = command[0];
+    options.directory = directory + "/agent";
+    options.idleTime = 20s;
+    options.wakeCommand.assign(command + 1, command + count);
+    return BackgroundTransferSession::factory(options);
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
-    if (argc != 6) return 2;
+    if (argc < 6) return 2;
     const std::string mode = argv[5];
     const int events = std::atoi(argv[4]);
     DocumentsDirectory::set(argv[2]);
-    TransferSession::setFactory(InProcessTransferSession::factory());
+    TransferSession::setFactory(argc > 7 ? background(argv[2], argc - 7, argv + 7)
+                                         : InProcessTransferSession::factory());
     Log::shared().setSink([](LogLevel, std::string_view) {});
-    staticHost.application = std::make_unique<Application>(argv[1], std::atoi(argv[3]));
+    staticHost.application = std::make_unique<Application>(argv[1], std::atoi(argv[3]), argc > 6 ? argv[6] : "main");
     Application& application = *staticHost.application;
     for (int i = 1; i <= events; ++i) {
         application.sessions.tracker()->submit<ScreenView>([=](const EventSubmitResult& result) {
@@ -82,9 +97,10 @@ int main(int argc, char** argv) {
     if (mode == "static") return 0;
     bool forked = true;
     if (mode == "fork") forked = forkChildren(30) == 30;
-    if (mode == "fork" || mode == "wait") {
+    if (mode == "fork" || mode == "wait" || mode == "handOver") {
         application.sessions.endSync();
-        const DeliveryReport report = application.wait();
+        if (mode == "handOver") kill(getpid(), SIGKILL);
+        const auto report = application.uploads->waitForDelivery(std::chrono::steady_clock::now() + 60s);
         staticHost.application.reset();
         return forked && report.pending.documents == 0 && report.givenUp.documents == 0 ? 0 : 1;
     }

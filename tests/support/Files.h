@@ -5,6 +5,7 @@
 #include <iterator>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace corvane::test {
 
@@ -16,6 +17,14 @@ namespace corvane::test {
 
 inline void writeFile(const std::filesystem::path& file, std::string_view contents) {
     std::ofstream(file, std::ios::binary) << contents;
+}
+
+/// What is in a directory; nothing when there is none.
+[[nodiscard]] inline std::vector<std::filesystem::path> filesIn(const std::filesystem::path& directory) {
+    std::error_code missing;
+    const std::filesystem::directory_iterator found(directory, missing);
+    if (missing) return {};
+    return {begin(found), end(found)};
 }
 
 /// The permission bits, such as 0600.
