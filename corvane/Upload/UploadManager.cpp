@@ -118,8 +118,8 @@ void UploadManager::forget() {
     if (!documents.empty()) service_->cancel(std::move(documents), [](const std::set<std::string>&) {});
 }
 
-// What earlier epochs have left is not among them: they are another process's, which had begun the epoch before this one
-// heard of it.
+// What earlier epochs have left is not among them: they are another process's, which had begun the epoch before this
+// one heard of it.
 std::vector<std::string> UploadManager::storedDocuments() {
     try {
         return rows_->identifiers();
