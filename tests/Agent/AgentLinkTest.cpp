@@ -140,6 +140,8 @@ TEST(AgentConversation, ACompletionForASessionThatHasJustGoneIsLeftToTheNext) {
         AgentConversation::Session{
             {}, tasks, reporter, std::make_shared<InsideTransfers>(TransferSessionConfiguration{}, reporter, tasks)});
     tasks->close();
+    EXPECT_FALSE(tasks->insert(
+        std::make_shared<BackgroundTransferTask>(std::weak_ptr<BackgroundTransferCore>(), 1, TransferRequest{}, "")));
     std::promise<bool> isAcknowledged;
     AgentThread::shared().post([&] {
         agentThread.assertCurrent("the test");
