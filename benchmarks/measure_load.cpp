@@ -2,8 +2,8 @@
 //
 //     measure_load [SCENARIO]
 //
-// Prints for each how long a caller's submissions took, the growth of the process's memory at its highest, and how long
-// it was until the first delivery and until the last.
+// Transfers run inside the process. Prints for each how long a caller's submissions took, the growth of the process's
+// memory at its highest, and how long it was until the first delivery and until the last.
 
 #include "benchmarks/Host.h"
 #include "benchmarks/Samples.h"
@@ -249,6 +249,7 @@ constexpr struct {
 }  // namespace
 
 int main(int argc, char** argv) {
+    TransferSession::setFactory(InProcessTransferSession::factory());
     for (const auto& scenario : scenarios) {
         if (argc > 1 && scenario.name != argv[1]) continue;
         const test::TemporaryDocuments documents;

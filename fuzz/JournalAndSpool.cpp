@@ -9,6 +9,8 @@
 
 #include <sqlite3.h>
 
+#include <algorithm>
+
 using namespace corvane;
 using namespace corvane::transferd;
 
@@ -121,9 +123,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     test::writeFile(directory.submissionPath(marked), test::submission(marked, "s").encoded());
     try {
         Start agent(directory);
-        const bool isAccepted = agent.book.find(marked).has_value();
-        CORVANE_REQUIRE(isAccepted || (!hasRows && directory.spooled() == std::vector{marked}),
-                        "a submission was lost");
+        const auto left = directory.spooled();  // by a damaged journal that takes nothing
+        const bool isLeft = !hasRows && std::count(left.begin(), left.end(), marked) == 1;
+        CORVANE_REQUIRE(isLeft || agent.book.find(marked), "a submission was lost");
         agent.endAll();
     } catch (const std::exception& error) {
         CORVANE_REQUIRE(!hasRows && *error.what(), error.what());

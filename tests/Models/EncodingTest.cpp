@@ -102,23 +102,20 @@ TEST(Encoding, TruncatesDatesAndDurationsTowardZero) {
 }
 
 TEST(Encoding, NeverWritesBrokenTextForAnEncoderMisused) {
-    const auto broken = [](auto&& use) {
-        Encoder encoder;
-        EXPECT_THROW(
-            {
-                use(encoder);
-                (void)std::move(encoder).take();
-            },
-            EncodingError);
+    const std::function<void(Encoder&)> misuses[] = {
+        [](Encoder&) {},
+        [](Encoder& e) { e.beginObject(); },
+        [](Encoder& e) { e.beginObject(), e.integer(1); },
+        [](Encoder& e) { e.beginObject(), e.key("a"), e.endObject(); },
+        [](Encoder& e) { e.beginObject(), e.key("a"), e.key("b"); },
+        [](Encoder& e) { e.beginArray(), e.endObject(); },
+        [](Encoder& e) { e.beginArray(), e.key("a"); },
+        [](Encoder& e) { e.integer(1), e.integer(2); },
     };
-    broken([](Encoder&) {});
-    broken([](Encoder& e) { e.beginObject(); });
-    broken([](Encoder& e) { e.beginObject(), e.integer(1); });
-    broken([](Encoder& e) { e.beginObject(), e.key("a"), e.endObject(); });
-    broken([](Encoder& e) { e.beginObject(), e.key("a"), e.key("b"); });
-    broken([](Encoder& e) { e.beginArray(), e.endObject(); });
-    broken([](Encoder& e) { e.beginArray(), e.key("a"); });
-    broken([](Encoder& e) { e.integer(1), e.integer(2); });
+    for (const auto& misuse : misuses) {
+        Encoder encoder;
+        EXPECT_THROW((misuse(encoder), std::move(encoder).take()), EncodingError);
+    }
 }
 
 TEST(Decoding, NamesWhatIsMissingWrongOrOutOfRange) {

@@ -5,23 +5,10 @@
 namespace corvane {
 namespace {
 
-TEST(JSON, HoldsAnyTopLevelValueAndSerialisesOnlyObjectsAndArrays) {
-    EXPECT_EQ(JSON("42").integer(), 42);
-    EXPECT_THROW((void)JSON("42").toData(), JSONError);
-    EXPECT_EQ(JSON(" [1, 2] ").toData(), "[1,2]");
-    EXPECT_THROW((void)JSON("[]").payload(), JSONError);
-    EXPECT_TRUE(JSON("null").exists());
-}
-
 TEST(JSON, IsNothingWhenTheBytesAreNotJSON) {
     for (const std::string bytes :
          {"", "{", "{\"a\":}", "nul", "[1] x", "\"\xff\"", "{\"a\":1}}", "1e999", "[-1e309]"}) {
-        const JSON json(bytes);
-        EXPECT_FALSE(json.exists()) << bytes;
-        EXPECT_FALSE(json.string() || json.integer() || json.double_() || json.bool_() || json.array() ||
-                     json.object() || json.number() || json.any());
-        EXPECT_FALSE(json["a"][3]["b"].exists());
-        EXPECT_EQ(json.text(), "");
+        EXPECT_FALSE(JSON(bytes).exists() || JSON(bytes)["a"][3]["b"].exists()) << bytes;
     }
     EXPECT_FALSE(JSON(std::string(600, '[') + std::string(600, ']')).exists()) << "nesting is bounded";
 }
@@ -62,13 +49,15 @@ TEST(JSON, WritesEveryNumberBackAsItWasRead) {
     EXPECT_EQ(JSON(copy.text()).text(), copy.text());
 }
 
-TEST(JSON, LaysOutTextAsAsked) {
+TEST(JSON, LaysOutTextOfObjectsAndArraysAsAsked) {
     const JSON json(R"({"b":[1,{}],"a":"\u00e9\n\u0001\"/"})");
     EXPECT_EQ(json.toData(), "{\"b\":[1,{}],\"a\":\"\u00e9\\n\\u0001\\\"/\"}");
     EXPECT_EQ(json.toData({.sortedKeys = true}), "{\"a\":\"\u00e9\\n\\u0001\\\"/\",\"b\":[1,{}]}");
     EXPECT_EQ(json.toData({.prettyPrinted = true}),
               "{\n  \"b\": [\n    1,\n    {}\n  ],\n  \"a\": \"\u00e9\\n\\u0001\\\"/\"\n}");
     EXPECT_EQ(json["b"].description(), "[1, [:]]");
+    EXPECT_THROW((void)JSON("42").toData(), JSONError);
+    EXPECT_THROW((void)JSON("[]").payload(), JSONError);
     EXPECT_EQ(JSON(R"({"k":"v","n":1.5})").description(), R"(["k": "v", "n": 1.5])");
 }
 

@@ -28,14 +28,6 @@ TEST(DocumentsDirectory, IsTheApplicationsOwnAndPrivate) {
     EXPECT_THROW(DocumentsDirectory::create(), SystemError);
 }
 
-TEST(DocumentsDirectory, NamesFilesAfterEndpointsOnlyInsideItself) {
-    EXPECT_EQ(DocumentsDirectory::fileNamePart(" Main Store\r\n"), "main store");
-    EXPECT_EQ(DocumentsDirectory::fileNamePart("..."), "...");
-    const std::string refused[] = {"", " \n", ".", "..", "a/b", "../a", std::string("a\0b", 3), std::string(191, 'a')};
-    for (const auto& name : refused)
-        EXPECT_THROW((void)DocumentsDirectory::fileNamePart(name), InvalidArgument) << name;
-}
-
 TEST(Bundle, ReadsEntriesAndSkipsWhatIsNone) {
     TemporaryDocuments temporary;
     writeFile(temporary / "app.bundle", "BundleName=A=B\nnonsense\n=\nBundleVersion=7\n");
@@ -54,7 +46,7 @@ TEST(Date, ConvertsOnlyWhatADateCanHold) {
     EXPECT_EQ(description(Date(-1ms)), "1969-12-31 23:59:59 +0000");
 }
 
-TEST(Log, ShowsErrorsUnlessToldOtherwiseAndPrintsNothingThatSteersATerminal) {
+TEST(Log, ShowsErrorsHidesPrivateArgumentsWhenAskedAndPrintsNothingThatSteersATerminal) {
     EXPECT_TRUE(Log::shared().isEnabled(LogLevel::error));
     EXPECT_FALSE(Log::shared().isEnabled(LogLevel::default_));
     const test::CapturedLog log;
@@ -63,6 +55,10 @@ TEST(Log, ShowsErrorsUnlessToldOtherwiseAndPrintsNothingThatSteersATerminal) {
     Log::shared().error("%@", LogLines{foreign});
     EXPECT_EQ(log.lines()[0].message, "a\\x1b[31m\\x0d\\n\\x7f\\xff\\xc2\\x9b\xe2\x82\xac\\xc3");
     EXPECT_EQ(log.lines()[1].message, "a\\x1b[31m\\x0d\n\\x7f\\xff\\xc2\\x9b\xe2\x82\xac\\xc3");
+    Log::shared().setHidesPrivateArguments(true);
+    Log::shared().error("a=%{public}@ b=%@ n=%ld 100%", "x", "secret", 7);
+    Log::shared().setHidesPrivateArguments(false);
+    EXPECT_EQ(log.lines()[2].message, "a=x b=<private> n=7 100%");
 }
 
 TEST(TransferSession, AFactoryThatGoesMaySetAnother) {

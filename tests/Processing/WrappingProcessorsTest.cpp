@@ -8,7 +8,7 @@ namespace {
 
 struct View {};
 
-/// Takes what it is asked to resume, and may refuse its queue.
+/// Takes what it is asked to resume, or does not, and may refuse its queue.
 struct Wrapped final : RecordingProcessor {
     void registerAccessQueue(std::shared_ptr<SerialQueue> queue) override {
         if (std::exchange(refuses, false)) throw std::runtime_error("not yet");
@@ -16,11 +16,11 @@ struct Wrapped final : RecordingProcessor {
     }
     bool resumeBackgroundProcessing(const std::string& identifier, const std::function<void()>& completion) override {
         resumed = identifier;
-        completion();
-        return true;
+        if (resumes) completion();
+        return resumes;
     }
     std::string resumed;
-    bool refuses = false;
+    bool refuses = false, resumes = true;
 };
 
 class WrappingProcessors : public TrackingTest {
@@ -134,6 +134,29 @@ TEST_F(WrappingProcessors, LetOutOnlyWhatTheFilterHasDecided) {
         EXPECT_EQ(filter->failures(), failures += test.failures) << test.what;
     }
     EXPECT_EQ(log.count("Host code failed, call=event filter, error="), 4);
+}
+
+using ProcessorManagerTest = WrappingProcessors;
+
+TEST_F(ProcessorManagerTest, KeepsOneResumeRequestForTheProcessorThatTakesIt) {
+    const auto manager = sessions->processorManager();
+    int replaced = 0, taken = 0;
+    manager->resumeBackgroundProcessing("first", [&] { ++replaced; });
+    manager->resumeBackgroundProcessing("second", [&] { ++taken; });
+    const auto declines = std::make_shared<Wrapped>(), after = std::make_shared<Wrapped>();
+    declines->resumes = false;
+    for (const auto& one : {declines, wrapped, after}) manager->add(one);
+    EXPECT_THROW(manager->add(nullptr), InvalidArgument);
+    processor->settle();
+    EXPECT_EQ(declines->resumed, "second");
+    EXPECT_EQ(wrapped->resumed, "second");
+    EXPECT_EQ(after->resumed, "") << "what was taken is not offered again";
+    EXPECT_EQ(taken, 1);
+    EXPECT_EQ(replaced, 0);
+
+    manager->resumeBackgroundProcessing("third", [&] { ++taken; });
+    processor->settle();
+    EXPECT_EQ(taken, 3) << "every processor is asked, also after one has taken it";
 }
 
 }  // namespace

@@ -36,26 +36,18 @@ TEST(Store, KeepsOneRowPerKeyAndFindsRowsByColumnAlsoInMemoryWhenItIsClosed) {
     EXPECT_EQ(store.fetchAll(), std::vector{pear});
 }
 
-TEST(Store, AClosedStoreOpensForOneStatement) {
+TEST(Store, FilesArePrivateNamedAfterTheLocationAndOpenForAsLongAsTheyAreUsed) {
     const TemporaryDocuments documents;
-    Store<Note> store(StoreLocation::default_("main"));
+    DocumentsDirectory::set(documents / "made on demand 100%");
+    Store<Note> store(StoreLocation::default_(" Main Store\n"));
     EXPECT_TRUE(store.isOpen());
     store.createTable();
     store.close();
     store.insert(apple);
     EXPECT_THROW(static_cast<void>(store.fetchWhere("no such column", 1)), StoreError);
-    EXPECT_FALSE(store.isOpen());
+    EXPECT_FALSE(store.isOpen()) << "but for one statement";
     store.open();
-    EXPECT_EQ(store.fetchAll(), std::vector{apple});
     EXPECT_TRUE(store.isOpen());
-}
-
-TEST(Store, FilesAreNamedAfterTheLocationAndArePrivate) {
-    const TemporaryDocuments documents;
-    DocumentsDirectory::set(documents / "made on demand 100%");
-    Store<Note> store(StoreLocation::default_(" Main Store\n"));
-    store.createTable();
-    store.insert(apple);
     const auto directory = documents / "made on demand 100%";
     const auto file = directory / "com.veskar.corvane.main store.db";
     EXPECT_EQ(permissions(directory), 0700U);
@@ -96,21 +88,6 @@ TEST(Store, FailedStatementsCarryTheirTextAndKeepDataOutOfTheMessage) {
     const auto overflow = "SELECT 1 UNION ALL SELECT abs(-9223372036854775807 - 1);";
     const auto interrupted = thrownBy([&] { connection.query(overflow, [](StoreStepper&) {}); });
     EXPECT_EQ(interrupted.value(), StoreError::execute) << "what was read by then is not all there is";
-}
-
-TEST(StoreStepper, AReadTakesItsColumnWhetherItFailsOrNot) {
-    StoreStepper nowhere(nullptr);
-    EXPECT_THROW(static_cast<void>(nowhere.integer()), StoreStepperError);
-    EXPECT_EQ(nowhere.index(), 1);
-
-    StoreConnection connection(StoreLocation::memory());
-    connection.query("SELECT NULL, 'text', NULL, x'', 1.5;", [](StoreStepper& stepper) {
-        EXPECT_THROW(static_cast<void>(stepper.text()), StoreStepperError);
-        EXPECT_EQ(stepper.text(), "text");
-        EXPECT_EQ(stepper.optionalText(), std::nullopt);
-        EXPECT_THROW(static_cast<void>(stepper.bytes()), StoreStepperError);
-        EXPECT_EQ(stepper.double_(), 1.5);
-    });
 }
 
 }  // namespace

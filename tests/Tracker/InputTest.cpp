@@ -74,34 +74,19 @@ TEST_F(Input, WhatCannotBeEncodedFailsItsEventNamesThePropertyAndHurtsNoOther) {
               "\x7f\"}}");
 }
 
-/// An event of this name, declared at run time.
-EventSubmit named(std::string_view name, std::string_view property = "p") {
-    struct Declaration : EventDeclaration {
-        EventMirrorProperties list;
-    };
-    auto declaration = std::make_shared<Declaration>();
-    declaration->name = name;
-    declaration->list = std::make_shared<std::vector<EventMirrorProperty>>(
-        std::vector<EventMirrorProperty>{{std::string(property), std::make_shared<EventProperty<Screen>>(required)}});
-    declaration->properties = [](const EventDeclaration& self, EventMirrorStore&) {
-        return static_cast<const Declaration&>(self).list;
-    };
-    return EventSubmit(std::move(declaration));
-}
+struct NotUTF8 {
+    static constexpr std::string_view typeName = "\xff";
+};
+struct Odd {
+    static constexpr std::string_view typeName{"a\"\n\0", 4};
+    EventProperty<Screen> p = required;
+};
 
-TEST_F(Input, NamesThatTheHostMakesAtRunTimeFailTheirEventsOrStayUnchanged) {
+TEST_F(Input, NamesOfEveryKindFailTheirEventsOrStayUnchanged) {
     root->push(Screen{"home"});
-    const auto outcomeOf = [&](const std::shared_ptr<Tracker>& tracker, const EventSubmit& event) {
-        std::string outcome;
-        tracker->submit(event, now(), {.completion = [&](const EventSubmitResult& result) {
-                            outcome = result.succeeded() ? result.event()->payload().text() : result.error()->what();
-                        }});
-        processor->settle();
-        return outcome;
-    };
-    EXPECT_EQ(outcomeOf(root, named("\xff")), "metadata.name: the text is not UTF-8");
-    EXPECT_EQ(outcomeOf(root, named("View", "\xff")), "(property name): the text is not UTF-8");
-    EXPECT_EQ(outcomeOf(root, named(std::string_view("a\"\n\0", 4))),
+    EXPECT_EQ(submit<NotUTF8>(root), "! metadata.name: the text is not UTF-8");
+    submit<Odd>(root);
+    EXPECT_EQ(processor->events().at(0).payload().text(),
               R"({"data":{"p":{"name":"home"}},"metadata":{"name":"a\"\n\u0000","version":"0.1.0"}})");
 
     const auto odd = root->chain("\xff")->chain("child");

@@ -19,7 +19,9 @@ TEST(Endpoint, RefusesWhatBreaksOutOfARequestOrOfItsDirectory) {
     }
     EXPECT_EQ(Endpoint("HTTPS://u:p@[::1]:8080/x", "main").url(), "HTTPS://u:p@[::1]:8080/x");
     EXPECT_THROW(Endpoint(good, "main", {.trustedCertificates = "ca.pem"}), InvalidArgument);
-    for (const std::string name : {"", " \n", "..", "a/b"}) EXPECT_THROW(Endpoint(good, name), InvalidArgument) << name;
+    const std::string names[] = {"", " \n", ".", "..", "a/b", "../a", std::string("a\0b", 3), std::string(191, 'a')};
+    for (const auto& name : names) EXPECT_THROW(Endpoint(good, name), InvalidArgument) << name;
+    EXPECT_NO_THROW(Endpoint(good, "..."));
     EXPECT_EQ(Endpoint(good, "main").sharedContainerIdentifier(), std::nullopt);
 }
 

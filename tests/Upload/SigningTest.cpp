@@ -13,12 +13,6 @@
 namespace corvane::test {
 namespace {
 
-TEST(Bytes, AreWrittenInHexAndBase64) {
-    EXPECT_EQ(hexString(std::string("\x00\x0f\xa0", 3)), "000fa0");
-    const std::pair<std::string, std::string> cases[] = {{"", ""}, {"f", "Zg=="}, {"fo", "Zm8="}, {"foo", "Zm9v"}};
-    for (const auto& [bytes, text] : cases) EXPECT_EQ(base64String(bytes), text);
-}
-
 TEST(OstrelSigner, SignsTheDigestAndPassesTheServicesErrorOn) {
     struct Service final : SigningServiceType {
         std::string sign(std::string_view digest) override {
