@@ -51,12 +51,8 @@ AgentFixture::~AgentFixture() {
 
 std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
                                                     const std::string& owner) {
-    return open(to, TransferSessionConfiguration{.identifier = "session", .ownerKey = owner});
-}
-
-std::shared_ptr<TransferSession> AgentFixture::open(const std::shared_ptr<SessionRecorder>& to,
-                                                    TransferSessionConfiguration configuration) {
-    configuration.relaunchesForEvents = true;
+    const TransferSessionConfiguration configuration{
+        .identifier = "session", .ownerKey = owner, .relaunchesForEvents = true};
     return std::make_shared<BackgroundTransferSession>(configuration, to, nullptr, options);
 }
 

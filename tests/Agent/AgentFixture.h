@@ -64,8 +64,6 @@ class AgentFixture : public ::testing::Test {
 
     std::shared_ptr<TransferSession> open(const std::shared_ptr<SessionRecorder>& recorder,
                                           const std::string& owner = "owner");
-    std::shared_ptr<TransferSession> open(const std::shared_ptr<SessionRecorder>& recorder,
-                                          TransferSessionConfiguration configuration);
     std::shared_ptr<TransferTask> upload(TransferSession& session, const std::string& url,
                                          const std::string& description, const std::string& contents = {});
     /// Descriptions of the running tasks.

@@ -140,6 +140,11 @@ TEST(AgentConversation, ACompletionForASessionThatHasJustGoneIsLeftToTheNext) {
         AgentConversation::Session{
             {}, tasks, reporter, std::make_shared<InsideTransfers>(TransferSessionConfiguration{}, reporter, tasks)});
     tasks->close();
+    using Task = BackgroundTransferTask;
+    const auto late = std::make_shared<Task>(std::weak_ptr<BackgroundTransferCore>(), 1, TransferRequest{}, "body");
+    EXPECT_FALSE(tasks->insert(late));
+    EXPECT_TRUE(late->advanceTo(Task::Stage::inside));
+    EXPECT_FALSE(late->advanceTo(Task::Stage::reporting)) << "no task goes both ways";
     std::promise<bool> isAcknowledged;
     AgentThread::shared().post([&] {
         agentThread.assertCurrent("the test");

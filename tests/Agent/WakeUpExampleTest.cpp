@@ -1,8 +1,5 @@
 #include "tests/Agent/AgentFixture.h"
-
-#include <spawn.h>
-#include <sys/wait.h>
-#include <unistd.h>
+#include "tests/Integration/HostProcess.h"
 
 namespace corvane::test {
 namespace {
@@ -15,13 +12,8 @@ class WakeUpExample : public AgentFixture {
 
 TEST_F(WakeUpExample, EndsAtOnceAndIsWokenWhenItsDocumentIsThrough) {
     server.script(ScriptedServer::Reply::status(200).hold());
-    std::string program = CORVANE_EXAMPLE, url = server.url("/events"), directory = documents.path().string();
-    char* argv[] = {program.data(), url.data(), directory.data(), nullptr};
-    pid_t process = -1;
-    ASSERT_EQ(posix_spawn(&process, argv[0], nullptr, nullptr, argv, environ), 0);
-    int status = 0;
-    ASSERT_EQ(waitpid(process, &status, 0), process);
-    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+    const std::string url = server.url("/events"), directory = documents.path().string();
+    EXPECT_TRUE(HostProcess::run({CORVANE_EXAMPLE, url, directory}).succeeded());
     ASSERT_TRUE(server.waitForRequests(1));
     server.release();
     const auto written = documents / "woken.txt";

@@ -121,16 +121,5 @@ TEST(HostValue, SaysWhyItCannotBecomeJSON) {
     EXPECT_FALSE(toJsonValueAndReturnError(opaque, nullptr) || toDataWithOptions(JSON("42"), {}, nullptr));
 }
 
-TEST(HostValue, NestsWithoutTheStack) {
-    HostValue dictionaries = 1;
-    HostValue arrays = 1;
-    for (int i = 0; i < 200000; ++i) {
-        dictionaries = Dictionary{{"k", std::move(dictionaries)}};
-        arrays = Array{std::move(arrays)};
-    }
-    EXPECT_TRUE(asValue(dictionaries).starts_with("! Corvane.EncodingError 2"));
-    EXPECT_TRUE(asDataEvent({{"k", arrays}}).starts_with("! Corvane.EncodingError 2"));
-}
-
 }  // namespace
 }  // namespace corvane

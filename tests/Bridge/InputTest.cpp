@@ -7,21 +7,18 @@ class BridgeInput : public BridgeTest {};
 
 CVValue nested(int depth) {
     CVValue value = 1;
-    for (int i = 0; i < depth; ++i) value = CVDictionary{{"k", std::move(value)}};
+    for (int i = 0; i < depth; ++i) {
+        value = i % 2 ? CVValue(CVArray{std::move(value)}) : CVValue(CVDictionary{{"k", std::move(value)}});
+    }
     return value;
 }
 
-class Failing final : public CVDataEventType {
-  public:
-    std::string dataName() const override { return "Screen"; }
+/// Throws, also when it is asked for its name if it has none.
+struct Failing final : CVDataEventType {
+    explicit Failing(std::string given) : name(std::move(given)) {}
+    std::string dataName() const override { return name.empty() ? throw std::runtime_error("no name") : name; }
     CVDictionary toDict() const override { throw std::runtime_error("the script failed"); }
-};
-
-/// Throws already when it is asked for its name.
-class Nameless final : public CVDataEventType {
-  public:
-    std::string dataName() const override { throw std::runtime_error("no name"); }
-    CVDictionary toDict() const override { return {}; }
+    const std::string name;
 };
 
 TEST_F(BridgeInput, DeclarationsThatCannotBeUsedFailTheirSubmissions) {
@@ -66,7 +63,7 @@ TEST_F(BridgeInput, DataThatCannotBeUsedIsRefusedAndNeverRecorded) {
     } cases[] = {
         {raw("Screen", {{"a", "\xff"}}), "Corvane.EncodingError 0: a: the text is not UTF-8"},
         {raw("Screen", {{"k", nested(100000)}}), "Corvane.EncodingError 2: "},
-        {std::make_shared<Failing>(), "Corvane.HostError 0: the script failed"},
+        {std::make_shared<Failing>("Screen"), "Corvane.HostError 0: the script failed"},
     };
     CapturedLog log;
     CVError refused;
@@ -121,7 +118,7 @@ TEST_F(BridgeInput, NamesAndObjectsThatCannotBeUsedChangeNothing) {
         EXPECT_EQ(describe(refused), "Corvane.BridgeError " + error);
         EXPECT_FALSE(call(nullptr));
     }
-    EXPECT_FALSE(root->pushDataEvent(std::make_shared<Nameless>(), {}, &refused));
+    EXPECT_FALSE(root->pushDataEvent(std::make_shared<Failing>(""), {}, &refused));
     EXPECT_EQ(describe(refused), "Corvane.HostError 0: no name");
     EXPECT_THROW(CVTracker{nullptr}, BridgeError);
     EXPECT_THROW(CVSessionManager{nullptr}, BridgeError);

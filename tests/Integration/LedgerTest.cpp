@@ -1,6 +1,5 @@
 #include <corvane/Testing/FakeTransferSession.h>
 #include <corvane/Testing/ProcessSettings.h>
-#include <corvane/Testing/RecordingProcessor.h>
 
 #include "tests/Integration/FaultFixture.h"
 
@@ -53,15 +52,13 @@ class Books : public ::testing::Test, protected FaultFixture {
 
     std::unique_ptr<Application> start(int batchSize) { return start({.batchSize = batchSize}); }
     std::unique_ptr<Application> start(const UploadBatchEventOptions& options) {
-        settled = std::make_shared<RecordingProcessor>();
         auto application =
             std::make_unique<Application>("https://collector.example.com/in", UploadBatchEventConfig(options));
-        application->sessions.processorManager()->add(settled);
-        settled->settle();
+        application->drain();
         return application;
     }
-    std::string ledger(const Application& application) {
-        settled->settle();
+    std::string ledger(Application& application) {
+        application.drain();
         return text(application.uploads->ledger());
     }
     /// As it is on disk.
@@ -81,7 +78,6 @@ class Books : public ::testing::Test, protected FaultFixture {
     }
 
     std::shared_ptr<FakeTransferSession> session;
-    std::shared_ptr<RecordingProcessor> settled;
     ProcessSettings settings;
 };
 
@@ -102,7 +98,7 @@ TEST_F(Books, CountEverythingOnceInOnePlaceOverRetriesAndRuns) {
     for (int i = 0; i < 3; ++i) tracker->submit<Incomplete>();
     application->sessions.end();
     tracker->submit<ScreenView>();
-    settled->settle();
+    application->drain();
     session->complete(6, 200);
     session->complete(5, 503);
     EXPECT_EQ(ledger(*application), "waiting 4/2, delivered 3/2, 4xx 2/1, 3xx 2/1, again 4/2");
@@ -124,7 +120,7 @@ TEST_F(Books, CountEverythingOnceInOnePlaceOverRetriesAndRuns) {
 TEST_F(Books, NameWhatProgramsThatKeepNoneHaveDoneAndWhatNoRowStoodFor) {
     auto application = start(1);
     application->submit(3);
-    settled->settle();
+    application->drain();
     const auto other = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
     Store<SignedEntity> requests(other);
     const auto stored = requests.fetchAll();
@@ -153,22 +149,6 @@ TEST_F(Books, NameWhatProgramsThatKeepNoneHaveDoneAndWhatNoRowStoodFor) {
     EXPECT_EQ(ledger(*application), "waiting 3/3, delivered 1/1, 4xx 1/1, payload 0/1, unknown 1/1, again 2/2");
 }
 
-TEST_F(Books, ThatCannotBeWrittenKeepNoDocumentFromBeingSentAgain) {
-    auto application = start(1);
-    application->submit();
-    settled->settle();
-    session->complete(1, 503);
-    application->abandon();
-    StoreConnection other(StoreLocation::default_("main"));
-    other.run("DELETE FROM documents;");
-    other.run("CREATE TRIGGER no BEFORE INSERT ON documents BEGIN SELECT RAISE(ABORT, 'full'); END;");
-    application = start(1);
-    EXPECT_TRUE(session->waitForTasks(1));
-    EXPECT_EQ(log.count("Failed to bring the ledger up to date"), 1);
-    session->complete(1, 200);
-    EXPECT_EQ(application->wait().delivered.documents, 1);
-}
-
 /// What the documents directory holds of events, without the names that change.
 std::string kept(const std::filesystem::path& directory) {
     std::map<std::string, int> kinds;
@@ -184,9 +164,8 @@ std::string kept(const std::filesystem::path& directory) {
 TEST_F(Books, ForgetDropsWhatIsNotDeliveredEverywhereAndKeepsWhatComesLater) {
     {
         Application other("https://collector.example.com/in", 2, "other");
-        other.sessions.processorManager()->add(settled = std::make_shared<RecordingProcessor>());
         other.submit(3);
-        settled->settle();
+        other.drain();
         session->complete(1, 503);
         other.abandon();
     }
@@ -205,9 +184,9 @@ TEST_F(Books, ForgetDropsWhatIsNotDeliveredEverywhereAndKeepsWhatComesLater) {
     }
     auto application = start(2);
     application->submit(5);
-    settled->settle();
+    application->drain();
     session->complete(1, 200);
-    settled->settle();
+    application->drain();
     EXPECT_EQ(kept(documents.path()), ".debugging 1 .upload-dropbox 4 ");
 
     int told = 0;
@@ -242,7 +221,7 @@ TEST_F(Books, ForgetIsObeyedByOthersAndFinishedByTheNext) {
     const auto file = documents / "com.veskar.corvane.recording";
     auto application = start(2);
     application->submit(3);
-    settled->settle();
+    application->drain();
     replacePrivateFile(file, "on 5000000000000 0\n");  // another process, which is killed
     application->submit(1);
     EXPECT_EQ(ledger(*application), "open 1/1, forgotten 3/1") << "what comes later is kept";
@@ -273,14 +252,14 @@ TEST_F(Books, WhatIsRecordedAfterForgettingIsSentByThisRunAndTheNext) {
     application->submit(2);  // handed over before the transfers of before are listed
     application->sessions.tracker()->resume();
     forgotten.get_future().wait();
-    settled->settle();
+    application->drain();
     for (const auto& task : session->made()) EXPECT_EQ(task->wasCancelled(), task->identifier() <= 2);
     for (const int task : {3, 4}) session->complete(task, 503);
     application->abandon();
     application = start(1);
-    settled->settle();
+    application->drain();
     ASSERT_TRUE(session->waitForTasks(2));
-    settled->settle();
+    application->drain();
     for (const auto& task : session->made()) EXPECT_FALSE(task->wasCancelled()) << "it has nothing of before";
     EXPECT_EQ(application->uploads->waitForDelivery({}).pending.documents, 2);
 }
@@ -301,7 +280,7 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     EXPECT_EQ(ledger(*application), "delivered 2/1, size 2/1");
     EXPECT_EQ(payloads().size() + rows().size(), 0u);
     application->submit(2);
-    settled->settle();
+    application->drain();
     session->complete(3, 503);
     EXPECT_EQ(ledger(*application), "delivered 2/1, size 4/2") << "nothing is sent again";
     EXPECT_EQ(application->wait(), (DeliveryReport{{2, 1}, {}, {4, 2}}));
@@ -311,7 +290,7 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     // What is counted is compared with what is there; a start gives up what is too old before it was sent again.
     application = start(1);
     application->submit(3);
-    settled->settle();
+    application->drain();
     for (const int task : {1, 2, 3}) session->complete(task, 503);
     application->abandon();
     auto old = rows().at(0);
@@ -319,13 +298,13 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     Store<SignedEntity>(StoreLocation::default_("main")).insert(old);
     std::filesystem::resize_file(dropbox() / rows().at(0).identifier, 100'000);
     application = start({.batchSize = 2, .maximumBytesOnDisk = 90'000, .maximumAge = std::chrono::hours(1)});
-    settled->settle();
+    application->drain();
     ASSERT_TRUE(session->waitForTasks(1));
     EXPECT_EQ(ledger(*application), "waiting 1/1, delivered 2/1, size 5/3, age 1/1, again 3/3");
 
     // Another process has delivered what this one counts, and writes what it does not.
     application->submit(2);
-    settled->settle();
+    application->drain();
     const auto size = static_cast<std::int64_t>(std::filesystem::file_size(dropbox() / rows().at(1).identifier));
     session->complete(2, 503);
     session->complete(1, 200);
@@ -335,7 +314,7 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     const auto other = std::make_shared<StoreConnection>(StoreLocation::default_("main"));
     for (int i = 0; i < 8; ++i) {
         application->submit(2);
-        settled->settle();
+        application->drain();
         for (const char* table : {"signed_requests", "documents"})
             other->run("DELETE FROM " + std::string(table) + ";");
     }
@@ -345,7 +324,7 @@ TEST_F(Books, BoundsGiveTheOldestDocumentsUpOnceTheyAreWithdrawnAndNoOpenBatch) 
     Store<SignedEntity>(other).insert(old);
     Store<DocumentEntity>(other).insert({old.identifier, 7, 1'000'000});
     application->submit(2);
-    settled->settle();  // it is withdrawn first
+    application->drain();  // it is withdrawn first
     EXPECT_NE(ledger(*application).find("size 12/4"), std::string::npos);
 
     for (const UploadBatchEventOptions& bad :
