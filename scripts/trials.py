@@ -2,6 +2,7 @@
 own, and what must hold at its end."""
 
 import collections
+import contextlib
 import gzip
 import http.server
 import json
@@ -17,11 +18,23 @@ import zlib
 
 ROOT = pathlib.Path(__file__).resolve().parent.parent
 BUILD = ROOT / "build/dev"
-HOST, DRIVEN, STEPS, AGENT = (BUILD / path for path in (
-    "tests/Kill/kill_host", "tests/Kill/kill_driven", "tests/Kill/libkill_steps.so", "corvane/Agent/Daemon/corvane-transferd"))
+HOST, STEPS, AGENT = (BUILD / path for path in ("tests/Kill/kill_host", "tests/Kill/libkill_steps.so",
+                                                "corvane/Agent/Daemon/corvane-transferd"))
 DEADLINE = 30  # seconds, for what takes milliseconds
 
-Scenario = collections.namedtuple("Scenario", "agent mode left")
+# What a host is told in a run (see tests/Kill/host.cpp). Events that are at hand together share a write, so that some wait
+# for the one before.
+END = ["end", "wait", "read", "told"]
+SEVEN = 7 * ["submit before"]
+PAUSE = 7 * ["submit before", "told"] + ["sleep 1200", "say later"]
+MODES = {
+    "leave": SEVEN,
+    "record": 12 * ["submit before", "told"] + END,
+    "pauses": 2 * PAUSE + END,
+    "forget": SEVEN + ["forget", "told"] + 3 * ["submit after"] + END,
+    "collect": ["submit after"] + END,
+}
+Scenario = collections.namedtuple("Scenario", "agent mode left options", defaults=[()])
 SCENARIOS = {
     "first run": Scenario(False, "record", False),
     "later run": Scenario(False, "record", True),
@@ -129,9 +142,14 @@ class Trial:
         return 200
 
     def start(self, mode, environment=None):
-        arguments = [HOST, self.server.url(self.number, self.phase), self.home, AGENT if self.scenario.agent else "-", mode]
-        return subprocess.Popen(arguments, stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True,
-                                env={**os.environ, **(environment or {})})
+        arguments = [HOST, self.server.url(self.number, self.phase), self.home, AGENT if self.scenario.agent else "-"]
+        process = subprocess.Popen(arguments + ["batchSize=5", *self.scenario.options], text=True, stdin=subprocess.PIPE,
+                                   stdout=subprocess.PIPE, stderr=subprocess.PIPE,
+                                   env={**os.environ, **(environment or {})})
+        with contextlib.suppress(BrokenPipeError):  # it was killed at once
+            process.stdin.write("\n".join(["start", *MODES[mode], ""]))
+            process.stdin.flush()
+        return process
 
     def finish(self, process):
         try:
@@ -149,12 +167,13 @@ class Trial:
         word, _, rest = line.partition(" ")
         if word == "forgotten":
             self.has_forgotten = True
-        elif word == "unaccounted" and rest != "0":
+        elif word == "ledger" and rest != "0":
             raise Failure(f"{rest} events are unaccounted for")
-        elif word in ("before", "after"):
-            self.acknowledged.add(rest)
-            if word == "after":
-                self.after.add(rest)
+        elif word == "ack":
+            when, event = rest.split()
+            self.acknowledged.add(event)
+            if when == "after":
+                self.after.add(event)
 
     def leave(self):
         """A run that is killed together with its agent, with a document under way and a batch open."""

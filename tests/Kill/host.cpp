@@ -1,18 +1,12 @@
-// The host that scripts/check-steps kills.
+// The host that scripts/check-steps, scripts/check-power and scripts/soak drive.
 //
-//   kill_host URL DIRECTORY AGENT MODE ["powerCut"]
+//   kill_host URL DIRECTORY AGENT OPTION=VALUE...
 //
-// AGENT is the transfer agent's program, or "-" for transfers inside the process. MODE:
-//
-//   leave    records 7 events in batches of 5, and waits to be killed
-//   record   records 12 events, each behind the one before, ends the session, and waits until each document has an
-//   outcome forget   records 7 events, forgets them, and records 3 behind that; then as "record" collect  records one
-//   event; then as "record", and waits until what was to be forgotten is
-//   pauses   records 7 events, waits until the disk's last moments are over, says "later", records 7 more and does the
-//            same; then as "record"
-//
-// Writes to standard output a line for each event that was acknowledged, "before ID" or "after ID" by whether
-// forgetting is to drop it, "forgotten" when that has succeeded, and at the end "unaccounted N", as the ledger has it.
+// AGENT is the transfer agent's program, or "-" for transfers inside the process. Does what the lines of standard input
+// say, each behind the one before, and ends with the input. What ends a line's work later than the line is told of on
+// standard output by a line of its own: of a submission "ack NAME EVENT" or "no NAME", of `record` "recorded", of
+// `forget` "forgotten" or "not forgotten", of `wait` "waited", of `read` "ledger UNACCOUNTED". `told` waits for all of
+// these.
 
 #include "tests/Integration/Application.h"
 
@@ -21,8 +15,12 @@
 
 #include <unistd.h>
 
+#include <atomic>
 #include <cstdio>
-#include <future>
+#include <functional>
+#include <iostream>
+#include <map>
+#include <sstream>
 #include <string>
 #include <thread>
 
@@ -31,79 +29,145 @@ using namespace corvane::test;
 
 namespace {
 
+struct Viewer {
+    std::string name;
+};
+
+std::atomic<int> untold = 0;
+
 void say(const std::string& line) {
     const auto text = line + "\n";
     if (write(STDOUT_FILENO, text.data(), text.size()) < 0) std::_Exit(3);
 }
 
-/// @param oneByOne whether each waits for the one before: those that are at hand together share a write
-void submit(Application& application, int count, const std::string& when, bool oneByOne = false) {
-    application.sessions.tracker()->push(Screen{when});
-    for (int i = 0; i < count; ++i) {
-        std::promise<void> told;
-        auto wait = told.get_future();
-        application.sessions.tracker()->submit<ScreenView>(
-            [when, told = std::make_shared<std::promise<void>>(std::move(told))](const EventSubmitResult& result) {
-                if (result.succeeded()) say(when + " " + *result.event()->json()["event"]["eventID"].string());
-                told->set_value();
-            });
-        if (oneByOne) wait.wait();
+void tell(const std::string& line) {
+    say(line);
+    --untold;
+    untold.notify_all();
+}
+
+struct Options {
+    UploadBatchEventOptions batches;
+    TransferAgentOptions agent;
+
+    Options(const std::string& directory, const std::string& program, int count, char** values) {
+        agent.program = program;
+        agent.directory = directory + "/agent";
+        agent.idleTime = 300ms;
+        agent.retryDelay = 20ms;
+        for (int i = 0; i < count; ++i) {
+            const std::string text = values[i];
+            const auto middle = text.find('=');
+            set(text.substr(0, middle), std::stoll(text.substr(middle + 1)));
+        }
     }
-}
 
-void forget(Application& application) {
-    std::promise<void> forgotten;
-    application.sessions.forget([&](const ForgottenRecords&, const AnyError* error) {
-        if (!error) say("forgotten");
-        forgotten.set_value();
-    });
-    forgotten.get_future().wait();
-}
+  private:
+    void set(const std::string& name, long long value) {
+        const std::chrono::milliseconds time(value);
+        if (name == "batchSize") batches.batchSize = static_cast<int>(value);
+        if (name == "maximumBytesOnDisk") batches.maximumBytesOnDisk = value;
+        if (name == "maximumAge") batches.maximumAge = time;
+        if (name == "maximumDelay") batches.maximumDelay = time;
+        if (name == "retryDelay") batches.retryDelay = time;
+        if (name == "powerCut") batches.durability = Durability::powerCut;
+        if (name == "deadline") agent.deadline = time;
+        if (name == "holdOff") agent.holdOff = time;
+    }
+};
 
-TransferSession::Factory transfers(const std::string& agent, const std::string& directory) {
-    if (agent == "-") return InProcessTransferSession::factory();
-    TransferAgentOptions options;
-    options.program = agent;
-    options.directory = directory + "/agent";
-    options.idleTime = 300ms;
-    options.retryDelay = 20ms;
-    return BackgroundTransferSession::factory(options);
-}
+class Host {
+  public:
+    Host(const std::string& url, const UploadBatchEventOptions& options)
+        : uploads_(std::make_shared<UploadBatchEventProcessor>(Client{"com.example.player", "Player", "2.3", 117},
+                                                               Endpoint{url, "main"},
+                                                               UploadBatchEventConfig(options))) {
+        sessions_.processorManager()->add(uploads_);
+    }
+
+    void obey(const std::string& line) {
+        std::istringstream words(line);
+        std::string what, name;
+        words >> what >> name;
+        const auto found = commands_.find(what);
+        if (found == commands_.end()) std::_Exit(2);
+        found->second(name);
+    }
+
+  private:
+    void submit(const std::string& name) {
+        ++untold;
+        sessions_.tracker()->push(Screen{name});
+        sessions_.tracker()->submit<ScreenView>([name](const EventSubmitResult& result) {
+            if (!result.succeeded()) return tell("no " + name);
+            tell("ack " + name + " " + *result.event()->json()["event"]["eventID"].string());
+        });
+    }
+
+    void forget() {
+        ++untold;
+        sessions_.forget(
+            [](const ForgottenRecords&, const AnyError* error) { tell(error ? "not forgotten" : "forgotten"); });
+    }
+
+    void record(bool isOn) {
+        ++untold;
+        sessions_.setRecording(isOn, [](const AnyError*) { tell("recorded"); });
+    }
+
+    void wait() {
+        uploads_->waitForDelivery(std::chrono::steady_clock::now() + 20s);
+        const auto deadline = std::chrono::steady_clock::now() + 10s;
+        while (RecordingSwitch::unfinishedEpoch() != 0 && std::chrono::steady_clock::now() < deadline) usleep(1000);
+        say("waited");
+    }
+
+    void read() {
+        ++untold;
+        uploads_->readLedger([](const Ledger& ledger) { tell("ledger " + std::to_string(ledger.unaccounted)); });
+    }
+
+    static void waitUntilTold() {
+        for (int left = untold; left > 0; left = untold) untold.wait(left);
+    }
+
+    std::shared_ptr<UploadBatchEventProcessor> uploads_;
+    SessionManager sessions_;
+    const std::map<std::string, std::function<void(const std::string&)>> commands_ = {
+        {"start", [this](auto&) { sessions_.start(Session::Kind::userEvents()); }},
+        {"end", [this](auto&) { sessions_.endSync(); }},
+        {"submit", [this](auto& name) { submit(name); }},
+        {"enter", [this](auto& name) { sessions_.tracker()->enterGroup(name); }},
+        {"leave", [this](auto&) { sessions_.tracker()->leaveGroup(); }},
+        {"update",
+         [this](auto& name) {
+             sessions_.push(SessionData<Viewer>{"viewer", {name}}, {}, true);
+         }},
+        {"flush", [this](auto&) { uploads_->flush(); }},
+        {"record", [this](auto& on) { record(on == "on"); }},
+        {"forget", [this](auto&) { forget(); }},
+        {"wait", [this](auto&) { wait(); }},
+        {"read", [this](auto&) { read(); }},
+        {"told", [](auto&) { waitUntilTold(); }},
+        {"sleep", [](auto& time) { std::this_thread::sleep_for(std::chrono::milliseconds(std::stoi(time))); }},
+        {"say", [](auto& word) { say(word); }},
+    };
+};
 
 }  // namespace
 
 int main(int argc, char** argv) {
-    if (argc < 5) return 2;
-    const std::string mode = argv[4];
-    DocumentsDirectory::set(argv[2]);
+    if (argc < 4) return 2;
+    const std::string directory = argv[2], agent = argv[3];
+    const Options options(directory, agent, argc - 4, argv + 4);
+    DocumentsDirectory::set(directory);
     Log::shared().setSink([](LogLevel level, std::string_view message) {
         if (level == LogLevel::error)
             dprintf(STDERR_FILENO, "%.*s\n", static_cast<int>(message.size()), message.data());
     });
-    TransferSession::setFactory(transfers(argv[3], argv[2]));
-    UploadBatchEventOptions options{.batchSize = 5};
-    if (argc > 5) options.durability = Durability::powerCut;
-    Application application(argv[1], UploadBatchEventConfig(options));
-    if (mode == "record") submit(application, 12, "before", true);
-    for (int i = 0; i < 2 && mode == "pauses"; ++i) {
-        submit(application, 7, "before", true);
-        std::this_thread::sleep_for(1200ms);
-        say("later");
-    }
-    if (mode == "leave" || mode == "forget") submit(application, 7, "before");
-    if (mode == "leave") pause();
-    if (mode == "forget") {
-        forget(application);
-        submit(application, 3, "after");
-    }
-    if (mode == "collect") submit(application, 1, "after");
-    application.sessions.endSync();
-    application.wait();
-    const auto deadline = std::chrono::steady_clock::now() + 10s;
-    while (mode == "collect" && RecordingSwitch::unfinishedEpoch() != 0) {
-        if (std::chrono::steady_clock::now() > deadline) return 4;
-        std::this_thread::sleep_for(1ms);
-    }
-    say("unaccounted " + std::to_string(application.uploads->ledger().unaccounted));
+    TransferSession::setFactory(agent == "-" ? InProcessTransferSession::factory()
+                                             : BackgroundTransferSession::factory(options.agent));
+    Host host(argv[1], options.batches);
+    for (std::string line; std::getline(std::cin, line);) host.obey(line);
     return 0;
 }
