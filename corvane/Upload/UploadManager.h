@@ -91,8 +91,8 @@ class UploadManager final : public UploadManagerType,
     /// Removes the payload of an upload that is over, unless its row could not be deleted.
     void didFinish(const UploadResult& result, const std::optional<AnyError>& rowProblem);
     void didFailForNow(const UploadResult::Retry& retry);
-    /// Notes the end of an upload. Returns whether it was under way without a row.
     [[nodiscard]] std::vector<std::string> storedDocuments();
+    /// Notes the end of an upload. Returns whether it was under way without a row.
     bool forgetUnrecorded(const std::string& identifier);
     [[nodiscard]] bool hasRow(const std::string& identifier);
 
