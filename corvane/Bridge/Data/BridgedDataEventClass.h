@@ -46,6 +46,7 @@ class CORVANE_EXPORT BridgedDataEventClass {
     friend class BridgedEventData;
     friend class BridgedTimedData;
     friend class BridgedEventMirrorProperty;
+    friend class BridgedRawEventMirrorProperty;
 
     BridgedDataEventClass(std::string dataName, DataType type);
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <corvane/Bridge/Data/BridgedDataEventClass.h>
 #include <corvane/Bridge/Data/BridgedEventClass.h>
 #include <corvane/Export.h>
 #include <corvane/Models/EventSubmit.h>
@@ -14,13 +15,18 @@ namespace corvane {
 class BridgedRawEventProperty {
   public:
     BridgedRawEventProperty(std::string dataName, BridgedEventPropertyRequirement requirement)
-        : dataName_(std::move(dataName)), requirement_(requirement) {}
+        : BridgedRawEventProperty(BridgedDataEventClass(std::move(dataName)), requirement) {}
+    /// Filled by data of a class, which may be one of the library's own records. Data that is known by its name alone
+    /// is none of these, whatever it is called.
+    BridgedRawEventProperty(BridgedDataEventClass dataType, BridgedEventPropertyRequirement requirement)
+        : dataType_(std::move(dataType)), requirement_(requirement) {}
 
-    [[nodiscard]] const std::string& dataName() const { return dataName_; }
+    [[nodiscard]] const std::string& dataName() const { return dataType_.dataName(); }
+    [[nodiscard]] const BridgedDataEventClass& dataType() const { return dataType_; }
     [[nodiscard]] BridgedEventPropertyRequirement requirement() const { return requirement_; }
 
   private:
-    std::string dataName_;
+    BridgedDataEventClass dataType_;
     BridgedEventPropertyRequirement requirement_;
 };
 

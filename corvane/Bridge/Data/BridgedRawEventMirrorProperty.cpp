@@ -1,7 +1,5 @@
 #include <corvane/Bridge/Data/BridgedRawEventMirrorProperty.h>
 
-#include <corvane/Bridge/Models/BridgedDataEvent.h>
-
 #include <utility>
 
 namespace corvane {
@@ -20,7 +18,7 @@ EventPropertyTrait BridgedRawEventMirrorProperty::trait() const {
     return EventPropertyTrait::data;
 }
 DataType BridgedRawEventMirrorProperty::dataType() const {
-    return DataType::of<BridgedDataEvent>();
+    return rawEventProperty_.dataType().type_;
 }
 bool BridgedRawEventMirrorProperty::isDataType(DataType type) const {
     return type == dataType();

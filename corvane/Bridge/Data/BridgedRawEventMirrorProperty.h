@@ -5,8 +5,8 @@
 
 namespace corvane {
 
-/// A property of a raw event as the tracker reads it: data of any type under a name, which is always looked up. What a
-/// tracker knows of an event itself is for typed and bridged event classes. Immutable.
+/// A property of a raw event as the tracker reads it: data of any type under a name, which is always looked up, unless
+/// it was declared by the class of a record that the tracker itself makes. Immutable.
 class BridgedRawEventMirrorProperty final : public EventPropertyType {
   public:
     explicit BridgedRawEventMirrorProperty(BridgedRawEventProperty rawEventProperty);
