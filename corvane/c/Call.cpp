@@ -96,7 +96,7 @@ std::optional<std::chrono::milliseconds> duration(std::int64_t milliseconds, con
 
 void requireSize(std::size_t size, std::size_t known, const char* what) {
     if (size < known) refuse(CORVANE_INVALID_ARGUMENT, std::string("the size is not set, or too small, of ") + what);
-    if (size > 64 * 1024) refuse(CORVANE_INVALID_ARGUMENT, std::string("the size is not set of ") + what);
+    if (size > std::size_t{64} * 1024) refuse(CORVANE_INVALID_ARGUMENT, std::string("the size is not set of ") + what);
 }
 
 void requireNoMore(const char* begin, const char* end, const char* what) {

@@ -46,6 +46,7 @@
  * The binary interface is stable: functions, constants and members stay, and new ones are added.
  */
 
+/* NOLINTBEGIN(modernize-*): C */
 #include <stdbool.h>
 #include <stddef.h>
 #include <stdint.h>
@@ -662,5 +663,7 @@ CORVANE_C_API bool corvane_transfers_use_default(corvane_error* error);
 #ifdef __cplusplus
 }
 #endif
+
+/* NOLINTEND(modernize-*) */
 
 #endif
