@@ -7,7 +7,7 @@ Calls enqueue their work and return at once, on any thread; those that wait say 
 run on threads of the library's; none runs any more when the interpreter ends, which waits for those that do.
 """
 
-from ._callbacks import logger as logger
+from ._callbacks import logger
 from ._declarations import AnyEvent, Event, EventData, TimedData, data, event
 from ._errors import Error, ForkedError
 from ._library import library as _library
@@ -54,4 +54,56 @@ from ._uploads import Uploads
 
 __version__: str = _library.corvane_version().decode()
 
-__all__ = [name for name in dir() if not name.startswith("_")]
+__all__ = [
+    "Access",
+    "agent_is_available",
+    "AnyEvent",
+    "AnyProcessor",
+    "Change",
+    "Client",
+    "Completion",
+    "Count",
+    "data",
+    "Delayed",
+    "DeliveryReport",
+    "DeliveryUpdate",
+    "documents_directory",
+    "Error",
+    "Evaluation",
+    "event",
+    "Event",
+    "EventData",
+    "EventHandler",
+    "FilteringProcessor",
+    "Forgotten",
+    "ForkedError",
+    "hide_private",
+    "Kind",
+    "Ledger",
+    "Logged",
+    "logger",
+    "LoggingProcessor",
+    "LogRecord",
+    "Missing",
+    "Observer",
+    "ProcessEvent",
+    "Processor",
+    "Reason",
+    "Rejection",
+    "SamplingProcessor",
+    "Session",
+    "SessionAccess",
+    "Sessions",
+    "set_documents_directory",
+    "set_log_level",
+    "Snapshot",
+    "Step",
+    "Task",
+    "TimedData",
+    "Tracker",
+    "upload_by_agent",
+    "upload_by_default",
+    "upload_in_process",
+    "Uploads",
+    "use_event_loop",
+]

@@ -108,16 +108,14 @@ class Event:
         event._properties = _encoded(properties)
         return event
 
-    def _pointer(self) -> Optional[int]:
-        """Made with the first use: a process that has only declared events may fork."""
-        handle = self._handle
-        if handle is None:
-            handle = Handle(call(library.corvane_event_create, self._name))
-            for key, data, is_required in self._properties:
-                add = library.corvane_event_require if is_required else library.corvane_event_allow
-                call(add, handle._pointer, key, data)
-            self._handle = handle
-        return handle._pointer
+    def _make(self) -> Handle:
+        """Called with the first use: a process that has only declared events may fork."""
+        handle = Handle(call(library.corvane_event_create, self._name))
+        for key, data, is_required in self._properties:
+            add = library.corvane_event_require if is_required else library.corvane_event_allow
+            call(add, handle._pointer, key, data)
+        self._handle = handle
+        return handle
 
 
 def _encoded(properties: List[Tuple[str, str, bool]]) -> List[Tuple[bytes, bytes, bool]]:
@@ -168,11 +166,13 @@ AnyEvent = Union[type, Event]
 
 def event_pointer(event: AnyEvent) -> Optional[int]:
     """Raises TypeError for what is no event."""
-    if isinstance(event, type):
-        return _event_of(event)._pointer()
-    if isinstance(event, Event):
-        return event._pointer()
-    raise TypeError(f"{type(event).__name__} is no event")
+    declared: Optional[Event] = event if isinstance(event, Event) else getattr(event, "__dict__", {}).get("__corvane_event__")
+    if declared is None:
+        if not isinstance(event, type):
+            raise TypeError(f"{type(event).__name__} is no event")
+        declared = _event_of(event)
+    handle = declared._handle
+    return handle._pointer if handle else declared._make()._pointer
 
 
 def encoded(data: object, name: Optional[str]) -> Tuple[bytes, bytes]:
