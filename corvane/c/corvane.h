@@ -20,8 +20,8 @@
  * null pointer, an object that was released, and one of another kind are errors that are reported, never undefined.
  *
  * Errors. A function that may fail takes a `corvane_error *` last, which may be null. It returns false, or a null
- * pointer, and fills the error; what it refuses has no effect, and nothing is lost. A success clears the error. No
- * exception leaves a function.
+ * pointer, and fills the error; what it refuses has no effect, and nothing is lost. A success clears the error, which
+ * one thread at a time may use. No exception leaves a function.
  *
  * Threads. Every function may be called on any thread, in callbacks too, and on several at once. Except those that say
  * that they wait, they enqueue their work and return at once; what waits is refused inside a callback of the library's,

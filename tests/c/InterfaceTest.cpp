@@ -112,9 +112,9 @@ TEST_F(CTest, EverythingOfTrackersIsThere) {
     using Inside = Block<corvane_access*>;
     corvane_tracker_when_session(
         tracker, &Inside::run, new Inside{[&](corvane_access* access) {
-            EXPECT_TRUE(corvane_access_push_json(access, "Screen", R"({"n":1})", nullptr, &error));
-            EXPECT_TRUE(corvane_access_submit(access, view, nullptr, &error));
-            EXPECT_TRUE(corvane_access_pop(access, "Screen", &error));
+            EXPECT_TRUE(corvane_access_push_json(access, "Screen", R"({"n":1})", nullptr, nullptr));
+            EXPECT_TRUE(corvane_access_submit(access, view, nullptr, nullptr));
+            EXPECT_TRUE(corvane_access_pop(access, "Screen", nullptr));
         }},
         &Inside::destroy, &error);
     const corvane_push_options once{.size = sizeof once, .traits = CORVANE_ONLY_ONCE, .file = "host.c", .line = 7};

@@ -62,11 +62,7 @@ else:
             def check(self, *arguments):
                 if initialise:
                     initialise(self, *arguments)
-                codec = _encoding.codec_of(made)
-                try:
-                    codec.check(self)
-                except _encoding.Invalid as invalid:
-                    raise invalid.seen_from(made.__name__) from None
+                _encoding.codec_of(made).verify(self)
 
             cls.__post_init__ = functools.wraps(initialise)(check) if initialise else check
             made = dataclasses.dataclass(**options)(cls)

@@ -11,9 +11,11 @@ import types
 import typing
 from collections import abc
 from datetime import datetime, timedelta, timezone
-from typing import Any, Callable, Dict, List, Mapping, NamedTuple, Optional, Sequence, Tuple, Type, Union
+from typing import Any, Callable, Dict, List, Mapping, NamedTuple, Optional, Sequence, Tuple, Type, TypeVar, Union
 
 quote: Callable[[str], str] = json.encoder.encode_basestring  # type: ignore[attr-defined]
+
+T = TypeVar("T")
 
 _EPOCH = datetime(1970, 1, 1, tzinfo=timezone.utc)
 _MILLISECOND = timedelta(milliseconds=1)
@@ -267,16 +269,21 @@ class Codec:
 
     def text(self, value: object) -> bytes:
         """The JSON of an instance. Raises TypeError and ValueError."""
-        return _checked(self.encode, value, self.cls.__name__)
+        return checked(self.encode, value, self.cls.__name__).encode()
+
+    def verify(self, value: object) -> None:
+        """The same without the JSON."""
+        checked(self.check, value, self.cls.__name__)
 
 
 def dictionary_text(value: Mapping[str, Any], name: str) -> bytes:
-    return _checked(_anything, value, name)
+    return checked(_anything, value, name).encode()
 
 
-def _checked(encode: Callable[[Any], str], value: object, name: str) -> bytes:
+def checked(function: Callable[[Any], T], value: object, name: str) -> T:
+    """What a function gives that raises `Invalid`. Raises TypeError and ValueError."""
     try:
-        return encode(value).encode()
+        return function(value)
     except Invalid as invalid:
         raise invalid.seen_from(name) from None
     except RecursionError:

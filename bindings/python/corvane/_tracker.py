@@ -32,7 +32,7 @@ from typing import (
 from . import _callbacks
 from ._calls import Handle, call, error_at, optional_text, text
 from ._declarations import AnyEvent, encoded, event_pointer
-from ._encoding import Invalid, data_name, milliseconds_of
+from ._encoding import checked, data_name, milliseconds_of
 from ._errors import Error
 from ._library import CEvaluated, CPushOptions, CSubmitOptions, CTimerOptions, library
 from ._records import ProcessEvent, process_event_at
@@ -90,10 +90,7 @@ _completed_address = _callbacks.address(_completed)
 
 def moment(time: datetime) -> int:
     """Raises TypeError, and ValueError for a time without a zone."""
-    try:
-        return milliseconds_of(time)
-    except Invalid as invalid:
-        raise invalid.seen_from("time") from None
+    return checked(milliseconds_of, time, "time")
 
 
 def _submit_options(completion: Any, only_if_timed: bool, time: Optional[datetime]) -> Optional[CSubmitOptions]:
