@@ -27,28 +27,29 @@ class View:
     event: corvane.EventData
     screen: Screen
 
-def begin(url="http://127.0.0.1:9/", **options):
+def begin(**options):
     corvane.set_documents_directory(os.environ["DOCUMENTS"])
     corvane.upload_in_process()
-    uploads = corvane.Uploads(corvane.Client("com.example.test", "Test", "1", 1), url, "main", **options)
+    uploads = corvane.Uploads(corvane.Client("com.example.test", "Test", "1", 1), os.environ["COLLECTOR"], "main", **options)
     return uploads, corvane.Sessions(uploads)
 """
 
 
 class Collector:
-    """Takes documents on loopback; with `hangs` it never answers."""
+    """Takes documents on loopback; while it `hangs` it does not answer."""
 
-    def __init__(self, hangs: bool = False) -> None:
+    def __init__(self) -> None:
         self.documents: List[Dict[str, Any]] = []
         self.headers: List[Dict[str, str]] = []
-        self.released = threading.Event()
+        self.hangs = False
+        self._ended = threading.Event()
         collector = self
 
         class Handler(http.server.BaseHTTPRequestHandler):
             def do_PUT(self) -> None:
                 body = self.rfile.read(int(self.headers["Content-Length"]))
-                if hangs:
-                    collector.released.wait(DEADLINE)
+                if collector.hangs:
+                    collector._ended.wait(DEADLINE)
                 collector.documents.append(json.loads(gzip.decompress(body)))
                 collector.headers.append(dict(self.headers))
                 self.send_response(200)
@@ -62,7 +63,7 @@ class Collector:
         threading.Thread(target=self._server.serve_forever, daemon=True).start()
 
     def close(self) -> None:
-        self.released.set()
+        self._ended.set()
         self._server.shutdown()
         self._server.server_close()
 
@@ -72,17 +73,15 @@ class ProcessTest(unittest.TestCase):
         directory = tempfile.TemporaryDirectory()
         self.addCleanup(directory.cleanup)
         self.directory = directory.name
-
-    def collector(self, hangs: bool = False) -> Collector:
-        collector = Collector(hangs)
-        self.addCleanup(collector.close)
-        return collector
+        self.collector = Collector()
+        self.addCleanup(self.collector.close)
 
     def start(self, program: str, *arguments: str, preamble: str = PREAMBLE) -> "subprocess.Popen[str]":
         path = os.path.join(self.directory, "program.py")
         with open(path, "w", encoding="utf-8") as file:
             file.write(preamble + program)
-        environment = {**os.environ, "DOCUMENTS": os.path.join(self.directory, "documents"), "PYTHONUNBUFFERED": "1"}
+        environment = {**os.environ, "PYTHONUNBUFFERED": "1", "COLLECTOR": self.collector.url}
+        environment["DOCUMENTS"] = os.path.join(self.directory, "documents")
         pipe = subprocess.PIPE
         command = [sys.executable, "-X", "dev", path, *arguments]
         return subprocess.Popen(command, stdout=pipe, stderr=pipe, text=True, env=environment, cwd=self.directory)
@@ -95,6 +94,8 @@ class ProcessTest(unittest.TestCase):
             process.kill()
             self.fail(f"the process does not end: {process.communicate()}")
         self.assertEqual(process.returncode, 0, out + err)
+        # What was under way when the process ended is sent by its next run.
+        err = "".join(line for line in err.splitlines(True) if "the process is exiting" not in line)
         if errors == "":
             self.assertEqual(err, "", out)
         elif errors:
@@ -104,10 +105,11 @@ class ProcessTest(unittest.TestCase):
     def run_program(self, program: str, *arguments: str, errors: Optional[str] = "") -> str:
         return self.finish(self.start(program, *arguments), errors)
 
-    def interrupt_at_lines(self, process: "subprocess.Popen[str]") -> None:
-        """Ctrl-C whenever the process has said that it waits."""
+    def interrupt_at_lines(self, process: "subprocess.Popen[str]") -> str:
+        """Ctrl-C whenever the process has said that it waits; returns the first line that says something else."""
         assert process.stdout
         for line in process.stdout:
-            if line.strip() == "over":
-                break
+            if line != "waiting\n":
+                return line.strip()
             process.send_signal(signal.SIGINT)
+        return ""

@@ -7,7 +7,7 @@ import struct
 import subprocess
 import unittest
 from datetime import datetime, timedelta, timezone
-from typing import Any, ClassVar, Dict, List, Literal, Optional, Tuple, Union
+from typing import Any, ClassVar, Dict, List, Literal, Optional, Tuple, Union, cast
 
 import corvane
 
@@ -111,18 +111,18 @@ class ValuesTest(unittest.TestCase):
         deep: Any = None
         for _ in range(200):
             deep = [deep]
-        tracker = corvane.Sessions().tracker
+        tracker, make = corvane.Sessions().tracker, cast(Any, Values)
         for wrong, kind, message in (
-            (lambda: Values(text=3), TypeError, "Values.text: expected str, got int"),
-            (lambda: Values(number=True), TypeError, "Values.number: expected int, got bool"),
-            (lambda: Values(number=2**64), ValueError, "Values.number: the integer does not fit 64 bits"),
-            (lambda: Values(real=float("nan")), ValueError, "Values.real: the number is not finite"),
-            (lambda: Values(real=10**400), ValueError, "Values.real: the number is beyond a float"),
-            (lambda: Values(text="\ud800"), ValueError, "Values.text: the text contains a lone surrogate"),
-            (lambda: Values(when=datetime(2026, 1, 1)), ValueError, "Values.when: the time has no zone"),
-            (lambda: Values(choice="b"), TypeError, "Values.choice: expected"),
-            (lambda: Values(anything=loop), ValueError, "Values: the value is nested too deeply"),
-            (lambda: Values(anything={1: 2}), TypeError, r"Values.anything \(a key\): expected str, got int"),
+            (lambda: make(text=3), TypeError, "Values.text: expected str, got int"),
+            (lambda: make(number=True), TypeError, "Values.number: expected int, got bool"),
+            (lambda: make(number=2**64), ValueError, "Values.number: the integer does not fit 64 bits"),
+            (lambda: make(real=float("nan")), ValueError, "Values.real: the number is not finite"),
+            (lambda: make(real=10**400), ValueError, "Values.real: the number is beyond a float"),
+            (lambda: make(text="\ud800"), ValueError, "Values.text: the text contains a lone surrogate"),
+            (lambda: make(when=datetime(2026, 1, 1)), ValueError, "Values.when: the time has no zone"),
+            (lambda: make(choice="b"), TypeError, "Values.choice: expected"),
+            (lambda: make(anything=loop), ValueError, "Values: the value is nested too deeply"),
+            (lambda: make(anything={1: 2}), TypeError, r"Values.anything \(a key\): expected str, got int"),
             (lambda: tracker.push(changed), TypeError, r"Values.nested.k\[1\]: expected Artist, got int"),
             (lambda: tracker.push({"a": deep}, name="Deep"), corvane.Error, "not JSON"),
             (lambda: tracker.push({"a": b""}, name="Bytes"), TypeError, "Bytes.a: bytes cannot be written"),

@@ -154,6 +154,7 @@ def _stop() -> None:
     if not _is_started:
         return
     try:
+        call(library.corvane_log_set_level, 2)  # what goes to standard error now, without `logging`, is errors alone
         call(library.corvane_log_set_sink, None, None, None)
         call(library.corvane_callbacks_stop, destroy)
     except Error:

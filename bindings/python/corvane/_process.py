@@ -66,12 +66,15 @@ def documents_directory() -> str:
 @_callbacks.function(None, c_void_p)
 def _execute(loop: asyncio.AbstractEventLoop, pointer: int) -> None:
     task = kept_task(pointer)
-    loop.call_soon_threadsafe(task.run)
+    try:
+        loop.call_soon_threadsafe(task.run)
+    except RuntimeError:
+        task.run()  # the loop is closed: rather here than never
 
 
 def use_event_loop(loop: Optional[asyncio.AbstractEventLoop]) -> None:
     """Has the main queue, on which observers of deliveries are called, run by an event loop. None brings back a queue of
-    the library's own. Do that before the loop is closed: what comes to a closed one is lost, with an error in the log.
+    the library's own. Do that before the loop is closed: what one that is closed had not run yet is lost.
     """
     call(library.corvane_main_queue_set_executor, *_callbacks.register(_execute, loop))
 

@@ -183,7 +183,8 @@ class SamplingProcessor(_Wrapping):
 
     def __init__(self, processor: AnyProcessor, keep_one_in: int) -> None:
         kept = number(keep_one_in, 32, "keep_one_in")
-        super().__init__(Handle(call(library.corvane_sampling_create, processor._make()._pointer, kept)))
+        inner = processor._make()
+        super().__init__(Handle(call(library.corvane_sampling_create, inner._pointer, kept)))
 
 
 #: Returns the event to keep it, a dictionary to replace its data, or None to drop it.
@@ -196,8 +197,9 @@ class FilteringProcessor(_Wrapping):
     """
 
     def __init__(self, processor: AnyProcessor, filter: Filter) -> None:
+        inner = processor._make()
         arguments = _callbacks.register(_filter, filter)
-        super().__init__(Handle(call(library.corvane_filtering_create, processor._make()._pointer, *arguments)))
+        super().__init__(Handle(call(library.corvane_filtering_create, inner._pointer, *arguments)))
 
 
 @_callbacks.function(c_int32, c_void_p, c_void_p)
