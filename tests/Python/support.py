@@ -4,7 +4,6 @@ import gzip
 import http.server
 import json
 import os
-import signal
 import subprocess
 import sys
 import tempfile
@@ -12,7 +11,7 @@ import threading
 import unittest
 from typing import Any, Dict, List, Optional
 
-DEADLINE = 120
+DEADLINE = 60
 
 PREAMBLE = """
 import asyncio, gc, logging, multiprocessing, os, signal, sys, threading, time
@@ -104,12 +103,3 @@ class ProcessTest(unittest.TestCase):
 
     def run_program(self, program: str, *arguments: str, errors: Optional[str] = "") -> str:
         return self.finish(self.start(program, *arguments), errors)
-
-    def interrupt_at_lines(self, process: "subprocess.Popen[str]") -> str:
-        """Ctrl-C whenever the process has said that it waits; returns the first line that says something else."""
-        assert process.stdout
-        for line in process.stdout:
-            if line != "waiting\n":
-                return line.strip()
-            process.send_signal(signal.SIGINT)
-        return ""

@@ -138,30 +138,27 @@ class WaitTest(ProcessTest):
         self.collector.hangs = True
         program = """
 uploads, sessions = begin()
+under_way = threading.Event()
+uploads.observe(lambda update: under_way.set())
+held = threading.Event()
+class Holding(corvane.Processor):
+    def did_end_session(self, session, end): held.wait()
+sessions.add(Holding())
 sessions.start()
 tracker = sessions.tracker
 tracker.push(Screen("home"))
 tracker.submit(View)
 uploads.flush()
-held = threading.Event()
-class Holding(corvane.Processor):
-    def did_end_session(self, session, end): held.wait()
-sessions.add(Holding())
+assert under_way.wait(100)
 for wait in (lambda: uploads.wait(1000), sessions.end_and_wait, tracker.snapshot, sessions.end().result):
-    began = time.monotonic()
-    try:
-        print("waiting")
-        wait()
-    except KeyboardInterrupt:
-        assert time.monotonic() - began < 100
+    threading.Timer(0.2, os.kill, (os.getpid(), signal.SIGINT)).start()
+    try: print("ended by itself:", wait())
+    except KeyboardInterrupt: print("interrupted")
 held.set()
 sessions.end_and_wait()
-print("over", uploads.wait(0.01).pending.documents, uploads.ledger().waiting.documents)
+print(uploads.wait(0.01).pending.documents, uploads.ledger().waiting.documents)
 """
-        process = self.start(program)
-        last = self.interrupt_at_lines(process)
-        self.finish(process)
-        self.assertEqual(last, "over 1 1")
+        self.assertEqual(self.run_program(program), "interrupted\n" * 4 + "1 1\n")
 
     def test_coroutines_are_cancelled_and_loops_closed_with_submissions_under_way(self) -> None:
         program = """
