@@ -12,6 +12,19 @@ if(CORVANE_BUILD_AGENT)
     install(TARGETS corvane-transferd RUNTIME DESTINATION ${CMAKE_INSTALL_LIBEXECDIR})
 endif()
 
+# A package of its own, which asks for nothing: a project in C finds it without a C++ compiler, and without what the
+# library is made of.
+if(CORVANE_BUILD_C_LIBRARY)
+    set(c_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/corvane_c)
+    install(TARGETS corvane_c EXPORT corvane_cTargets
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+        FILE_SET HEADERS DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+    install(EXPORT corvane_cTargets NAMESPACE corvane:: FILE corvane_cConfig.cmake DESTINATION ${c_package_dir})
+    write_basic_package_version_file(${CMAKE_CURRENT_BINARY_DIR}/corvane_cConfigVersion.cmake
+        COMPATIBILITY AnyNewerVersion)
+    install(FILES ${CMAKE_CURRENT_BINARY_DIR}/corvane_cConfigVersion.cmake DESTINATION ${c_package_dir})
+endif()
+
 # A set of its own: it needs zlib, which a user of the shared library may not have.
 if(CORVANE_BUILD_TESTING_LIBRARY)
     install(TARGETS corvane_testing EXPORT corvaneTestingTargets
@@ -44,5 +57,11 @@ if(NOT BUILD_SHARED_LIBS)
 endif()
 # Relative, so that a package may be moved as a whole.
 file(RELATIVE_PATH pc_prefix ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
-configure_file(${PROJECT_SOURCE_DIR}/cmake/corvane.pc.in ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc @ONLY)
-install(FILES ${CMAKE_CURRENT_BINARY_DIR}/corvane.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+function(corvane_pkg_config pc_name pc_libs_extra)
+    configure_file(${PROJECT_SOURCE_DIR}/cmake/corvane.pc.in ${CMAKE_CURRENT_BINARY_DIR}/${pc_name}.pc @ONLY)
+    install(FILES ${CMAKE_CURRENT_BINARY_DIR}/${pc_name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+endfunction()
+corvane_pkg_config(corvane "${pc_libs_extra}")
+if(CORVANE_BUILD_C_LIBRARY)
+    corvane_pkg_config(corvane_c "")
+endif()

@@ -2,6 +2,7 @@
 
 #include <corvane/Tracker/Tracker.h>
 #include <corvane/c/Call.h>
+#include <corvane/c/EncodedText.h>
 #include <corvane/c/Event.h>
 #include <corvane/c/Records.h>
 #include <corvane/c/Sessions.h>
@@ -41,15 +42,25 @@ class Observer final : public Object {
 };
 
 template <class Target>
-void push(Target& tracker, const char* name, HostValue::Dictionary dictionary, const corvane_push_options* given) {
+void push(const Target& tracker, const char* name, HostValue::Dictionary dictionary,
+          const corvane_push_options* given) {
     const auto options = read(given, "the options");
     BridgedError refused;
     auto data = std::make_shared<const BridgedRawDataEvent>(dataName(name), std::move(dictionary));
-    const auto traits = traitsOf(options.traits);
-    const bool isPushed =
-        options.file ? tracker.pushDataEvent(data, traits, text(options.file, "the file"), options.line, &refused)
-                     : tracker.pushDataEvent(data, traits, std::string(), 0, &refused);
-    if (!isPushed) throw refused;
+    if (!tracker->pushDataEvent(data, traitsOf(options.traits), optionalText(options.file, "the file"), options.line,
+                                &refused)) {
+        throw refused;
+    }
+}
+
+template <class Target>
+void pushJSON(const Target& tracker, const char* name, const char* json, const corvane_push_options* given) {
+    const auto options = read(given, "the options");
+    BridgedError refused;
+    if (!tracker->pushEncodedDataEvent(dataName(name), encodedObject(json), traitsOf(options.traits),
+                                       optionalText(options.file, "the file"), options.line, &refused)) {
+        throw refused;
+    }
 }
 
 BridgedSubmitCompletion completionOf(const corvane_submit_options& options, Context context) {
@@ -110,12 +121,12 @@ const char* corvane_tracker_path(corvane_tracker* tracker, size_t index, corvane
 
 bool corvane_tracker_push(corvane_tracker* tracker, const char* name, corvane_value* dictionary,
                           const corvane_push_options* options, corvane_error* error) {
-    return call(error, [&] { push(*Used<TrackerObject>(tracker)->tracker, name, dictionaryOf(dictionary), options); });
+    return call(error, [&] { push(Used<TrackerObject>(tracker)->tracker, name, dictionaryOf(dictionary), options); });
 }
 
 bool corvane_tracker_push_json(corvane_tracker* tracker, const char* name, const char* json,
                                const corvane_push_options* options, corvane_error* error) {
-    return call(error, [&] { push(*Used<TrackerObject>(tracker)->tracker, name, dictionaryOfJSON(json), options); });
+    return call(error, [&] { pushJSON(Used<TrackerObject>(tracker)->tracker, name, json, options); });
 }
 
 bool corvane_tracker_pop(corvane_tracker* tracker, const char* name, corvane_error* error) {
@@ -189,12 +200,12 @@ bool corvane_tracker_when_session(corvane_tracker* tracker, corvane_block block,
 
 bool corvane_access_push(corvane_access* access, const char* name, corvane_value* dictionary,
                          const corvane_push_options* options, corvane_error* error) {
-    return call(error, [&] { push(*Used<Access>(access)->access, name, dictionaryOf(dictionary), options); });
+    return call(error, [&] { push(Used<Access>(access)->access, name, dictionaryOf(dictionary), options); });
 }
 
 bool corvane_access_push_json(corvane_access* access, const char* name, const char* json,
                               const corvane_push_options* options, corvane_error* error) {
-    return call(error, [&] { push(*Used<Access>(access)->access, name, dictionaryOfJSON(json), options); });
+    return call(error, [&] { pushJSON(Used<Access>(access)->access, name, json, options); });
 }
 
 bool corvane_access_pop(corvane_access* access, const char* name, corvane_error* error) {

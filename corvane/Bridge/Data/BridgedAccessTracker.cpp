@@ -80,6 +80,15 @@ bool BridgedAccessTracker::pushDataEvent(const Data& data, BridgedDataEventTrait
     });
 }
 
+bool BridgedAccessTracker::pushEncodedDataEvent(std::string dataName, JSON dictionary, BridgedDataEventTraits traits,
+                                                std::string file, std::uint_least32_t line, BridgedError* error) const {
+    return bridge::attempt("pushEncodedDataEvent", error, [&] {
+        requireQueue();
+        accessTracker_.push(bridge::stackEntry(std::move(dataName), std::move(dictionary), traits,
+                                               {.ownFile = std::move(file), .line = line}));
+    });
+}
+
 bool BridgedAccessTracker::popDataEventType(const BridgedDataEventClass& dataType, BridgedError* error) const {
     return popDataEventByName(dataType.dataName(), error);
 }

@@ -49,6 +49,8 @@ class CORVANE_EXPORT BridgedAccessTracker {
                        std::source_location where = std::source_location::current()) const;
     bool pushDataEvent(const Data& data, BridgedDataEventTraits traits, std::string file, std::uint_least32_t line,
                        BridgedError* error = nullptr) const;
+    bool pushEncodedDataEvent(std::string dataName, JSON dictionary, BridgedDataEventTraits traits, std::string file,
+                              std::uint_least32_t line, BridgedError* error = nullptr) const;
     bool popDataEventType(const BridgedDataEventClass& dataType, BridgedError* error = nullptr) const;
     bool popDataEventByName(const std::string& dataName, BridgedError* error = nullptr) const;
 

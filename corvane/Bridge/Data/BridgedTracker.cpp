@@ -107,6 +107,14 @@ bool BridgedTracker::pushDataEvent(const Data& data, BridgedDataEventTraits trai
     });
 }
 
+bool BridgedTracker::pushEncodedDataEvent(std::string dataName, JSON dictionary, BridgedDataEventTraits traits,
+                                          std::string file, std::uint_least32_t line, BridgedError* error) {
+    return bridge::attempt("pushEncodedDataEvent", error, [&] {
+        tracker_->push(bridge::stackEntry(std::move(dataName), std::move(dictionary), traits,
+                                          {.ownFile = std::move(file), .line = line}));
+    });
+}
+
 void BridgedTracker::popDataEventType(const BridgedDataEventClass& dataType) {
     popDataEventByName(dataType.dataName());
 }

@@ -100,6 +100,9 @@ class CORVANE_EXPORT BridgedTracker {
     /// The same from a script, whose file and line are known at run time.
     bool pushDataEvent(const Data& data, BridgedDataEventTraits traits, std::string file, std::uint_least32_t line,
                        BridgedError* error = nullptr);
+    /// The same for data whose dictionary is JSON already. What is not an object is refused and changes nothing.
+    bool pushEncodedDataEvent(std::string dataName, JSON dictionary, BridgedDataEventTraits traits, std::string file,
+                              std::uint_least32_t line, BridgedError* error = nullptr);
     /// Takes the newest data of a class, or name, that was pushed here through the bridge out of scope.
     void popDataEventType(const BridgedDataEventClass& dataType);
     void popDataEventByName(const std::string& dataName);

@@ -2,6 +2,7 @@
 
 #include <corvane/Bridge/Models/BridgedDataEvent.h>
 #include <corvane/Bridge/Models/Refusal.h>
+#include <corvane/Models/OwnJSON.h>
 #include <corvane/Models/SessionData.h>
 
 #include <utility>
@@ -34,11 +35,14 @@ AnyDataEventEntry entryOf(Asked asked, DataEventTraits traits, const char* file,
     return {key, std::move(data), traits, file, line};
 }
 
-std::string nameOf(const std::shared_ptr<const BridgedDataEventType>& data) {
-    if (!data) throw BridgeError(BridgeError::missingObject, "the data event");
-    std::string name = data->dataName();
+std::string usableName(std::string name) {
     requireUTF8(name, "the data event's name");
     return name;
+}
+
+std::string nameOf(const std::shared_ptr<const BridgedDataEventType>& data) {
+    if (!data) throw BridgeError(BridgeError::missingObject, "the data event");
+    return usableName(data->dataName());
 }
 
 }  // namespace
@@ -58,6 +62,13 @@ AnyDataEventEntry stackEntry(const std::shared_ptr<const BridgedDataEventType>& 
         asked.dict = *failure;
     }
     return entryOf(std::move(asked), traits.traits(), place.file, place.line);
+}
+
+AnyDataEventEntry stackEntry(std::string name, JSON dictionary, BridgedDataEventTraits traits, Place place) {
+    auto object = OwnJSON::is(dictionary) ? detail::requireObject(std::move(dictionary))
+                                          : detail::requireHostObject(std::move(dictionary));
+    return entryOf({usableName(std::move(name)), std::move(place.ownFile), std::move(object)}, traits.traits(),
+                   place.file, place.line);
 }
 
 DataType stackEntryType() {

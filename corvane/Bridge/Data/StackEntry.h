@@ -29,6 +29,9 @@ struct Place {
 [[nodiscard]] AnyDataEventEntry stackEntry(const std::shared_ptr<const BridgedDataEventType>& data,
                                            BridgedDataEventTraits traits, Place place,
                                            std::optional<AnyError>& failure);
+/// The same for data that is encoded already. Throws when it is not an object.
+[[nodiscard]] AnyDataEventEntry stackEntry(std::string name, JSON dictionary, BridgedDataEventTraits traits,
+                                           Place place);
 /// The type of the data in such entries: pops of it leave typed data alone.
 [[nodiscard]] DataType stackEntryType();
 
