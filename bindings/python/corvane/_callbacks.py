@@ -6,6 +6,7 @@ There is one C function for each kind of callback, made once.
 
 import asyncio
 import atexit
+import contextlib
 import ctypes
 import itertools
 import logging
@@ -13,7 +14,7 @@ from concurrent.futures import Future
 from typing import Any, Callable, Dict, Generic, List, Optional, Tuple, TypeVar
 
 from ._calls import call, interrupted
-from ._errors import Error
+from ._errors import Error, ForkedError
 from ._library import library
 
 logger = logging.getLogger("corvane")
@@ -28,6 +29,8 @@ def keep(thing: Any) -> int:
     """Keeps what a callback needs; returns its context, to be passed on with `destroy`."""
     context = next(_numbers)
     _kept[context] = thing
+    if _is_stopped and isinstance(thing, Outcome):
+        thing.abandon()  # nobody would ever settle it
     return context
 
 
@@ -130,7 +133,12 @@ def register(c_function: Any, thing: Any) -> Tuple[Any, Optional[int], Any]:
 
 
 _at_start: List[Callable[[], None]] = []
-_is_started = False
+_is_started = _is_stopped = False
+
+
+def may_call_back() -> bool:
+    """Whether callbacks are called: not any more when the interpreter ends."""
+    return not _is_stopped
 
 
 def at_start(task: Callable[[], None]) -> Callable[[], None]:
@@ -151,11 +159,22 @@ def start() -> None:
 @atexit.register
 def _stop() -> None:
     # From here on nothing of the library's enters an interpreter that is being taken down.
+    global _is_stopped
     if not _is_started:
         return
+    _is_stopped = True
     try:
         call(library.corvane_log_set_level, 2)  # what goes to standard error now, without `logging`, is errors alone
         call(library.corvane_log_set_sink, None, None, None)
         call(library.corvane_callbacks_stop, destroy)
     except Error:
         pass  # the child of a fork, where nothing calls back
+    for thing in list(_kept.values()):
+        if isinstance(thing, Outcome):
+            thing.abandon()
+
+
+def unless_forked(function: Callable[..., Any], *arguments: Any) -> None:
+    """Calls a function at the end of a block, which a child that was forked off inside it has no part in."""
+    with contextlib.suppress(ForkedError):
+        function(*arguments)

@@ -23,6 +23,8 @@ _SIGNATURES = """
     sessions_push_json hssspp-b
     sessions_transaction hpppp-b
     session_access_is_active hp-b
+    session_access_push hsshpp-b
+    value_from_json sp-h
     sessions_set_recording hbpppp-b
     sessions_is_recording hp-b
     sessions_forget hpppp-b

@@ -26,8 +26,29 @@ class SessionAccess(Handle):
         """Whether a session runs."""
         return bool(call(library.corvane_session_access_is_active, self._pointer))
 
+    def push(
+        self,
+        key: str,
+        data: object,
+        *,
+        only_once: bool = False,
+        unique: bool = False,
+        submit_queues: bool = False,
+        name: Optional[str] = None,
+    ) -> None:
+        """Puts data into this and later sessions; see `Sessions.push`. Done when this returns."""
+        known, written = encoded(data, name)
+        value = Handle(call(library.corvane_value_from_json, written))
+        options = _data_options(only_once, unique, submit_queues)
+        push = library.corvane_session_access_push
+        call(push, self._pointer, text(key, "the key"), known, value._pointer, byref(options))
+
     def __del__(self) -> None:
         pass  # it is not this object's to release
+
+
+def _data_options(only_once: bool, unique: bool, submit_queues: bool) -> CSessionDataOptions:
+    return CSessionDataOptions(traits=(1 if only_once else 0) | (2 if unique else 0), submit_queues=submit_queues)
 
 
 @_callbacks.function(None, c_void_p)
@@ -99,10 +120,11 @@ class Sessions(Handle):
 
     def end_and_wait(self) -> None:
         """The same; waits. Does nothing while the queue is suspended. Refused inside a callback."""
-        if threading.current_thread() is not threading.main_thread() or self._suspensions > 0:
+        is_main = threading.current_thread() is threading.main_thread()
+        if is_main and self._suspensions == 0 and _callbacks.may_call_back():
+            self.end().result()  # which Ctrl-C can interrupt
+        else:
             call(library.corvane_sessions_end_and_wait, self._pointer)
-            return
-        self.end().result()  # which Ctrl-C can interrupt
 
     def session(self, kind: Kind = Kind.USER_EVENTS) -> "RunningSession":
         """A session for the length of a block: `with` waits for its end, `async with` lets the loop go on meanwhile."""
@@ -123,8 +145,7 @@ class Sessions(Handle):
         send first what they have collected under the data before.
         """
         known, written = encoded(data, name)
-        traits = (1 if only_once else 0) | (2 if unique else 0)
-        options = CSessionDataOptions(traits=traits, submit_queues=submit_queues)
+        options = _data_options(only_once, unique, submit_queues)
         push = library.corvane_sessions_push_json
         call(push, self._pointer, text(key, "the key"), known, written, byref(options))
 
@@ -185,7 +206,7 @@ class Sessions(Handle):
     def __exit__(
         self, kind: Optional[Type[BaseException]], raised: Optional[BaseException], trace: Optional[TracebackType]
     ) -> None:
-        self.end_and_wait()
+        _callbacks.unless_forked(self.end_and_wait)
         self.close()
 
     def _later(self, function: Any, *arguments: Any) -> "Future[None]":
@@ -208,7 +229,7 @@ class RunningSession:
     def __exit__(
         self, kind: Optional[Type[BaseException]], raised: Optional[BaseException], trace: Optional[TracebackType]
     ) -> None:
-        self._sessions.end_and_wait()
+        _callbacks.unless_forked(self._sessions.end_and_wait)
 
     async def __aenter__(self) -> Sessions:
         return self.__enter__()

@@ -246,7 +246,7 @@ class Tracker(_Scope):
         try:
             yield
         finally:
-            self.leave_group()
+            _callbacks.unless_forked(self.leave_group)
 
     def enter_group(self, name: Optional[str] = None) -> None:
         call(library.corvane_tracker_enter_group, self._pointer, optional_text(name, "the group's name"))
@@ -272,7 +272,7 @@ class Tracker(_Scope):
         """Copies the data and timers in scope: of each name the one that an event would find, or `all` of every stack.
         Waits for the queue; refused inside a callback.
         """
-        if threading.current_thread() is threading.main_thread():
+        if threading.current_thread() is threading.main_thread() and _callbacks.may_call_back():
             # The library's own wait could not be interrupted by Ctrl-C, nor end while the queue is suspended.
             self._wait_for_queue()
         return Snapshot(call(library.corvane_tracker_snapshot, self._pointer, 1 if all else 0))
@@ -340,7 +340,10 @@ class Timed:
     def __exit__(
         self, kind: Optional[Type[BaseException]], raised: Optional[BaseException], trace: Optional[TracebackType]
     ) -> None:
-        options = CTimerOptions(has_start=True, start=self._starts.pop())
+        _callbacks.unless_forked(self._submit, self._starts.pop())
+
+    def _submit(self, start: int) -> None:
+        options = CTimerOptions(has_start=True, start=start)
         event, pointer = event_pointer(self._event), self._tracker._pointer
         with _timing:
             call(library.corvane_tracker_time, pointer, event, byref(options))

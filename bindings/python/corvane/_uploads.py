@@ -83,6 +83,8 @@ class Uploads(AnyProcessor):
         became of it. See what is pending: that is kept, and goes out later. `only_while_reachable` ends the wait when all
         that is left waits for a server that is known to be unreachable. Ctrl-C ends it too. Refused inside a callback.
         """
+        if not timeout >= 0:
+            raise ValueError(f"timeout: {timeout} is negative or no number")
         deadline = time.monotonic() + timeout
         report = CDeliveryReport()
         flags = 1 if only_while_reachable else 0
