@@ -5,6 +5,7 @@
 #include <corvane/Platform/Log.h>
 
 #include <cstddef>
+#include <new>
 
 namespace corvane::c {
 
@@ -54,10 +55,18 @@ void clear(corvane_error* error) noexcept {
 }
 
 void fill(corvane_error* error) noexcept {
-    const BridgedError from = BridgedError::of(AnyError::current());
-    if (error && error->size >= sizeof *error) return fillWith(*error, from);
-    // Nobody else would hear of it.
-    Log::shared().error("A call has failed, error=%{public}@", from.what());
+    const bool isWanted = error && error->size >= sizeof *error;
+    try {
+        const BridgedError from = BridgedError::of(AnyError::current());
+        if (isWanted) return fillWith(*error, from);
+        // Nobody else would hear of it.
+        Log::shared().error("A call has failed, error=%{public}@", from.what());
+    } catch (const std::bad_alloc&) {  // of the error itself
+        if (isWanted) {
+            copy(error->domain, sizeof error->domain, "Corvane.HostError");
+            copy(error->message, sizeof error->message, "there is no memory");
+        }
+    }
 }
 
 corvane_error recordOf(const BridgedError& error) noexcept {

@@ -38,8 +38,8 @@ class Gate {
     }
     void stop() {
         isStopped_ = true;
-        const int own = Entered::countOf(*this);
-        for (int running = running_; running > own; running = running_) running_.wait(running);
+        if (Entered::isInside(*this)) return;  // two such calls would wait for each other
+        for (int running = running_; running > 0; running = running_) running_.wait(running);
     }
 
   private:
@@ -68,12 +68,11 @@ bool Entered::forbidsWaiting() noexcept {
     return false;
 }
 
-int Entered::countOf(const Gate& gate) noexcept {
-    int count = 0;
+bool Entered::isInside(const Gate& gate) noexcept {
     for (const Entered* entered = innermost; entered; entered = entered->outer_) {
-        count += &entered->gate_ == &gate && entered->isIn_;
+        if (&entered->gate_ == &gate && entered->isIn_) return true;
     }
-    return count;
+    return false;
 }
 
 struct Context::Owned {

@@ -24,8 +24,8 @@ class Entered {
 
     /// Whether a call is under way on this thread in which nobody may wait.
     [[nodiscard]] static bool forbidsWaiting() noexcept;
-    /// How many calls are under way on this thread behind a gate.
-    [[nodiscard]] static int countOf(const Gate& gate) noexcept;
+    /// Whether a call is under way on this thread behind a gate.
+    [[nodiscard]] static bool isInside(const Gate& gate) noexcept;
 
   private:
     Gate& gate_;

@@ -38,7 +38,6 @@ constexpr std::uint64_t generationOf(std::uint64_t state) {
 }
 struct Slot {
     std::atomic<std::uint64_t> state = 0;
-    Kind kind{};
     std::unique_ptr<Object> object;
 };
 
@@ -133,7 +132,6 @@ void* add(Kind kind, std::unique_ptr<Object> object) {
     Table& table = Table::shared();
     const std::uint64_t index = table.take();
     Slot& slot = *table.find(index);
-    slot.kind = kind;
     slot.object = std::move(object);
     const std::uint64_t generation = generationOf(slot.state.fetch_add(oneOwner, std::memory_order_release));
     const std::uint64_t bits = mark << markShift | generation << generationShift | index << indexShift |

@@ -31,7 +31,7 @@
  *
  * Callbacks come with a context, which is passed to them, and a function that destroys it, which may be null. It is
  * called once, on any thread, when the callback is not called any more; also when the function that took it has
- * failed, or the callback was null.
+ * failed, or the callback was null, unless the structure that names it was refused for its size.
  *
  * Text is UTF-8 and ends with a zero. What is passed in is copied; what is handed out is good as long as the object
  * that it was asked of, or for the length of the callback that it was passed to.
@@ -117,8 +117,9 @@ CORVANE_C_API void corvane_release(void* object);
 typedef void (*corvane_destroy)(void* context);
 
 /* Ends every callback that was registered with this `destroy`, and calls of `destroy` too: none begins any more, and
- * those that run on other threads have returned when this returns; it waits for them. For a language whose runtime ends
- * before the process does. What was registered goes on otherwise, and its contexts are kept. */
+ * those that run have returned when this returns: it waits for them, unless it is called inside one of them. For a
+ * language whose runtime ends before the process does. What was registered goes on otherwise, and its contexts are
+ * kept. */
 CORVANE_C_API bool corvane_callbacks_stop(corvane_destroy destroy, corvane_error* error);
 
 /* ---- Times ------------------------------------------------------------------------------------------------------- */
