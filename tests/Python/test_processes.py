@@ -147,6 +147,7 @@ class WaitTest(ProcessTest):
     def test_ctrl_c_ends_every_wait(self) -> None:
         self.collector.hangs = True
         program = """
+signal.signal(signal.SIGINT, signal.default_int_handler)  # what a shell starts in the background ignores it
 uploads, sessions = begin()
 under_way = threading.Event()
 uploads.observe(lambda update: under_way.set())
