@@ -1,5 +1,8 @@
 #include <corvane/Platform/Date.h>
 
+#include <corvane/Platform/TestClock.h>
+
+#include <atomic>
 #include <cmath>
 #include <cstdio>
 #include <ctime>
@@ -12,7 +15,23 @@ using Ticks = Date::duration;
 constexpr std::int64_t ticksPerMillisecond = std::chrono::duration_cast<Ticks>(std::chrono::milliseconds(1)).count();
 constexpr double ticksPerSecond =
     static_cast<double>(std::chrono::duration_cast<Ticks>(std::chrono::seconds(1)).count());
+
+constexpr Ticks::rep notStopped = std::numeric_limits<Ticks::rep>::min();
+constinit std::atomic<Ticks::rep> stoppedAt = notStopped;
 }  // namespace
+
+Date now() noexcept {
+    const Ticks::rep ticks = stoppedAt.load(std::memory_order_relaxed);
+    return ticks == notStopped ? std::chrono::system_clock::now() : Date(Ticks(ticks));
+}
+
+void detail::setWallClock(std::optional<Date> date) noexcept {
+    stoppedAt = date ? date->time_since_epoch().count() : notStopped;
+}
+
+void detail::advanceBootClock(std::chrono::nanoseconds time) noexcept {
+    BootClock::advance(time);
+}
 
 std::int64_t millisecondsBetween(Date start, Date end) {
     const std::int64_t from = start.time_since_epoch().count();

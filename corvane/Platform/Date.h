@@ -13,10 +13,8 @@ namespace corvane {
 /// seconds; both count from 1970-01-01T00:00:00Z.
 using Date = std::chrono::system_clock::time_point;
 
-/// The wall clock.
-[[nodiscard]] inline Date now() {
-    return std::chrono::system_clock::now();
-}
+/// The wall clock, or what a test has put in its place.
+[[nodiscard]] CORVANE_EXPORT Date now() noexcept;
 
 /// Whole milliseconds since 1970, truncated toward zero.
 [[nodiscard]] constexpr std::int64_t millisecondsSince1970(Date date) {

@@ -1,6 +1,7 @@
 #include <corvane/Testing/RecordingProcessor.h>
 
 #include <algorithm>
+#include <future>
 #include <stdexcept>
 #include <utility>
 
@@ -25,6 +26,14 @@ std::vector<std::shared_ptr<SerialQueue>> RecordingProcessor::queues() const {
 void RecordingProcessor::settle() const {
     for (const auto& queue : queues()) {
         if (!queue->isCurrent()) queue->sync([] {});
+    }
+}
+
+void RecordingProcessor::settleByWorker() const {
+    for (const auto& queue : queues()) {
+        std::promise<void> reached;
+        queue->async([&] { reached.set_value(); });
+        reached.get_future().wait();
     }
 }
 

@@ -82,7 +82,11 @@ class RecordingProcessor : public EventProcessorType {
         std::vector<Date> endDates;
         std::vector<Group> groups;
     };
+    friend class ManualClock;
+
     [[nodiscard]] std::vector<std::shared_ptr<SerialQueue>> queues() const;
+    /// As `settle`, by the queue's own thread, which looks after timers.
+    void settleByWorker() const;
     void note(const char* what, const Session& session);
 
     mutable std::mutex mutex_;

@@ -6,6 +6,8 @@
 
 #include <corvane/Testing/CapturedLog.h>
 #include <corvane/Testing/FakeTransferSession.h>
+#include <corvane/Testing/ManualClock.h>
+#include <corvane/Testing/ManualQueue.h>
 #include <corvane/Testing/ProcessSettings.h>
 #include <corvane/Testing/RecordedEvent.h>
 #include <corvane/Testing/RecordingProcessor.h>

@@ -1,4 +1,6 @@
 #include <corvane/Testing/FakeTransferSession.h>
+#include <corvane/Testing/ManualClock.h>
+#include <corvane/Testing/ManualQueue.h>
 #include <corvane/Testing/Matchers.h>
 #include <corvane/Testing/ProcessSettings.h>
 #include <corvane/corvane.h>
@@ -36,6 +38,42 @@ TEST_F(Recording, SaysWhatIsThereAndWhatWasExpected) {
                                                          Not(HasInteger("viewer.id", Ge(7))))));
     processor->clear();
     EXPECT_EQ(processor->checkOnly("ScreenView"), "expected 1 of ScreenView, and there are 0; nothing was recorded");
+}
+
+TEST_F(Recording, TimePassesWhenTheTestSaysSo) {
+    using namespace std::chrono_literals;
+    const TemporaryDocuments documents;
+    std::shared_ptr<FakeTransferSession> transfers;
+    ProcessSettings settings;
+    settings.setTransfers(FakeTransferSession::factory(transfers));
+    const auto uploads = std::make_shared<UploadBatchEventProcessor>(Client{"com.example", "Example", "1", 1},
+                                                                     Endpoint{"http://127.0.0.1:9/", "test"},
+                                                                     UploadBatchEventConfig({.maximumDelay = 24h}));
+    ManualQueue queue;
+    int told = 0;
+    uploads->setDeliveryObserver([&](const DeliveryUpdate&) { ++told; });
+    sessions->processorManager()->add(uploads);
+
+    ManualClock clock(*dateFromMilliseconds(1'000'000));
+    root->time<Played>();
+    clock.advance(90s, *processor);
+    root->submit<Played>();
+    EXPECT_EQ(processor->checkOnly(
+                  "Played",
+                  {{"span.startTimestamp", 1'000'000}, {"span.endTimestamp", 1'090'000}, {"span.duration", 90'000}}),
+              "");
+    clock.advance(23h, *processor);
+    EXPECT_TRUE(!transfers || transfers->made().empty());
+    clock.advance(1h, *processor);
+    ASSERT_TRUE(transfers->waitForTasks(1));
+    transfers->complete(1, 200);
+    EXPECT_TRUE(uploads->waitForDelivery(std::chrono::steady_clock::now() + 10s).pending.documents == 0);
+    EXPECT_EQ(told, 0);
+    const auto ran = queue.run();
+    EXPECT_GT(ran, 0u);
+    EXPECT_EQ(static_cast<std::size_t>(told), ran);
+    clock.set(*dateFromMilliseconds(-5));
+    EXPECT_EQ(millisecondsSince1970(now()), -5);
 }
 
 TEST(FieldValue, FollowsPathsAndComparesNumbersAsNumbers) {
