@@ -4,18 +4,22 @@
 
 namespace corvane::catalogue {
 
-std::string schemaFileOf(std::string_view event) {
+std::string plainName(std::string_view name) {
     constexpr std::string_view digits = "0123456789ABCDEF";
-    std::string file;
-    for (const char c : event) {
+    std::string plain;
+    for (const char c : name) {
         if ((c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || (c >= '0' && c <= '9') || c == '_') {
-            file += c;
+            plain += c;
         } else {
             const auto byte = static_cast<unsigned char>(c);
-            file.append({'+', digits[byte >> 4U], digits[byte & 15U]});
+            plain.append({'+', digits[byte >> 4U], digits[byte & 15U]});
         }
     }
-    return (file.empty() ? "+" : file) + std::string(schemaSuffix);
+    return plain.empty() ? "+" : plain;
+}
+
+std::string schemaFileOf(std::string_view event) {
+    return plainName(event) + std::string(schemaSuffix);
 }
 
 std::vector<std::string> namesOf(const std::vector<Definition>& definitions) {

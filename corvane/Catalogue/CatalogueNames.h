@@ -17,7 +17,10 @@ inline constexpr std::string_view pageFile = "catalogue.md";
 /// In each schema, so that one which is not needed any more is known as the library's own.
 inline constexpr std::string_view writtenBy = "Written by corvane::writeCatalogue, which overwrites changes.";
 
-/// The file of an event's schema: "ScreenView.schema.json", "Box+3Cint+3E.schema.json".
+/// A name with everything but letters, digits and "_" escaped: "ScreenView", "Box+3Cint+3E". No two become one.
+[[nodiscard]] std::string plainName(std::string_view name);
+
+/// The file of an event's schema: "ScreenView.schema.json".
 [[nodiscard]] std::string schemaFileOf(std::string_view event);
 
 /// A name for each definition, none twice: the type's, or its whole one with namespaces where others have that, or with

@@ -1,6 +1,8 @@
 #include <corvane/Catalogue/CataloguePage.h>
 
 #include <corvane/Catalogue/CatalogueNames.h>
+#include <corvane/Models/JSONTree.h>
+#include <corvane/Platform/JSONText.h>
 
 #include <algorithm>
 #include <map>
@@ -31,20 +33,26 @@ class Page {
     void addSession();
     void addTypes();
     void addDefinition(std::size_t index);
+    void addOwn(const Definition& definition);
     void addMembers(std::string_view what, const std::vector<Member>& members);
     void addParagraph(const std::string& text);
-    std::string anchorOf(std::size_t definition) const { return "type-" + std::to_string(place_.at(definition)); }
+    std::string anchorOf(std::size_t definition) const { return "type-" + plainName(names_[definition]); }
     std::string typeOf(const Shape& shape) const;
+    std::string elementOf(const Shape& shape) const;
 
     const Vocabulary& vocabulary_;
     const std::vector<std::string> names_;
     std::map<std::string_view, std::size_t> byName_;
-    std::map<std::size_t, std::size_t> place_;  // of a definition in the order of the names
     std::string out_;
 };
 
 std::string integerType(const Shape& shape) {
     return "integer, " + std::to_string(shape.minimum) + " to " + std::to_string(shape.maximum);
+}
+
+std::string Page::elementOf(const Shape& shape) const {
+    const Shape& element = shape.element.front();
+    return element.mayBeNull ? "(" + typeOf(element) + ")" : typeOf(element);
 }
 
 std::string Page::typeOf(const Shape& shape) const {
@@ -68,10 +76,9 @@ std::string Page::typeOf(const Shape& shape) const {
             case Kind::duration:
                 return "duration, in milliseconds";
             case Kind::array:
-                return "array of " + (shape.length ? std::to_string(*shape.length) + " times " : "") +
-                       typeOf(shape.element.front());
+                return "array of " + (shape.length ? std::to_string(*shape.length) + " times " : "") + elementOf(shape);
             case Kind::map:
-                return "object, each member " + typeOf(shape.element.front());
+                return "object, each member " + elementOf(shape);
             case Kind::named:
                 return "[" + escaped(names_[shape.definition]) + "](#" + anchorOf(shape.definition) + ")";
         }
@@ -85,7 +92,7 @@ void Page::addParagraph(const std::string& text) {
 }
 
 void Page::addMembers(std::string_view what, const std::vector<Member>& members) {
-    if (members.empty()) return addParagraph("Has none of its own.");
+    if (members.empty()) return addParagraph("It has none of its own.");
     out_.append("| ").append(what).append(" | type | | |\n|---|---|---|---|\n");
     for (const Member& member : members) {
         out_ += "| " + escaped(member.name) + " | " + typeOf(member.shape) +
@@ -108,6 +115,13 @@ void Page::addSession() {
     addMembers("key", vocabulary_.session);
 }
 
+void Page::addOwn(const Definition& definition) {
+    if (definition.schema.empty()) return addParagraph("Written by the type's own code: " + typeOf(definition.shape));
+    const auto schema = jsontree::parse(definition.schema, jsontext::maximumDepth);  // has been looked at
+    if (schema)
+        addParagraph("As its schema says:\n\n```json\n" + jsontree::write(*schema, {.prettyPrinted = true}) + "\n```");
+}
+
 void Page::addDefinition(std::size_t index) {
     const Definition& definition = vocabulary_.definitions[index];
     addParagraph("### <a id=\"" + anchorOf(index) + "\"></a>" + escaped(names_[index]));
@@ -116,9 +130,7 @@ void Page::addDefinition(std::size_t index) {
         case Definition::Form::record:
             return addMembers("field", definition.members);
         case Definition::Form::own:
-            return addParagraph(definition.schema.empty()
-                                    ? "Written by the type's own code: " + typeOf(definition.shape)
-                                    : "As its schema says:\n\n```json\n" + definition.schema + "\n```");
+            return addOwn(definition);
         case Definition::Form::enumeration:
             break;
     }
@@ -136,7 +148,6 @@ void Page::addTypes() {
 
 std::string Page::write() && {
     for (std::size_t i = 0; i < names_.size(); ++i) byName_.emplace(names_[i], i);
-    for (const auto& [name, index] : byName_) place_.emplace(index, place_.size() + 1);
     addParagraph("# Events");
     addParagraph("<!-- " + std::string(writtenBy) + " -->");
     addEvents();

@@ -2,9 +2,11 @@
 
 #include <corvane/Catalogue/Vocabulary.h>
 #include <corvane/Models/Encoding.h>
+#include <corvane/Models/EventData.h>
 #include <corvane/Models/EventProperty.h>
 #include <corvane/Models/EventSubmit.h>
 
+#include <array>
 #include <concepts>
 #include <limits>
 #include <ranges>
@@ -17,6 +19,24 @@
 // value. Internal.
 
 #pragma GCC visibility push(hidden)  // what is made of host types belongs to the object that makes it
+
+namespace corvane::catalogue {
+
+template <>
+inline constexpr auto description<EventData> = "What identifies an event.";
+template <>
+inline constexpr auto fieldDescriptions<EventData> =
+    std::to_array<FieldDescription>({{"eventID", "A random UUID, upper case."},
+                                     {"eventTimestamp", "When the application submitted the event."},
+                                     {"eventPath", "The tracker's place, such as /root/player."},
+                                     {"sessionID", "The session that the event belongs to."}});
+template <>
+inline constexpr auto description<TimedData> = "How long an event took.";
+template <>
+inline constexpr auto fieldDescriptions<TimedData> = std::to_array<FieldDescription>(
+    {{"duration", "In milliseconds; negative when the end lies before the start, as when a clock was set."}});
+
+}  // namespace corvane::catalogue
 
 namespace corvane::catalogue::detail {
 
