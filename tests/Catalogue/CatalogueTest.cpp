@@ -152,6 +152,19 @@ TEST(CatalogueTest, DescribesEveryKindOfField) {
     EXPECT_NE(page.find("| text | text | required | A text. |"), std::string::npos) << page;
 }
 
+/// Whether another validator finds the schemas to be such, and the document to match them.
+void checkByOthers(const std::filesystem::path& directory, const JSON& document) {
+#ifdef CORVANE_SCHEMA_CHECK
+    const std::string file = (directory / "document.json").string();
+    writeFile(file, document.text());
+    EXPECT_EQ(std::system((CORVANE_SCHEMA_CHECK " " + directory.string() + " " + file).c_str()), 0);
+    writeFile(file, R"({"metadata":{"version":"0.1.0","identifier":"x"},"data":{"session":{},"events":[]}})");
+    EXPECT_NE(std::system((CORVANE_SCHEMA_CHECK " " + directory.string() + " " + file).c_str()), 0);
+#else
+    std::cerr << "not looked at by another validator: " << directory << document.text() << "\n";
+#endif
+}
+
 /// Documents as a collector gets them.
 std::vector<JSON> upload(const std::function<void(SessionManager&)>& use) {
     const TemporaryDocuments documents;
@@ -183,6 +196,7 @@ TEST(CatalogueTest, DocumentsAsTheyAreUploadedMatchAndOthersDoNot) {
     });
     ASSERT_EQ(documents.size(), 1U);
     EXPECT_EQ(schemas.check(documents[0]).lines, std::vector<std::string>{});
+    checkByOthers(directory.path(), documents[0]);
 
     const std::string text = documents[0].text();
     const auto changed = [&](const std::string& from, const std::string& to) {
