@@ -17,12 +17,11 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// A file of the directory is for those whom the directory is for.
+// A file is for those whom its directory is for; others than its owner's group never write it.
 void shareLikeDirectory(const fs::path& file) {
     std::error_code error;
-    const fs::perms mode =
-        fs::status(file.parent_path(), error).permissions() & (fs::perms(0666));  // nobody executes a schema
-    if (!error) fs::permissions(file, mode | fs::perms::owner_read | fs::perms::owner_write, error);
+    const fs::perms shared = fs::status(file.parent_path(), error).permissions() & fs::perms(0664);
+    if (!error) fs::permissions(file, shared | fs::perms::owner_read | fs::perms::owner_write, error);
     if (error) throw SystemError("set the permissions of " + file.string(), error.value());
 }
 
@@ -48,7 +47,8 @@ std::vector<fs::path> abandonedSchemas(const fs::path& directory, const std::map
     std::error_code error;
     for (fs::directory_iterator entry(directory, error), end; !error && entry != end; entry.increment(error)) {
         const std::string name = entry->path().filename().string();
-        if (!name.ends_with(schemaSuffix) || files.contains(name) || !entry->is_regular_file()) continue;
+        if (!name.ends_with(schemaSuffix) || files.contains(name)) continue;
+        if (std::error_code unknown; !fs::is_regular_file(entry->symlink_status(unknown))) continue;
         if (readWholeFile(entry->path()).find(writtenBy) != std::string::npos) abandoned.push_back(entry->path());
     }
     if (error) throw SystemError("read the directory " + directory.string(), error.value());
