@@ -29,9 +29,11 @@ long long shown(std::int64_t number) {
 
 }  // namespace
 
-Collector::Collector(const std::filesystem::path& directory, const std::optional<std::filesystem::path>& publicKeyFile)
+Collector::Collector(const std::filesystem::path& directory, const std::optional<std::filesystem::path>& publicKeyFile,
+                     const std::optional<std::filesystem::path>& schemas)
     : archive_(directory) {
     if (publicKeyFile) verifier_.emplace(*publicKeyFile);
+    if (schemas) schemas_.emplace(*schemas);
 }
 
 Answer Collector::receive(const Upload& upload) noexcept {
@@ -48,6 +50,7 @@ Answer Collector::accept(const Upload& upload) {
     checkHeaders(upload);
     if (verifier_) verifier_->verify(upload.body, upload.signature);
     const Document document = readDocument(gunzip(upload.body, largestDocument));
+    const auto report = schemas_ ? schemas_->check(corvane::JSON(document.line)) : SchemaFolder::Report();
 
     const std::lock_guard lock(mutex_);
     const Archive::Counts added = archive_.add(document);
@@ -55,8 +58,15 @@ Answer Collector::accept(const Upload& upload) {
                 added.documents > 0 ? "document" : "duplicate document", document.identifier.c_str(),
                 shown(added.events), shown(added.duplicateEvents), upload.body.size(),
                 verifier_ ? ", signature verified" : "");
+    print(report);
     std::fflush(stdout);
     return {200, "accepted\n"};
+}
+
+// A sender gives a document up that is refused, so what does not match is said here and to nobody else.
+void Collector::print(const SchemaFolder::Report& report) {
+    mismatches_ += static_cast<std::int64_t>(report.mismatches);
+    for (const std::string& line : report.lines) std::printf("  does not match: %s\n", line.c_str());
 }
 
 Answer Collector::refuse(int status, const char* reason) {
@@ -73,6 +83,7 @@ void Collector::printTotals() {
     std::printf("documents: %lld, and %lld duplicate\n", shown(counts.documents), shown(counts.duplicateDocuments));
     std::printf("events: %lld, and %lld duplicate\n", shown(counts.events), shown(counts.duplicateEvents));
     std::printf("requests refused: %lld\n", shown(refused_));
+    if (schemas_) std::printf("events that do not match their schemas: %lld\n", shown(mismatches_));
     std::fflush(stdout);
 }
 

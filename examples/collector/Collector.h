@@ -1,6 +1,7 @@
 #pragma once
 
 #include "Archive.h"
+#include "SchemaFolder.h"
 #include "SignatureVerifier.h"
 #include "Upload.h"
 
@@ -15,7 +16,9 @@ namespace collector {
 class Collector {
   public:
     /// @param publicKeyFile the key to verify signatures with; nothing to leave them unverified
-    Collector(const std::filesystem::path& directory, const std::optional<std::filesystem::path>& publicKeyFile);
+    /// @param schemas the directory of schemas to hold documents against; nothing to take whatever is in them
+    Collector(const std::filesystem::path& directory, const std::optional<std::filesystem::path>& publicKeyFile,
+              const std::optional<std::filesystem::path>& schemas);
 
     /// Never throws: what is wrong with an upload is in the answer.
     [[nodiscard]] Answer receive(const Upload& upload) noexcept;
@@ -26,12 +29,15 @@ class Collector {
 
   private:
     Answer accept(const Upload& upload);
+    void print(const SchemaFolder::Report& report);
 
     std::optional<SignatureVerifier> verifier_;
+    std::optional<SchemaFolder> schemas_;
     std::mutex mutex_;
     // Guarded by mutex_, as is standard output.
     Archive archive_;
     std::int64_t refused_ = 0;
+    std::int64_t mismatches_ = 0;
 };
 
 }  // namespace collector

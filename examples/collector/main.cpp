@@ -29,6 +29,8 @@ constexpr auto usage =
     "  --port N           the port (8080); 0 for a free one\n"
     "  --directory DIR    where documents are kept (collected)\n"
     "  --public-key FILE  verify signatures with the key in this PEM file, which is read with the first upload\n"
+    "  --schemas DIR      say which events do not match the schemas there, which corvane::writeCatalogue wrote; they\n"
+    "                     are kept all the same: a sender gives up what is refused\n"
     "  --drop-first N     close the first N connections without an answer\n"
     "  --fail-first N     answer the first N requests after those with a failure\n"
     "  --fail-status S    the status of these failures (503)\n"
@@ -38,6 +40,7 @@ struct Options {
     int port;
     std::filesystem::path directory;
     std::optional<std::filesystem::path> publicKeyFile;
+    std::optional<std::filesystem::path> schemas;
     Misbehaviour misbehaviour;
 };
 
@@ -47,11 +50,13 @@ Options optionsFrom(const examples::CommandLine& line) {
     Options options{.port = static_cast<int>(line.number("--port", 8080, 0, 65535)),
                     .directory = line.value("--directory").value_or("collected"),
                     .publicKeyFile = std::nullopt,
+                    .schemas = std::nullopt,
                     .misbehaviour = {.dropFirst = line.number("--drop-first", 0, 0, many),
                                      .failFirst = line.number("--fail-first", 0, 0, many),
                                      .failStatus = static_cast<int>(line.number("--fail-status", 503, 200, 599)),
                                      .delay = std::chrono::milliseconds(line.number("--delay", 0, 0, many))}};
     if (const auto file = line.value("--public-key")) options.publicKeyFile = *file;
+    if (const auto directory = line.value("--schemas")) options.schemas = *directory;
     return options;
 }
 
@@ -68,7 +73,7 @@ sigset_t blockStopSignals() {
 int collect(const Options& options) {
     umask(077);  // documents say what people did
     const sigset_t signals = blockStopSignals();
-    Collector collector(options.directory, options.publicKeyFile);
+    Collector collector(options.directory, options.publicKeyFile, options.schemas);
     CollectionServer server(options.misbehaviour, collector);
     const auto port = server.bind(options.port);
     if (!port) {
@@ -91,9 +96,9 @@ int collect(const Options& options) {
 
 int run(int argc, char** argv) {
     try {
-        const examples::CommandLine line(
-            argc, argv,
-            {"--port", "--directory", "--public-key", "--drop-first", "--fail-first", "--fail-status", "--delay"});
+        const examples::CommandLine line(argc, argv,
+                                         {"--port", "--directory", "--public-key", "--schemas", "--drop-first",
+                                          "--fail-first", "--fail-status", "--delay"});
         if (line.wantsHelp()) {
             std::fputs(usage, stdout);
             return EXIT_SUCCESS;
