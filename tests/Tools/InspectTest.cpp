@@ -112,8 +112,9 @@ TEST_F(InspectTest, ReadsBesideAHostAndWhatTheAgentHas) {
         EXPECT_EQ(now["endpoints"][0]["documents"][0]["isWithAgent"].bool_(), true) << now.text();
         EXPECT_EQ(now["agent"]["tasks"][0]["url"].string(), "http://127.0.0.1:9/in");
         EXPECT_TRUE(holds(inspect("verify " + directory()).output, "signature  good"));
-        app.sessions.setRecording(false);
-        app.drain();
+        std::promise<void> kept;
+        app.sessions.setRecording(false, [&](const AnyError*) { kept.set_value(); });
+        kept.get_future().wait();
         EXPECT_EQ(status()["isRecording"].bool_(), false);
     }
     TransferSession::setFactory(InProcessTransferSession::factory());
