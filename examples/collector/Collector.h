@@ -1,6 +1,7 @@
 #pragma once
 
 #include "Archive.h"
+#include "Hub.h"
 #include "SignatureVerifier.h"
 #include "Upload.h"
 
@@ -24,10 +25,14 @@ class Collector {
 
     void printTotals();
 
+    /// Where everything that is received or refused is told.
+    [[nodiscard]] Hub& hub() { return hub_; }
+
   private:
     Answer accept(const Upload& upload);
 
     std::optional<SignatureVerifier> verifier_;
+    Hub hub_;
     std::mutex mutex_;
     // Guarded by mutex_, as is standard output.
     Archive archive_;
