@@ -2,6 +2,7 @@
 
 #include "Collector.h"
 #include "Upload.h"
+#include "Viewers.h"
 
 #include <httplib.h>
 
@@ -22,7 +23,8 @@ struct Misbehaviour {
     std::chrono::milliseconds delay{0};  ///< before every answer
 };
 
-/// The HTTP side of the collector: takes PUT requests of any path on the loopback interface, one a connection.
+/// The HTTP side of the collector: takes PUT requests of any path on the loopback interface, one a connection, and
+/// serves the page that shows them ("/") and the stream that feeds it ("/events").
 ///
 /// It drives the connections itself, for two things that the underlying server has no switch for: the body as it was
 /// sent, which is what the signature is of, and connections that break off.
@@ -43,12 +45,14 @@ class CollectionServer final : private httplib::Server {
 
   private:
     bool process_and_close_socket(socket_t socket) override;
+    void servePage();
     void handle(const httplib::Request& request, httplib::Response& response, const httplib::ContentReader& reader);
     [[nodiscard]] Answer answer(const httplib::Request& request, const httplib::ContentReader& reader);
     void waitForDelay();
 
     const Misbehaviour misbehaviour_;
     Collector& collector_;
+    Viewers viewers_;
     std::atomic<std::int64_t> connections_ = 0;
     std::atomic<std::int64_t> requests_ = 0;
     std::atomic<std::int64_t> dropped_ = 0;

@@ -4,6 +4,9 @@
 #include "Refusal.h"
 #include "gunzip.h"
 
+#include <corvane/Platform/JSONText.h>
+
+#include <chrono>
 #include <cstdio>
 #include <exception>
 #include <string_view>
@@ -21,6 +24,33 @@ void checkHeaders(const Upload& upload) {
     }
     if (upload.contentEncoding != "gzip") throw Refusal(400, "Content-Encoding is not \"gzip\"");
     if (upload.userAgent.empty()) throw Refusal(400, "User-Agent is missing");
+}
+
+constexpr std::size_t largestShownDocument = std::size_t{1} << 20;
+
+std::string now() {
+    using namespace std::chrono;
+    return std::to_string(duration_cast<milliseconds>(system_clock::now().time_since_epoch()).count());
+}
+
+// What the page gets to see. The document stands in it as it came: it is JSON, in one line.
+std::string messageOf(const Document& document, const Archive::Counts& added, std::size_t bytes, bool isVerified) {
+    std::string text = R"({"kind":"document","time":)" + now() + R"(,"identifier":")" + document.identifier +
+                       R"(","isDuplicate":)" + (added.documents > 0 ? "false" : "true") + R"(,"newEvents":)" +
+                       std::to_string(added.events) + R"(,"duplicateEvents":)" + std::to_string(added.duplicateEvents) +
+                       R"(,"events":)" + std::to_string(document.events) + R"(,"bytes":)" + std::to_string(bytes) +
+                       R"(,"unpackedBytes":)" + std::to_string(document.line.size()) + R"(,"signature":")" +
+                       (isVerified ? "verified" : "no key") + '"';
+    // A page could not show it in any useful way, and a few of these would push out all others.
+    if (document.line.size() <= largestShownDocument) text += R"(,"document":)" + document.line;
+    return text + '}';
+}
+
+std::string messageOf(int status, const char* reason) {
+    std::string text =
+        R"({"kind":"refusal","time":)" + now() + R"(,"status":)" + std::to_string(status) + R"(,"reason":)";
+    if (!corvane::jsontext::appendString(text, reason)) text += R"("the reason is not text")";
+    return text + '}';
 }
 
 long long shown(std::int64_t number) {
@@ -60,6 +90,7 @@ Answer Collector::accept(const Upload& upload) {
                 verifier_ ? ", signature verified" : "");
     print(report);
     std::fflush(stdout);
+    hub_.publish(messageOf(document, added, upload.body.size(), verifier_.has_value()));
     return {200, "accepted\n"};
 }
 
@@ -74,6 +105,7 @@ Answer Collector::refuse(int status, const char* reason) {
     ++refused_;
     std::printf("refused with %d: %s\n", status, reason);
     std::fflush(stdout);
+    hub_.publish(messageOf(status, reason));
     return {status, std::string(reason) + "\n"};
 }
 

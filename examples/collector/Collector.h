@@ -1,6 +1,7 @@
 #pragma once
 
 #include "Archive.h"
+#include "Hub.h"
 #include "SchemaFolder.h"
 #include "SignatureVerifier.h"
 #include "Upload.h"
@@ -27,12 +28,16 @@ class Collector {
 
     void printTotals();
 
+    /// Where everything that is received or refused is told.
+    [[nodiscard]] Hub& hub() { return hub_; }
+
   private:
     Answer accept(const Upload& upload);
     void print(const SchemaFolder::Report& report);
 
     std::optional<SignatureVerifier> verifier_;
     std::optional<SchemaFolder> schemas_;
+    Hub hub_;
     std::mutex mutex_;
     // Guarded by mutex_, as is standard output.
     Archive archive_;

@@ -22,9 +22,7 @@ Recorder::~Recorder() {
 void Recorder::record(AccessLogEntry entry) {
     if (linesInSession_ == linesPerSession) {
         // A running session keeps its events, so a file of any size needs a new one now and then.
-        sessions_.endSync();
-        sessions_.start(corvane::Session::Kind::userEvents());
-        linesInSession_ = 0;
+        startNextSession();
     }
     ++linesInSession_;
 
@@ -49,6 +47,12 @@ void Recorder::completed(const corvane::EventSubmitResult& result) {
         std::fprintf(stderr, "replay: an event was not recorded: %s\n", result.error()->what());
     }
     inFlight_.release();
+}
+
+void Recorder::startNextSession() {
+    sessions_.endSync();
+    sessions_.start(corvane::Session::Kind::userEvents());
+    linesInSession_ = 0;
 }
 
 void Recorder::finish() {

@@ -22,6 +22,8 @@ class Recorder {
 
     /// Submits one event; waits while too many are in flight.
     void record(AccessLogEntry entry);
+    /// Waits for all submissions, and goes on in a new session: the last batch is sent.
+    void startNextSession();
     /// Waits for all submissions and ends the session, which sends the last batch.
     void finish();
 

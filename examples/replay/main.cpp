@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <chrono>
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <exception>
@@ -34,6 +35,9 @@ constexpr auto usage =
     "  --batch-size N     events in a document (50)\n"
     "  --documents DIR    where the database, the payload files and the key are kept (corvane-replay)\n"
     "  --timeout SECONDS  how long to wait for delivery after the last line (60)\n"
+    "  --rate N           record N events a second as they happen now, from the beginning again at the end of FILE, "
+    "until\n"
+    "                     SIGINT or SIGTERM; a session ends every two seconds\n"
     "\n"
     "A line that is not in the format is counted and skipped. Text that is not UTF-8 is recorded with U+FFFD in the\n"
     "place of each bad byte sequence. What is not delivered in time stays in DIR and goes out with the next run.\n"
@@ -44,6 +48,7 @@ struct Options {
     int batchSize;
     std::filesystem::path documents;
     std::chrono::seconds timeout;
+    std::int64_t rate;  // 0: the file once, as fast as it goes
     std::string file;
 };
 
@@ -54,6 +59,7 @@ Options optionsFrom(const examples::CommandLine& line) {
             .batchSize = static_cast<int>(line.number("--batch-size", 50, 1, 1'000'000)),
             .documents = line.value("--documents").value_or("corvane-replay"),
             .timeout = std::chrono::seconds(line.number("--timeout", 60, 0, 1'000'000)),
+            .rate = line.number("--rate", 0, 1, 10'000),
             .file = line.operands().front()};
 }
 
@@ -103,6 +109,53 @@ LineCounts recordLines(Input& input, Recorder& recorder, Progress& progress) {
     return lines;
 }
 
+sigset_t stopSignals() {
+    sigset_t signals;
+    sigemptyset(&signals);
+    sigaddset(&signals, SIGINT);
+    sigaddset(&signals, SIGTERM);
+    return signals;
+}
+
+// Whether the program was told to stop before `time`.
+bool stopsBefore(Clock::time_point time) {
+    const sigset_t signals = stopSignals();
+    const auto left = std::max(Clock::duration::zero(), time - Clock::now());
+    const auto seconds = std::chrono::floor<std::chrono::seconds>(left);
+    const timespec timeout{.tv_sec = static_cast<time_t>(seconds.count()),
+                           .tv_nsec = static_cast<long>(std::chrono::nanoseconds(left - seconds).count())};
+    return sigtimedwait(&signals, nullptr, &timeout) > 0;
+}
+
+// Sessions end often, so that whoever watches sees what was recorded a moment ago.
+LineCounts recordSteadily(const Options& options, Recorder& recorder) {
+    LineCounts lines;
+    const auto step = std::chrono::duration_cast<Clock::duration>(std::chrono::seconds(1)) / options.rate;
+    auto due = Clock::now();
+    auto sessionEnd = due + std::chrono::seconds(2);
+    while (true) {
+        Input input(options.file);
+        LineReader reader(input.stream());
+        const auto readBefore = lines.read - lines.skipped;
+        while (reader.next()) {
+            ++lines.read;
+            auto entry = reader.isTooLong() ? std::nullopt : parseAccessLogLine(reader.line());
+            if (!entry) {
+                ++lines.skipped;
+                continue;
+            }
+            if (stopsBefore(due)) return lines;
+            due += step;
+            entry->time = std::chrono::time_point_cast<Date::duration>(std::chrono::system_clock::now());
+            recorder.record(std::move(*entry));
+            if (Clock::now() < sessionEnd) continue;
+            recorder.startNextSession();
+            sessionEnd = Clock::now() + std::chrono::seconds(2);
+        }
+        if (lines.read - lines.skipped == readBefore) throw std::runtime_error(options.file + " has no line to record");
+    }
+}
+
 DeliveryReport waitForDelivery(const UploadBatchEventProcessor& uploads, std::chrono::seconds timeout,
                                Progress& progress) {
     const auto deadline = Clock::now() + timeout;
@@ -124,6 +177,11 @@ void print(const char* what, const DeliveryReport::Count& count) {
 }
 
 bool replayLog(const Options& options) {
+    if (options.rate > 0) {
+        if (options.file == "-") throw std::runtime_error("standard input cannot be read again");
+        const sigset_t signals = stopSignals();  // before there are threads that could take them
+        pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+    }
     Input input(options.file);  // first: a wrong name leaves nothing behind
     DocumentsDirectory::set(options.documents);
     TransferSession::setFactory(InProcessTransferSession::factory());  // it waits for its delivery
@@ -137,7 +195,7 @@ bool replayLog(const Options& options) {
     DeliveryReport report;
     {
         Progress progress(input.size());
-        lines = recordLines(input, recorder, progress);
+        lines = options.rate > 0 ? recordSteadily(options, recorder) : recordLines(input, recorder, progress);
         recorder.finish();
         report = waitForDelivery(*uploads, options.timeout, progress);
     }
@@ -154,7 +212,8 @@ bool replayLog(const Options& options) {
 
 int run(int argc, char** argv) {
     try {
-        const examples::CommandLine line(argc, argv, {"--endpoint", "--batch-size", "--documents", "--timeout"});
+        const examples::CommandLine line(argc, argv,
+                                         {"--endpoint", "--batch-size", "--documents", "--timeout", "--rate"});
         if (line.wantsHelp()) {
             std::fputs(usage, stdout);
             return EXIT_SUCCESS;
