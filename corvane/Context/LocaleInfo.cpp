@@ -50,7 +50,7 @@ std::optional<std::string> timeZone(const detail::Surroundings& around) {
         return zoneName(chosen->front() == ':' ? std::string_view(*chosen).substr(1) : std::string_view(*chosen));
     }
     if (const auto target = around.link("etc/localtime")) {
-        if (const auto zone = zoneName(*target)) return zone;
+        if (auto zone = zoneName(*target)) return zone;
     }
     const std::string file = around.file("etc/timezone").value_or("");
     return zoneName(std::string_view(file).substr(0, file.find('\n')));

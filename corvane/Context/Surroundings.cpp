@@ -13,7 +13,7 @@ namespace corvane::detail {
 
 namespace {
 
-constexpr std::size_t longestFile = 64 * 1024, longestText = 128;
+constexpr std::size_t longestFile = std::size_t{64} * 1024, longestText = 128;
 
 }  // namespace
 

@@ -62,7 +62,7 @@ class CORVANE_EXPORT SessionManager {
             push({typeName<SessionData<D>>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()},
                  submitEventQueues);
         }
-    }
+    }  // NOLINT(clang-analyzer-cplusplus.NewDeleteLeaks): the data counts its references
 
     /// Switches recording on or off, for every session manager of this process at once, and in the documents directory
     /// as it is set now: for every process that uses it, as soon as that next looks at its database or starts a

@@ -112,7 +112,7 @@ class CORVANE_EXPORT Tracker : public std::enable_shared_from_this<Tracker> {
         if constexpr (detail::check(detail::searchDataEvent<detail::Use::later, D>())) {
             push({typeName<D>(), AnyDataEvent(std::move(data)), traits, where.file_name(), where.line()});
         }
-    }
+    }  // NOLINT(clang-analyzer-cplusplus.NewDeleteLeaks): the data counts its references
     /// Takes the newest data of a type that was pushed on this very tracker out of scope; nothing if there is none.
     template <class D>
     CORVANE_LOCAL void pop() {
