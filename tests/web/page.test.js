@@ -53,10 +53,10 @@ const documentOf = (identifier, text) => gzipSync(JSON.stringify({
     session: { sessionID: text },
     events: [{
       metadata: { name: text.slice(0, 60), version: '0.1.0' },
-      data: { event: { eventID: identifier, eventTimestamp: 1, eventPath: text, sessionID: text }, word: { text } },
+      data: { event: { eventID: identifier, eventTimestamp: 1, eventPath: text, sessionID: text }, word: { text, numbers: 'NUMBERS' } },
     }],
   },
-}));
+}).replace('"NUMBERS"', '[9007199254740993,3.0]'));
 
 let page;
 const text = selector => page.$eval(selector, node => node.textContent);
@@ -105,6 +105,7 @@ const tests = {
     assert.match(await text('#arrivals'), /duplicate document 00000000-0000-4000-8000-000000000001/);
     await page.click('#arrivals summary');
     await until(() => /\\u202e/.test(document.querySelector('#arrivals pre')?.textContent ?? ''));
+    assert.match(await text('#arrivals pre'), /9007199254740993,\s+3\.0/);
     assert.equal(await page.evaluate(() => window.broken), undefined);
     assert.equal(await page.$('#arrivals img, #arrivals script, #sessions img'), null);
   },

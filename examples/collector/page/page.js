@@ -25,6 +25,10 @@ const plain = value => value !== null && typeof value === 'object';
 const visible = text => text.replace(/[\u200b-\u200f\u202a-\u202e\u2060-\u2069\ufeff]/g,
   c => '\\u' + c.charCodeAt(0).toString(16));
 
+// Numbers stand as they came, where the browser can tell: 9007199254740993, 3.0.
+const parse = text => JSON.parse(text, !JSON.rawJSON ? undefined : (key, value, context) =>
+  typeof value === 'number' && context.source !== String(value) ? JSON.rawJSON(context.source) : value);
+
 function identityOf(event) {
   return Object.values(event.data).find(value => plain(value) && 'eventPath' in value) || {};
 }
@@ -177,7 +181,7 @@ function connect() {
     const number = Number(event.lastEventId.split('-')[1]);
     if (number <= lastID) return;
     lastID = number;
-    take(JSON.parse(event.data));
+    take(parse(event.data));
   });
   source.addEventListener('error', () => {
     byId('connection').textContent = 'The collector is away; trying again';
