@@ -52,7 +52,11 @@ Payload Payload::read(const std::filesystem::path& file, const std::optional<std
     payload.checks.push_back(
         {"gzip", problemOf([&] { payload.text = collector::gunzip(payload.body, largestDocument); })});
     if (payload.text) {
-        payload.checks.push_back({"document", problemOf([&] { (void)collector::readDocument(*payload.text); })});
+        payload.checks.push_back({"document", problemOf([&] {
+                                      const std::string found = collector::readDocument(*payload.text).identifier;
+                                      if (found != file.filename())
+                                          throw Problem("the file holds another document, " + found);
+                                  })});
     }
     return payload;
 }
