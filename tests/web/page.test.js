@@ -17,6 +17,14 @@ const axeSource = readFileSync(createRequire(import.meta.url).resolve('axe-core/
 const work = mkdtempSync(join(tmpdir(), 'corvane-page-'));
 const processes = new Set();
 
+for (const signal of ['SIGINT', 'SIGTERM']) {
+  process.on(signal, () => {
+    for (const child of processes) child.kill('SIGKILL');
+    rmSync(work, { recursive: true, force: true });
+    process.exit(1);
+  });
+}
+
 function run(program, ...options) {
   const child = spawn(program, options, { stdio: ['ignore', 'pipe', 'inherit'] });
   processes.add(child);
