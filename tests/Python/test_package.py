@@ -8,7 +8,7 @@ import sys
 import tarfile
 import unittest
 
-from support import ProcessTest
+from support import ProcessTest, plain_environment
 
 PACKAGE = pathlib.Path(__file__).parents[2] / "bindings" / "python"
 
@@ -26,7 +26,7 @@ class PackageTest(ProcessTest):
     @unittest.skipUnless("CORVANE_COLLECTOR" in os.environ, "CORVANE_COLLECTOR names the example collector")
     def test_what_the_examples_record_comes_back_as_a_table(self) -> None:
         command = [os.environ["CORVANE_COLLECTOR"], "--port", "0", "--directory", self.directory]
-        with subprocess.Popen(command, stdout=subprocess.PIPE, text=True) as collector:
+        with subprocess.Popen(command, stdout=subprocess.PIPE, text=True, env=plain_environment()) as collector:
             self.addCleanup(collector.kill)
             assert collector.stdout
             url = collector.stdout.readline().strip()

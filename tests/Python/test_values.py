@@ -10,6 +10,7 @@ from datetime import datetime, timedelta, timezone
 from typing import Any, ClassVar, Dict, List, Literal, Optional, Tuple, Union, cast
 
 import corvane
+from support import plain_environment
 
 
 class Quality(enum.Enum):
@@ -85,9 +86,13 @@ class ValuesTest(unittest.TestCase):
             sessions.tracker.submit(event)
         return recording.events[0].json
 
+    def typed(self) -> str:
+        command = [os.environ["CORVANE_TYPED"]]
+        return subprocess.run(command, check=True, capture_output=True, env=plain_environment()).stdout.decode()
+
     @unittest.skipUnless("CORVANE_TYPED" in os.environ, "CORVANE_TYPED names the program of typed.cpp")
     def test_events_are_those_of_typed_declarations_to_the_byte(self) -> None:
-        typed = subprocess.run([os.environ["CORVANE_TYPED"]], check=True, capture_output=True).stdout.decode()
+        typed = self.typed()
         released = datetime(1970, 1, 1, tzinfo=timezone.utc) - timedelta(microseconds=1500900)
         track = Track(
             None, 'Pr\u00e9lude "n\u00ba 1"\\\n\t\x01\x7f\U0001f3b9', True, -(2**63), 2**64 - 1, released,
