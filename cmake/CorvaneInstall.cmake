@@ -10,6 +10,7 @@ install(TARGETS corvane EXPORT corvaneTargets
 
 if(CORVANE_BUILD_AGENT)
     install(TARGETS corvane-transferd RUNTIME DESTINATION ${CMAKE_INSTALL_LIBEXECDIR})
+    install(FILES ${PROJECT_SOURCE_DIR}/tools/man/corvane-transferd.8 DESTINATION ${CMAKE_INSTALL_MANDIR}/man8)
 endif()
 
 # A package of its own, which asks for nothing: a project in C finds it without a C++ compiler, and without what the
